@@ -1,0 +1,88 @@
+#pragma once
+
+// The appliance's database layer: connections and statements over SQLite.
+//
+// A connection and its results are used by one thread at a time. Nothing here throws, and nothing writes to
+// the system log: a failure is a null or negative result, and the connection tells the cause (KELODBErrorGet,
+// and sqlite3_errcode() on KELODBInternalDBHdlGet).
+
+#include <cstddef>
+
+#include "keloplatform/export.h"
+
+struct sqlite3;
+
+// A connection to one database file.
+struct DBConnect_tag;
+// The complete result of one statement, independent of the connection's later work.
+struct DBResult_tag;
+
+extern "C" {
+
+// Opens the existing database file at `path` for reading and writing; where the caller may only read it, for
+// reading. The first three arguments (host, user, password on other systems) are ignored and called with 0.
+//
+// The file is never created, and `path` is taken as it stands (no "file:" URI). Statements wait for another
+// writer with a time-out. SQL reached through the connection can neither load extensions nor attach other
+// files.
+//
+// Returns a connection that the caller closes with KELODBClose, or null: no path, no such file, no
+// permission, out of memory. A file that is no database is noticed only by the first statement.
+KELOPLATFORM_API DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path);
+
+// Closes the connection; null is accepted. Results stay valid until they are freed themselves. Returns 0, or
+// -1 when SQLite refused to close.
+KELOPLATFORM_API int KELODBClose(DBConnect_tag *connection);
+
+// Runs exactly one statement to its end. A text with a second statement fails before anything runs; a text
+// without any statement succeeds and does nothing.
+//
+// `result`, when not null, receives the complete result, to be freed with KELODBFreeResult, or null for a
+// statement that has no columns and on failure. Returns 0, or -1 after which the connection tells the cause.
+KELOPLATFORM_API int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result);
+
+// As KELODBExecute for one SELECT without a LIMIT clause of its own, of whose rows it skips `offset` and then
+// takes `limit` at the most; a limit of 0 means all. The bounds reach SQLite, so a sorted page does not sort
+// the table.
+KELOPLATFORM_API int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit,
+                                       unsigned int offset, DBResult_tag **result);
+
+// Number of rows in the result; 0 for null.
+KELOPLATFORM_API int KELODBNumRows(DBResult_tag *result);
+
+// Advances to the next row (the first at the first call) and stores its handle in `row`. Returns 0, or below
+// 0 when there is no further row or an argument is null.
+KELOPLATFORM_API int KELODBFetchRow(DBResult_tag *result, unsigned int *row);
+
+// The text of a column, by its exact name, of a row whose handle KELODBFetchRow gave. It is NUL-terminated
+// and belongs to the result. Null when the result has no such row or column, or the value is NULL. Where two
+// columns have one name the first counts.
+KELOPLATFORM_API const char *KELODBFetchField(DBResult_tag *result, unsigned int row, const char *column);
+
+// Frees a result; null is accepted.
+KELOPLATFORM_API void KELODBFreeResult(DBResult_tag *result);
+
+// Text of the connection's last error, valid until its next call. Never null, not even for a null connection.
+KELOPLATFORM_API const char *KELODBErrorGet(DBConnect_tag *connection);
+
+// The SQLite handle behind the connection (null for null). It stays the connection's own.
+KELOPLATFORM_API sqlite3 *KELODBInternalDBHdlGet(DBConnect_tag *connection);
+
+// Writes `inLen` bytes of `in` to `out` so that they can stand between single quotes in SQL: every single
+// quote is doubled and nothing else is changed. `out` is NUL-terminated. The connection may be null.
+//
+// Returns the number of bytes written without the NUL, or -1: an argument is null, `outSize` is too small, or
+// the text holds a NUL byte, which no SQL text can carry. 2 * inLen + 1 bytes always suffice.
+KELOPLATFORM_API int KELODBEscapeStringEX(DBConnect_tag *connection, char *out, size_t outSize,
+                                          const char *in, size_t inLen);
+
+// The same as KELODBEscapeStringEX.
+KELOPLATFORM_API int KELODBEscapeStringEX2(DBConnect_tag *connection, char *out, size_t outSize,
+                                           const char *in, size_t inLen);
+
+// Copies the C string `in` to `out` with a backslash before every '%', '_' and '\', for LIKE ... ESCAPE '\'.
+// Results as for KELODBEscapeStringEX; 2 * strlen(in) + 1 bytes always suffice.
+KELOPLATFORM_API int KELODBEscapeBackslashEX2(DBConnect_tag *connection, char *out, size_t outSize,
+                                              const char *in);
+
+} // extern "C"

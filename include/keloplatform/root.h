@@ -1,0 +1,16 @@
+#pragma once
+
+// The root that the platform's own fixed paths (spool, pid files, settings) stand under.
+
+#include "keloplatform/export.h"
+
+extern "C" {
+
+// Sets the root. Null or "" (the default) leaves the fixed paths as they are; anything else must begin with
+// '/' and is put in front of them. Paths that a caller passes in are never rewritten.
+//
+// Call it once, before the first use of the library: it is not synchronised. Returns 0, or -1 for a relative
+// root or when out of memory, and then nothing changed.
+KELOPLATFORM_API int KELORootSet(const char *root);
+
+} // extern "C"

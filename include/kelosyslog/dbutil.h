@@ -1,0 +1,98 @@
+#pragma once
+
+// Searching, counting and deleting the logs of a database.
+//
+//     std::list<_SYSLOG_SQL_COND_tag> conditions;
+//     LogSearchCondListGen("nas,backup", "err", "", "", "disk*full", "2020/01/01", "2020/01/31", conditions);
+//     _SYSLOG_SQL_LIMIT_tag page{50, 0};
+//     _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
+//     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
+//
+// Every function takes the absolute path of an existing database, opens a connection of its own, runs one
+// statement and closes the connection before it returns. None throws on a database error. A database is never
+// created.
+
+#include <cstdint>
+#include <list>
+#include <string>
+
+#include "kelosyslog/export.h"
+#include "kelosyslog/records.h"
+
+// One comparison of a column with a value, with further comparisons that are ORed with it. A list of
+// conditions is ANDed.
+//
+// The value is the operand as the user gave it; the library escapes it. For LIKE and NOT LIKE, '*' and '?'
+// are the wildcards and '%' and '_' stand for themselves; for GLOB, '[' and ']' do. A value of SYSLOG_OP_RAW
+// is an SQL expression and goes into the statement as it is: the caller answers for it. The alternatives of
+// alternatives are ignored.
+struct _SYSLOG_SQL_COND_tag {
+    _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
+    _SYSLOG_SQL_OP_tag op = SYSLOG_OP_EQ;
+    std::string value;
+    std::list<_SYSLOG_SQL_COND_tag> alternatives;
+};
+
+// A page: `limit` rows after skipping `offset`. A limit of 0 means all rows.
+struct _SYSLOG_SQL_LIMIT_tag {
+    uint64_t limit = 0;
+    uint64_t offset = 0;
+};
+
+// The sort order: non-zero `ascending` for ascending, 0 for descending.
+struct _SYSLOG_SQL_ORDER_tag {
+    int32_t ascending = 0;
+    _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
+};
+
+// Receives one row. `log` is reused for the next row. Returning non-zero ends the walk.
+using SyslogDBRowCallback = int (*)(_SYSLOG_LOG_DATA_tag &log, void *context);
+
+// Hands the rows of `table` that meet all `conditions` to `callback` (which may be null), one by one.
+//
+// A null `limit` means all rows, a null `order` no order. Without a filter, a page is taken by row id: the
+// rows whose id lies in (largest - offset - limit, largest - offset]; after deletions such a page may hold
+// fewer rows. `trimUser` removes the user name from the messages of table "logs".
+//
+// Returns 0, also when the callback stopped the walk, or -1 with a message in the system log: a path that is
+// not absolute, a database that cannot be opened, a statement that failed.
+KELOSYSLOG_API int SyslogDBSelectByTable(const std::string &dbPath, const std::string &table,
+                                         const std::list<_SYSLOG_SQL_COND_tag> &conditions,
+                                         _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order,
+                                         SyslogDBRowCallback callback, void *context, bool trimUser);
+
+// SyslogDBSelectByTable on table "logs".
+KELOSYSLOG_API int SyslogDBSelect(const std::string &dbPath,
+                                  const std::list<_SYSLOG_SQL_COND_tag> &conditions,
+                                  _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order,
+                                  SyslogDBRowCallback callback, void *context, bool trimUser);
+
+// Counts the rows of `table` that meet all `conditions`. Without a filter the count is the largest row id,
+// which is instant but counts deleted rows too. `limit` and `order` go into the counting statement itself.
+//
+// Returns the count, narrowed to int; -1 for a failure (only a bad path is reported in the system log); -2
+// when the statement did not yield exactly one row.
+KELOSYSLOG_API int SyslogDBSelectCountByTable(const std::string &dbPath, const std::string &table,
+                                              const std::list<_SYSLOG_SQL_COND_tag> &conditions,
+                                              _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
+
+// SyslogDBSelectCountByTable on table "logs".
+KELOSYSLOG_API int SyslogDBSelectCount(const std::string &dbPath,
+                                       const std::list<_SYSLOG_SQL_COND_tag> &conditions,
+                                       _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
+
+// Deletes the rows of table "logs" that meet all `conditions`; all rows when there are none. Returns 0, or
+// -1: only a bad path is reported in the system log.
+KELOSYSLOG_API int SyslogDBDelete(const std::string &dbPath,
+                                  const std::list<_SYSLOG_SQL_COND_tag> &conditions);
+
+// Appends the conditions of a filter form to `conditions`.
+//
+// `host`, `level`, `facility` and `program` are comma-separated alternatives; "" and "any" mean all.
+// `keyword` is a search expression (GenSQLRegexp) on the message, "" for none. The dates are texts as in
+// column "ldate" ("2020/01/02"), both inclusive; "" and "0" mean open.
+KELOSYSLOG_API void LogSearchCondListGen(const std::string &host, const std::string &level,
+                                         const std::string &facility, const std::string &program,
+                                         const std::string &keyword, const std::string &dateFrom,
+                                         const std::string &dateTo,
+                                         std::list<_SYSLOG_SQL_COND_tag> &conditions);

@@ -1,0 +1,34 @@
+#include "common/root.h"
+
+#include <new>
+
+#include "keloplatform/root.h"
+
+namespace {
+
+std::string &Root() {
+    static std::string root;
+    return root;
+}
+
+} // namespace
+
+int KELORootSet(const char *root) {
+    const char *text = root != nullptr ? root : "";
+    if (text[0] != '\0' && text[0] != '/')
+        return -1;
+    try {
+        Root() = text;
+    } catch (const std::bad_alloc &) {
+        return -1;
+    }
+    return 0;
+}
+
+namespace kelo::platform {
+
+std::string RootedPath(const std::string &path) {
+    return Root() + path;
+}
+
+} // namespace kelo::platform

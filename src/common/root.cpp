@@ -1,0 +1,28 @@
+#include "common/root.h"
+
+#include "kelosyslog/root.h"
+
+namespace {
+
+// Constructed on first use: nothing of ours runs when the library is loaded.
+std::string &Root() {
+    static std::string root;
+    return root;
+}
+
+} // namespace
+
+int SyslogRootSet(const std::string &root) {
+    if (!root.empty() && root.front() != '/')
+        return -1;
+    Root() = root;
+    return 0;
+}
+
+namespace kelo {
+
+std::string RootedPath(const std::string &path) {
+    return Root() + path;
+}
+
+} // namespace kelo

@@ -1,0 +1,87 @@
+#include "kelosyslog/records.h"
+
+#include <cstdlib>
+
+#include "common/db_field.h"
+
+using kelo::FieldText;
+
+namespace {
+
+uint64_t UnsignedField(DBResult_tag *result, uint32_t row, const char *column) {
+    return std::strtoull(FieldText(result, row, column), nullptr, 10);
+}
+
+int64_t SignedField(DBResult_tag *result, uint32_t row, const char *column) {
+    return std::strtoll(FieldText(result, row, column), nullptr, 10);
+}
+
+} // namespace
+
+std::string TrimUserName(const std::string &text) {
+    const size_t colon = text.find(':');
+    return colon == std::string::npos ? text : text.substr(colon + 1);
+}
+
+int DBRecToAllLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log, bool trimUser) {
+    if (result == nullptr || log == nullptr)
+        return -1;
+    log->id = UnsignedField(result, row, "id");
+    log->host = FieldText(result, row, "host");
+    log->ip = FieldText(result, row, "ip");
+    log->tag = FieldText(result, row, "tag");
+    log->tzoffset = FieldText(result, row, "tzoffset");
+    log->ldate = FieldText(result, row, "ldate");
+    log->ltime = FieldText(result, row, "ltime");
+    log->prog = FieldText(result, row, "prog");
+    log->msg = FieldText(result, row, "msg");
+    if (trimUser)
+        log->msg = TrimUserName(log->msg);
+    log->utcsec = SignedField(result, row, "utcsec");
+    log->fac = FieldText(result, row, "fac");
+    log->prio = PriorStrToType(FieldText(result, row, "prio"));
+    return 0;
+}
+
+int DBRecToSysLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log) {
+    if (result == nullptr || log == nullptr)
+        return -1;
+    log->id = UnsignedField(result, row, "id");
+    log->host = FieldText(result, row, "host");
+    log->prio = PriorStrToType(FieldText(result, row, "llevel"));
+    log->prog = FieldText(result, row, "prog");
+    log->ldate = FieldText(result, row, "ldate");
+    log->ltime = FieldText(result, row, "ltime");
+    log->luser = FieldText(result, row, "luser");
+    // Readers of general and connection logs take the message from `event`.
+    log->event = FieldText(result, row, "msg");
+    return 0;
+}
+
+int DBRecToXferLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log) {
+    if (result == nullptr || log == nullptr)
+        return -1;
+    log->id = UnsignedField(result, row, "id");
+    log->host = FieldText(result, row, "host");
+    log->prog = FieldText(result, row, "prog");
+    log->ldate = FieldText(result, row, "ldate");
+    log->ltime = FieldText(result, row, "ltime");
+    log->luser = FieldText(result, row, "luser");
+    log->event = FieldText(result, row, "event");
+    log->fname = FieldText(result, row, "fname");
+    log->isdir = UnsignedField(result, row, "isdir");
+    log->fsize = FieldText(result, row, "fsize");
+    log->xferip = FieldText(result, row, "ip");
+    return 0;
+}
+
+int DBRecToLogInfo(const std::string &table, DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log,
+                   bool trimUser) {
+    if (table == "logs")
+        return DBRecToAllLogInfo(result, row, log, trimUser);
+    if (table == "general_log" || table == "connection_log")
+        return DBRecToSysLogInfo(result, row, log);
+    if (table == "transfer_log")
+        return DBRecToXferLogInfo(result, row, log);
+    return -1;
+}

@@ -1,0 +1,146 @@
+#include "support/log_database.h"
+
+#include <sqlite3.h>
+
+#include <cstdio>
+#include <ctime>
+#include <memory>
+#include <stdexcept>
+
+#include "support/temp_root.h"
+
+namespace kelo::test {
+namespace {
+
+struct CloseDatabase {
+    void operator()(sqlite3 *db) const { sqlite3_close(db); }
+};
+struct FinalizeStatement {
+    void operator()(sqlite3_stmt *statement) const { sqlite3_finalize(statement); }
+};
+using Database = std::unique_ptr<sqlite3, CloseDatabase>;
+using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
+
+[[noreturn]] void Fail(sqlite3 *db, const std::string &what) {
+    throw std::runtime_error(what + ": " + sqlite3_errmsg(db));
+}
+
+Database Open(const std::string &path) {
+    sqlite3 *db = nullptr;
+    const int status = sqlite3_open(path.c_str(), &db);
+    Database owner(db);
+    if (status != SQLITE_OK)
+        Fail(db, path);
+    sqlite3_busy_timeout(db, 10000);
+    return owner;
+}
+
+void Run(sqlite3 *db, const std::string &sql) {
+    if (sqlite3_exec(db, sql.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK)
+        Fail(db, sql);
+}
+
+Statement Prepare(sqlite3 *db, const std::string &sql) {
+    sqlite3_stmt *statement = nullptr;
+    if (sqlite3_prepare_v2(db, sql.c_str(), -1, &statement, nullptr) != SQLITE_OK)
+        Fail(db, sql);
+    return Statement(statement);
+}
+
+std::string FormatTime(int64_t utcsec, const char *format) {
+    const auto time = static_cast<time_t>(utcsec);
+    tm parts{};
+    gmtime_r(&time, &parts);
+    char text[32];
+    const size_t length = std::strftime(text, sizeof text, format, &parts);
+    return std::string(text, length);
+}
+
+} // namespace
+
+void RunSql(const std::string &path, const std::string &sql) {
+    Run(Open(path).get(), sql);
+}
+
+std::string QueryText(const std::string &path, const std::string &sql) {
+    const Database db = Open(path);
+    const Statement statement = Prepare(db.get(), sql);
+    if (sqlite3_step(statement.get()) != SQLITE_ROW)
+        return "";
+    const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement.get(), 0));
+    return text != nullptr ? text : "";
+}
+
+void CreateLogDatabase(const std::string &path, const std::string &schema) {
+    const std::string sql = ReadFile(std::string(KELO_SOURCE_DIR) + "/package/schema/" + schema);
+    if (sql.empty())
+        throw std::runtime_error("no schema " + schema);
+    RunSql(path, "PRAGMA journal_mode=WAL;" + sql);
+}
+
+void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs) {
+    const Database db = Open(path);
+    Run(db.get(), "BEGIN IMMEDIATE");
+    const Statement statement = Prepare(
+        db.get(), "INSERT INTO logs(id,host,ip,fac,prio,llevel,tag,utcsec,tzoffset,ldate,ltime,prog,msg) "
+                  "VALUES(?1,?2,?3,?4,?5,?5,?6,?7,?8,?9,?10,?11,?12)");
+    const auto bind = [&](int index, const std::string &text) {
+        sqlite3_bind_text(statement.get(), index, text.data(), static_cast<int>(text.size()), SQLITE_STATIC);
+    };
+    for (const _SYSLOG_LOG_DATA_tag &log : logs) {
+        if (log.id != 0)
+            sqlite3_bind_int64(statement.get(), 1, static_cast<sqlite3_int64>(log.id));
+        else
+            sqlite3_bind_null(statement.get(), 1);
+        bind(2, log.host);
+        bind(3, log.ip);
+        bind(4, log.fac);
+        const std::string prio = PriorTypeToStr(log.prio);
+        bind(5, prio);
+        bind(6, log.tag);
+        sqlite3_bind_int64(statement.get(), 7, log.utcsec);
+        bind(8, log.tzoffset);
+        bind(9, log.ldate);
+        bind(10, log.ltime);
+        bind(11, log.prog);
+        bind(12, log.msg);
+        if (sqlite3_step(statement.get()) != SQLITE_DONE)
+            Fail(db.get(), "insert");
+        sqlite3_reset(statement.get());
+    }
+    Run(db.get(), "COMMIT");
+}
+
+_SYSLOG_LOG_DATA_tag SampleLog(int number) {
+    static const char *const kFacilities[] = {"kern", "user", "daemon", "auth", "local0", "local7"};
+    const auto numbered = [](const char *prefix, int value) {
+        char text[32];
+        const int length = std::snprintf(text, sizeof text, "%s%02d", prefix, value);
+        return std::string(text, static_cast<size_t>(length));
+    };
+    _SYSLOG_LOG_DATA_tag log;
+    log.utcsec = 1577836800 + number;
+    log.prio = static_cast<_SYSLOG_DB_PRIORITY_tag>(number % 8);
+    log.tag = "86";
+    log.host = numbered("host", number % 50);
+    log.ip = "10.0.0." + std::to_string(number % 50);
+    log.fac = kFacilities[number % 6];
+    log.tzoffset = "+00:00";
+    log.ldate = FormatTime(log.utcsec, "%Y/%m/%d");
+    log.ltime = FormatTime(log.utcsec, "%H:%M:%S");
+    log.prog = numbered("prog", number % 30);
+    log.msg = "user" + std::to_string(number % 97) + ": request " + std::to_string(number) +
+              " from 192.168.1." + std::to_string(number % 254) + " took " + std::to_string(number % 1000) +
+              " ms, status " + (number % 13 == 0 ? "FAILED" : "done") + ", session closed normally";
+    return log;
+}
+
+void InsertSampleLogs(const std::string &path, int count) {
+    std::vector<_SYSLOG_LOG_DATA_tag> logs;
+    logs.reserve(static_cast<size_t>(count));
+    for (int number = 0; number < count; ++number)
+        logs.push_back(SampleLog(number));
+    InsertLogs(path, logs);
+}
+
+} // namespace kelo::test

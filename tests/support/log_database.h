@@ -1,0 +1,35 @@
+#pragma once
+
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "kelosyslog/records.h"
+
+struct sqlite3;
+
+namespace kelo::test {
+
+// Runs SQL text (any number of statements) on the file at `path`, which is created when missing, through a
+// plain SQLite connection of its own. Throws std::runtime_error with SQLite's message.
+void RunSql(const std::string &path, const std::string &sql);
+
+// First column of the first row of a query, as text; "" for no row or NULL.
+std::string QueryText(const std::string &path, const std::string &sql);
+
+// Creates a log database from one of the shipped schemas, in WAL mode like a real one: "logs.sql",
+// "archive.sql".
+void CreateLogDatabase(const std::string &path, const std::string &schema = "logs.sql");
+
+// Appends records to table "logs" in one transaction. `id` is left to SQLite where it is 0; both `prio` and
+// `llevel` get the severity word.
+void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
+
+// A record that differs by `number` in a repeatable way: host "host00".."host49", program "prog00".."prog29",
+// every severity, one log a second from 2020/01/01 00:00:00 UTC on.
+_SYSLOG_LOG_DATA_tag SampleLog(int number);
+
+// The records SampleLog(0) to SampleLog(count - 1), appended.
+void InsertSampleLogs(const std::string &path, int count);
+
+} // namespace kelo::test

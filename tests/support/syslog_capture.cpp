@@ -1,0 +1,84 @@
+#include "support/syslog_capture.h"
+
+#include <syslog.h>
+
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+
+namespace kelo::test {
+namespace {
+
+SyslogCapture *active = nullptr;
+
+// Formats as vsyslog does; %m works because glibc's printf family knows it.
+void Capture(int priority, const char *format, va_list arguments) {
+    const int savedErrno = errno;
+    if (!SyslogCapture::IsActive())
+        return;
+    va_list copy;
+    va_copy(copy, arguments);
+    const int length = std::vsnprintf(nullptr, 0, format, copy);
+    va_end(copy);
+    if (length < 0)
+        return;
+    std::string text(static_cast<size_t>(length), '\0');
+    errno = savedErrno;
+    std::vsnprintf(text.data(), text.size() + 1, format, arguments);
+    SyslogCapture::Receive(priority, text);
+}
+
+} // namespace
+
+std::ostream &operator<<(std::ostream &out, const SyslogMessage &message) {
+    return out << "<" << message.priority << "> " << message.text;
+}
+
+SyslogCapture::SyslogCapture() {
+    active = this;
+}
+SyslogCapture::~SyslogCapture() {
+    active = nullptr;
+}
+bool SyslogCapture::IsActive() {
+    return active != nullptr;
+}
+void SyslogCapture::Receive(int priority, const std::string &text) {
+    active->messages_.push_back({priority, text});
+}
+
+std::vector<std::string> SyslogCapture::Texts() const {
+    std::vector<std::string> texts;
+    for (const SyslogMessage &message : messages_)
+        texts.push_back(message.text);
+    return texts;
+}
+
+} // namespace kelo::test
+
+// Fortified builds call the _chk forms.
+extern "C" {
+
+void vsyslog(int priority, const char *format, va_list arguments) {
+    kelo::test::Capture(priority, format, arguments);
+}
+
+void syslog(int priority, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    kelo::test::Capture(priority, format, arguments);
+    va_end(arguments);
+}
+
+void __vsyslog_chk(int priority, int, const char *format, va_list arguments) {
+    kelo::test::Capture(priority, format, arguments);
+}
+
+void __syslog_chk(int priority, int, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    kelo::test::Capture(priority, format, arguments);
+    va_end(arguments);
+}
+
+} // extern "C"
