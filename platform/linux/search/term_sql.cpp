@@ -11,9 +11,9 @@
 namespace kelo::platform {
 namespace {
 
-// SQLite refuses LIKE and GLOB patterns beyond 50,000 bytes, and takes quadratic time for many wildcards.
+// SQLite refuses LIKE and GLOB patterns beyond 50,000 bytes, and matches them with a recursion for every star.
 constexpr size_t kMaxPatternBytes = 40'000;
-constexpr size_t kMaxPatternPieces = 32;
+constexpr std::ptrdiff_t kMaxStars = 1'000;
 
 using Pieces = std::vector<Piece>;
 
@@ -88,11 +88,13 @@ std::string TextSql(const Pieces &pieces, const std::string &column, std::vector
     const bool ignoreCase = LetterCaseOf(pieces) == LetterCase::kIgnored;
     const PatternSyntax &syntax = ignoreCase ? kLike : kGlob;
     const bool isLiteral = pieces.size() == 1 && pieces[0].kind == Piece::Kind::kLiteral;
+    const auto stars = std::count_if(pieces.begin(), pieces.end(),
+                                     [](const Piece &piece) { return piece.kind == Piece::Kind::kAnyText; });
     const std::string pattern = Pattern(pieces, syntax);
 
     if (isLiteral && pattern.size() > kMaxPatternBytes)
         return LiteralSql(pieces[0].literal, ignoreCase, column);
-    if (pattern.size() > kMaxPatternBytes || pieces.size() > kMaxPatternPieces)
+    if (pattern.size() > kMaxPatternBytes || stars > kMaxStars)
         return RegexSql("(?s)" + Pattern(pieces, kRegex), ignoreCase, column, broken);
     if (ignoreCase) {
         const bool hasEscapes = pattern.find('\\') != std::string::npos;
