@@ -50,7 +50,7 @@
 // the statement builders know. Any other text may change from release to release; what holds is that
 //
 // - SQLite prepares and runs it, whatever the keyword: it is UTF-8 without NUL bytes, and within SQLite's
-//   default limits on depth, pattern length and arguments for keywords of some megabytes;
+//   default limits on depth, pattern length and arguments for keywords of a megabyte;
 // - it may stand in parentheses or as an operand of AND, OR and NOT;
 // - a row whose column is NULL is never matched by an inclusion and always kept by an exclusion;
 // - regular expressions call regexp() and regexpi(), which every connection of KELODBConnect has and the
