@@ -34,4 +34,22 @@ struct Answer {
 };
 Answer Ask(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page = nullptr);
 
+// Asks and calls `take(result, row)` for every row, in order. Returns false when the connection, the
+// statement or the fetch of a row failed; rows before it have been taken.
+template <typename Take>
+bool AskRows(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
+             Take take) {
+    const Answer answer = Ask(dbPath, sql, page);
+    if (!answer.isGood)
+        return false;
+    const int rowCount = KELODBNumRows(answer.result.get());
+    for (int i = 0; i < rowCount; ++i) {
+        uint32_t row = 0;
+        if (KELODBFetchRow(answer.result.get(), &row) < 0)
+            return false;
+        take(answer.result.get(), row);
+    }
+    return true;
+}
+
 } // namespace kelo
