@@ -94,7 +94,8 @@ void ShmBarrier(sqlite3_file *file) {
     Real(file)->pMethods->xShmBarrier(Real(file));
 }
 
-// Version 2: with shared memory, as a WAL needs it; without memory-mapped pages, which no read would go through.
+// Version 2: with shared memory, as a WAL needs it; without memory-mapped pages, which no read would go
+// through.
 const sqlite3_io_methods kMethods = {
     2,
     Close,
@@ -128,7 +129,9 @@ int Open(sqlite3_vfs *, const char *name, sqlite3_file *file, int flags, int *ou
     return status;
 }
 
-void Install() {
+} // namespace
+
+void FileFaults::Install() {
     if (realVfs != nullptr)
         return;
     realVfs = sqlite3_vfs_find(nullptr);
@@ -138,8 +141,6 @@ void Install() {
     shim.xOpen = Open;
     sqlite3_vfs_register(&shim, 1);
 }
-
-} // namespace
 
 void FileFaults::Start(Kind kind, int first, int times) {
     Install();
