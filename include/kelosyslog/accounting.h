@@ -67,11 +67,11 @@ public:
     void AccountingDump();
 
     // Logs counted since construction.
-    int64_t TotalCountGet() const { return totalCount_; }
+    int64_t TotalCountGet() const;
     // Logs counted since the last sample was closed.
-    int64_t CurrentEpsGet() const { return currentCount_; }
+    int64_t CurrentEpsGet() const;
     // A copy of the histogram: stored devices by name, then devices in the order of their first log.
-    std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const { return histogram_; }
+    std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
 
 private:
     struct Device {
@@ -79,9 +79,9 @@ private:
         int32_t currentCount; // in the sample that is still open
     };
 
-    Device &DeviceOf(const std::string &name);
-    std::map<std::string, int32_t> CurrentDevices() const;
-    void NotifyEps(uint64_t eps);
+    KELOSYSLOG_LOCAL Device &DeviceOf(const std::string &name);
+    KELOSYSLOG_LOCAL std::map<std::string, int32_t> CurrentDevices() const;
+    KELOSYSLOG_LOCAL void NotifyEps(uint64_t eps);
 
     std::string dbPath_;
     int64_t totalCount_ = 0;

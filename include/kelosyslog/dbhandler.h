@@ -48,9 +48,9 @@ public:
     int DBCon();
     // Closes the connection, if there is one. Always 0. The in-transaction flag stays as it is.
     int DBDiscon();
-    bool isConnected() const { return connection_ != nullptr; }
+    bool isConnected() const;
     // 1 from a successful DBTranStart to the next successful DBTranEnd or DBTranRollback, else 0.
-    int32_t isInTran() const { return inTransaction_; }
+    int32_t isInTran() const;
 
     // Creates the database with the sqlite3 tool: its folder (with parents), the file from the schema,
     // write-ahead logging. A failure to set write-ahead logging is reported and tolerated. The paths go
@@ -107,8 +107,8 @@ public:
     int DBInfoGet(_ARCH_DB_INFO_tag &info);
 
 private:
-    int RunTransactionStatement(const char *operation, int32_t forbiddenFlag, const char *sql,
-                                const char *failure);
+    KELOSYSLOG_LOCAL int RunTransactionStatement(const char *operation, int32_t forbiddenFlag,
+                                                 const char *sql, const char *failure);
 
     std::string schemaPath_;
     std::string dbPath_;

@@ -97,3 +97,15 @@ void AccountingManager::AccountingDump() {
         Debuger::MSG(2, "Device: " + entry.device + ", count: " + ullNumberToString(entry.count));
     Debuger::MSG(2, "==================================");
 }
+
+int64_t AccountingManager::TotalCountGet() const {
+    return totalCount_;
+}
+
+int64_t AccountingManager::CurrentEpsGet() const {
+    return currentCount_;
+}
+
+std::list<KELOLOG_LOG_DEVICE_STATISTIC> AccountingManager::HistogramGet() const {
+    return histogram_;
+}

@@ -42,6 +42,14 @@ int DBHandler::DBDiscon() {
     return 0;
 }
 
+bool DBHandler::isConnected() const {
+    return connection_ != nullptr;
+}
+
+int32_t DBHandler::isInTran() const {
+    return inTransaction_;
+}
+
 int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *context) {
     if (connection_ == nullptr) {
         Debuger::MSG(0, "DB is not connected");
