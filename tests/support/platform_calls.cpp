@@ -74,6 +74,10 @@ void PlatformCalls::FailFrom(int first, int times) {
     state.hasFailed = false;
 }
 
+bool PlatformCalls::MustFail(const char *function, const char *text) {
+    return kelo::test::MustFail({function, Text(text)});
+}
+
 std::vector<std::string> PlatformCalls::Statements() {
     std::vector<std::string> statements;
     for (const PlatformCall &call : state.recorded) {

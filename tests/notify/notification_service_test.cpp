@@ -1,0 +1,1 @@
+#include "notify/notify_fixture.h"
