@@ -47,7 +47,6 @@ TEST_F(RuleFile, ReadsBackWhatTheFormOfTheNumbersKeeps) {
         EXPECT_EQ(read.pattern, "p=\"\\");
         EXPECT_FALSE(read.enable);
     }
-    // A sign-extended number below 0 is read through saturation: only -1 survives.
     EXPECT_THAT(Messages(), IsEmpty());
 }
 

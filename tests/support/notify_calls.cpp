@@ -128,7 +128,9 @@ int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDi
                                             TORVSZHASH **hash, int zero) {
     if (PlatformCalls::MustFail("KELOSysNotifySendNotificationCustomized", tag))
         return -1;
-    state.sent.push_back({tag, textsDir, filterFile, state.hashes[*hash]});
+    const bool hasValues = hash != nullptr && *hash != nullptr;
+    state.sent.push_back(
+        {tag, textsDir, filterFile, hasValues ? state.hashes[*hash] : decltype(SentNotification::values)()});
     if (state.answer)
         return *state.answer;
     return KELO_REAL(KELOSysNotifySendNotificationCustomized)(tag, textsDir, filterFile, hash, zero);
