@@ -17,10 +17,10 @@ Database OpenNamed(const char *name, int flags) {
     return status == SQLITE_OK ? std::move(owner) : nullptr;
 }
 
-// Whether SQLite fails to open the file behind `db` although it exists, which shows at the first statement.
+// Whether SQLite cannot even read the file behind `db`: without its "-shm" it fails to open or to write that.
 bool CannotRead(sqlite3 *db) {
-    return sqlite3_exec(db, "SELECT 1 FROM sqlite_schema LIMIT 1", nullptr, nullptr, nullptr) ==
-           SQLITE_CANTOPEN;
+    const int status = sqlite3_exec(db, "SELECT 1 FROM sqlite_schema LIMIT 1", nullptr, nullptr, nullptr);
+    return status == SQLITE_CANTOPEN || status == SQLITE_READONLY;
 }
 
 // A "file:" URI of a path, whatever bytes it holds.

@@ -54,17 +54,24 @@ bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
     return StepToEnd(single.prepared.get(), result.get());
 }
 
-bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+// Runs the one statement of `sql`; `rows` stays null where it has no columns or they are not wanted.
+bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
+               std::unique_ptr<DBResult_tag> &rows) {
     SingleStatement single;
-    if (!PrepareSingle(connection.db, sql, single))
+    if (!PrepareSingle(db, sql, single))
         return false;
     if (single.prepared == nullptr)
         return true;
-    std::unique_ptr<DBResult_tag> rows;
-    if (result != nullptr && sqlite3_column_count(single.prepared.get()) > 0)
+    if (wantsRows && sqlite3_column_count(single.prepared.get()) > 0)
         rows = std::make_unique<DBResult_tag>(single.prepared.get());
-    if (!Deliver(connection.db, single, delivery, rows))
+    return Deliver(db, single, delivery, rows);
+}
+
+bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+    std::unique_ptr<DBResult_tag> rows;
+    if (!RunSingle(connection.db, sql, delivery, result != nullptr, rows))
         return false;
+    // An error is raised when no statement is left: finalising one that succeeded would clear it.
     if (connection.file.HasChanged()) {
         RaiseError(connection.db, SQLITE_BUSY, "database changed while it was read without locks");
         return false;
