@@ -3,6 +3,8 @@
 #include <memory>
 #include <new>
 
+#include "search/regexp_function.h"
+
 using kelo::platform::Database;
 using kelo::platform::DatabaseFile;
 
@@ -41,7 +43,8 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
     try {
         auto connection = std::make_unique<DBConnect_tag>(DatabaseFile(path));
         Database db = connection->file.Open();
-        if (db == nullptr || !Harden(db.get()) || sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)
+        if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
+            sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)
             return nullptr;
         connection->db = db.release();
         return connection.release();
