@@ -9,8 +9,9 @@
 //     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
 //
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
-// statement and closes the connection before it returns. None throws on a database error. A database is never
-// created.
+// statement and closes the connection before it returns. None throws on a database error; where memory
+// runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing deleted.
+// A database is never created.
 
 #include <cstdint>
 #include <list>
