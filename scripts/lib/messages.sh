@@ -11,7 +11,7 @@ make_messages() {
         users = split("alice bob carol dave erin frank", user)
         for (n = first; n < first + count; n++) {
             k = n % 100; who = user[n % users + 1]; facility = 3; severity = 6
-            if (k < 4)       { program = "smartd"; severity = 3; text = "Device: /dev/sd" substr("abcd", n % 4 + 1, 1) ", " n % 9 + 1 " Currently unreadable (pending) sectors" }
+            if (k < 4)       { program = "smartd"; severity = 3; text = "Device: /dev/sd" substr("abcd", n % 4 + 1, 1) ", " n " Currently unreadable (pending) sectors" }
             else if (k < 6)  { program = "rsyncd"; severity = 4; text = "write failed on \"share/" who "/run-" n "\": No space left on device, disk full at 100%" }
             else if (k < 10) { program = "sshd"; facility = 4; severity = 4; text = "Failed password for invalid user admin from 203.0.113." n % 250 " port " 1024 + n % 60000 " ssh2" }
             else if (k < 40) { program = "sshd"; facility = 4; text = "Accepted publickey for " who " from 192.0.2." n % 250 " port " 1024 + n % 60000 " ssh2" }

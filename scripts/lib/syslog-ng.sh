@@ -78,6 +78,7 @@ syslog_ng_launch() {
     syslog-ng --foreground --no-caps --cfgfile="$root/syslog-ng.conf" --persist-file="$root/syslog-ng.persist" \
         --pidfile="$root/syslog-ng.pid" --control="$root/syslog-ng.ctl" </dev/null >>"$root/syslog-ng.err" 2>&1 &
     echo $! >"$root/pid"
+    disown # no notice of the shell when the daemon is killed
     wait_until 30 syslog_ng_settled "$root" && syslog_ng_ready "$root"
 }
 syslog_ng_settled() { ! syslog_ng_alive "$1" || syslog_ng_ready "$1"; }
@@ -106,7 +107,6 @@ syslog_ng_stop() {
     if kill -s "${2:-TERM}" "$pid" 2>/dev/null; then
         wait_until 20 eval "! kill -0 $pid 2>/dev/null" || kill -s KILL "$pid" 2>/dev/null
     fi
-    wait "$pid" 2>/dev/null || true
     rm -f "$1/pid"
 }
 
