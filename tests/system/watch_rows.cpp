@@ -1,6 +1,7 @@
-// Reads a log database through the library while somebody writes it: watch_rows DATABASE COUNT. Ends with 0 as soon as
-// the table holds COUNT rows, with 1 at the first answer that cannot be true or after two minutes.
+// Reads a log database through the library while somebody writes it: watch_rows DATABASE COUNT. Ends with 0
+// as soon as the table holds COUNT rows, with 1 at the first answer that cannot be true or after two minutes.
 
+#include <algorithm>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
@@ -29,7 +30,7 @@ void CheckNewestPage(const std::string &database, int count) {
     _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
     if (SyslogDBSelect(database, {}, &page, &newestFirst, AppendId, &ids, false) != 0)
         Fail("select failed at row", count);
-    if (ids.size() != (count < 50 && ids.size() < 50 ? ids.size() : 50))
+    if (ids.size() < static_cast<size_t>(std::min(count, 50)) || ids.size() > 50)
         Fail("rows of a page", static_cast<long long>(ids.size()));
     if (ids.empty() || ids.front() < static_cast<uint64_t>(count))
         Fail("the newest page is older than the count", count);
