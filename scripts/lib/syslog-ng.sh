@@ -3,6 +3,8 @@
 # Everything stands below ROOT: ROOT/kelosyslog.conf, ROOT/logs.db, ROOT/syslog-ng.{conf,persist,pid,ctl,log}. The
 # daemon runs as the calling user and is stopped by its process id alone.
 
+PATH=$PATH:/usr/sbin # where Debian puts syslog-ng, and users do not look
+
 # wait_until SECONDS COMMAND...: runs the command until it succeeds; fails when the time is over.
 wait_until() {
     local deadline=$((SECONDS + $1))
