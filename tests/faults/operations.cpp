@@ -2,7 +2,6 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sqlite3.h>
 
 #include <map>
 
@@ -45,15 +44,10 @@ void SetUpLogs(Ground &ground) {
     ground.database = ground.root.File("logs.db");
     CreateLogDatabase(ground.database);
     InsertSampleLogs(ground.database, kRows - 10);
-    sqlite3 *holder = nullptr;
-    ASSERT_EQ(sqlite3_open(ground.database.c_str(), &holder), SQLITE_OK);
-    ASSERT_EQ(sqlite3_exec(holder, "SELECT count(*) FROM logs", nullptr, nullptr, nullptr), SQLITE_OK);
     std::vector<_SYSLOG_LOG_DATA_tag> newest;
     for (int number = kRows - 10; number < kRows; ++number)
         newest.push_back(SampleLog(number));
-    InsertLogs(ground.database, newest);
-    sqlite3_db_config(holder, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
-    sqlite3_close(holder);
+    InsertLogsIntoWal(ground.database, newest);
 }
 
 void SetUpLogsOfHost3(Ground &ground) {
