@@ -21,6 +21,7 @@ void ColumnIndex::Add(std::string_view name) {
     names_.insert(names_.end(), name.begin(), name.end());
     names_.push_back('\0');
     nameAt_.push_back(offset);
+    next_.push_back(0);
     if (slots_.size() < 2 * nameAt_.size()) {
         Grow();
         return;
@@ -47,8 +48,17 @@ size_t ColumnIndex::SlotOf(const char *name) const {
     return slot;
 }
 
-uint32_t ColumnIndex::Find(const char *name) const {
-    return slots_.empty() ? kNone : slots_[SlotOf(name)];
+uint32_t ColumnIndex::Find(const char *name) {
+    if (slots_.empty())
+        return kNone;
+    // Rows are read with the same columns in the same order, so the guess is nearly always right.
+    const uint32_t guess = next_[last_];
+    if (std::strcmp(Name(guess), name) == 0)
+        return last_ = guess;
+    const uint32_t column = slots_[SlotOf(name)];
+    if (column != kNone)
+        last_ = next_[last_] = column;
+    return column;
 }
 
 } // namespace kelo::platform

@@ -17,8 +17,9 @@ public:
 
     uint32_t Count() const { return static_cast<uint32_t>(nameAt_.size()); }
 
-    // Position of the first column with this name, or kNone.
-    uint32_t Find(const char *name) const;
+    // Position of the first column with this name, or kNone. Fastest where columns are asked for in a
+    // repeating order.
+    uint32_t Find(const char *name);
 
 private:
     const char *Name(uint32_t column) const { return names_.data() + nameAt_[column]; }
@@ -28,6 +29,8 @@ private:
 
     std::vector<char> names_;      // one after the other, each NUL-terminated
     std::vector<uint32_t> nameAt_; // by position, offset into `names_`
+    std::vector<uint32_t> next_;   // by position, the column that was looked for after it
+    uint32_t last_ = 0;            // the column that was found last
     std::vector<uint32_t> slots_;  // open addressing; a power of two, half empty at the least
 };
 
