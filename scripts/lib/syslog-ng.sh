@@ -65,7 +65,7 @@ log { source(s_internal); destination(d_internal); };
 END
 }
 
-syslog_ng_alive() { kill -0 "$(cat "$1/pid" 2>/dev/null || echo 0x)" 2>/dev/null; }
+syslog_ng_alive() { [[ -s $1/pid ]] && kill -0 "$(<"$1/pid")" 2>/dev/null; }
 
 syslog_ng_ready() {
     syslog_ng_alive "$1" && syslog_ng_control "$1" stats >/dev/null && port_in_use "$syslogPort" &&
@@ -83,7 +83,8 @@ syslog_ng_launch() {
     disown # no notice of the shell when the daemon is killed
     wait_until 30 syslog_ng_settled "$root" && syslog_ng_ready "$root"
 }
-syslog_ng_settled() { ! syslog_ng_alive "$1" || syslog_ng_ready "$1"; }
+syslog_ng_gone() { ! syslog_ng_alive "$1"; }
+syslog_ng_settled() { syslog_ng_gone "$1" || syslog_ng_ready "$1"; }
 
 # syslog_ng_start ROOT: chooses free ports (variables syslogPort and framePort) and starts the daemon; again with other
 # ports when somebody took one in between.
@@ -91,9 +92,10 @@ syslog_ng_start() {
     local root=$1
     for _ in {1..5}; do
         syslogPort=$(free_port) && framePort=$(free_port) || return 1
+        ((syslogPort != framePort)) || continue
         define "$root/kelosyslog.conf" kelo_port "$syslogPort"
         define "$root/kelosyslog.conf" kelo_frame_port "$framePort"
-        if ((syslogPort != framePort)) && syslog_ng_launch "$root"; then return; fi
+        if syslog_ng_launch "$root"; then return; fi
         syslog_ng_stop "$root"
         grep -qi 'error binding socket' "$root/syslog-ng.err" "$root/syslog-ng.log" 2>/dev/null || break
     done
@@ -104,10 +106,9 @@ syslog_ng_start() {
 
 # syslog_ng_stop ROOT [SIGNAL]: ends the daemon and waits until it is gone; after 20 s it is killed.
 syslog_ng_stop() {
-    local pid
-    pid=$(cat "$1/pid" 2>/dev/null) || return 0
-    if kill -s "${2:-TERM}" "$pid" 2>/dev/null; then
-        wait_until 20 eval "! kill -0 $pid 2>/dev/null" || kill -s KILL "$pid" 2>/dev/null
+    if syslog_ng_alive "$1"; then
+        kill -s "${2:-TERM}" "$(<"$1/pid")" || true
+        wait_until 20 syslog_ng_gone "$1" || { kill -s KILL "$(<"$1/pid")" && wait_until 5 syslog_ng_gone "$1"; } || true
     fi
     rm -f "$1/pid"
 }
