@@ -5,6 +5,7 @@
 
 #include <map>
 
+#include "kelosyslog/dbhandler.h"
 #include "support/fault_pause.h"
 #include "support/log_database.h"
 
@@ -148,6 +149,54 @@ void CheckStatistics(const Ground &ground, const Outcome &outcome) {
     EXPECT_THAT(outcome.messages, IsEmpty());
 }
 
+// A handler on the database that is disconnected on every path.
+class OpenHandler : public DBHandler {
+public:
+    explicit OpenHandler(const Ground &ground) : DBHandler(ground.database, ground.root.File("no schema")) {}
+    ~OpenHandler() { DBDiscon(); }
+};
+
+int ReplaceInTransaction(Ground &ground) {
+    OpenHandler handler(ground);
+    if (handler.DBCon() != 0 || handler.DBTranStart() != 0)
+        return -1;
+    const bool isReplaced = handler.DBExecute("DELETE FROM logs WHERE id > 5") == 0 &&
+                            handler.DBExecute("INSERT INTO logs (host) VALUES ('new')") == 0 &&
+                            handler.DBTranEnd() == 0;
+    if (isReplaced)
+        return 0;
+    handler.DBTranRollback();
+    return -1;
+}
+
+// Everything or nothing is replaced; nothing where no statement of the transaction can have been committed.
+void CheckTransaction(const Ground &ground, const Outcome &outcome) {
+    const std::string rows = QueryText(ground.database, kIdsLeft);
+    const std::string untouched = Ids(1, kRows);
+    const std::string replaced = Ids(1, 5) + "," + std::to_string(kRows + 1);
+    if (outcome.IsDone())
+        EXPECT_EQ(rows, replaced);
+    else if (outcome.outOfMemory || outcome.fault.starts_with("KELODB"))
+        EXPECT_EQ(rows, untouched);
+    else
+        EXPECT_THAT(rows, AnyOf(untouched, replaced));
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone());
+    }
+}
+
+int CountByHandler(Ground &ground) {
+    OpenHandler handler(ground);
+    return handler.DBCon() == 0 ? TakeCount(ground, static_cast<int>(handler.DBLogCountGet())) : -1;
+}
+
+void CheckCountByHandler(const Ground &ground, const Outcome &outcome) {
+    CheckSeen(ground, outcome, {std::to_string(kRows)}, {});
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone() || outcome.fault == "KELODBFetchRow");
+    }
+}
+
 int SelectWith(Ground &ground, _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order) {
     return SyslogDBSelect(ground.database, ground.conditions, limit, order, TakeId, &ground, true);
 }
@@ -241,6 +290,8 @@ const std::vector<Operation> &Operations() {
         WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
         Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
         {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
+        {"CountByHandler", false, SetUpLogs, CountByHandler, CheckCountByHandler},
+        {"ReplaceInTransaction", true, SetUpLogs, ReplaceInTransaction, CheckTransaction},
         Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
         Delete("DeleteAll", SetUpLogs, ""),
     };
