@@ -3,6 +3,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <iterator>
 #include <map>
 
 #include "kelosyslog/dbhandler.h"
@@ -273,28 +275,34 @@ void SetUpLogsOfTwoPrograms(Ground &ground) {
 } // namespace
 
 const std::vector<Operation> &Operations() {
-    static const std::vector<Operation> operations = {
-        Select("SelectPage", SetUpLogs, SelectPage,
-               "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs WHERE ( id > totalCount - 15 "
-               "AND id <= "
-               "totalCount - 5)",
-               IdLines(26, 35), {}),
-        Select("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSortedPage,
-               "SELECT * FROM logs WHERE (prog LIKE 'prog_1' escape '\\') AND (msg GLOB '*closed*') ORDER BY "
-               "id desc",
-               {"22", "12", "2"}, {}),
-        Select("SelectAll", SetUpLogs, SelectAll, "SELECT * FROM logs", IdLines(1, kRows), {}),
-        Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
-        Ask("CountFiltered", SetUpLogsOfHost3, Count, {"1"}, {"0"}),
-        Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-        WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
-        Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
-        {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
-        {"CountByHandler", false, SetUpLogs, CountByHandler, CheckCountByHandler},
-        {"ReplaceInTransaction", true, SetUpLogs, ReplaceInTransaction, CheckTransaction},
-        Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
-        Delete("DeleteAll", SetUpLogs, ""),
-    };
+    static const std::vector<Operation> operations = [] {
+        std::vector<Operation> all = {
+            Select(
+                "SelectPage", SetUpLogs, SelectPage,
+                "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs WHERE ( id > totalCount - 15 "
+                "AND id <= "
+                "totalCount - 5)",
+                IdLines(26, 35), {}),
+            Select("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSortedPage,
+                   "SELECT * FROM logs WHERE (prog LIKE 'prog_1' escape '\\') AND (msg GLOB '*closed*') "
+                   "ORDER BY "
+                   "id desc",
+                   {"22", "12", "2"}, {}),
+            Select("SelectAll", SetUpLogs, SelectAll, "SELECT * FROM logs", IdLines(1, kRows), {}),
+            Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
+            Ask("CountFiltered", SetUpLogsOfHost3, Count, {"1"}, {"0"}),
+            Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
+            WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
+            Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
+            {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
+            {"CountByHandler", false, SetUpLogs, CountByHandler, CheckCountByHandler},
+            {"ReplaceInTransaction", true, SetUpLogs, ReplaceInTransaction, CheckTransaction},
+            Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
+            Delete("DeleteAll", SetUpLogs, ""),
+        };
+        std::ranges::move(HandlerOperations(), std::back_inserter(all));
+        return all;
+    }();
     return operations;
 }
 
