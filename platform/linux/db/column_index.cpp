@@ -1,7 +1,5 @@
 #include "db/column_index.h"
 
-#include <cstring>
-
 namespace kelo::platform {
 namespace {
 
@@ -21,6 +19,7 @@ void ColumnIndex::Add(std::string_view name) {
     names_.insert(names_.end(), name.begin(), name.end());
     names_.push_back('\0');
     nameAt_.push_back(offset);
+    follower_.push_back(0);
     if (slots_.size() < 2 * nameAt_.size()) {
         Grow();
         return;
@@ -42,13 +41,18 @@ void ColumnIndex::Grow() {
 size_t ColumnIndex::SlotOf(const char *name) const {
     const size_t mask = slots_.size() - 1;
     size_t slot = HashOf(name) & mask;
-    while (slots_[slot] != kNone && std::strcmp(Name(slots_[slot]), name) != 0)
+    while (slots_[slot] != kNone && !IsSame(Name(slots_[slot]), name))
         slot = (slot + 1) & mask;
     return slot;
 }
 
-uint32_t ColumnIndex::Find(const char *name) const {
-    return slots_.empty() ? kNone : slots_[SlotOf(name)];
+uint32_t ColumnIndex::Search(const char *name) {
+    const uint32_t found = slots_[SlotOf(name)];
+    if (found != kNone) {
+        follower_[last_] = found;
+        last_ = found;
+    }
+    return found;
 }
 
 } // namespace kelo::platform

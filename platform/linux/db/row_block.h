@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <memory>
 #include <span>
 #include <vector>
@@ -27,9 +28,24 @@ public:
     uint64_t Count() const { return count_; }
 
     // Text of a cell, null for NULL. Both positions have to exist.
-    const char *Text(uint64_t row, size_t column) const;
+    const char *Text(uint64_t row, size_t column) const {
+        const char *start = tables_[row / kRowsPerTable][row % kRowsPerTable];
+        return start[0] == kNarrow ? ReadText<uint16_t>(start, column) : ReadText<uint32_t>(start, column);
+    }
 
 private:
+    // A row is a byte that tells the width of its offsets, the offsets of its texts from the row's start, and
+    // the texts. No text starts at 0, so that offset stands for NULL.
+    enum Width : char { kNarrow = 0, kWide = 1 };
+    template <typename Offset>
+    static void WriteRow(char *row, Width width, std::span<const Cell> cells);
+    template <typename Offset>
+    static const char *ReadText(const char *row, size_t column) {
+        Offset offset;
+        std::memcpy(&offset, row + 1 + column * sizeof offset, sizeof offset);
+        return offset != 0 ? row + offset : nullptr;
+    }
+
     struct FreeChunk {
         void operator()(char *chunk) const;
     };
