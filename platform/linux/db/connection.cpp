@@ -6,7 +6,6 @@
 #include "search/regexp_function.h"
 
 using kelo::platform::Database;
-using kelo::platform::DatabaseFile;
 
 namespace {
 
@@ -41,7 +40,7 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
     if (path == nullptr || path[0] == '\0')
         return nullptr;
     try {
-        auto connection = std::make_unique<DBConnect_tag>(DatabaseFile(path));
+        auto connection = std::make_unique<DBConnect_tag>(path);
         Database db = connection->file.Open();
         if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
             sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)

@@ -19,9 +19,7 @@ struct Cell {
 // texts with their NULs, two bytes a cell (four where the row passes 64 KiB) and nine bytes.
 class RowBlock {
 public:
-    explicit RowBlock(size_t columnCount) : columnCount_(columnCount) {}
-
-    // Appends a row of `columnCount` cells. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
+    // Appends a row. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
     // either leaves the rows as they were.
     void Add(std::span<const Cell> cells);
 
@@ -53,7 +51,6 @@ private:
 
     char *Allocate(size_t size);
 
-    size_t columnCount_;
     uint64_t count_ = 0;
     std::vector<std::unique_ptr<char, FreeChunk>> chunks_;
     char *free_ = nullptr; // rest of the newest chunk
