@@ -37,6 +37,7 @@ public:
     // Loads the rules of /etc/kelosyslog/notify.conf. Where that fails the manager is usable with what was
     // loaded: with no rule, every check answers no.
     NotificationManager();
+    ~NotificationManager();
 
     // Appends every section of the file at `path`, as a rule, to the list of its type, in file order.
     //

@@ -68,7 +68,7 @@ int ReadInfo(DBResult_tag *result, void *context) {
 } // namespace
 
 int64_t DBHandler::DBLogCountGet() {
-    NumberQuery query{"count_result", 0};
+    NumberQuery query{"count_result", -1}; // a count whose row cannot be fetched has failed
     return DBExecute("SELECT COUNT(*) as count_result FROM logs", NumberQuery::Read, &query) == 0
                ? query.number
                : -1;

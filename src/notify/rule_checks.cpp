@@ -14,6 +14,8 @@ NotificationManager::NotificationManager() {
         Debuger::MSG(0, "Fail to load configuration");
 }
 
+NotificationManager::~NotificationManager() = default;
+
 int NotificationManager::ConfigLoad(const std::string &path) {
     kelo::SzList sections(TORVCSzListAlloc(kelo::kSzCapacity));
     if (sections == nullptr) {

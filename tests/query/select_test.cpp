@@ -156,7 +156,7 @@ TEST_F(SyslogDBSelectCountTest, CountsByTheLargestIdWithoutAFilter) {
 }
 
 TEST_F(SyslogDBSelectCountTest, TellsAMissingRowFromSeveral) {
-    InsertSampleLogs(path_, 3);
+    InsertSampleLogs(path_, 2);
     _SYSLOG_SQL_LIMIT_tag all{0, 0}, second{1, 1};
     EXPECT_EQ(SyslogDBSelectCount(path_, {kHost}, &all, nullptr), 1);
     EXPECT_EQ(SyslogDBSelectCount(path_, {kHost}, &second, nullptr), -1);

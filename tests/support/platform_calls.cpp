@@ -2,6 +2,7 @@
 
 #include <dlfcn.h>
 
+#include <cstdint>
 #include <cstring>
 #include <mutex>
 
@@ -14,7 +15,7 @@ namespace {
 struct State {
     std::vector<PlatformCall> recorded;
     int count = 0;
-    int failFirst = 0; // counted like `count`; 0 for never
+    int64_t failFirst = 0; // counted like `count`; 0 for never
     int failTimes = 0;
     std::string failedFunction;
     int openConnections = 0;
@@ -109,7 +110,7 @@ int PlatformCalls::OpenResults() {
 }
 
 void PlatformCalls::FailFrom(int first, int times) {
-    state.failFirst = state.count + first;
+    state.failFirst = int64_t{state.count} + first;
     state.failTimes = times;
     state.failedFunction.clear();
 }

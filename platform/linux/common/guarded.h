@@ -1,13 +1,14 @@
 #pragma once
 
 #include <cerrno>
+#include <exception>
 #include <new>
 #include <stdexcept>
 
 namespace kelo::platform {
 
-// Runs `body` for a function of the C interface, which lets no exception out: running out of memory becomes
-// errno ENOMEM and the result `failed`.
+// Runs `body` for a function of the C interface, which lets no exception out: it becomes the result `failed`
+// with errno ENOMEM where memory ran out, EIO for anything else.
 template <typename Result, typename Body>
 Result Guarded(Result failed, Body body) noexcept {
     try {
@@ -16,6 +17,8 @@ Result Guarded(Result failed, Body body) noexcept {
         errno = ENOMEM;
     } catch (const std::length_error &) {
         errno = ENOMEM;
+    } catch (const std::exception &) {
+        errno = EIO;
     }
     return failed;
 }

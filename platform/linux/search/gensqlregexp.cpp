@@ -57,6 +57,7 @@ public:
         if (std::all_of(groups.begin(), groups.end(), MatchesEveryText))
             return MatchAllSql(column_);
         std::vector<std::string> operands;
+        operands.reserve(groups.size());
         for (const Alternatives &group : groups)
             operands.push_back(GroupSql(group));
         ReportBroken();
@@ -70,6 +71,7 @@ private:
 
     std::string GroupSql(const Alternatives &group) {
         std::vector<std::string> operands;
+        operands.reserve(group.size());
         for (const Term &term : group)
             operands.push_back(TermSql(term, column_, broken_));
         return Joined(std::move(operands), " OR ");
