@@ -11,12 +11,13 @@ namespace kelo::tool {
 // slowly the input comes.
 class BatchSink : public RecordSink {
 public:
-    // `store` must outlive the sink. `source` is the name that the progress is stored under.
-    BatchSink(LogStore &store, std::string source);
+    // `store` and `reader`, whose records come, must outlive the sink. `source` is the name that the progress
+    // is stored under.
+    BatchSink(LogStore &store, const LineReader &reader, std::string source);
 
     void Take(_SYSLOG_LOG_DATA_tag &log) override;
-    void LineDone(const LineReader &reader) override;
-    void Flush(const LineReader &reader) override;
+    void LineDone() override;
+    void Flush() override;
 
 private:
     static constexpr size_t kBatchRows = 5000;
@@ -24,6 +25,7 @@ private:
     static constexpr size_t kLongLineBytes = 8 * 1024;
 
     LogStore &store_;
+    const LineReader &reader_;
     StoreProgress progress_;
     std::vector<_SYSLOG_LOG_DATA_tag> batch_;
     size_t rows_ = 0; // of the batch; what lies behind waits for use

@@ -48,6 +48,7 @@ bool LineReader::Fill() {
     const auto count = static_cast<size_t>(result);
     head_.append(buffer_.data() + end_, std::min(count, kHeadBytes - head_.size()));
     end_ += count;
+    onProgress_(count);
     return count > 0;
 }
 
@@ -68,6 +69,7 @@ bool LineReader::SkipTo(uint64_t offset, uint64_t lines) {
             return false;
         if (lseek(fd_, static_cast<off_t>(target), SEEK_SET) < 0)
             ThrowErrno();
+        onProgress_(left - end_);
         left = 0;
         begin_ = end_;
     }

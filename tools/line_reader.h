@@ -19,6 +19,9 @@ public:
     // Called before a read that would have to wait for its data. The current line is the last one then.
     void OnWait(std::function<void()> onWait) { onWait_ = std::move(onWait); }
 
+    // Called with the number of bytes whenever some were read or skipped.
+    void OnProgress(std::function<void(uint64_t)> onProgress) { onProgress_ = std::move(onProgress); }
+
     // What the input begins with: all that has been read, up to kHeadBytes.
     static constexpr size_t kHeadBytes = 4096;
     const std::string &Head() const { return head_; }
@@ -50,6 +53,7 @@ private:
     int fd_;
     size_t maxLineBytes_;
     std::function<void()> onWait_ = [] {};
+    std::function<void(uint64_t)> onProgress_ = [](uint64_t) {};
     std::string head_;
     std::vector<char> buffer_;
     size_t begin_ = 0; // what is read and not yet taken lies in [begin_, end_)

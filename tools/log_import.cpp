@@ -20,21 +20,21 @@ const char *FirstEmptyField(const _SYSLOG_LOG_DATA_tag &log) {
 
 } // namespace
 
-void LogImport::Run(LineReader &reader) {
-    reader.OnWait([this, &reader] { sink_.Flush(reader); });
+void LogImport::Run(LineReader &reader, RecordSink &sink) {
+    reader.OnWait([&sink] { sink.Flush(); });
     while (reader.Next()) {
         if (reader.IsOverlong()) {
             ++counts_.overlong;
             report_(reader.Number(), "rejected: too long");
         } else if (!reader.Line().empty()) {
-            ImportLine(reader);
+            ImportLine(reader, sink);
         }
-        sink_.LineDone(reader);
+        sink.LineDone();
     }
-    sink_.Flush(reader);
+    sink.Flush();
 }
 
-void LogImport::ImportLine(const LineReader &reader) {
+void LogImport::ImportLine(const LineReader &reader, RecordSink &sink) {
     line_.assign(reader.Line());
     if (parser_.ParseSingleEntry(line_, log_) != 0) {
         Reject(reader.Number());
@@ -47,7 +47,7 @@ void LogImport::ImportLine(const LineReader &reader) {
         if (skipIncomplete_)
             return;
     }
-    sink_.Take(log_);
+    sink.Take(log_);
 }
 
 void LogImport::Reject(uint64_t line) {

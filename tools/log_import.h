@@ -18,11 +18,11 @@ public:
     // Takes a record, and may leave another's contents in `log`.
     virtual void Take(_SYSLOG_LOG_DATA_tag &log) = 0;
 
-    // A line has been dealt with, up to which `reader` has been read. Called for lines without a record too.
-    virtual void LineDone(const LineReader &reader) = 0;
+    // A line has been dealt with, whether or not it gave a record.
+    virtual void LineDone() {}
 
     // The input pauses or ends: nothing that was taken may wait any longer.
-    virtual void Flush(const LineReader &reader) = 0;
+    virtual void Flush() = 0;
 };
 
 // What became of the lines of an import. Empty lines are no lines.
@@ -39,21 +39,19 @@ public:
     // Told of a line that was rejected, or that is incomplete, and why.
     using LineReport = std::function<void(uint64_t line, const std::string &reason)>;
 
-    // Both must outlive the import. With `skipIncomplete`, records with an empty mandatory field do not reach
-    // the sink.
-    LogImport(RecordSink &sink, LineReport report, bool skipIncomplete)
-        : sink_(sink), report_(std::move(report)), skipIncomplete_(skipIncomplete) {}
+    // With `skipIncomplete`, records with an empty mandatory field do not reach the sink.
+    LogImport(LineReport report, bool skipIncomplete)
+        : report_(std::move(report)), skipIncomplete_(skipIncomplete) {}
 
     // Imports all lines of one input. Throws what the reader and the sink throw.
-    void Run(LineReader &reader);
+    void Run(LineReader &reader, RecordSink &sink);
 
     const ImportCounts &Counts() const { return counts_; }
 
 private:
-    void ImportLine(const LineReader &reader);
+    void ImportLine(const LineReader &reader, RecordSink &sink);
     void Reject(uint64_t line);
 
-    RecordSink &sink_;
     LineReport report_;
     bool skipIncomplete_;
     ImportCounts counts_;
