@@ -74,7 +74,8 @@ private:
 // Prints records as they come.
 class PrintSink : public RecordSink {
 public:
-    explicit PrintSink(RecordLayout layout) : output_(false), writer_(MakeRecordWriter(std::move(layout))) {
+    PrintSink(RecordLayout layout, bool mayPage)
+        : output_(mayPage), writer_(MakeRecordWriter(std::move(layout))) {
         writer_->Begin(text_);
     }
     void Take(_SYSLOG_LOG_DATA_tag &log) override {
@@ -112,12 +113,12 @@ RecordLayout MakeParseLayout(const OutputOptions &options) {
 class ParseRun {
 public:
     explicit ParseRun(const Options &options)
-        : options_(options), bar_(TotalSize(options.files)),
+        : options_(options), bar_(CheckInputs(options)),
           import_([this](uint64_t line, const std::string &reason) { Report(line, reason); },
                   options.skipIncomplete) {}
 
     void Print() {
-        PrintSink sink(MakeParseLayout(options_.output));
+        PrintSink sink(MakeParseLayout(options_.output), !options_.output.noPager);
         ForEachInput([&](const Input &, LineReader &reader) { import_.Run(reader, sink); });
         sink.Finish();
     }
@@ -147,11 +148,12 @@ public:
     }
 
 private:
-    // Also finds unreadable files before anything is printed or stored. 0 when a size is not known.
-    static uint64_t TotalSize(const std::vector<std::string> &files) {
+    // Finds unreadable files before anything is printed or stored. Returns the size of all inputs, 0 when it
+    // is not known or when a progress bar would stand among the logs on the terminal.
+    static uint64_t CheckInputs(const Options &options) {
         uint64_t total = 0;
-        bool isKnown = true;
-        for (const std::string &file : files) {
+        bool isKnown = !options.db.empty() || isatty(STDOUT_FILENO) == 0;
+        for (const std::string &file : options.files) {
             const uint64_t size = Input(file).Size();
             isKnown = isKnown && size > 0;
             total += size;

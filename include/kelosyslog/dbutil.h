@@ -9,11 +9,13 @@
 //     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
 //
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
-// statement and closes the connection before it returns. None throws on a database error. A database is never
-// created.
+// statement and closes the connection before it returns. None throws on a database error; where memory
+// runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing deleted.
+// A database is never created.
 
 #include <cstdint>
 #include <list>
+#include <map>
 #include <string>
 
 #include "kelosyslog/export.h"
@@ -96,3 +98,60 @@ KELOSYSLOG_API void LogSearchCondListGen(const std::string &host, const std::str
                                          const std::string &keyword, const std::string &dateFrom,
                                          const std::string &dateTo,
                                          std::list<_SYSLOG_SQL_COND_tag> &conditions);
+
+// Generation of a database's format: 1 when it has the readable table "db_info", else 2. A bad path (reported
+// in the system log) and a failed connection count as 1.
+KELOSYSLOG_API int SyslogDBVersionGet(const std::string &dbPath);
+
+// The statistics of an accounting database. All of these answer a failure like an empty table, with 0 or an
+// empty map; only a bad path is reported in the system log.
+
+// One sample of received logs.
+struct SYSLOG_LOG_EPS {
+    int64_t stamp = 0;                      // seconds since the epoch
+    int64_t eps = 0;                        // logs since the sample before
+    std::map<std::string, int32_t> devices; // the same by sending device
+};
+
+// Sum of the counts of all devices.
+KELOSYSLOG_API uint64_t SyslogDBHistTotalGet(const std::string &dbPath);
+
+// Count of one device. `device` goes into the statement as it is, between single quotes: the caller doubles
+// the quotes that it holds.
+KELOSYSLOG_API uint64_t SyslogDBHistGetSingle(const std::string &dbPath, std::string device);
+
+// Counts by device, of the `top` devices with the highest counts or, for 0, of all. Of two rows of one device
+// the first counts.
+KELOSYSLOG_API std::map<std::string, uint64_t> SyslogDBHistGet(const std::string &dbPath, int top);
+
+// The samples with stamps in [from, to], seconds since the epoch, by stamp. A sample's total sums all its
+// rows; of two rows of one device in a sample, `devices` has the first. The bounds are meant to be 0 or more:
+// a negative one lies above every stamp.
+KELOSYSLOG_API std::map<int, SYSLOG_LOG_EPS> SyslogDBEpsGet(const std::string &dbPath, int from, int to);
+
+// Appends the distinct values of a column of table "logs", named as LogAttriType knows it, to `values` in
+// ascending order; a NULL counts as the empty text. A null `limit` means all values.
+//
+// Returns 0 or -1; a bad path and an unknown name are reported in the system log.
+KELOSYSLOG_API int SyslogDBAttriValueGet(const std::string &dbPath, const std::string &name,
+                                         _SYSLOG_SQL_LIMIT_tag *limit, std::list<std::string> &values);
+
+// A kind of name that databases of generation 1 keep in a table of its own, by numeric key.
+enum _SYSLOG_EXTKEY_TB_TYPE_tag : int32_t {
+    SYSLOG_EXTKEY_HOST = 0,
+    SYSLOG_EXTKEY_PROG = 1,
+    SYSLOG_EXTKEY_TAG = 2,
+    SYSLOG_EXTKEY_FAC = 3,
+};
+
+// Fills `names` with the names of one kind by their keys; keys that it holds already keep their names. A
+// database of generation 2 has no keys: its distinct names are numbered from 0 as they come.
+//
+// Returns 0 or -1; a bad path is reported in the system log.
+KELOSYSLOG_API int SyslogDBExtkeyMapGet(const std::string &dbPath, _SYSLOG_EXTKEY_TB_TYPE_tag type,
+                                        std::map<uint64_t, std::string> &names);
+
+// The lowest key of exactly this name; 0 when there is none, and on a failure, which is reported in the
+// system log. (0 is also the key of the first name of a database of generation 2.)
+KELOSYSLOG_API uint64_t SyslogDBExtkeyLookupByName(const std::string &dbPath, _SYSLOG_EXTKEY_TB_TYPE_tag type,
+                                                   std::string name);

@@ -26,9 +26,11 @@ KELOSYSLOG_API int32_t EncodeJson(const char *source, char *destination, int32_t
 // Reads the lines of a stream from the last to the first, up to `max` lines.
 //
 // Allocates an array of `max` pointers, stores it in `*lines`, and stores the lines as C strings from index
-// `count` upward, counting `count` up. The caller frees every string and the array with free(), also after a
-// failure once the array is there. A line ends before its first NUL byte. A file that ends with a line feed
-// gives an empty first entry, and an empty file gives one empty line.
+// `count` (0 or more) upward, counting `count` up. The caller frees every string and the array with free(),
+// also after a failure once the array is there. A line ends before its first NUL byte. A file that ends with
+// a line feed gives an empty first entry, and an empty file gives one empty line.
 //
-// Returns 0, or -1 after a message in the system log. The stream's position afterwards is unspecified.
+// Returns 0; or -1 with a message in the system log when the stream cannot seek or memory runs out before the
+// first line, and silently when the stream cannot be read or memory runs out for a line. What `count` counts
+// is there in any case. The stream's position afterwards is unspecified.
 KELOSYSLOG_API int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t max);

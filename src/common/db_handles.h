@@ -19,8 +19,10 @@ struct DbResultFreer {
 using DbConnection = std::unique_ptr<DBConnect_tag, DbConnectionCloser>;
 using DbResult = std::unique_ptr<DBResult_tag, DbResultFreer>;
 
-// Opens the database at `path`; null on failure.
+// Opens the database at `path`; null on failure. A path with a NUL byte would name another file and fails.
 inline DbConnection Connect(const std::string &path) {
+    if (path.find('\0') != std::string::npos)
+        return nullptr;
     return DbConnection(KELODBConnect(nullptr, nullptr, nullptr, path.c_str()));
 }
 

@@ -14,6 +14,13 @@ struct Free {
 };
 using Buffer = std::unique_ptr<char, Free>;
 
+bool SeekTo(FILE *stream, long offset, int whence) {
+    if (std::fseek(stream, offset, whence) == 0)
+        return true;
+    syslog(LOG_ERR, "%s:%d fseek failed. %m", "utils", __LINE__);
+    return false;
+}
+
 // The bytes of a stream by their position, read in blocks from the end towards the start as they are asked
 // for.
 class BackwardReader {
@@ -26,10 +33,8 @@ public:
         if (position >= start_)
             return true;
         const long blockStart = std::max(0L, start_ - kBlockSize);
-        if (std::fseek(stream_, blockStart, SEEK_SET) != 0) {
-            syslog(LOG_ERR, "%s:%d fseek failed. %m", "utils", __LINE__);
+        if (!SeekTo(stream_, blockStart, SEEK_SET))
             return false;
-        }
         const auto wanted = static_cast<size_t>(start_ - blockStart);
         if (std::fread(buffer_ + blockStart, 1, wanted, stream_) != wanted)
             return false;
@@ -90,10 +95,8 @@ int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t m
         syslog(LOG_ERR, "%s:%d calloc failed. %m", "utils", __LINE__);
         return -1;
     }
-    if (std::fseek(stream, 0, SEEK_END) != 0) {
-        syslog(LOG_ERR, "%s:%d fseek failed. %m", "utils", __LINE__);
+    if (!SeekTo(stream, 0, SEEK_END))
         return -1;
-    }
     const long length = std::ftell(stream);
     if (length < 0) {
         syslog(LOG_ERR, "%s:%d ftell failed. %m", "utils", __LINE__);
@@ -104,6 +107,9 @@ int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t m
         syslog(LOG_ERR, "%s:%d malloc failed. %m", "utils", __LINE__);
         return -1;
     }
+    // An empty file has no last byte to seek to; it still has one empty line.
+    if (length > 0 && !SeekTo(stream, length - 1, SEEK_SET))
+        return -1;
     LineArray target(*lines, count, max);
     if (target.IsFull())
         return 0;

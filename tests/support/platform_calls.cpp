@@ -2,7 +2,11 @@
 
 #include <dlfcn.h>
 
+#include <cstring>
+#include <mutex>
+
 #include "keloplatform/kelodb.h"
+#include "support/fault_pause.h"
 
 namespace kelo::test {
 namespace {
@@ -12,35 +16,68 @@ struct State {
     int count = 0;
     int failFirst = 0; // counted like `count`; 0 for never
     int failTimes = 0;
-    bool hasFailed = false;
+    std::string failedFunction;
     int openConnections = 0;
     int openResults = 0;
 };
 State state;
+std::mutex stateMutex;
+
+// Lives while the real library works: what it calls of its own functions is no call into the platform.
+class PlatformVisit {
+public:
+    PlatformVisit() { ++depth_; }
+    ~PlatformVisit() { --depth_; }
+    PlatformVisit(const PlatformVisit &) = delete;
+    PlatformVisit &operator=(const PlatformVisit &) = delete;
+    static bool IsActive() { return depth_ > 0; }
+
+private:
+    static inline thread_local int depth_ = 0;
+};
 
 // Records a call and tells whether it has to fail.
-bool MustFail(PlatformCall call) {
-    state.recorded.push_back(std::move(call));
+bool MustFail(const char *function, const char *text, size_t length, unsigned int limit = 0,
+              unsigned int offset = 0) {
+    if (PlatformVisit::IsActive())
+        return false;
+    const FaultPause pause;
+    const std::lock_guard lock(stateMutex);
+    state.recorded.push_back(
+        {function, text != nullptr ? std::string(text, length) : std::string(), limit, offset});
     ++state.count;
     const bool fails = state.failFirst > 0 && state.count >= state.failFirst &&
                        state.count - state.failFirst < state.failTimes;
-    state.hasFailed = state.hasFailed || fails;
+    if (fails && state.failedFunction.empty())
+        state.failedFunction = function;
     return fails;
 }
 
-std::string Text(const char *text) {
-    return text != nullptr ? text : "";
+bool MustFail(const char *function, const char *text) {
+    return MustFail(function, text, text != nullptr ? std::strlen(text) : 0);
 }
 
-// The platform library's own function behind one of ours.
-template <typename Function>
-Function *Real(Function *, const char *name) {
-    return reinterpret_cast<Function *>(dlsym(RTLD_NEXT, name));
+// Calls the platform library's own function behind one of ours.
+template <auto *Function, typename... Arguments>
+auto CallReal(const char *name, Arguments... arguments) {
+    static const auto real = [name] {
+        const FaultPause pause;
+        return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
+    }();
+    const PlatformVisit visit;
+    return real(arguments...);
+}
+
+void Count(int State::*handles, int change) {
+    if (PlatformVisit::IsActive())
+        return;
+    const std::lock_guard lock(stateMutex);
+    state.*handles += change;
 }
 
 int CountResult(int status, DBResult_tag **result) {
     if (status >= 0 && result != nullptr && *result != nullptr)
-        ++state.openResults;
+        Count(&State::openResults, 1);
     return status;
 }
 
@@ -50,7 +87,7 @@ void PlatformCalls::Reset() {
     state.recorded.clear();
     state.count = 0;
     state.failFirst = 0;
-    state.hasFailed = false;
+    state.failedFunction.clear();
 }
 const std::vector<PlatformCall> &PlatformCalls::Recorded() {
     return state.recorded;
@@ -59,7 +96,10 @@ int PlatformCalls::Count() {
     return state.count;
 }
 bool PlatformCalls::HasFailed() {
-    return state.hasFailed;
+    return !state.failedFunction.empty();
+}
+std::string PlatformCalls::FailedFunction() {
+    return state.failedFunction;
 }
 int PlatformCalls::OpenConnections() {
     return state.openConnections;
@@ -71,7 +111,7 @@ int PlatformCalls::OpenResults() {
 void PlatformCalls::FailFrom(int first, int times) {
     state.failFirst = state.count + first;
     state.failTimes = times;
-    state.hasFailed = false;
+    state.failedFunction.clear();
 }
 
 std::vector<std::string> PlatformCalls::Statements() {
@@ -87,67 +127,67 @@ std::vector<std::string> PlatformCalls::Statements() {
 
 using namespace kelo::test;
 
-#define KELO_REAL(function) Real(function, #function)
+#define KELO_CALL_REAL(function, ...) CallReal<&function>(#function, __VA_ARGS__)
 
 extern "C" {
 
 DBConnect_tag *KELODBConnect(const char *host, const char *user, const char *password, const char *path) {
-    if (MustFail({"KELODBConnect", Text(path)}))
+    if (MustFail("KELODBConnect", path))
         return nullptr;
-    DBConnect_tag *connection = KELO_REAL(KELODBConnect)(host, user, password, path);
+    DBConnect_tag *connection = KELO_CALL_REAL(KELODBConnect, host, user, password, path);
     if (connection != nullptr)
-        ++state.openConnections;
+        Count(&State::openConnections, 1);
     return connection;
 }
 
 int KELODBClose(DBConnect_tag *connection) {
     if (connection != nullptr)
-        --state.openConnections;
-    return KELO_REAL(KELODBClose)(connection);
+        Count(&State::openConnections, -1);
+    return KELO_CALL_REAL(KELODBClose, connection);
 }
 
 int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result) {
-    if (MustFail({"KELODBExecute", Text(sql)}))
+    if (MustFail("KELODBExecute", sql))
         return -1;
-    return CountResult(KELO_REAL(KELODBExecute)(connection, sql, result), result);
+    return CountResult(KELO_CALL_REAL(KELODBExecute, connection, sql, result), result);
 }
 
 int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit, unsigned int offset,
                       DBResult_tag **result) {
-    if (MustFail({"KELODBSelectLimit", Text(sql), limit, offset}))
+    if (MustFail("KELODBSelectLimit", sql, sql != nullptr ? std::strlen(sql) : 0, limit, offset))
         return -1;
-    return CountResult(KELO_REAL(KELODBSelectLimit)(connection, sql, limit, offset, result), result);
+    return CountResult(KELO_CALL_REAL(KELODBSelectLimit, connection, sql, limit, offset, result), result);
 }
 
 int KELODBFetchRow(DBResult_tag *result, unsigned int *row) {
-    if (MustFail({"KELODBFetchRow", ""}))
+    if (MustFail("KELODBFetchRow", nullptr))
         return -1;
-    return KELO_REAL(KELODBFetchRow)(result, row);
+    return KELO_CALL_REAL(KELODBFetchRow, result, row);
 }
 
 void KELODBFreeResult(DBResult_tag *result) {
     if (result != nullptr)
-        --state.openResults;
-    KELO_REAL(KELODBFreeResult)(result);
+        Count(&State::openResults, -1);
+    KELO_CALL_REAL(KELODBFreeResult, result);
 }
 
 int KELODBEscapeStringEX(DBConnect_tag *connection, char *out, size_t outSize, const char *in, size_t inLen) {
-    if (MustFail({"KELODBEscapeStringEX", std::string(in, inLen)}))
+    if (MustFail("KELODBEscapeStringEX", in, inLen))
         return -1;
-    return KELO_REAL(KELODBEscapeStringEX)(connection, out, outSize, in, inLen);
+    return KELO_CALL_REAL(KELODBEscapeStringEX, connection, out, outSize, in, inLen);
 }
 
 int KELODBEscapeStringEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in,
                           size_t inLen) {
-    if (MustFail({"KELODBEscapeStringEX2", std::string(in, inLen)}))
+    if (MustFail("KELODBEscapeStringEX2", in, inLen))
         return -1;
-    return KELO_REAL(KELODBEscapeStringEX2)(connection, out, outSize, in, inLen);
+    return KELO_CALL_REAL(KELODBEscapeStringEX2, connection, out, outSize, in, inLen);
 }
 
 int KELODBEscapeBackslashEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in) {
-    if (MustFail({"KELODBEscapeBackslashEX2", Text(in)}))
+    if (MustFail("KELODBEscapeBackslashEX2", in))
         return -1;
-    return KELO_REAL(KELODBEscapeBackslashEX2)(connection, out, outSize, in);
+    return KELO_CALL_REAL(KELODBEscapeBackslashEX2, connection, out, outSize, in);
 }
 
 } // extern "C"

@@ -15,7 +15,8 @@ struct PlatformCall {
 };
 
 // Watches every call of a platform function in the process, also those out of libkelosyslog, and makes chosen
-// ones fail. The calls reach the real platform library.
+// ones fail. The calls reach the real platform library. Calls may come from several threads; the questions
+// are for when none is under way.
 class PlatformCalls {
 public:
     // Forgets what was recorded and makes nothing fail. Open handles stay counted.
@@ -32,6 +33,8 @@ public:
     static void FailFrom(int first, int times = std::numeric_limits<int>::max());
     // Whether a failure has been injected since FailFrom.
     static bool HasFailed();
+    // The function that failed first; "" when none has.
+    static std::string FailedFunction();
 
     static int OpenConnections();
     static int OpenResults();

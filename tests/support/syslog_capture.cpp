@@ -5,17 +5,20 @@
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
+#include <mutex>
+
+#include "support/fault_pause.h"
 
 namespace kelo::test {
 namespace {
 
 SyslogCapture *active = nullptr;
+std::mutex activeMutex; // messages may come from any thread
 
 // Formats as vsyslog does; %m works because glibc's printf family knows it.
 void Capture(int priority, const char *format, va_list arguments) {
     const int savedErrno = errno;
-    if (!SyslogCapture::IsActive())
-        return;
+    const FaultPause pause;
     va_list copy;
     va_copy(copy, arguments);
     const int length = std::vsnprintf(nullptr, 0, format, copy);
@@ -26,6 +29,7 @@ void Capture(int priority, const char *format, va_list arguments) {
     errno = savedErrno;
     std::vsnprintf(text.data(), text.size() + 1, format, arguments);
     SyslogCapture::Receive(priority, text);
+    errno = savedErrno;
 }
 
 } // namespace
@@ -35,16 +39,17 @@ std::ostream &operator<<(std::ostream &out, const SyslogMessage &message) {
 }
 
 SyslogCapture::SyslogCapture() {
+    const std::lock_guard lock(activeMutex);
     active = this;
 }
 SyslogCapture::~SyslogCapture() {
+    const std::lock_guard lock(activeMutex);
     active = nullptr;
 }
-bool SyslogCapture::IsActive() {
-    return active != nullptr;
-}
 void SyslogCapture::Receive(int priority, const std::string &text) {
-    active->messages_.push_back({priority, text});
+    const std::lock_guard lock(activeMutex);
+    if (active != nullptr)
+        active->messages_.push_back({priority, text});
 }
 
 std::vector<std::string> SyslogCapture::Texts() const {

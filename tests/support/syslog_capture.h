@@ -26,9 +26,8 @@ public:
     std::vector<std::string> Texts() const;
     void Clear() { messages_.clear(); }
 
-    // For the replaced syslog(); allocates only where a capture is active.
+    // For the replaced syslog().
     static void Receive(int priority, const std::string &text);
-    static bool IsActive();
 
 private:
     std::vector<SyslogMessage> messages_;

@@ -3,6 +3,8 @@
 #include <memory>
 #include <new>
 
+#include "search/regexp_function.h"
+
 namespace {
 
 constexpr int kBusyTimeoutMs = 5000;
@@ -26,7 +28,8 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
     // SQLite itself falls back to read-only where the file cannot be written.
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX;
     const int status = sqlite3_open_v2(path, &connection->db, flags, nullptr);
-    if (status != SQLITE_OK || !Harden(connection->db)) {
+    if (status != SQLITE_OK || !Harden(connection->db) ||
+        !kelo::platform::RegisterSearchFunctions(connection->db)) {
         sqlite3_close(connection->db);
         return nullptr;
     }

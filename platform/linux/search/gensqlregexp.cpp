@@ -1,21 +1,102 @@
 #include "keloplatform/gensqlregexp.h"
 
+#include <syslog.h>
+
+#include <algorithm>
+#include <set>
+#include <string_view>
+#include <vector>
+
+#include "search/keyword.h"
+#include "search/term_sql.h"
+#include "search/utf8.h"
+
+namespace kelo::platform {
 namespace {
 
-std::string Quoted(const std::string &text) {
-    std::string quoted = "'";
-    for (const char byte : text) {
-        quoted += byte;
-        if (byte == '\'')
-            quoted += byte;
+// SQLite takes expressions of a depth up to 1000, and a chain is as deep as it is long: more operands than
+// this become a tree.
+constexpr size_t kMaxChain = 100;
+constexpr size_t kMaxReportedBytes = 200;
+
+// Free text as it may stand in a log: bounded, with control bytes made visible.
+std::string Printable(std::string_view text) {
+    constexpr char kHexDigits[] = "0123456789abcdef";
+    std::string printable;
+    for (const char byte : text.substr(0, kMaxReportedBytes)) {
+        const auto code = static_cast<unsigned char>(byte);
+        if (code >= 0x20 && code != 0x7F)
+            printable += byte;
+        else
+            printable.append("\\x").append(1, kHexDigits[code >> 4]).append(1, kHexDigits[code & 0xF]);
     }
-    return quoted + "'";
+    return text.size() > kMaxReportedBytes ? printable + "..." : printable;
 }
 
+// The operands joined into one that can stand beside any operator; `operands` is not empty.
+std::string Joined(std::vector<std::string> operands, const char *separator) {
+    while (operands.size() > 1) {
+        std::vector<std::string> joined;
+        for (size_t first = 0; first < operands.size(); first += kMaxChain) {
+            const size_t end = std::min(first + kMaxChain, operands.size());
+            std::string &chain = joined.emplace_back("(" + operands[first]);
+            for (size_t next = first + 1; next < end; ++next)
+                chain.append(separator).append(operands[next]);
+            chain += ")";
+        }
+        operands = std::move(joined);
+    }
+    return operands.front();
+}
+
+class Generator {
+public:
+    explicit Generator(std::string column) : column_(std::move(column)) {}
+
+    std::string Sql(const std::vector<Alternatives> &groups) {
+        if (std::all_of(groups.begin(), groups.end(), MatchesEveryText))
+            return MatchAllSql(column_);
+        std::vector<std::string> operands;
+        for (const Alternatives &group : groups)
+            operands.push_back(GroupSql(group));
+        ReportBroken();
+        return Joined(std::move(operands), " AND ");
+    }
+
+private:
+    static bool MatchesEveryText(const Alternatives &group) {
+        return group.size() == 1 && group[0].MatchesEveryText() && !group[0].excluded;
+    }
+
+    std::string GroupSql(const Alternatives &group) {
+        std::vector<std::string> operands;
+        for (const Term &term : group)
+            operands.push_back(TermSql(term, column_, broken_));
+        return Joined(std::move(operands), " OR ");
+    }
+
+    // A regex that stands several times in a keyword is reported once.
+    void ReportBroken() const {
+        std::set<std::string> reported;
+        for (const auto &[regex, reason] : broken_) {
+            if (!reported.insert(regex).second)
+                continue;
+            const std::string message = "Broken regular expression [" + Printable(regex) +
+                                        "] in a search keyword matches nothing: " + Printable(reason);
+            syslog(LOG_ERR, "%s", message.c_str());
+        }
+    }
+
+    std::string column_;
+    std::vector<BrokenRegex> broken_;
+};
+
 } // namespace
+} // namespace kelo::platform
 
 std::string GenSQLRegexp(std::string pattern, std::string column) {
-    if (pattern == "*")
-        return column + " GLOB '**'";
-    return "instr(" + column + ", " + Quoted(pattern) + ") > 0";
+    using namespace kelo::platform;
+    // No SQL text can carry a NUL, and no searched text has one.
+    std::replace(pattern.begin(), pattern.end(), '\0', ' ');
+    return Generator(std::move(column)).Sql(ParseKeyword(ToUtf8(pattern)));
 }

@@ -1,0 +1,31 @@
+#pragma once
+
+#include <memory>
+#include <string>
+
+struct sqlite3;
+namespace re2 {
+class RE2;
+}
+
+namespace kelo::platform {
+
+// Compiles a regular expression (RE2 syntax, UTF-8) with bounded memory. The result is to be asked for ok()
+// and error(); nothing is logged.
+std::unique_ptr<re2::RE2> CompileRegex(const std::string &regex, bool ignoreCase);
+
+// Gives the connection the SQL functions regexp(REGEX, TEXT), which also is what TEXT REGEXP REGEX calls, and
+// regexpi(REGEX, TEXT), which ignores case. They take linear time in the text and give
+//
+//   1 or 0   whether the regex is found anywhere in the text. As for LIKE and GLOB the text ends at its first
+//            NUL; bytes that are not UTF-8 are read as Latin-1.
+//   NULL     where an argument is NULL
+//   error    for a broken regex; it names the regex and what is wrong with it
+//
+// A regex that is the same for every row is compiled once a statement. Triggers and views cannot call the
+// functions. The sqlite3 shell has functions of the same names, so that a statement works there too.
+//
+// Returns false when SQLite refuses (out of memory).
+bool RegisterSearchFunctions(sqlite3 *db);
+
+} // namespace kelo::platform

@@ -1,0 +1,16 @@
+#include "query/condition_text.h"
+#include "query/statement.h"
+
+using namespace kelo;
+
+int SyslogDBDelete(const std::string &dbPath, const std::list<_SYSLOG_SQL_COND_tag> &conditions) {
+    if (!CheckDbPath(dbPath, 661))
+        return -1;
+    std::string body;
+    if (SyslogSQLCondListStrGen(conditions, body) != 0)
+        return -1;
+    const std::string sql = "DELETE FROM logs" + (body.empty() ? "" : " WHERE " + body);
+
+    const DbConnection connection = Connect(dbPath);
+    return connection != nullptr && RunCommand(connection.get(), sql) ? 0 : -1;
+}

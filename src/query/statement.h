@@ -1,0 +1,55 @@
+#pragma once
+
+#include <string>
+
+#include "common/db_handles.h"
+#include "kelosyslog/dbutil.h"
+
+namespace kelo {
+
+// Whether `path` can name a database: not empty, and beginning with '/'.
+bool SyslogDBPathIsValid(const std::string &path);
+
+// Checks a path, and reports one that cannot name a database under the given line number of the message.
+bool CheckDbPath(const std::string &path, int line);
+
+// " ORDER BY column asc" or "... desc"; "" for null.
+std::string OrderClause(const _SYSLOG_SQL_ORDER_tag *order);
+
+// Runs `sql` and stores its rows in `result`: as it stands, or with a `page` through the platform's limited
+// select, which takes the low 32 bits of the page's numbers. Returns false when the statement failed, and for
+// a text with a NUL byte, which would silently cut the statement and with it a part of its filter.
+bool RunQuery(DBConnect_tag *connection, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
+              DbResult &result);
+
+// The same for a statement without rows.
+bool RunCommand(DBConnect_tag *connection, const std::string &sql);
+
+// The rows of one statement with the connection that they came from, for callers that make no difference
+// between a failed connection and a failed statement.
+struct Answer {
+    DbConnection connection;
+    DbResult result;
+    bool isGood = false;
+};
+Answer Ask(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page = nullptr);
+
+// Asks and calls `take(result, row)` for every row, in order. Returns false when the connection, the
+// statement or the fetch of a row failed; rows before it have been taken.
+template <typename Take>
+bool AskRows(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
+             Take take) {
+    const Answer answer = Ask(dbPath, sql, page);
+    if (!answer.isGood)
+        return false;
+    const int rowCount = KELODBNumRows(answer.result.get());
+    for (int i = 0; i < rowCount; ++i) {
+        uint32_t row = 0;
+        if (KELODBFetchRow(answer.result.get(), &row) < 0)
+            return false;
+        take(answer.result.get(), row);
+    }
+    return true;
+}
+
+} // namespace kelo

@@ -1,0 +1,72 @@
+#include "kelosyslog/utils.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <locale>
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+TEST(Tokenize, KeepsEmptyPieces) {
+    EXPECT_THAT(Tokenize("", ","), IsEmpty());
+    EXPECT_THAT(Tokenize(",,,", ","), ElementsAre("", "", "", ""));
+    EXPECT_THAT(Tokenize("plain", ","), ElementsAre("plain"));
+    EXPECT_THAT(Tokenize("plain", ""), ElementsAre("plain"));
+    EXPECT_THAT(Tokenize("a,b;c,", ";,"), ElementsAre("a", "b", "c", ""));
+    EXPECT_THAT(Tokenize(std::string("a\0b", 3), std::string("\0", 1)), ElementsAre("a", "b"));
+}
+
+struct Grouping : std::numpunct<char> {
+    char do_thousands_sep() const override { return '.'; }
+    std::string do_grouping() const override { return "\3"; }
+};
+
+TEST(UllNumberToString, NeverGroupsDigits) {
+    const std::locale before = std::locale::global(std::locale(std::locale::classic(), new Grouping));
+    EXPECT_EQ(ullNumberToString(0), "0");
+    EXPECT_EQ(ullNumberToString(1234567), "1234567");
+    EXPECT_EQ(ullNumberToString(18446744073709551615ULL), "18446744073709551615");
+    std::locale::global(before);
+}
+
+TEST(EncodeJson, EscapesToTheByteAndStaysInsideTheBuffer) {
+    constexpr char kGuard = '#';
+    const struct {
+        const char *source;
+        int32_t size;
+        int32_t result;
+        std::string written; // what the buffer starts with; the rest must be untouched
+    } cases[] = {
+        {"", 0, -1, ""},
+        {"", -1, -1, ""},
+        {"", 1, 0, std::string("\0", 1)},
+        {"a", 1, -1, "a"},
+        {"a", 2, 0, std::string("a\0", 2)},
+        {"\"", 1, -1, ""},
+        {"\"", 2, -1, "\\\""},
+        {"\"", 3, 0, std::string("\\\"\0", 3)},
+        {"ab\\", 3, -1, "ab"},
+        {"a\\b", 5, 0, std::string("a\\\\b\0", 5)},
+        {"\n\t\x01\x7f\xff/", 7, 0, std::string("\n\t\x01\x7f\xff/\0", 7)},
+    };
+    for (const auto &c : cases) {
+        std::string buffer(16, kGuard);
+        EXPECT_EQ(EncodeJson(c.source, buffer.data(), c.size), c.result) << c.source << " into " << c.size;
+        EXPECT_EQ(buffer, c.written + std::string(16 - c.written.size(), kGuard))
+            << c.source << " into " << c.size;
+    }
+}
+
+TEST(EncodeJson, RefusesNullAndEqualPointers) {
+    char buffer[] = "x\"y";
+    EXPECT_EQ(EncodeJson(nullptr, buffer, 4), -1);
+    EXPECT_EQ(EncodeJson(buffer, buffer, 4), -1);
+    EXPECT_STREQ(buffer, "x\"y");
+    EXPECT_EQ(EncodeJson(buffer, nullptr, 4), -1);
+}
+
+} // namespace

@@ -1,0 +1,274 @@
+// Files that are no good database: every operation says so with its stated result and message, opens nothing
+// for good and creates no file.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <dlfcn.h>
+#include <sqlite3.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <functional>
+#include <map>
+#include <memory>
+#include <random>
+
+#include "faults/file_faults.h"
+#include "kelosyslog/dbutil.h"
+#include "support/log_database.h"
+#include "support/platform_calls.h"
+#include "support/syslog_capture.h"
+#include "support/temp_root.h"
+
+namespace {
+
+int askedBusyTimeoutMs = 0;
+
+} // namespace
+
+// Waiting for a lock is cut short; what was asked for is kept.
+extern "C" int sqlite3_busy_timeout(sqlite3 *db, int ms) {
+    static const auto real =
+        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
+    askedBusyTimeoutMs = ms;
+    return real(db, ms > 0 ? 1 : ms);
+}
+
+namespace kelo::test {
+namespace {
+
+namespace fs = std::filesystem;
+using testing::AnyOf;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+const std::list<_SYSLOG_SQL_COND_tag> kFromHost3 = {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host03", {}}};
+
+int CountRow(_SYSLOG_LOG_DATA_tag &, void *context) {
+    ++*static_cast<int *>(context);
+    return 0;
+}
+
+std::string RandomBytes(size_t count) {
+    std::mt19937 random(1);
+    std::string bytes(count, '\0');
+    for (char &byte : bytes)
+        byte = static_cast<char>(random());
+    return bytes;
+}
+
+// Type and content of everything in a folder, by name; a database's companions count only with `all`.
+std::map<std::string, std::string> Listing(const TempRoot &root, bool all = true) {
+    std::map<std::string, std::string> listing;
+    for (const auto &entry : fs::directory_iterator(root.Path())) {
+        const std::string name = entry.path().filename();
+        if (all || !(name.ends_with("-wal") || name.ends_with("-shm") || name.ends_with("-journal")))
+            listing[name] = fs::is_regular_file(entry.symlink_status()) ? ReadFile(entry.path()) : "no file";
+    }
+    return listing;
+}
+
+void ExpectNothingOpen() {
+    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
+    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
+}
+
+void ExpectReadsToFail(const std::string &path) {
+    int rows = 0;
+    SyslogCapture capture;
+    EXPECT_EQ(SyslogDBSelect(path, kFromHost3, nullptr, nullptr, CountRow, &rows, false), -1);
+    EXPECT_EQ(rows, 0);
+    EXPECT_THAT(
+        capture.Texts(),
+        ElementsAre(AnyOf("fail to connect database (" + path + ")",
+                          "fail to execute database command (SELECT * FROM logs WHERE (host = 'host03'))")));
+    capture.Clear();
+    EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), -1);
+    EXPECT_THAT(capture.Messages(), IsEmpty());
+    ExpectNothingOpen();
+}
+
+void ExpectDeleteToFail(const std::string &path) {
+    const SyslogCapture capture;
+    EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
+    EXPECT_THAT(capture.Messages(), IsEmpty());
+    ExpectNothingOpen();
+}
+
+// A database in one file, without a write-ahead log.
+void CreateSingleFile(const std::string &path) {
+    CreateLogDatabase(path);
+    InsertSampleLogs(path, 200);
+    RunSql(path, "PRAGMA journal_mode = DELETE");
+}
+
+std::string ContentOfSingleFile() {
+    const TempRoot root;
+    CreateSingleFile(root.File("logs.db"));
+    return ReadFile(root.File("logs.db"));
+}
+
+TEST(BadDatabase, IsRefusedWithAMessageAndLeftAlone) {
+    const struct {
+        const char *name;
+        std::function<void(const std::string &path)> create;
+    } cases[] = {
+        {"missing", [](const std::string &) {}},
+        {"empty", [](const std::string &path) { WriteFile(path, ""); }},
+        {"text", [](const std::string &path) { WriteFile(path, "Jan  2 10:11:12 nas sshd: hello\n"); }},
+        {"long text", [](const std::string &path) { WriteFile(path, std::string(100000, 'x')); }},
+        {"encrypted", [](const std::string &path) { WriteFile(path, RandomBytes(32768)); }},
+        {"cut in the header",
+         [](const std::string &path) { WriteFile(path, ContentOfSingleFile().substr(0, 60)); }},
+        {"cut in the middle",
+         [](const std::string &path) {
+             const std::string content = ContentOfSingleFile();
+             WriteFile(path, content.substr(0, content.size() / 2));
+         }},
+        {"folder", [](const std::string &path) { fs::create_directory(path); }},
+        {"pipe", [](const std::string &path) { ASSERT_EQ(mkfifo(path.c_str(), 0600), 0); }},
+        {"dangling link", [](const std::string &path) { fs::create_symlink(path + "-target", path); }},
+        {"no table", [](const std::string &path) { RunSql(path, "CREATE TABLE other (host)"); }},
+        {"no column", [](const std::string &path) { RunSql(path, "CREATE TABLE logs (id, msg)"); }},
+        {"a view that fails",
+         [](const std::string &path) { RunSql(path, "CREATE VIEW logs AS SELECT host FROM gone"); }},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        const TempRoot root;
+        c.create(root.File("logs.db"));
+        const auto before = Listing(root);
+        ExpectReadsToFail(root.File("logs.db"));
+        ExpectDeleteToFail(root.File("logs.db"));
+        EXPECT_EQ(Listing(root), before);
+    }
+}
+
+TEST(BadDatabase, IsNotFoundByAPathThatOnlyBeginsWithItsName) {
+    const TempRoot root;
+    CreateSingleFile(root.File("logs.db"));
+    const SyslogCapture capture;
+    const std::string path = root.File("logs.db") + std::string("\0.old", 5);
+    EXPECT_EQ(SyslogDBSelectCount(path, {}, nullptr, nullptr), -1);
+    EXPECT_EQ(SyslogDBDelete(path, {}), -1);
+    EXPECT_EQ(QueryText(root.File("logs.db"), "SELECT count(*) FROM logs"), "200");
+}
+
+// Runs `check` where the rights of root do not help, in a process of its own.
+void ExpectWithoutPrivileges(const std::function<void()> &check) {
+    const auto checkAndExit = [&] {
+        if (geteuid() == 0 && (setgid(65534) != 0 || setuid(65534) != 0))
+            _exit(2);
+        check();
+        _exit(testing::Test::HasFailure() ? 1 : 0);
+    };
+    EXPECT_EXIT(checkAndExit(), testing::ExitedWithCode(0), "");
+}
+
+TEST(BadDatabaseDeathTest, FailsWhereTheFileMayNotBeReadOrWritten) {
+    const TempRoot root;
+    const std::string path = root.File("logs.db");
+    CreateSingleFile(path);
+    ASSERT_EQ(chmod(root.Path().c_str(), 0555), 0);
+    ASSERT_EQ(chmod(path.c_str(), 0), 0);
+    ExpectWithoutPrivileges([&] {
+        ExpectReadsToFail(path);
+        ExpectDeleteToFail(path);
+    });
+    ASSERT_EQ(chmod(path.c_str(), 0444), 0);
+    ExpectWithoutPrivileges([&] {
+        EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), 4);
+        ExpectDeleteToFail(path);
+    });
+    ASSERT_EQ(chmod(root.Path().c_str(), 0755), 0);
+    EXPECT_EQ(QueryText(path, "SELECT count(*) FROM logs"), "200");
+}
+
+TEST(LockedDatabase, FailsAfterWaiting) {
+    const struct {
+        const char *name;
+        const char *lock;
+        bool canRead;
+    } cases[] = {
+        {"everything", "PRAGMA journal_mode = DELETE; BEGIN EXCLUSIVE", false},
+        {"another writer", "PRAGMA journal_mode = WAL; BEGIN IMMEDIATE", true},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        const TempRoot root;
+        const std::string path = root.File("logs.db");
+        CreateSingleFile(path);
+        sqlite3 *db = nullptr;
+        ASSERT_EQ(sqlite3_open(path.c_str(), &db), SQLITE_OK);
+        const std::unique_ptr<sqlite3, decltype(&sqlite3_close)> locker(db, sqlite3_close);
+        ASSERT_EQ(sqlite3_exec(db, c.lock, nullptr, nullptr, nullptr), SQLITE_OK);
+        askedBusyTimeoutMs = 0;
+        if (c.canRead)
+            EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), 4);
+        else
+            ExpectReadsToFail(path);
+        ExpectDeleteToFail(path);
+        EXPECT_GE(askedBusyTimeoutMs, 1000);
+        ASSERT_EQ(sqlite3_exec(db, "COMMIT", nullptr, nullptr, nullptr), SQLITE_OK);
+        EXPECT_EQ(QueryText(path, "SELECT count(*) FROM logs"), "200");
+    }
+}
+
+// Flips bits, overwrites, swaps and cuts: where it hits is up to `random`.
+std::string Damaged(std::string content, std::mt19937 &random) {
+    const auto below = [&](size_t bound) {
+        return std::uniform_int_distribution<size_t>(0, bound - 1)(random);
+    };
+    constexpr size_t kPage = 4096;
+    const auto page = [&] { return below(content.size() / kPage) * kPage; };
+    switch (below(5)) {
+    case 0:
+        for (size_t flips = 1 + below(20); flips > 0; --flips)
+            content[below(content.size())] ^= static_cast<char>(1U << below(8));
+        break;
+    case 1: // the header of the file and its schema
+        for (size_t bytes = 1 + below(8); bytes > 0; --bytes)
+            content[below(600)] = static_cast<char>(random());
+        break;
+    case 2: // the header of a page, where its cells are listed
+        content.replace(page(), 16, RandomBytes(16));
+        break;
+    case 3:
+        content.replace(page(), kPage, content.substr(page(), kPage));
+        break;
+    default:
+        content.resize(below(content.size()));
+    }
+    return content;
+}
+
+TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
+    FileFaults::Install();
+    const std::string sound = ContentOfSingleFile();
+    const TempRoot root;
+    const std::string path = root.File("logs.db");
+    std::mt19937 random(20200102); // repeatable
+    int failures = 0;
+    for (int round = 0; round < 1000; ++round) {
+        SCOPED_TRACE(round);
+        for (const char *suffix : {"-wal", "-shm", "-journal"})
+            fs::remove(path + suffix);
+        WriteFile(path, Damaged(sound, random));
+        int rows = 0;
+        const int select = SyslogDBSelect(path, kFromHost3, nullptr, nullptr, CountRow, &rows, true);
+        const int count = SyslogDBSelectCount(path, {}, nullptr, nullptr);
+        const int deletion = SyslogDBDelete(path, kFromHost3);
+        EXPECT_TRUE(select == 0 || (select == -1 && rows == 0)) << select;
+        EXPECT_GE(count, -1);
+        EXPECT_TRUE(deletion == 0 || deletion == -1) << deletion;
+        failures += select == -1 || deletion == -1;
+        ExpectNothingOpen();
+        ASSERT_EQ(Listing(root, false).size(), 1u);
+    }
+    EXPECT_GT(failures, 100) << "hardly any database was damaged";
+}
+
+} // namespace
+} // namespace kelo::test

@@ -1,0 +1,207 @@
+#include "faults/operations.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+
+#include "support/fault_pause.h"
+#include "support/log_database.h"
+
+namespace kelo::test {
+namespace {
+
+using testing::AnyOf;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::StartsWith;
+
+using Lines = std::vector<std::string>;
+
+constexpr int kRows = 40;
+const _SYSLOG_SQL_COND_tag kFromHost3{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host03", {}};
+const std::string kIdsLeft = "SELECT group_concat(id) FROM (SELECT id FROM logs ORDER BY id)";
+
+std::string Ids(int first, int last, int without = 0) {
+    std::string ids;
+    for (int id = first; id <= last; ++id) {
+        if (id != without)
+            ids += (ids.empty() ? "" : ",") + std::to_string(id);
+    }
+    return ids;
+}
+
+Lines IdLines(int first, int last) {
+    Lines lines;
+    for (int id = first; id <= last; ++id)
+        lines.push_back(std::to_string(id));
+    return lines;
+}
+
+// A database of kRows sample logs, the last ten of them still in the write-ahead log, as a busy writer leaves
+// it.
+void SetUpLogs(Ground &ground) {
+    ground.database = ground.root.File("logs.db");
+    CreateLogDatabase(ground.database);
+    InsertSampleLogs(ground.database, kRows - 10);
+    sqlite3 *holder = nullptr;
+    ASSERT_EQ(sqlite3_open(ground.database.c_str(), &holder), SQLITE_OK);
+    ASSERT_EQ(sqlite3_exec(holder, "SELECT count(*) FROM logs", nullptr, nullptr, nullptr), SQLITE_OK);
+    std::vector<_SYSLOG_LOG_DATA_tag> newest;
+    for (int number = kRows - 10; number < kRows; ++number)
+        newest.push_back(SampleLog(number));
+    InsertLogs(ground.database, newest);
+    sqlite3_db_config(holder, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
+    sqlite3_close(holder);
+}
+
+void SetUpLogsOfHost3(Ground &ground) {
+    SetUpLogs(ground);
+    ground.conditions = {kFromHost3};
+}
+
+int TakeId(_SYSLOG_LOG_DATA_tag &log, void *context) {
+    const FaultPause pause;
+    static_cast<Ground *>(context)->seen.push_back(std::to_string(log.id));
+    return 0;
+}
+
+int TakeCount(Ground &ground, int count) {
+    const FaultPause pause;
+    if (count >= 0)
+        ground.seen.push_back(std::to_string(count));
+    return count;
+}
+
+// A search that reports itself done has delivered exactly its rows, a failed one no other rows.
+void CheckSeen(const Ground &ground, const Outcome &outcome, const Lines &whole, const Lines &withoutValues) {
+    if (outcome.MayHaveLostValues() && ground.seen == withoutValues)
+        return;
+    if (outcome.IsDone())
+        EXPECT_EQ(ground.seen, whole);
+    else
+        EXPECT_TRUE(ground.seen.size() <= whole.size() &&
+                    std::equal(ground.seen.begin(), ground.seen.end(), whole.begin()))
+            << testing::PrintToString(ground.seen);
+}
+
+void CheckSelectMessages(const Ground &ground, const Outcome &outcome, const std::string &statement) {
+    const std::string cannotConnect = "fail to connect database (" + ground.database + ")";
+    const std::string cannotExecute = "fail to execute database command (";
+    if (outcome.IsDone() || outcome.outOfMemory || outcome.fault == "KELODBFetchRow")
+        EXPECT_THAT(outcome.messages, IsEmpty());
+    else if (outcome.fault == "KELODBConnect")
+        EXPECT_THAT(outcome.messages, ElementsAre(cannotConnect));
+    else if (outcome.MayHaveLostValues())
+        EXPECT_THAT(outcome.messages, ElementsAre(AnyOf(cannotConnect, StartsWith(cannotExecute))));
+    else
+        EXPECT_THAT(outcome.messages, ElementsAre(AnyOf(cannotConnect, cannotExecute + statement + ")")));
+}
+
+// A select: `statement` is the text that its failure names, `whole` the ids that it delivers, `withoutValues`
+// those that it delivers when the values of its conditions were lost.
+Operation Select(const char *name, std::function<void(Ground &)> setUp, std::function<int(Ground &)> run,
+                 std::string statement, Lines whole, Lines withoutValues) {
+    const auto check = [=](const Ground &ground, const Outcome &outcome) {
+        CheckSeen(ground, outcome, whole, withoutValues);
+        CheckSelectMessages(ground, outcome, statement);
+    };
+    return {name, false, std::move(setUp), std::move(run), check};
+}
+
+// An operation that delivers values and whose failures are silent.
+Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::function<int(Ground &)> run,
+              Lines whole, Lines withoutValues) {
+    const auto check = [=](const Ground &ground, const Outcome &outcome) {
+        CheckSeen(ground, outcome, whole, withoutValues);
+        EXPECT_THAT(outcome.messages, IsEmpty());
+    };
+    return {name, false, std::move(setUp), std::move(run), check};
+}
+
+// A deletion, after which the ids `left` are left. A failed one has deleted either everything it should or
+// nothing, and nothing when the statement never ran.
+Operation Delete(const char *name, std::function<void(Ground &)> setUp, std::string left) {
+    const auto run = [](Ground &ground) { return SyslogDBDelete(ground.database, ground.conditions); };
+    const auto check = [=](const Ground &ground, const Outcome &outcome) {
+        const std::string rows = QueryText(ground.database, kIdsLeft);
+        const bool nothingDeleted = rows == Ids(1, kRows);
+        if (outcome.IsDone())
+            EXPECT_TRUE(rows == left || (nothingDeleted && outcome.MayHaveLostValues())) << rows;
+        else if (outcome.outOfMemory || outcome.fault.starts_with("KELODB"))
+            EXPECT_TRUE(nothingDeleted) << rows;
+        else
+            EXPECT_TRUE(rows == left || nothingDeleted) << rows;
+        EXPECT_THAT(outcome.messages, IsEmpty());
+    };
+    return {name, true, std::move(setUp), run, check};
+}
+
+int SelectWith(Ground &ground, _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order) {
+    return SyslogDBSelect(ground.database, ground.conditions, limit, order, TakeId, &ground, true);
+}
+
+int SelectPage(Ground &ground) {
+    _SYSLOG_SQL_LIMIT_tag page{10, 5};
+    return SelectWith(ground, &page, nullptr);
+}
+
+int SelectSortedPage(Ground &ground) {
+    _SYSLOG_SQL_LIMIT_tag page{3, 1};
+    _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
+    return SelectWith(ground, &page, &newestFirst);
+}
+
+int SelectAll(Ground &ground) {
+    return SelectWith(ground, nullptr, nullptr);
+}
+
+int Count(Ground &ground) {
+    return TakeCount(ground, SyslogDBSelectCount(ground.database, ground.conditions, nullptr, nullptr));
+}
+
+int CountByForm(Ground &ground) {
+    std::list<_SYSLOG_SQL_COND_tag> conditions;
+    LogSearchCondListGen("host03,host99", "any", "", "", "closed", "2020/01/01", "0", conditions);
+    return TakeCount(ground, SyslogDBSelectCount(ground.database, conditions, nullptr, nullptr));
+}
+
+int GetHosts(Ground &ground) {
+    std::list<std::string> hosts;
+    _SYSLOG_SQL_LIMIT_tag first{2, 0};
+    const int result = SyslogDBAttriValueGet(ground.database, "host", &first, hosts);
+    const FaultPause pause;
+    ground.seen.assign(hosts.begin(), hosts.end());
+    return result;
+}
+
+void SetUpLogsOfTwoPrograms(Ground &ground) {
+    SetUpLogs(ground);
+    ground.conditions = {{SYSLOG_ATTRI_PROG, SYSLOG_OP_LIKE, "prog?1", {}},
+                         {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
+}
+
+} // namespace
+
+const std::vector<Operation> &Operations() {
+    static const std::vector<Operation> operations = {
+        Select("SelectPage", SetUpLogs, SelectPage,
+               "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs WHERE ( id > totalCount - 15 "
+               "AND id <= "
+               "totalCount - 5)",
+               IdLines(26, 35), {}),
+        Select("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSortedPage,
+               "SELECT * FROM logs WHERE (prog LIKE 'prog_1' escape '\\') AND (msg GLOB '*closed*') ORDER BY "
+               "id desc",
+               {"22", "12", "2"}, {}),
+        Select("SelectAll", SetUpLogs, SelectAll, "SELECT * FROM logs", IdLines(1, kRows), {}),
+        Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
+        Ask("CountFiltered", SetUpLogsOfHost3, Count, {"1"}, {"0"}),
+        Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
+        Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
+        Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
+        Delete("DeleteAll", SetUpLogs, ""),
+    };
+    return operations;
+}
+
+} // namespace kelo::test

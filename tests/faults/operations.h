@@ -1,0 +1,55 @@
+#pragma once
+
+#include <functional>
+#include <list>
+#include <string>
+#include <vector>
+
+#include "kelosyslog/dbutil.h"
+#include "support/syslog_capture.h"
+#include "support/temp_root.h"
+
+namespace kelo::test {
+
+// What an operation works on. The files under `root` are put back before every run.
+struct Ground {
+    TempRoot root;
+    std::string database; // checked for integrity after every run; "" when the operation has none
+    std::list<_SYSLOG_SQL_COND_tag> conditions;
+    std::vector<std::string> seen; // what the run delivered
+};
+
+// How a run ended.
+struct Outcome {
+    // What failed first: a platform function's name, "allocation", "write", "full disk", "read"; "" for
+    // nothing.
+    std::string fault;
+    bool outOfMemory = false; // std::bad_alloc came out; `result` means nothing
+    int result = 0;
+    std::vector<std::string> messages; // the system log
+
+    // Whether the operation says that it is done.
+    bool IsDone() const { return !outOfMemory && result >= 0; }
+    // Whether the values of conditions may have been replaced by "", as a value is that cannot be escaped.
+    bool MayHaveLostValues() const { return fault.starts_with("KELODBEscape") || fault == "allocation"; }
+};
+
+// One operation of the library for the fault loops. That it ends, leaves nothing open or leaked, creates no
+// file and keeps the database sound is checked for every one; a row adds what only it can know.
+struct Operation {
+    const char *name;
+    bool writes; // whether it writes to files, so that writes can fail
+    std::function<void(Ground &)> setUp;
+    // Runs the operation; a result below 0 is a failure. What it does for the test is done under a
+    // FaultPause.
+    std::function<int(Ground &)> run;
+    // Whether what was promised holds, whatever failed.
+    std::function<void(const Ground &, const Outcome &)> check;
+
+    friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
+};
+
+// Every operation that the fault loops drive.
+const std::vector<Operation> &Operations();
+
+} // namespace kelo::test

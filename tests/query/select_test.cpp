@@ -1,0 +1,175 @@
+#include <syslog.h>
+
+#include <optional>
+#include <stdexcept>
+
+#include "query/query_fixture.h"
+
+using namespace kelo::test;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+namespace {
+
+const _SYSLOG_SQL_COND_tag kMatchAll{SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "**", {}};
+const _SYSLOG_SQL_COND_tag kHost{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host01", {}};
+
+int Collect(_SYSLOG_LOG_DATA_tag &log, void *context) {
+    static_cast<std::vector<_SYSLOG_LOG_DATA_tag> *>(context)->push_back(log);
+    return 0;
+}
+
+using SyslogDBSelectTest = QueryTest;
+
+TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
+    const Conditions none, all = {kMatchAll}, host = {kHost};
+    const uint64_t huge = UINT64_MAX;
+    struct Case {
+        Conditions conditions;
+        std::optional<_SYSLOG_SQL_LIMIT_tag> limit;
+        std::optional<_SYSLOG_SQL_ORDER_tag> order;
+        PlatformCall call;
+    } cases[] = {
+        {none, {}, {}, {"KELODBExecute", "SELECT * FROM t"}},
+        {none, {{0, 7}}, {{1, SYSLOG_ATTRI_XFERIP}}, {"KELODBExecute", "SELECT * FROM t ORDER BY ip asc"}},
+        {none,
+         {{50, 0}},
+         {{0, SYSLOG_ATTRI_ID}},
+         {"KELODBExecute", "SELECT *, (SELECT max(rowid) FROM t) totalCount FROM t WHERE "
+                           "( id > totalCount - 50 AND id <= totalCount - 0) ORDER BY id desc"}},
+        {all,
+         {{huge, 2}},
+         {},
+         {"KELODBExecute", "SELECT *, (SELECT max(rowid) FROM t) totalCount FROM t WHERE (msg GLOB '**') AND "
+                           "( id > totalCount - 1 AND id <= totalCount - 2)"}},
+        {host,
+         {},
+         {{-1, SYSLOG_ATTRI_ID}},
+         {"KELODBExecute", "SELECT * FROM t WHERE (host = 'host01') ORDER BY id asc"}},
+        {host, {{0, 5}}, {}, {"KELODBSelectLimit", "SELECT * FROM t WHERE (host = 'host01')", 0, 5}},
+        {host,
+         {{0x100000005, 0x200000003}},
+         {},
+         {"KELODBSelectLimit", "SELECT * FROM t WHERE (host = 'host01')", 5, 3}},
+    };
+    for (Case &c : cases) {
+        EXPECT_EQ(SyslogDBSelectByTable(path_, "t", c.conditions, c.limit ? &*c.limit : nullptr,
+                                        c.order ? &*c.order : nullptr, nullptr, nullptr, false),
+                  -1);
+        ASSERT_THAT(log_.Messages(), ElementsAre(SyslogMessage{LOG_ERR, "fail to execute database command (" +
+                                                                            c.call.text + ")"}));
+        const PlatformCall &call = PlatformCalls::Recorded().back();
+        EXPECT_EQ(call.function, c.call.function);
+        EXPECT_EQ(call.limit, c.call.limit);
+        EXPECT_EQ(call.offset, c.call.offset);
+        EXPECT_EQ(TakeStatement(), c.call.text);
+        log_.Clear();
+    }
+}
+
+TEST_F(SyslogDBSelectTest, HandsOverWholeRows) {
+    InsertSampleLogs(path_, 60);
+    std::vector<_SYSLOG_LOG_DATA_tag> logs;
+    EXPECT_EQ(SyslogDBSelect(path_, {kHost}, nullptr, nullptr, Collect, &logs, true), 0);
+    ASSERT_EQ(logs.size(), 2u);
+    const _SYSLOG_LOG_DATA_tag expected = SampleLog(51);
+    EXPECT_EQ(logs[1].id, 52u);
+    EXPECT_EQ(logs[1].utcsec, expected.utcsec);
+    EXPECT_EQ(logs[1].prio, expected.prio);
+    EXPECT_EQ(logs[1].ltime, expected.ltime);
+    EXPECT_EQ(logs[1].msg, TrimUserName(expected.msg));
+}
+
+TEST_F(SyslogDBSelectTest, StopsWhereTheCallbackOrTheConversionEnds) {
+    RunSql(path_, "CREATE TABLE other AS SELECT 1 AS id UNION SELECT 2");
+    InsertSampleLogs(path_, 5);
+    int calls = 0;
+    const auto stop = [](_SYSLOG_LOG_DATA_tag &, void *context) {
+        return ++*static_cast<int *>(context) == 2 ? 1 : 0;
+    };
+    EXPECT_EQ(SyslogDBSelect(path_, {}, nullptr, nullptr, stop, &calls, false), 0);
+    EXPECT_EQ(calls, 2);
+    EXPECT_EQ(SyslogDBSelectByTable(path_, "other", {}, nullptr, nullptr, stop, &calls, false), 0);
+    EXPECT_EQ(calls, 2);
+    const auto failNextFetch = [](_SYSLOG_LOG_DATA_tag &, void *) {
+        PlatformCalls::FailFrom(1);
+        return 0;
+    };
+    EXPECT_EQ(SyslogDBSelect(path_, {}, nullptr, nullptr, failNextFetch, nullptr, false), -1);
+    PlatformCalls::Reset();
+    const auto raise = [](_SYSLOG_LOG_DATA_tag &, void *) -> int { throw std::runtime_error("stop"); };
+    EXPECT_THROW(SyslogDBSelect(path_, {}, nullptr, nullptr, raise, nullptr, false), std::runtime_error);
+    EXPECT_THAT(log_.Messages(), IsEmpty());
+}
+
+TEST_F(SyslogDBSelectTest, NamesTheDatabaseThatCannotBeOpened) {
+    const std::string missing = root_.File("missing.db");
+    EXPECT_EQ(SyslogDBSelect(missing, {kHost}, nullptr, nullptr, Collect, nullptr, false), -1);
+    EXPECT_THAT(log_.Texts(), ElementsAre("fail to connect database (" + missing + ")"));
+    EXPECT_EQ(SyslogDBSelectCount(missing, {}, nullptr, nullptr), -1);
+    EXPECT_EQ(SyslogDBDelete(missing, {}), -1);
+    EXPECT_EQ(log_.Messages().size(), 1u);
+    EXPECT_EQ(ReadFile(missing), "");
+}
+
+TEST_F(SyslogDBSelectTest, RejectsAPathBeforeAnythingIsOpened) {
+    for (const std::string path : {"", "logs.db", "file:/logs.db"}) {
+        log_.Clear();
+        std::list<std::string> values;
+        std::map<uint64_t, std::string> names;
+        EXPECT_EQ(SyslogDBSelect(path, {kHost}, nullptr, nullptr, nullptr, nullptr, false), -1);
+        EXPECT_EQ(SyslogDBSelectCount(path, {}, nullptr, nullptr), -1);
+        EXPECT_EQ(SyslogDBDelete(path, {}), -1);
+        EXPECT_EQ(SyslogDBVersionGet(path), 1);
+        EXPECT_EQ(SyslogDBHistTotalGet(path), 0u);
+        EXPECT_EQ(SyslogDBHistGetSingle(path, "nas"), 0u);
+        EXPECT_THAT(SyslogDBHistGet(path, 0), IsEmpty());
+        EXPECT_THAT(SyslogDBEpsGet(path, 0, 1), IsEmpty());
+        EXPECT_EQ(SyslogDBAttriValueGet(path, "nothing", nullptr, values), -1);
+        EXPECT_EQ(SyslogDBExtkeyLookupByName(path, SYSLOG_EXTKEY_FAC, "kern"), 0u);
+        EXPECT_EQ(PlatformCalls::Count(), 0);
+        const auto at = [](int line) {
+            return "dbutil:" + std::to_string(line) + " Invalid syslog db path!";
+        };
+        const std::string version = at(863) + " [" + path + "]";
+        EXPECT_THAT(log_.Texts(),
+                    ElementsAre(at(472), at(581), at(661), version, at(1061), at(1102), at(1144), at(992),
+                                at(705), version, at(897), "dbutil:966 Fail to get foreign key map"));
+    }
+}
+
+using SyslogDBSelectCountTest = QueryTest;
+
+TEST_F(SyslogDBSelectCountTest, CountsByTheLargestIdWithoutAFilter) {
+    EXPECT_EQ(SyslogDBSelectCount(path_, {}, nullptr, nullptr), 0);
+    InsertSampleLogs(path_, 60);
+    EXPECT_EQ(SyslogDBDelete(path_, {{SYSLOG_ATTRI_ID, SYSLOG_OP_LE, "10", {}}}), 0);
+    PlatformCalls::Reset();
+    _SYSLOG_SQL_ORDER_tag newest{0, SYSLOG_ATTRI_ID};
+    EXPECT_EQ(SyslogDBSelectCount(path_, {kMatchAll}, nullptr, &newest), 60);
+    EXPECT_EQ(TakeStatement(), "SELECT max(rowid) FROM logs WHERE (msg GLOB '**') ORDER BY id desc");
+    EXPECT_EQ(SyslogDBSelectCount(path_, {kMatchAll, kMatchAll}, nullptr, &newest), 50);
+    EXPECT_EQ(TakeStatement(),
+              "SELECT COUNT(*) FROM logs WHERE (msg GLOB '**') AND (msg GLOB '**') ORDER BY id desc");
+    RunSql(path_, "INSERT INTO logs(id) VALUES(4294967298)");
+    EXPECT_EQ(SyslogDBSelectCount(path_, {}, nullptr, nullptr), 2);
+}
+
+TEST_F(SyslogDBSelectCountTest, TellsAMissingRowFromSeveral) {
+    InsertSampleLogs(path_, 3);
+    _SYSLOG_SQL_LIMIT_tag all{0, 0}, second{1, 1};
+    EXPECT_EQ(SyslogDBSelectCount(path_, {kHost}, &all, nullptr), 1);
+    EXPECT_EQ(SyslogDBSelectCount(path_, {kHost}, &second, nullptr), -1);
+    EXPECT_EQ(SyslogDBSelectCountByTable(path_, "logs GROUP BY host", {}, nullptr, nullptr), -2);
+    EXPECT_EQ(SyslogDBSelectCountByTable(path_, "nothing", {}, nullptr, nullptr), -1);
+    EXPECT_THAT(log_.Messages(), IsEmpty());
+}
+
+TEST_F(SyslogDBSelectCountTest, CountsNothingAfterEverythingIsDeleted) {
+    InsertSampleLogs(path_, 3);
+    EXPECT_EQ(SyslogDBDelete(path_, {}), 0);
+    EXPECT_EQ(TakeStatement(), "DELETE FROM logs");
+    EXPECT_EQ(QueryText(path_, "SELECT count(*) FROM logs"), "0");
+}
+
+} // namespace

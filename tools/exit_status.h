@@ -1,0 +1,14 @@
+#pragma once
+
+namespace kelo::tool {
+
+// What the program ends with. Scripts tell "no match" from "error" by it.
+enum ExitStatus : int {
+    kExitFound = 0,
+    kExitNothing = 1,
+    kExitUsage = 2,
+    kExitDatabase = 3,
+    kExitOutput = 4, // what was found could not be written, for example to a full disk
+};
+
+} // namespace kelo::tool

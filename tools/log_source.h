@@ -1,0 +1,40 @@
+#pragma once
+
+#include <string>
+
+namespace kelo::tool {
+
+// The row shapes of log tables.
+enum class TableKind {
+    Logs,     // "logs"
+    System,   // "general_log", "connection_log"
+    Transfer, // "transfer_log"
+};
+
+// A table of a log database.
+struct LogSource {
+    std::string path; // absolute
+    std::string table = "logs";
+    TableKind kind = TableKind::Logs;
+};
+
+// What the options --db, --log, --table and --root say; "" for an option that was not given.
+struct LogSourceOptions {
+    std::string db;
+    std::string log;
+    std::string table;
+};
+
+// The table to read: a file by its path (relative to the working folder), or a fixed log by its name, whose
+// path stands below `root`: "logs" for the working log, which is the default, and the names of the transfer
+// logs. Nothing is opened. Throws UsageError for an unknown log or table.
+LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root);
+
+// The names that --log knows, separated by commas.
+std::string KnownLogNames();
+
+// One line that names the path and what can be told from outside about why it cannot be read (or changed,
+// with `forWriting`): missing, a folder, no permission, empty, not a database, cut short.
+std::string DescribeDatabaseProblem(const LogSource &source, bool forWriting = false);
+
+} // namespace kelo::tool

@@ -1,0 +1,24 @@
+// kelosyslog: searches and maintains the logs of a log server.
+
+#include <csignal>
+
+#include "program.h"
+
+int main(int argc, char **argv) {
+    // A reader that goes away is noticed by the failing write.
+    std::signal(SIGPIPE, SIG_IGN);
+
+    kelo::tool::Program program;
+    program.app.name("kelosyslog");
+    program.app.description("Search and maintain the logs of a log server.");
+    program.app.set_version_flag("--version", "kelosyslog " KELOSYSLOG_VERSION);
+    program.app.require_subcommand(1);
+    program.app.footer("'kelosyslog COMMAND --help' tells about one command.\n"
+                       "Exit status: 0 found or done, 1 nothing matched, 2 usage, 3 database, 4 output.");
+
+    kelo::tool::AddSearch(program);
+    kelo::tool::AddCount(program);
+    kelo::tool::AddDelete(program);
+    kelo::tool::AddParse(program);
+    return kelo::tool::RunProgram(program, argc, argv);
+}

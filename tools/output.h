@@ -1,0 +1,51 @@
+#pragma once
+
+#include <sys/types.h>
+
+#include <string>
+#include <string_view>
+
+namespace kelo::tool {
+
+enum class ColourMode { Auto, Always, Never };
+
+// The mode of this name ("auto", "always", "never"). Throws UsageError naming --color.
+ColourMode ParseColourMode(const std::string &name);
+
+// Whether to colour: "auto" means on a terminal that is not "dumb", unless the environment holds NO_COLOR
+// with a value (https://no-color.org).
+bool WantsColour(ColourMode mode, bool isTerminal, const char *noColor, const char *term);
+// The same for the standard output and environment of the process.
+bool WantsColour(ColourMode mode);
+
+// The standard output: buffered, with a pager in front where one is wanted, and with honest failures.
+class Output {
+public:
+    // With `mayPage` the first text starts the pager (environment PAGER, else "less" with FRX), provided that
+    // the standard output is a terminal. An empty PAGER or "cat" means none.
+    explicit Output(bool mayPage);
+    ~Output();
+    Output(const Output &) = delete;
+    Output &operator=(const Output &) = delete;
+
+    // Throws OutputClosed when the reader went away and OutputError when the text cannot be written.
+    void Write(std::string_view text);
+    void Flush();
+
+    // Waits up to `timeoutMs`, shorter when the reader goes away, and then throws OutputClosed.
+    void Wait(int timeoutMs) const;
+
+    // Writes what is left and waits until the user leaves the pager.
+    void Finish();
+
+private:
+    void StartPager();
+    void ClosePager();
+
+    std::string buffer_;
+    int file_;
+    pid_t pager_ = -1;
+    bool mayPage_;
+};
+
+} // namespace kelo::tool

@@ -1,0 +1,25 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace kelo::tool {
+
+// Logs hold whatever bytes a sender chose. These functions make a text safe for the place it goes to.
+
+// The text on one line of a terminal: control characters, characters that turn the writing direction and
+// bytes that are no UTF-8 are written as "\n", "\t", "\x1b" or "\u202e". Everything else, backslashes
+// included, stays.
+std::string VisibleText(std::string_view text);
+
+// Number of characters of a text that is UTF-8, which is the number of its columns for most scripts.
+size_t CharacterCount(std::string_view text);
+
+// Appends the text as a JSON string with its quotes: control characters are escaped, and each byte that is no
+// UTF-8 becomes U+FFFD.
+void AppendJsonString(std::string &out, std::string_view text);
+
+// Appends the text as a field of RFC 4180: between double quotes where it needs them, bytes unchanged.
+void AppendCsvField(std::string &out, std::string_view text);
+
+} // namespace kelo::tool

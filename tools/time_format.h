@@ -1,0 +1,28 @@
+#pragma once
+
+#include <cstdint>
+#include <ctime>
+#include <string>
+
+namespace kelo::tool {
+
+// Writes moments in the time zone of the process (TZ), or in UTC.
+class TimeFormat {
+public:
+    explicit TimeFormat(bool inUtc) : inUtc_(inUtc) {}
+
+    // "2020-01-02 10:11:12"
+    std::string Plain(int64_t seconds) const;
+    // "2020-01-02T10:11:12+01:00"
+    std::string Iso(int64_t seconds) const;
+    // "Jan 02 10:11:12"
+    std::string Short(int64_t seconds) const;
+
+private:
+    std::string Format(int64_t seconds, const char *format) const;
+    bool Break(int64_t seconds, tm &parts) const;
+
+    bool inUtc_;
+};
+
+} // namespace kelo::tool
