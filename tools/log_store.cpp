@@ -76,8 +76,8 @@ LogStore::LogStore(const std::string &path) : path_(std::filesystem::absolute(pa
         Create();
     file_ = path_;
     Open(SQLITE_OPEN_READWRITE);
+    insertLog_ = Prepare(kInsertLog); // first: a database of another kind must not get our table
     Run(kCreateProgress);
-    insertLog_ = Prepare(kInsertLog);
     saveProgress_ = Prepare(kSaveProgress);
 }
 
