@@ -105,11 +105,11 @@ public:
     void Finish();
 
     // Lines dropped because of their length.
-    uint64_t OverlongCount() const { return overlongCount_; }
+    uint64_t OverlongCount() const;
 
 private:
-    void AddPart(std::string_view piece);
-    void AddLines(std::string_view lines);
+    void TakePart(std::string_view piece);
+    void ParseLines(std::string_view lines);
     void Keep(std::string_view part);
 
     LogParser &parser_;

@@ -9,25 +9,29 @@ LogStream::LogStream(LogParser &parser, size_t maxLineBytes)
 void LogStream::Add(std::string_view piece) {
     // So cut, a line that lies within one part is short enough.
     for (; !piece.empty(); piece.remove_prefix(std::min(piece.size(), maxLineBytes_)))
-        AddPart(piece.substr(0, maxLineBytes_));
+        TakePart(piece.substr(0, maxLineBytes_));
 }
 
-void LogStream::AddPart(std::string_view piece) {
+void LogStream::TakePart(std::string_view piece) {
     const size_t firstLineFeed = piece.find('\n');
     Keep(piece.substr(0, firstLineFeed));
     if (firstLineFeed == std::string_view::npos)
         return;
     const size_t lastLineFeed = piece.rfind('\n');
-    AddLines(piece.substr(firstLineFeed, lastLineFeed + 1 - firstLineFeed));
+    ParseLines(piece.substr(firstLineFeed, lastLineFeed + 1 - firstLineFeed));
     Keep(piece.substr(lastLineFeed + 1));
 }
 
 void LogStream::Finish() {
-    AddLines({});
+    ParseLines({});
 }
 
-// Adds the waiting line, which ends here, and the complete `lines` behind it.
-void LogStream::AddLines(std::string_view lines) {
+uint64_t LogStream::OverlongCount() const {
+    return overlongCount_;
+}
+
+// Parses the waiting line, which ends here, and the complete `lines` behind it.
+void LogStream::ParseLines(std::string_view lines) {
     std::string text(lines);
     if (!waiting_.empty() || !text.empty()) {
         parser_.PartialLogSet(std::move(waiting_));
