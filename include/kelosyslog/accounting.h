@@ -1,0 +1,96 @@
+#pragma once
+
+// Counts of received logs: in total, per second and per sending device.
+//
+//     AccountingManager accounting;      // loads the stored histogram
+//     for (each received log) {
+//         accounting.LogInc(host);
+//         ...
+//     }
+//     if (accounting.isNeed2Flush())     // on a beat of 6 seconds or more
+//         accounting.AccoutingFlush2DB();
+//
+// At the first log of a new second the manager closes a sample: logs per device since the sample before. A
+// sample that reaches a rule raises a notification and an event. Samples are kept until a flush has written
+// them. One object per accounting database, used by one thread.
+
+#include <cstdint>
+#include <list>
+#include <map>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+#include "kelosyslog/dbutil.h"
+#include "kelosyslog/export.h"
+#include "kelosyslog/notification.h"
+
+// One entry of the histogram.
+struct KELOLOG_LOG_DEVICE_STATISTIC {
+    std::string device;
+    uint64_t count = 0; // cumulative, across flushes and restarts
+};
+
+class KELOSYSLOG_API AccountingManager {
+public:
+    // Loads the stored histogram and the notification rules. A database that is missing or cannot be read
+    // counts as empty.
+    AccountingManager();
+    // Flushes once more; its failure is only reported.
+    ~AccountingManager();
+    AccountingManager(const AccountingManager &) = delete;
+    AccountingManager &operator=(const AccountingManager &) = delete;
+
+    // Sets the path of the accounting database, "/var/log/kelolog/.KELOACCOUNTDB". Reads no file; always 0.
+    int ConfigLoad();
+
+    // Counts one log from `device`, after closing the sample where the second has changed. Always 0. Its cost
+    // does not depend on the number of devices.
+    int LogInc(std::string device);
+
+    // Closes the current sample when the clock has left the second in which the last one was closed and there
+    // is something to close. Its stamp is the present second. Always 0.
+    int CurEpsUpdate();
+
+    // Whether more than 5 seconds have passed since the call before; true at the first call.
+    bool isNeed2Flush();
+
+    // Writes the closed samples and the histogram to the database, which is created when missing, in one
+    // transaction. Without samples it does nothing. When the file is larger than 5 MiB, samples older than a
+    // day are deleted.
+    //
+    // Returns 0, or -1 after a report; the samples then stay for the next flush. A failed insert of a sample
+    // leaves those before it in the database, and the next flush writes them again.
+    int AccoutingFlush2DB();
+
+    // Writes the figures to the debug channel at level 2.
+    void AccountingDump();
+
+    // Logs counted since construction.
+    int64_t TotalCountGet() const;
+    // Logs counted since the last sample was closed.
+    int64_t CurrentEpsGet() const;
+    // A copy of the histogram: stored devices by name, then devices in the order of their first log.
+    std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
+
+private:
+    struct Device {
+        KELOLOG_LOG_DEVICE_STATISTIC *statistic;
+        int32_t currentCount; // in the sample that is still open
+    };
+
+    KELOSYSLOG_LOCAL Device &DeviceOf(const std::string &name);
+    KELOSYSLOG_LOCAL std::map<std::string, int32_t> CurrentDevices() const;
+    KELOSYSLOG_LOCAL void NotifyEps(uint64_t eps);
+
+    std::string dbPath_;
+    int64_t totalCount_ = 0;
+    int64_t currentSecond_ = 0;
+    int64_t currentCount_ = 0;
+    std::vector<Device *> currentDevices_; // those with logs in the open sample
+    int32_t lastFlushCheck_ = 0;
+    std::list<SYSLOG_LOG_EPS> samples_;
+    std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram_;
+    std::unordered_map<std::string, Device> devices_; // finds a device's histogram entry
+    NotificationManager notifications_;
+};

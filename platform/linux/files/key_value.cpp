@@ -1,0 +1,31 @@
+#include <algorithm>
+#include <cstring>
+
+#include "common/guarded.h"
+#include "files/section_cache.h"
+#include "keloplatform/torvc.h"
+
+using namespace kelo::platform;
+
+int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t size, int) {
+    if (buffer != nullptr && size > 0)
+        buffer[0] = '\0';
+    if (path == nullptr || key == nullptr || buffer == nullptr || size == 0) {
+        errno = EINVAL;
+        return -1;
+    }
+    return Guarded(-1, [&] {
+        const std::shared_ptr<const SectionText> text = LoadSectionText(path);
+        if (text == nullptr)
+            return -1;
+        const std::optional<std::string_view> value = text->FindKey(key);
+        if (!value) {
+            errno = ENOENT;
+            return -1;
+        }
+        const size_t length = std::min(value->size(), size - 1);
+        std::memcpy(buffer, value->data(), length);
+        buffer[length] = '\0';
+        return static_cast<int>(value->size()); // below kMaxTextFileBytes
+    });
+}

@@ -1,0 +1,24 @@
+#include "common/guarded.h"
+#include "keloplatform/kelonotify.h"
+#include "notify/settings.h"
+
+using namespace kelo::platform;
+
+KELOSMSCONF *KELOSmsConfGet() {
+    return Guarded<KELOSMSCONF *>(nullptr, []() -> KELOSMSCONF * {
+        const Settings settings;
+        if (!settings.IsLoaded())
+            return nullptr;
+        auto conf = std::make_unique<KELOSMSCONF>();
+        conf->enabled = settings.IsOn("sms_enabled") ? 1 : 0;
+        const bool complete = settings.CopyTo(conf->url, "sms_url") &&
+                              settings.CopyTo(conf->body, "sms_body") &&
+                              settings.CopyTo(conf->contentType, "sms_content_type") &&
+                              settings.CopyTo(conf->numbers, "sms_to");
+        return complete ? conf.release() : nullptr;
+    });
+}
+
+void KELOSmsConfFree(KELOSMSCONF *conf) {
+    delete conf;
+}

@@ -1,0 +1,124 @@
+#include "notify/spool.h"
+
+#include <fcntl.h>
+#include <json/json.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <cstdio>
+
+#include "common/root.h"
+#include "common/unique_fd.h"
+#include "files/replace_file.h"
+#include "text/utf8.h"
+
+namespace kelo::platform {
+namespace {
+
+constexpr mode_t kFolderMode = 0750;
+constexpr mode_t kEntryMode = 0640; // log texts are not for everybody
+
+// Sorts by time, and no other process or call has the same.
+std::string NewId(const timespec &now) {
+    static std::atomic<unsigned> counter{0};
+    char id[80];
+    std::snprintf(id, sizeof id, "%012lld.%09ld-%ld-%u", static_cast<long long>(now.tv_sec), now.tv_nsec,
+                  static_cast<long>(getpid()), counter++);
+    return id;
+}
+
+std::string ToJson(const SpoolEntry &entry, const std::string &id, time_t now) {
+    Json::Value root;
+    root["version"] = 1;
+    root["id"] = id;
+    root["time"] = static_cast<Json::Int64>(now);
+    root["tag"] = ToValidUtf8(entry.tag);
+    root["language"] = ToValidUtf8(entry.language);
+    root["channels"] = Json::arrayValue;
+    for (const std::string_view channel : entry.channels)
+        root["channels"].append(std::string(channel));
+    root["title"] = entry.message.title;
+    root["body"] = entry.message.body;
+    root["class"] = "";
+    root["values"] = Json::objectValue;
+    for (const TORVSZHASH::Entry &value : entry.values->entries) {
+        if (value.key == kClassKey)
+            root["class"] = ToValidUtf8(value.value);
+        else
+            root["values"][ToValidUtf8(value.key)] = ToValidUtf8(value.value);
+    }
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    builder["emitUTF8"] = true;
+    return Json::writeString(builder, root) + "\n";
+}
+
+UniqueFd OpenExisting(int parent, const std::string &name) {
+    return UniqueFd(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+}
+
+// Opens a folder of the parent, created where it is missing. A created folder is synced into its parent, so
+// that it outlives a crash as its content does.
+UniqueFd OpenOrCreate(int parent, const std::string &name) {
+    UniqueFd folder = OpenExisting(parent, name);
+    if (folder || errno != ENOENT)
+        return folder;
+    // Another process may be quicker.
+    if (mkdirat(parent, name.c_str(), kFolderMode) == 0 ? fsync(parent) != 0 : errno != EEXIST)
+        return UniqueFd();
+    return OpenExisting(parent, name);
+}
+
+// Opens the folder at the absolute `path`, with its parents created where they are missing.
+UniqueFd OpenFolder(const std::string &path) {
+    UniqueFd folder = OpenExisting(AT_FDCWD, path);
+    if (folder || errno != ENOENT)
+        return folder;
+    folder = OpenExisting(AT_FDCWD, "/");
+    for (size_t at = path.find_first_not_of('/'); folder && at < path.size();) {
+        const size_t end = std::min(path.find('/', at), path.size());
+        folder = OpenOrCreate(folder.Get(), path.substr(at, end - at));
+        at = path.find_first_not_of('/', end);
+    }
+    return folder;
+}
+
+} // namespace
+
+std::string SpoolPath() {
+    return RootedPath("/var/spool/kelonotify");
+}
+
+bool AddToSpool(const SpoolEntry &entry) {
+    timespec now{};
+    clock_gettime(CLOCK_REALTIME, &now);
+    const std::string id = NewId(now);
+    const std::string content = ToJson(entry, id, now.tv_sec);
+    const UniqueFd tmp = OpenFolder(SpoolPath() + "/tmp");
+    const UniqueFd fresh = tmp ? OpenFolder(SpoolPath() + "/new") : UniqueFd();
+    if (!fresh)
+        return false;
+
+    const std::string name = id + ".json";
+    const int flags = O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC;
+    const UniqueFd file(openat(tmp.Get(), name.c_str(), flags, kEntryMode));
+    if (!file)
+        return false;
+    if (!WriteAll(file.Get(), content) || fsync(file.Get()) != 0 ||
+        renameat(tmp.Get(), name.c_str(), fresh.Get(), name.c_str()) != 0) {
+        const int cause = errno;
+        unlinkat(tmp.Get(), name.c_str(), 0);
+        errno = cause;
+        return false;
+    }
+    if (fsync(fresh.Get()) == 0)
+        return true;
+    const int cause = errno;
+    unlinkat(fresh.Get(), name.c_str(), 0);
+    errno = cause;
+    return false;
+}
+
+} // namespace kelo::platform

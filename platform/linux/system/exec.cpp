@@ -1,0 +1,75 @@
+#include <fcntl.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+
+#include "keloplatform/torvc.h"
+
+namespace {
+
+// What runs between fork and exec may call async-signal-safe functions only: other threads may hold any lock.
+
+// A fork without the handlers and locks of the C library, whose child sends `exitSignal` at its end. A child
+// that sends none is reaped only by a wait with __WALL: neither a wait for any child elsewhere in the process
+// nor an ignored SIGCHLD takes its status away.
+pid_t Fork(int exitSignal) {
+    return static_cast<pid_t>(syscall(SYS_clone, exitSignal, nullptr, nullptr, nullptr, nullptr));
+}
+
+int AwaitExitStatus(pid_t child) {
+    int status = 0;
+    while (waitpid(child, &status, __WALL) < 0) {
+        if (errno != EINTR)
+            return -1;
+    }
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+void ResetSignals() {
+    struct sigaction standard {};
+    standard.sa_handler = SIG_DFL;
+    for (int number = 1; number < NSIG; ++number)
+        sigaction(number, &standard, nullptr);
+    sigset_t none;
+    sigemptyset(&none);
+    sigprocmask(SIG_SETMASK, &none, nullptr);
+}
+
+// Leaves only standard input and output, both on /dev/null, and standard error.
+void ResetDescriptors() {
+    const int null = open("/dev/null", O_RDWR | O_CLOEXEC);
+    dup2(null, STDIN_FILENO);
+    dup2(null, STDOUT_FILENO);
+    close_range(STDERR_FILENO + 1, ~0U, 0);
+}
+
+[[noreturn]] void RunCommand(const char *program, char *const *arguments) {
+    const pid_t command = Fork(SIGCHLD);
+    if (command == 0) {
+        execv(program, arguments);
+        _exit(127);
+    }
+    _exit(command > 0 && AwaitExitStatus(command) == 0 ? 0 : 1);
+}
+
+} // namespace
+
+int TORVCExec(const char *program, const char *arg1, const char *arg2, const char *arg3, const char *arg4) {
+    if (program == nullptr)
+        return -1;
+    // An exec makes a child visible to every wait again, so the command runs as the child of one that execs
+    // nothing.
+    const char *arguments[] = {program, arg1, arg2, arg3, arg4, nullptr};
+    const pid_t keeper = Fork(0);
+    if (keeper < 0)
+        return -1;
+    if (keeper == 0) {
+        ResetSignals();
+        ResetDescriptors();
+        RunCommand(program, const_cast<char *const *>(arguments));
+    }
+    return AwaitExitStatus(keeper) == 0 ? 0 : -1;
+}

@@ -1,0 +1,47 @@
+#include "system/pid_file.h"
+
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+#include <fstream>
+
+#include "common/root.h"
+#include "common/unique_fd.h"
+
+namespace kelo::platform {
+namespace {
+
+// The kernel cuts a process's name to this length.
+constexpr size_t kNameLength = 15;
+
+std::string NameOf(pid_t pid) {
+    std::string name;
+    std::getline(std::ifstream("/proc/" + std::to_string(pid) + "/comm"), name);
+    return name;
+}
+
+} // namespace
+
+std::string HangUpByPidFile(const std::string &service, const std::string &program) {
+    const std::string path = RootedPath("/run/" + service + ".pid");
+    std::ifstream file(path);
+    if (!file)
+        return "no systemd, and no pid file " + path;
+    pid_t pid = 0;
+    if (!(file >> pid) || pid <= 0)
+        return "no process id in " + path;
+    // The descriptor holds on to the process, so that the one that was checked is the one that gets the
+    // signal.
+    const UniqueFd process(static_cast<int>(syscall(SYS_pidfd_open, pid, 0)));
+    if (process.Get() < 0 || NameOf(pid) != program.substr(0, kNameLength))
+        return "process " + std::to_string(pid) + " of " + path + " is not " + program;
+    // A HUP signal that is still pending swallows this one: the kernel does not queue it twice.
+    if (syscall(SYS_pidfd_send_signal, process.Get(), SIGHUP, nullptr, 0) != 0)
+        return "process " + std::to_string(pid) + ": " + std::strerror(errno);
+    return "";
+}
+
+} // namespace kelo::platform

@@ -1,0 +1,34 @@
+#include <syslog.h>
+#include <systemd/sd-daemon.h>
+
+#include <new>
+
+#include "keloplatform/kelosystem.h"
+#include "system/pid_file.h"
+#include "system/service_manager.h"
+
+namespace {
+
+// The program that a service runs: the package's own service runs a syslog-ng too.
+std::string ProgramOf(const std::string &service) {
+    return service == "pkg-Quillbay-syslog" ? "syslog-ng" : service;
+}
+
+bool IsServiceName(const std::string &service) {
+    return !service.empty() && service.find('/') == std::string::npos &&
+           service.find('\0') == std::string::npos;
+}
+
+} // namespace
+
+bool KELOSystemdReload(const std::string &service) {
+    std::string problem = "not a service name";
+    if (IsServiceName(service)) {
+        problem = sd_booted() > 0 ? kelo::platform::ReloadUnit(service + ".service")
+                                  : kelo::platform::HangUpByPidFile(service, ProgramOf(service));
+    }
+    if (problem.empty())
+        return true;
+    syslog(LOG_ERR, "cannot reload service %s: %s", service.c_str(), problem.c_str());
+    return false;
+}

@@ -1,0 +1,62 @@
+#include "text/sz_hash.h"
+
+#include <algorithm>
+#include <memory>
+
+#include "common/guarded.h"
+
+using kelo::platform::Guarded;
+
+namespace {
+
+// More room than this is made only when there are keys for it.
+constexpr size_t kMaxReserved = 65536;
+
+} // namespace
+
+const TORVSZHASH::Entry *TORVSZHASH::Find(std::string_view key) const {
+    const auto found = index.find(key);
+    return found != index.end() ? found->second : nullptr;
+}
+
+void TORVSZHASH::Set(std::string_view key, std::string_view value) {
+    const auto found = index.find(key);
+    if (found != index.end()) {
+        found->second->value = std::string(value);
+        return;
+    }
+    std::list<Entry> added;
+    added.push_back({std::string(key), std::string(value)});
+    index.emplace(added.front().key, &added.front());
+    entries.splice(entries.end(), added);
+}
+
+TORVSZHASH *TORVCSzHashAlloc(size_t size) {
+    return Guarded<TORVSZHASH *>(nullptr, [&] {
+        auto hash = std::make_unique<TORVSZHASH>();
+        hash->index.reserve(std::min(size, kMaxReserved));
+        return hash.release();
+    });
+}
+
+int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, const char *value) {
+    if (hash == nullptr || *hash == nullptr || key == nullptr || value == nullptr) {
+        errno = EINVAL;
+        return -1;
+    }
+    return Guarded(-1, [&] {
+        (*hash)->Set(key, value);
+        return 0;
+    });
+}
+
+const char *TORVCSzHashGetValue(const TORVSZHASH *hash, const char *key) {
+    if (hash == nullptr || key == nullptr)
+        return nullptr;
+    const TORVSZHASH::Entry *entry = hash->Find(key);
+    return entry != nullptr ? entry->value.c_str() : nullptr;
+}
+
+void TORVCSzHashFree(TORVSZHASH *hash) {
+    delete hash;
+}

@@ -1,0 +1,122 @@
+#include <sqlite3.h>
+#include <sys/stat.h>
+
+#include <memory>
+#include <new>
+
+#include "common/root.h"
+#include "kelosyslog/accounting.h"
+#include "kelosyslog/dbhandler.h"
+#include "kelosyslog/debuger.h"
+#include "kelosyslog/utils.h"
+
+namespace {
+
+constexpr off_t kTrimAboveBytes = 5242880;
+
+struct SqliteFree {
+    void operator()(char *text) const { sqlite3_free(text); }
+};
+
+template <typename... Arguments>
+std::string Format(const char *format, Arguments... arguments) {
+    const std::unique_ptr<char, SqliteFree> text(sqlite3_mprintf(format, arguments...));
+    if (text == nullptr)
+        throw std::bad_alloc();
+    return text.get();
+}
+
+void ReportFailedStatement(const std::string &sql) {
+    Debuger::MSG(0, "Fail to execute SQL command: " + sql);
+}
+
+// The database of one flush. Whatever happened, the transaction is ended and the connection closed.
+class FlushDatabase {
+public:
+    explicit FlushDatabase(const std::string &path)
+        : path_(path), db_(path, kelo::RootedPath("/usr/kelo/syslog/schema/accinfo.sql")) {}
+    ~FlushDatabase() {
+        db_.DBTranEnd();
+        db_.DBDiscon();
+    }
+    FlushDatabase(const FlushDatabase &) = delete;
+    FlushDatabase &operator=(const FlushDatabase &) = delete;
+
+    bool Connect() {
+        if (db_.DBCon() < 0) {
+            Debuger::MSG(0, "Fail to connect db");
+            return false;
+        }
+        db_.DBTranStart();
+        return true;
+    }
+
+    // A failure leaves the samples before it in the transaction, to be committed.
+    bool WriteSample(const SYSLOG_LOG_EPS &sample) {
+        const std::string stamp = std::to_string(sample.stamp);
+        for (const auto &[device, count] : sample.devices) {
+            const std::string sql = Format("INSERT INTO eps VALUES(NULL, '%q', '%q', '%q');", stamp.c_str(),
+                                           device.c_str(), std::to_string(count).c_str());
+            if (db_.DBExecute(sql) < 0) {
+                ReportFailedStatement(sql);
+                return false;
+            }
+        }
+        return true;
+    }
+
+    // A failure rolls the whole flush back.
+    bool WriteStatistic(const KELOLOG_LOG_DEVICE_STATISTIC &statistic) {
+        const std::string sql = Format("INSERT OR REPLACE INTO histogram VALUES(NULL, '%q', %q);",
+                                       statistic.device.c_str(), ullNumberToString(statistic.count).c_str());
+        if (db_.DBExecute(sql) >= 0)
+            return true;
+        db_.DBTranRollback();
+        ReportFailedStatement(sql);
+        return false;
+    }
+
+    // Deletes old samples from a file that has grown large. Only a file whose size cannot be told is a
+    // failure.
+    bool Trim() {
+        struct stat status {};
+        if (stat(path_.c_str(), &status) != 0) {
+            Debuger::MSG(0, "Fail to state file status: " + path_);
+            return false;
+        }
+        if (!S_ISREG(status.st_mode)) {
+            Debuger::MSG(0, "Working database is not regular file");
+            return false;
+        }
+        const std::string sql = "DELETE FROM eps WHERE stamp < strftime('%s', 'now') - 24*60*60;";
+        if (status.st_size > kTrimAboveBytes && db_.DBExecute(sql) < 0)
+            ReportFailedStatement(sql);
+        return true;
+    }
+
+private:
+    const std::string &path_;
+    DBHandler db_;
+};
+
+} // namespace
+
+int AccountingManager::AccoutingFlush2DB() {
+    if (samples_.empty())
+        return 0;
+    FlushDatabase db(dbPath_);
+    if (!db.Connect())
+        return -1;
+    for (const SYSLOG_LOG_EPS &sample : samples_) {
+        if (!db.WriteSample(sample))
+            return -1;
+    }
+    for (const KELOLOG_LOG_DEVICE_STATISTIC &statistic : histogram_) {
+        if (!db.WriteStatistic(statistic))
+            return -1;
+    }
+    if (!db.Trim())
+        return -1;
+    samples_.clear();
+    return 0;
+}

@@ -1,0 +1,153 @@
+#include "kelosyslog/dbhandler.h"
+
+#include <unistd.h>
+
+#include <memory>
+#include <new>
+#include <utility>
+
+#include "common/db_handles.h"
+#include "db/catalogue.h"
+#include "db/first_row.h"
+#include "keloplatform/kelodb.h"
+#include "keloplatform/torvc.h"
+#include "kelosyslog/debuger.h"
+
+DBHandler::DBHandler(std::string dbPath, std::string schemaPath)
+    : schemaPath_(std::move(schemaPath)), dbPath_(std::move(dbPath)) {}
+
+int DBHandler::DBCon() {
+    if (connection_ != nullptr) {
+        Debuger::MSG(0, "Connection is already existed");
+        return -1;
+    }
+    if (!TORVCFileExist(dbPath_.c_str())) {
+        Debuger::MSG(2, "Database is not existed: " + dbPath_);
+        if (DBCreate() != 0) {
+            Debuger::MSG(0, "Fail to create database: " + dbPath_);
+            return -1;
+        }
+    }
+    connection_ = kelo::Connect(dbPath_).release();
+    if (connection_ == nullptr) {
+        Debuger::MSG(0, "Fail to open db: " + dbPath_);
+        return -1;
+    }
+    return 0;
+}
+
+int DBHandler::DBDiscon() {
+    if (connection_ != nullptr)
+        KELODBClose(std::exchange(connection_, nullptr));
+    return 0;
+}
+
+bool DBHandler::isConnected() const {
+    return connection_ != nullptr;
+}
+
+int32_t DBHandler::isInTran() const {
+    return inTransaction_;
+}
+
+int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *context) {
+    if (connection_ == nullptr) {
+        Debuger::MSG(0, "DB is not connected");
+        return -1;
+    }
+    DBResult_tag *raw = nullptr;
+    if (KELODBExecute(connection_, sql.c_str(), &raw) < 0) {
+        DBErrorHandle(sql);
+        return -1;
+    }
+    const kelo::DbResult result(raw);
+    if (callback != nullptr)
+        callback(result.get(), context);
+    return 0;
+}
+
+int DBHandler::DBExecute(std::string sql) {
+    if (connection_ == nullptr)
+        return -1;
+    if (KELODBExecute(connection_, sql.c_str(), nullptr) < 0) {
+        DBErrorHandle(sql);
+        return -1;
+    }
+    return 0;
+}
+
+int DBHandler::RunTransactionStatement(const char *operation, int32_t forbiddenFlag, const char *sql,
+                                       const char *failure) {
+    if (connection_ == nullptr || inTransaction_ == forbiddenFlag) {
+        Debuger::MSG(0, std::string("Fail to check sanity (") + operation + ")");
+        return -1;
+    }
+    if (KELODBExecute(connection_, sql, nullptr) < 0) {
+        Debuger::MSG(0, failure);
+        return -1;
+    }
+    return 0;
+}
+
+int DBHandler::DBTranStart() {
+    if (RunTransactionStatement("DBTranStart", 1, "BEGIN;", "Fail to begin transaction") != 0)
+        return -1;
+    inTransaction_ = 1;
+    return 0;
+}
+
+int DBHandler::DBTranEnd() {
+    if (RunTransactionStatement("DBTranEnd", 0, "END;", "Fail to end transaction") != 0)
+        return -1;
+    inTransaction_ = 0;
+    return 0;
+}
+
+int DBHandler::DBTranRollback() {
+    if (RunTransactionStatement("DBTranRollback", 0, "ROLLBACK;", "Fail to rollback transaction") != 0)
+        return -1;
+    inTransaction_ = 0;
+    return 0;
+}
+
+std::string DBHandler::DBCmdEscape(std::string text) {
+    const size_t size = 2 * text.size() + 1;
+    const std::unique_ptr<char[]> escaped(new (std::nothrow) char[size]);
+    if (escaped == nullptr) {
+        Debuger::MSG(0, "Fail to allocate memory");
+        return "";
+    }
+    if (KELODBEscapeStringEX(connection_, escaped.get(), size, text.c_str(), text.size()) < 0) {
+        Debuger::MSG(0, "Fail to escapse string");
+        return "";
+    }
+    return escaped.get();
+}
+
+int DBHandler::DBWalCheckpoint(bool removeFiles) {
+    if (KELODBExecute(connection_, "PRAGMA wal_checkpoint(FULL);", nullptr) < 0) {
+        Debuger::MSG(0, "Fail to force WAL checkpoint(FULL)");
+        return -1;
+    }
+    if (removeFiles) {
+        unlink((dbPath_ + "-wal").c_str());
+        unlink((dbPath_ + "-shm").c_str());
+    }
+    return 0;
+}
+
+bool DBHandler::DBcheckTableExist(std::string table) {
+    const std::string sql = kelo::CatalogueQuery(table);
+    int32_t count = 0;
+    const auto readCount = [](DBResult_tag *result, void *context) {
+        uint32_t row = 0;
+        if (kelo::FirstRow(result, row))
+            *static_cast<int32_t *>(context) = kelo::ParseInt32(kelo::FieldText(result, row, "count_result"));
+        return 0;
+    };
+    if (DBExecute(sql, readCount, &count) != 0) {
+        Debuger::MSG(0, "Fail to execute SQL command : " + sql);
+        return false;
+    }
+    return count != 0;
+}

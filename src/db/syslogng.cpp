@@ -1,0 +1,42 @@
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "common/report.h"
+#include "common/root.h"
+#include "db/shell.h"
+#include "keloplatform/kelosystem.h"
+#include "keloplatform/torvc.h"
+#include "kelosyslog/dbhandler.h"
+
+int32_t SyslogngHupSignalSend() {
+    const bool packageEnabled = TORVCFileExist(kelo::RootedPath("/var/packages/Quillbay/enabled").c_str());
+    const std::string service = packageEnabled ? "pkg-Quillbay-syslog" : "syslog-ng";
+    if (!KELOSystemdReload(service)) {
+        kelo::ReportError("Fail to send HUP signal to " + service);
+        return -1;
+    }
+    return 0;
+}
+
+int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib) {
+    struct stat status {};
+    if (stat(dbPath.c_str(), &status) != 0)
+        return -1;
+    if (!S_ISREG(status.st_mode)) {
+        kelo::ReportError("Working database is not regular file");
+        return -1;
+    }
+    if (int64_t{status.st_size} / 1024 > limitKib) {
+        unlink(dbPath.c_str());
+        SyslogngHupSignalSend();
+    }
+    return 0;
+}
+
+int32_t SyslogngWorkingDbSetJouWal(std::string dbPath) {
+    if (!kelo::RunShell("/usr/bin/sqlite3 " + dbPath + " \"PRAGMA journal_mode=WAL;\"")) {
+        kelo::ReportError("Fail to set jounal mode as WAL, use DELETE by default");
+        return -1;
+    }
+    return 0;
+}

@@ -1,0 +1,71 @@
+#include <unistd.h>
+
+#include <cstdio>
+#include <ctime>
+#include <memory>
+
+#include "kelosyslog/logger.h"
+
+namespace {
+
+struct CloseFile {
+    void operator()(FILE *file) const { std::fclose(file); }
+};
+using File = std::unique_ptr<FILE, CloseFile>;
+
+std::string LocalTime(int64_t utcsec) {
+    const auto time = static_cast<time_t>(utcsec);
+    tm parts{};
+    char text[1024] = {};
+    if (localtime_r(&time, &parts) != nullptr)
+        std::strftime(text, sizeof text, "%Y-%m-%dT%H:%M:%S", &parts);
+    return text;
+}
+
+// Users and events go out as they are, for the programs that read this page expect it so.
+void WriteEvent(FILE *page, const _SSYSLOG_LOG_LOG_tag &event) {
+    char level[1024] = {};
+    szLevelGet(event.level, level, sizeof level);
+    std::fprintf(page,
+                 "<tr>\n"
+                 "<td align=\"center\">%s</td>\n"
+                 "<td align=\"center\">%s</td>"
+                 "<td align=\"center\">%s</td>"
+                 "<td align=\"left\">%s</td>"
+                 "</tr>\n",
+                 level, LocalTime(event.time).c_str(), event.user.c_str(), event.event.c_str());
+}
+
+void WritePage(FILE *page, const std::list<_SSYSLOG_LOG_LOG_tag> &events) {
+    std::fputs("<html><head>\n"
+               "<meta http-equiv=\"Content-Type\" content=\"text/html; charset=utf-8;\">\n"
+               "<title>Syslog Server Log</title>\n"
+               "</head>\n"
+               "<body>\n"
+               "<center><h2> Syslog Server Log </h2></center>\n"
+               "<table border=1 width=95%>\n"
+               "<tr>\n"
+               "<th>Type</th><th>Time</th><th>User</th><th>Event</th></tr>\n",
+               page);
+    for (const _SSYSLOG_LOG_LOG_tag &event : events)
+        WriteEvent(page, event);
+    std::fputs("</table></body></html>\n", page);
+}
+
+} // namespace
+
+int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPath) {
+    if (dbPath.empty() || second.empty() || outPath.empty())
+        return -1;
+    const std::list<_SSYSLOG_LOG_LOG_tag> events = LogEnum(dbPath, 0, 0);
+    if (events.empty())
+        return 0;
+    const File page(std::fopen(outPath.c_str(), "w+"));
+    if (page != nullptr)
+        WritePage(page.get(), events);
+    return 0;
+}
+
+int Logger::LogHtmlRemove(std::string path) {
+    return path.empty() ? -1 : unlink(path.c_str());
+}

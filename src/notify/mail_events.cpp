@@ -1,0 +1,56 @@
+#include "common/report.h"
+#include "common/sz_handles.h"
+#include "kelosyslog/notification.h"
+#include "notify/service.h"
+
+namespace {
+
+int SendShareEvent(const char *tag, const char *share) {
+    if (share == nullptr)
+        return -1;
+    kelo::SzHash values;
+    if (!values || !values.Set("%SHARED_FOLDER%", share))
+        return -1;
+    return SyslogMailSend(tag, values.Address()) < 0 ? -1 : 0;
+}
+
+int SendContentEvent(const char *tag, const char *placeholder, const char *value, const char *content) {
+    if (value == nullptr || content == nullptr)
+        return -1;
+    kelo::SzHash values;
+    if (!values)
+        return -1;
+    const std::optional<std::string> escaped = kelo::EscapeContent(content);
+    if (!escaped || !values.Set(placeholder, value) || !values.Set("%SYSLOG_CONTENT%", *escaped))
+        return -1;
+    return SyslogMailSend(tag, values.Address()) < 0 ? -1 : 0;
+}
+
+} // namespace
+
+int SyslogMailSend(const char *tag, TORVSZHASH **hash) {
+    if (kelo::SendToService(tag, hash) >= 0)
+        return 0;
+    kelo::ReportError(std::string("Fail to send notification: ") + (tag != nullptr ? tag : ""));
+    return -1;
+}
+
+int SyslogMailShareRemove(const char *share) {
+    return SendShareEvent("KELOSYSLOG_ShareRemove", share);
+}
+int SyslogMailShareRename(const char *share) {
+    return SendShareEvent("KELOSYSLOG_ShareRename", share);
+}
+int SyslogMailShareEncMount(const char *share) {
+    return SendShareEvent("KELOSYSLOG_ShareEncMount", share);
+}
+int SyslogMailShareEncUnmount(const char *share) {
+    return SendShareEvent("KELOSYSLOG_ShareEncUnmount", share);
+}
+
+int SyslogMailSeverityExceeded(const char *sev, const char *content) {
+    return SendContentEvent("KELOSYSLOG_SEV_EXCEED", "%SEV%", sev, content);
+}
+int SyslogMailKeywordMatched(const char *keyword, const char *content) {
+    return SendContentEvent("KELOSYSLOG_KEYWORD_MATCH", "%KEYWORD%", keyword, content);
+}
