@@ -8,3 +8,7 @@ if(KELO_SANITIZE)
     add_compile_options(-fsanitize=${KELO_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     add_link_options(-fsanitize=${KELO_SANITIZE})
 endif()
+if(KELO_BUILD_FUZZ)
+    # The libraries too tell libFuzzer which ways their code went.
+    add_compile_options(-fsanitize=fuzzer-no-link)
+endif()

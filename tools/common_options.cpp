@@ -9,11 +9,10 @@ namespace kelo::tool {
 
 void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTable) {
     const std::string group = "Where to look";
-    CLI::Option *db = AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
+    AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
     AddText(command, "--log", options.log, "NAME",
             "One of the system's logs: " + KnownLogNames() + " (default: logs)")
-        ->group(group)
-        ->excludes(db);
+        ->group(group);
     if (withTable)
         AddText(
             command, "--table", options.table, "TABLE",

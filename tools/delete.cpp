@@ -49,27 +49,24 @@ bool Confirm(const std::string &question) {
     return answer == "y" || answer == "Y" || answer == "yes";
 }
 
-// Deletes what is selected up to `lastId`, hopping from one selected log to the next, so that neither gaps
-// between the ids nor rare matches make it slow.
-void DeleteUpTo(const LogReader &reader, const Conditions &conditions, uint64_t lastId) {
-    const LogSource &source = reader.Source();
-    uint64_t next = 1;
-    bool isBegun = false;
-    while (next <= lastId) {
-        const uint64_t first = reader.FirstId({next, lastId});
-        if (first == 0)
-            return;
-        const uint64_t last = std::min(first + kStepIds - 1, lastId);
-        Conditions step = conditions;
-        step.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_GE, std::to_string(first), {}});
-        step.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_LE, std::to_string(last), {}});
-        if (SyslogDBDelete(source.path, step) != 0)
-            throw DatabaseError(
-                DescribeDatabaseProblem(source, true) +
-                (isBegun ? "; matching logs before id " + std::to_string(first) + " are deleted" : ""));
-        isBegun = true;
-        next = last + 1;
+// Deletes what is selected up to `lastId`, range by range, hopping over ranges without a match. Returns how
+// many logs matched right before each step.
+uint64_t DeleteUpTo(const LogReader &reader, uint64_t lastId) {
+    const std::string &path = reader.Source().path;
+    uint64_t deleted = 0;
+    uint64_t next = reader.FirstId({1, lastId});
+    while (next != 0 && next <= lastId) {
+        const IdRange step{next, std::min(next + kStepIds - 1, lastId)};
+        const uint64_t count = reader.CountIn(step);
+        Conditions conditions = reader.Selected();
+        AddRange(conditions, step);
+        if (count > 0 && SyslogDBDelete(path, conditions) != 0)
+            throw DatabaseError(DescribeDatabaseProblem(reader.Source(), true) +
+                                (deleted > 0 ? "; " + Logs(deleted) + " were deleted before" : ""));
+        deleted += count;
+        next = count > 0 ? step.last + 1 : reader.FirstId({step.last + 1, lastId});
     }
+    return deleted;
 }
 
 int Run(const Options &options, const std::string &root) {
@@ -82,8 +79,7 @@ int Run(const Options &options, const std::string &root) {
     if (source.kind != TableKind::Logs)
         throw UsageError("--log: logs can be deleted from table logs only, not from '" + options.source.log +
                          "'");
-    const Conditions conditions = MakeConditions(options.selection, source, std::time(nullptr));
-    const LogReader reader(source, conditions);
+    const LogReader reader(source, MakeConditions(options.selection, source, std::time(nullptr)));
 
     const uint64_t newest = reader.IdFromNewest(0);
     const uint64_t count = newest == 0 ? 0 : reader.Count();
@@ -98,8 +94,8 @@ int Run(const Options &options, const std::string &root) {
         PrintMessage("nothing deleted");
         return kExitNothing;
     }
-    DeleteUpTo(reader, conditions, newest);
-    output.Write("deleted " + what + "\n");
+    const uint64_t deleted = DeleteUpTo(reader, newest);
+    output.Write("deleted " + Logs(deleted) + " from " + source.path + "\n");
     output.Finish();
     return kExitFound;
 }

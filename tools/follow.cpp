@@ -2,6 +2,7 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <chrono>
 #include <ctime>
 
@@ -41,9 +42,9 @@ uint64_t Follow(const LogReader &reader, const FollowOptions &options, const Log
     const uint64_t newest = everything.IdFromNewest(0);
     uint64_t count = 0;
     if (options.showAll)
-        count = reader.WalkPage({}, printAndRemember);
+        count = reader.WalkPage({}, true, printAndRemember);
     else if (options.lines > 0)
-        count = reader.WalkPage({options.lines, 0}, printAndRemember);
+        count = reader.WalkPage({options.lines, 0}, true, printAndRemember);
     lastId = std::max(lastId, newest);
     output.Flush();
 
@@ -59,7 +60,7 @@ uint64_t Follow(const LogReader &reader, const FollowOptions &options, const Log
             file = current;
             const uint64_t seen = everything.IdFromNewest(0);
             if (seen > lastId) {
-                news = reader.Walk({lastId + 1, seen}, true, {}, printAndRemember);
+                news = reader.Walk({lastId + 1, seen}, true, 0, printAndRemember);
                 lastId = seen;
             }
         }

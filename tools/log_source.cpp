@@ -81,6 +81,8 @@ std::string ReasonFromOutside(const LogSource &source, bool forWriting) {
 } // namespace
 
 LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root) {
+    if (!options.db.empty() && !options.log.empty())
+        throw UsageError("--log: goes not together with --db");
     LogSource source;
     if (!options.db.empty()) {
         source.path = std::filesystem::absolute(options.db).string();

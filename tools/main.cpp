@@ -2,6 +2,7 @@
 
 #include <csignal>
 
+#include "help_formatter.h"
 #include "program.h"
 
 int main(int argc, char **argv) {
@@ -12,13 +13,14 @@ int main(int argc, char **argv) {
     program.app.name("kelosyslog");
     program.app.description("Search and maintain the logs of a log server.");
     program.app.set_version_flag("--version", "kelosyslog " KELOSYSLOG_VERSION);
-    program.app.require_subcommand(1);
-    program.app.footer("'kelosyslog COMMAND --help' tells about one command.\n"
+    program.app.formatter(std::make_shared<kelo::tool::HelpFormatter>());
+    program.app.footer("'kelosyslog COMMAND --help' tells about one command; --root goes with each.\n\n"
                        "Exit status: 0 found or done, 1 nothing matched, 2 usage, 3 database, 4 output.");
 
     kelo::tool::AddSearch(program);
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
+    kelo::tool::AddValues(program);
     kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

@@ -101,16 +101,18 @@ void PrintMessage(const std::string &text) {
 }
 
 int RunProgram(Program &program, int argc, const char *const *argv) {
-    AddText(program.app, "--root", program.root, "DIR", "Use the log databases of the system below DIR");
+    AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
     try {
         std::vector<std::string> arguments = SplitEmptyValues(argc, argv);
         program.app.parse(arguments);
+        if (!program.run)
+            throw UsageError("a command is missing (see --help)");
         ApplyRoot(program.root);
         return program.run();
     } catch (const CLI::Success &request) { // --help, --version
         return program.app.exit(request);
     } catch (const CLI::ParseError &error) {
-        return ReportUsage(error.what());
+        return ReportUsage(std::string(error.what()) + " (see --help)");
     } catch (const UsageError &error) {
         return ReportUsage(error.what());
     } catch (const OutputClosed &) {

@@ -166,25 +166,13 @@ public:
         std::vector<std::string> names;
         for (const RecordField *field : Layout().fields)
             names.emplace_back(field->name);
-        AppendLine(out, names);
+        AppendCsvLine(out, names);
     }
     void Add(const Log &log, std::string &out) override {
         std::vector<std::string> values;
         for (const RecordField *field : Layout().fields)
             values.push_back(Value(*field, log, &TimeFormat::Iso));
-        AppendLine(out, values);
-    }
-
-private:
-    static void AppendLine(std::string &out, const std::vector<std::string> &values) {
-        for (const std::string &value : values) {
-            if (&value != &values.front())
-                out += ',';
-            AppendCsvField(out, value);
-        }
-        if (values.size() == 1 && values[0].empty())
-            out += "\"\""; // an empty line would be no record to most readers
-        out += "\r\n";
+        AppendCsvLine(out, values);
     }
 };
 

@@ -82,13 +82,8 @@ int Run(const Options &options, const std::string &root) {
         writer->Add(log, text);
         send();
     };
-    uint64_t count = 0;
-    if (options.follow)
-        count = Follow(reader, follow, print, output);
-    else if (options.newestFirst)
-        count = reader.Walk({}, false, page, print);
-    else
-        count = reader.WalkPage(page, print);
+    const uint64_t count = options.follow ? Follow(reader, follow, print, output)
+                                          : reader.WalkPage(page, !options.newestFirst, print);
     writer->End(text);
     send();
     output.Finish();

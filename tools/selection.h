@@ -14,13 +14,13 @@ namespace kelo::tool {
 // Which logs a command is about, as the user wrote it. Values of one option are alternatives, the options
 // together narrow the selection.
 struct Selection {
-    std::string since; // "" for no bound
-    std::string until;
-    std::vector<std::string> levels;
-    std::vector<std::string> facilities;
-    std::vector<std::string> hosts;
-    std::vector<std::string> programs;
-    std::vector<std::string> keywords;
+    std::string since = {}; // "" for no bound
+    std::string until = {};
+    std::vector<std::string> levels = {};
+    std::vector<std::string> facilities = {};
+    std::vector<std::string> hosts = {};
+    std::vector<std::string> programs = {};
+    std::vector<std::string> keywords = {};
 };
 
 bool IsEmpty(const Selection &selection);

@@ -62,6 +62,20 @@ char ShortEscape(uint32_t code) {
     }
 }
 
+void AppendCsvField(std::string &out, std::string_view text) {
+    if (text.find_first_of(",\"\r\n") == std::string_view::npos) {
+        out += text;
+        return;
+    }
+    out += '"';
+    for (const char byte : text) {
+        if (byte == '"')
+            out += '"';
+        out += byte;
+    }
+    out += '"';
+}
+
 } // namespace
 
 std::string VisibleText(std::string_view text) {
@@ -109,18 +123,15 @@ void AppendJsonString(std::string &out, std::string_view text) {
     out += '"';
 }
 
-void AppendCsvField(std::string &out, std::string_view text) {
-    if (text.find_first_of(",\"\r\n") == std::string_view::npos) {
-        out += text;
-        return;
+void AppendCsvLine(std::string &out, const std::vector<std::string> &fields) {
+    for (const std::string &field : fields) {
+        if (&field != &fields.front())
+            out += ',';
+        AppendCsvField(out, field);
     }
-    out += '"';
-    for (const char byte : text) {
-        if (byte == '"')
-            out += '"';
-        out += byte;
-    }
-    out += '"';
+    if (fields.size() == 1 && fields[0].empty())
+        out += "\"\""; // an empty line would be no record to most readers
+    out += "\r\n";
 }
 
 } // namespace kelo::tool

@@ -2,6 +2,7 @@
 
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace kelo::tool {
 
@@ -19,7 +20,8 @@ size_t CharacterCount(std::string_view text);
 // UTF-8 becomes U+FFFD.
 void AppendJsonString(std::string &out, std::string_view text);
 
-// Appends the text as a field of RFC 4180: between double quotes where it needs them, bytes unchanged.
-void AppendCsvField(std::string &out, std::string_view text);
+// Appends a record of RFC 4180 with its line end: fields stand between double quotes where they need them,
+// and their bytes are unchanged.
+void AppendCsvLine(std::string &out, const std::vector<std::string> &fields);
 
 } // namespace kelo::tool

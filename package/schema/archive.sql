@@ -1,4 +1,4 @@
--- An archived log database: the logs and the one row that describes them.
+-- An archived log database: the logs, as in logs.sql, and the one row that describes them.
 CREATE TABLE IF NOT EXISTS logs (
     id INTEGER PRIMARY KEY AUTOINCREMENT,
     host TEXT,
@@ -14,6 +14,10 @@ CREATE TABLE IF NOT EXISTS logs (
     prog TEXT,
     msg TEXT
 );
+CREATE INDEX IF NOT EXISTS logs_utcsec_idx ON logs (utcsec);
+CREATE INDEX IF NOT EXISTS logs_ldate_idx ON logs (ldate);
+CREATE INDEX IF NOT EXISTS logs_host_idx ON logs (host);
+CREATE INDEX IF NOT EXISTS logs_prog_idx ON logs (prog);
 CREATE TABLE IF NOT EXISTS db_info (
     id INTEGER PRIMARY KEY,
     start_time INTEGER,

@@ -17,11 +17,12 @@ namespace kelo::test {
 namespace {
 
 struct State {
-    bool isActive = false;
+    bool isFailing = false;
     int count = 0;
     int failFirst = 0;
     int failTimes = 0;
     bool hasFailed = false;
+    bool isCounting = false;
     int liveBlocks = 0;
 };
 constinit thread_local State state;
@@ -33,28 +34,34 @@ bool AllocationFaults::IsSupported() {
 }
 
 void AllocationFaults::Start(int first, int times) {
-    state = {true, 0, first, times, false, 0};
+    state.isFailing = true;
+    state.count = 0;
+    state.failFirst = first;
+    state.failTimes = times;
+    state.hasFailed = false;
 }
 
 bool AllocationFaults::Stop() {
-    state.isActive = false;
+    state.isFailing = false;
     return state.hasFailed;
 }
 
-int AllocationFaults::LiveBlocks() {
+void AllocationFaults::StartCounting() {
+    state.isCounting = true;
+    state.liveBlocks = 0;
+}
+
+int AllocationFaults::StopCounting() {
+    state.isCounting = false;
     return state.liveBlocks;
 }
 
 #if KELO_OWN_ALLOCATOR
 namespace {
 
-bool IsWatched() {
-    return state.isActive && !FaultPause::IsActive();
-}
-
 // Counts an allocation and tells whether it has to fail.
 bool MustFail() {
-    if (!IsWatched())
+    if (!state.isFailing || FaultPause::IsActive())
         return false;
     ++state.count;
     if (state.count < state.failFirst || state.count - state.failFirst >= state.failTimes)
@@ -65,7 +72,7 @@ bool MustFail() {
 }
 
 void CountBlock(const void *block, int change) {
-    if (block != nullptr && IsWatched())
+    if (block != nullptr && state.isCounting && !FaultPause::IsActive())
         state.liveBlocks += change;
 }
 

@@ -9,13 +9,16 @@ class AllocationFaults {
 public:
     static bool IsSupported();
 
-    // Makes the `first`-th allocation from now fail (1 is the next one) and `times - 1` more after it, and
-    // starts counting blocks. Allocations under a FaultPause are neither failed nor counted.
+    // Makes the `first`-th allocation from now fail (1 is the next one) and `times - 1` more after it, but
+    // none under a FaultPause.
     static void Start(int first, int times);
-    // Ends both. Returns whether an allocation failed.
+    // Makes nothing fail any more. Returns whether an allocation failed since Start.
     static bool Stop();
-    // Blocks allocated and not freed between Start and Stop.
-    static int LiveBlocks();
+
+    // Counts blocks that are allocated and not freed, but those under a FaultPause, until the count is taken.
+    // Always 0 where this is not supported.
+    static void StartCounting();
+    static int StopCounting();
 };
 
 } // namespace kelo::test

@@ -246,16 +246,22 @@ std::string Damaged(std::string content, std::mt19937 &random) {
 
 TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
     FileFaults::Install();
-    const std::string sound = ContentOfSingleFile();
     const TempRoot root;
     const std::string path = root.File("logs.db");
+    CreateSingleFile(path);
+    RunSql(path, "PRAGMA journal_mode = WAL");
+    InsertLogsIntoWal(path, {SampleLog(203), SampleLog(204)});
+    const std::string database = ReadFile(path);
+    const std::string wal = ReadFile(path + "-wal");
+    ASSERT_GT(wal.size(), 4096u);
     std::mt19937 random(20200102); // repeatable
     int failures = 0;
     for (int round = 0; round < 1000; ++round) {
         SCOPED_TRACE(round);
-        for (const char *suffix : {"-wal", "-shm", "-journal"})
-            fs::remove(path + suffix);
-        WriteFile(path, Damaged(sound, random));
+        fs::remove(path + "-shm");
+        const bool hitsWal = round % 4 == 0;
+        WriteFile(path, hitsWal ? database : Damaged(database, random));
+        WriteFile(path + "-wal", hitsWal ? Damaged(wal, random) : round % 4 == 1 ? wal : "");
         int rows = 0;
         const int select = SyslogDBSelect(path, kFromHost3, nullptr, nullptr, CountRow, &rows, true);
         const int count = SyslogDBSelectCount(path, {}, nullptr, nullptr);

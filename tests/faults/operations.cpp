@@ -2,7 +2,8 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sqlite3.h>
+
+#include <map>
 
 #include "support/fault_pause.h"
 #include "support/log_database.h"
@@ -43,15 +44,10 @@ void SetUpLogs(Ground &ground) {
     ground.database = ground.root.File("logs.db");
     CreateLogDatabase(ground.database);
     InsertSampleLogs(ground.database, kRows - 10);
-    sqlite3 *holder = nullptr;
-    ASSERT_EQ(sqlite3_open(ground.database.c_str(), &holder), SQLITE_OK);
-    ASSERT_EQ(sqlite3_exec(holder, "SELECT count(*) FROM logs", nullptr, nullptr, nullptr), SQLITE_OK);
     std::vector<_SYSLOG_LOG_DATA_tag> newest;
     for (int number = kRows - 10; number < kRows; ++number)
         newest.push_back(SampleLog(number));
-    InsertLogs(ground.database, newest);
-    sqlite3_db_config(holder, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
-    sqlite3_close(holder);
+    InsertLogsIntoWal(ground.database, newest);
 }
 
 void SetUpLogsOfHost3(Ground &ground) {
@@ -118,6 +114,11 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
+Operation WithRegexes(Operation operation) {
+    operation.survivesOutOfMemory = false;
+    return operation;
+}
+
 // A deletion, after which the ids `left` are left. A failed one has deleted either everything it should or
 // nothing, and nothing when the statement never ran.
 Operation Delete(const char *name, std::function<void(Ground &)> setUp, std::string left) {
@@ -134,6 +135,17 @@ Operation Delete(const char *name, std::function<void(Ground &)> setUp, std::str
         EXPECT_THAT(outcome.messages, IsEmpty());
     };
     return {name, true, std::move(setUp), run, check};
+}
+
+// Either map is whole or empty.
+void CheckStatistics(const Ground &ground, const Outcome &outcome) {
+    const Lines counts = {"a 5", "b 7"};
+    const Lines samples = {"100 3", "200 4"};
+    if (outcome.IsDone())
+        EXPECT_EQ(ground.seen, (Lines{"a 5", "b 7", "100 3", "200 4"}));
+    else
+        EXPECT_THAT(ground.seen, AnyOf(IsEmpty(), counts, samples));
+    EXPECT_THAT(outcome.messages, IsEmpty());
 }
 
 int SelectWith(Ground &ground, _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order) {
@@ -159,10 +171,18 @@ int Count(Ground &ground) {
     return TakeCount(ground, SyslogDBSelectCount(ground.database, ground.conditions, nullptr, nullptr));
 }
 
-int CountByForm(Ground &ground) {
+int CountByKeyword(Ground &ground, const char *keyword) {
     std::list<_SYSLOG_SQL_COND_tag> conditions;
-    LogSearchCondListGen("host03,host99", "any", "", "", "closed", "2020/01/01", "0", conditions);
+    LogSearchCondListGen("host03,host99", "any", "", "", keyword, "2020/01/01", "0", conditions);
     return TakeCount(ground, SyslogDBSelectCount(ground.database, conditions, nullptr, nullptr));
+}
+
+int CountByForm(Ground &ground) {
+    return CountByKeyword(ground, "\"request 3\" FAILED OR clos?d -absent");
+}
+
+int CountByRegex(Ground &ground) {
+    return CountByKeyword(ground, "/request 3.*closed/ -/request \\d\\d/");
 }
 
 int GetHosts(Ground &ground) {
@@ -172,6 +192,27 @@ int GetHosts(Ground &ground) {
     const FaultPause pause;
     ground.seen.assign(hosts.begin(), hosts.end());
     return result;
+}
+
+// The statistics, which answer with an empty map instead of a failure.
+int GetStatistics(Ground &ground) {
+    const std::map<std::string, uint64_t> counts = SyslogDBHistGet(ground.database, 2);
+    const std::map<int, SYSLOG_LOG_EPS> samples = SyslogDBEpsGet(ground.database, 100, 300);
+    const FaultPause pause;
+    for (const auto &[device, count] : counts)
+        ground.seen.push_back(device + " " + std::to_string(count));
+    for (const auto &[stamp, sample] : samples)
+        ground.seen.push_back(std::to_string(stamp) + " " + std::to_string(sample.eps));
+    return counts.empty() || samples.empty() ? -1 : 0;
+}
+
+void SetUpStatistics(Ground &ground) {
+    ground.database = ground.root.File("accinfo.db");
+    RunSql(ground.database,
+           "CREATE TABLE histogram (device TEXT PRIMARY KEY, count INTEGER);"
+           "CREATE TABLE eps (stamp INTEGER, eps INTEGER, device TEXT);"
+           "INSERT INTO histogram VALUES ('a', 5), ('b', 7), ('c', 1);"
+           "INSERT INTO eps VALUES (100, 1, 'a'), (100, 2, 'b'), (200, 4, 'a'), (400, 9, 'a')");
 }
 
 void SetUpLogsOfTwoPrograms(Ground &ground) {
@@ -197,7 +238,9 @@ const std::vector<Operation> &Operations() {
         Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
         Ask("CountFiltered", SetUpLogsOfHost3, Count, {"1"}, {"0"}),
         Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
+        WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
         Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
+        {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
         Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
         Delete("DeleteAll", SetUpLogs, ""),
     };

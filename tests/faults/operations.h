@@ -45,6 +45,8 @@ struct Operation {
     std::function<int(Ground &)> run;
     // Whether what was promised holds, whatever failed.
     std::function<void(const Ground &, const Outcome &)> check;
+    // RE2 does not: it frees blocks twice when std::bad_alloc passes through it, and may end the process.
+    bool survivesOutOfMemory = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };

@@ -99,7 +99,7 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         {"/a b/ c", {"a bc"}, {"ab c"}},
         {R"(/a\/b\\/)", {R"(a/b\)"}, {"a/b", "ab"}},
         {"/var/log", {"in /var/log/x"}, {"var/log"}},
-        {"/var /usr/", {"/var /usr/"}, {"var", "/var /usr"}},
+        {"/var /usr/", {"/var /usr"}, {"var usr", "/var"}},
         {"// /x", {"x///x"}, {"x"}},
         {R"(\/etc/)", {"/etc/x"}, {"etc"}},
         {"it's /it's/", {"it's"}, {"its"}},
@@ -172,21 +172,24 @@ std::string Numbered(const std::string &before, const std::string &after, int co
 }
 
 TEST(Keyword, StaysWithinSqlitesLimitsWhateverItsSize) {
-    const std::string longText = Repeated("abcdefghij", 10'000);
-    const std::string numbers = Numbered("t", " ", 20'000) + longText;
-    const Texts texts = {longText, numbers, "a'%_[\\"};
+    const std::string letters = Repeated("abcdefghij", 4'100);
+    const std::string numbers = Numbered("t", " ", 3'000);
+    const std::string odd = "a'%_[\\";
+    const Texts texts = {letters, numbers, odd};
     const std::vector<std::pair<std::string, Texts>> examples = {
-        {longText, {longText, numbers}},
-        {"X" + longText, {}},
-        {Repeated("abcDefghij", 10'000), {}},
-        {Repeated("a*j", 16'000), {}},
-        {Repeated("a*j?b*", 3'000) + "*", {longText, numbers}},
-        {Repeated("?", 70'000), {longText, numbers}},
-        {"-" + longText, {"a'%_[\\"}},
-        {Numbered("t", " ", 20'000), {numbers}},
-        {Numbered("t", " OR ", 20'000) + "t", {numbers}},
-        {Numbered("x", " OR a t", 5'000), {numbers}},
-        {Numbered("-y", " ", 20'000), texts},
+        {letters, {letters}},
+        {"-" + letters, {numbers, odd}},
+        {letters + "X", {}},
+        {"[" + letters, {}},
+        {Repeated("a*j", 900), {letters}},
+        {Repeated("a*j", 1'100), {letters}}, // more stars than GLOB and LIKE are asked for
+        {Repeated("?", 10'000), {letters, numbers}},
+        {"x*" + letters, {}},
+        {Numbered("t", " ", 3'000), {numbers}},
+        {Numbered("x", " OR ", 20'000) + "T", {}},
+        {Numbered("t", " OR zz ", 3'000), {numbers}},
+        {Numbered("-y", " ", 3'000), texts},
+        {Numbered("Y", " ", 20'000), {}},
         {Numbered("/t", "/ ", 500), {numbers}},
         {Repeated("'%_[\\", 20'000), {}},
     };

@@ -12,11 +12,12 @@ namespace kelo::test {
 
 SearchTable::SearchTable(const std::vector<std::string> &texts) : texts_(texts) {
     const std::string path = root_.File("logs.db");
-    RunSql(path, "PRAGMA journal_mode=OFF; PRAGMA synchronous=OFF;"
-                 "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT); INSERT INTO logs VALUES(0, NULL)");
+    RunSql(path, "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT); INSERT INTO logs VALUES(0, NULL)");
     connection_ = KELODBConnect(nullptr, nullptr, nullptr, path.c_str());
     if (connection_ == nullptr)
         throw std::runtime_error("no connection to " + path);
+    Run("PRAGMA synchronous=OFF");
+    Run("BEGIN");
     sqlite3_stmt *insert = nullptr;
     sqlite3_prepare_v2(KELODBInternalDBHdlGet(connection_), "INSERT INTO logs(msg) VALUES(?)", -1, &insert,
                        nullptr);
@@ -26,6 +27,7 @@ SearchTable::SearchTable(const std::vector<std::string> &texts) : texts_(texts) 
         sqlite3_reset(insert);
     }
     sqlite3_finalize(insert);
+    Run("COMMIT");
 }
 
 SearchTable::~SearchTable() {

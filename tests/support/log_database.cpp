@@ -111,6 +111,14 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
     Run(db.get(), "COMMIT");
 }
 
+void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs) {
+    // The last connection that closes empties the log, unless it is told not to.
+    const Database last = Open(path);
+    Run(last.get(), "SELECT count(*) FROM sqlite_schema");
+    InsertLogs(path, logs);
+    sqlite3_db_config(last.get(), SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
+}
+
 _SYSLOG_LOG_DATA_tag SampleLog(int number) {
     static const char *const kFacilities[] = {"kern", "user", "daemon", "auth", "local0", "local7"};
     const auto numbered = [](const char *prefix, int value) {

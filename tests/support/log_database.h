@@ -25,6 +25,9 @@ void CreateLogDatabase(const std::string &path, const std::string &schema = "log
 // `llevel` get the severity word.
 void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
 
+// The same, and leaves the records in the write-ahead log beside the database, as a writer at work does.
+void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
+
 // A record that differs by `number` in a repeatable way: host "host00".."host49", program "prog00".."prog29",
 // every severity, one log a second from 2020/01/01 00:00:00 UTC on.
 _SYSLOG_LOG_DATA_tag SampleLog(int number);

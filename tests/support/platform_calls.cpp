@@ -114,6 +114,10 @@ void PlatformCalls::FailFrom(int first, int times) {
     state.failedFunction.clear();
 }
 
+bool PlatformCalls::MustFail(const char *function, const char *text) {
+    return kelo::test::MustFail(function, text);
+}
+
 std::vector<std::string> PlatformCalls::Statements() {
     std::vector<std::string> statements;
     for (const PlatformCall &call : state.recorded) {

@@ -38,6 +38,9 @@ public:
 
     static int OpenConnections();
     static int OpenResults();
+
+    // For the doubles of other platform functions: records a call and tells whether it has to fail.
+    static bool MustFail(const char *function, const char *text);
 };
 
 } // namespace kelo::test

@@ -5,36 +5,52 @@
 
 #include "search/regexp_function.h"
 
+using kelo::platform::Database;
+using kelo::platform::DatabaseFile;
+
 namespace {
 
 constexpr int kBusyTimeoutMs = 5000;
 
-// Data read from a file must not be able to make SQLite do more than read it.
+struct Limit {
+    int id;
+    int value;
+};
+// Far above what a log needs and far below what a damaged file can ask for.
+constexpr Limit kLimits[] = {
+    {SQLITE_LIMIT_ATTACHED, 0},          // also VACUUM, which attaches its copy
+    {SQLITE_LIMIT_LENGTH, 64 << 20},     // bytes of a value or a row
+    {SQLITE_LIMIT_SQL_LENGTH, 16 << 20}, // bytes of a statement
+    {SQLITE_LIMIT_WORKER_THREADS, 0},
+};
+
+// What a file holds must not make SQLite do more than read it, and SQL must stay inside the file.
 bool Harden(sqlite3 *db) {
+    for (const Limit &limit : kLimits)
+        sqlite3_limit(db, limit.id, limit.value);
     return sqlite3_db_config(db, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr) == SQLITE_OK &&
            sqlite3_db_config(db, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr) == SQLITE_OK &&
            sqlite3_db_config(db, SQLITE_DBCONFIG_ENABLE_LOAD_EXTENSION, 0, nullptr) == SQLITE_OK &&
-           sqlite3_limit(db, SQLITE_LIMIT_ATTACHED, 0) >= 0;
+           sqlite3_db_config(db, SQLITE_DBCONFIG_ENABLE_FTS3_TOKENIZER, 0, nullptr) == SQLITE_OK &&
+           sqlite3_exec(db, "PRAGMA cell_size_check=ON", nullptr, nullptr, nullptr) == SQLITE_OK;
 }
 
 } // namespace
 
 DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path) {
-    if (path == nullptr || path[0] != '/')
+    if (path == nullptr || path[0] == '\0')
         return nullptr;
-    std::unique_ptr<DBConnect_tag> connection(new (std::nothrow) DBConnect_tag);
-    if (connection == nullptr)
-        return nullptr;
-    // SQLite itself falls back to read-only where the file cannot be written.
-    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX;
-    const int status = sqlite3_open_v2(path, &connection->db, flags, nullptr);
-    if (status != SQLITE_OK || !Harden(connection->db) ||
-        !kelo::platform::RegisterSearchFunctions(connection->db)) {
-        sqlite3_close(connection->db);
+    try {
+        auto connection = std::make_unique<DBConnect_tag>(DatabaseFile(path));
+        Database db = connection->file.Open();
+        if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
+            sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)
+            return nullptr;
+        connection->db = db.release();
+        return connection.release();
+    } catch (const std::bad_alloc &) {
         return nullptr;
     }
-    sqlite3_busy_timeout(connection->db, kBusyTimeoutMs);
-    return connection.release();
 }
 
 int KELODBClose(DBConnect_tag *connection) {

@@ -1,66 +1,138 @@
 #include <memory>
 #include <new>
+#include <stdexcept>
 #include <string>
 
 #include "db/connection.h"
+#include "db/raise_error.h"
 #include "db/result.h"
+#include "db/row_sink.h"
+#include "db/statement.h"
+
+using kelo::platform::RaiseError;
+using kelo::platform::SingleStatement;
+using kelo::platform::Statement;
 
 namespace {
 
-struct FinalizeStatement {
-    void operator()(sqlite3_stmt *statement) const { sqlite3_finalize(statement); }
-};
-using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
+// A sink costs a second prepare: not worth it for a value or two, or for a page.
+constexpr size_t kSinkColumns = 3;
+constexpr unsigned int kSinkRows = 200;
 
-int Run(DBConnect_tag *connection, const char *sql, DBResult_tag **result) {
-    sqlite3_stmt *raw = nullptr;
-    const char *tail = nullptr;
-    if (sqlite3_prepare_v2(connection->db, sql, -1, &raw, &tail) != SQLITE_OK)
-        return -1;
-    const Statement statement(raw);
-    if (statement == nullptr)
-        return 0;
-    std::unique_ptr<DBResult_tag> rows;
-    if (result != nullptr && sqlite3_column_count(statement.get()) > 0) {
-        rows = std::make_unique<DBResult_tag>();
-        kelo::platform::TakeColumns(*rows, statement.get());
+enum class Delivery { kByRow, kBySink };
+
+void TakeRow(sqlite3_stmt *statement, DBResult_tag &result) {
+    for (size_t i = 0; i < result.cells.size(); ++i) {
+        const int column = static_cast<int>(i);
+        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
+        if (text == nullptr && sqlite3_column_type(statement, column) != SQLITE_NULL)
+            throw std::bad_alloc();
+        result.cells[i] = {text, static_cast<size_t>(sqlite3_column_bytes(statement, column))};
     }
+    result.AddRow();
+}
+
+bool StepToEnd(sqlite3_stmt *statement, DBResult_tag *result) {
     int status;
-    while ((status = sqlite3_step(statement.get())) == SQLITE_ROW) {
-        if (rows != nullptr)
-            kelo::platform::TakeRow(*rows, statement.get());
+    while ((status = sqlite3_step(statement)) == SQLITE_ROW) {
+        if (result != nullptr)
+            TakeRow(statement, *result);
     }
-    if (status != SQLITE_DONE)
-        return -1;
+    return status == SQLITE_DONE;
+}
+
+// Runs a prepared statement; `result` is null where its rows are not wanted.
+bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
+             std::unique_ptr<DBResult_tag> &result) {
+    if (result == nullptr)
+        return StepToEnd(single.prepared.get(), nullptr);
+    if (delivery == Delivery::kBySink && result->cells.size() >= kSinkColumns) {
+        const Statement sink = kelo::platform::PrepareRowSink(db, single, *result);
+        if (sink != nullptr)
+            return StepToEnd(sink.get(), nullptr);
+    }
+    return StepToEnd(single.prepared.get(), result.get());
+}
+
+// Runs the one statement of `sql`; `rows` stays null where it has no columns or they are not wanted.
+bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
+               std::unique_ptr<DBResult_tag> &rows) {
+    SingleStatement single;
+    if (!PrepareSingle(db, sql, single))
+        return false;
+    if (single.prepared == nullptr)
+        return true;
+    if (wantsRows && sqlite3_column_count(single.prepared.get()) > 0)
+        rows = std::make_unique<DBResult_tag>(single.prepared.get());
+    return Deliver(db, single, delivery, rows);
+}
+
+bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+    std::unique_ptr<DBResult_tag> rows;
+    if (!RunSingle(connection.db, sql, delivery, result != nullptr, rows))
+        return false;
+    // An error is raised when no statement is left: finalising one that succeeded would clear it.
+    if (connection.file.HasChanged()) {
+        RaiseError(connection.db, SQLITE_BUSY, "database changed while it was read without locks");
+        return false;
+    }
     if (result != nullptr)
         *result = rows.release();
-    return 0;
+    return true;
+}
+
+// The one SELECT of `sql` with its bounds, "" where the text holds no statement.
+bool BoundedText(sqlite3 *db, const char *sql, unsigned int limit, unsigned int offset,
+                 std::string &bounded) {
+    SingleStatement single;
+    if (!PrepareSingle(db, sql, single))
+        return false;
+    if (single.prepared == nullptr)
+        return true;
+    if (sqlite3_stmt_readonly(single.prepared.get()) == 0) {
+        single.prepared.reset();
+        RaiseError(db, SQLITE_ERROR, "only a SELECT can be limited");
+        return false;
+    }
+    bounded.append(single.text).append(kelo::platform::kCommentEnd).append("LIMIT ");
+    bounded.append(limit != 0 ? std::to_string(limit) : "-1")
+        .append(" OFFSET ")
+        .append(std::to_string(offset));
+    return true;
+}
+
+// Runs `work` for a statement of the caller and turns its outcome into the result code, with the connection's
+// error set where it failed.
+template <typename Work>
+int Guarded(DBConnect_tag *connection, const char *sql, DBResult_tag **result, Work work) {
+    if (result != nullptr)
+        *result = nullptr;
+    if (connection == nullptr)
+        return -1;
+    try {
+        if (sql != nullptr)
+            return work() ? 0 : -1;
+        RaiseError(connection->db, SQLITE_MISUSE, "no statement text");
+    } catch (const std::bad_alloc &) {
+        RaiseError(connection->db, SQLITE_NOMEM, "out of memory");
+    } catch (const std::length_error &) {
+        RaiseError(connection->db, SQLITE_TOOBIG, "result too big");
+    }
+    return -1;
 }
 
 } // namespace
 
 int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result) {
-    if (result != nullptr)
-        *result = nullptr;
-    if (connection == nullptr || sql == nullptr)
-        return -1;
-    try {
-        return Run(connection, sql, result);
-    } catch (const std::bad_alloc &) {
-        return -1;
-    }
+    return Guarded(connection, sql, result, [&] { return Run(*connection, sql, Delivery::kBySink, result); });
 }
 
 int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit, unsigned int offset,
                       DBResult_tag **result) {
-    if (sql == nullptr)
-        return -1;
-    try {
-        const std::string bounded = std::string(sql) + "\nLIMIT " +
-                                    (limit == 0 ? "-1" : std::to_string(limit)) + " OFFSET " +
-                                    std::to_string(offset);
-        return KELODBExecute(connection, bounded.c_str(), result);
-    } catch (const std::bad_alloc &) {
-        return -1;
-    }
+    return Guarded(connection, sql, result, [&] {
+        std::string bounded;
+        const bool isPage = limit != 0 && limit < kSinkRows;
+        return BoundedText(connection->db, sql, limit, offset, bounded) &&
+               Run(*connection, bounded.c_str(), isPage ? Delivery::kByRow : Delivery::kBySink, result);
+    });
 }

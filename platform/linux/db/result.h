@@ -2,30 +2,27 @@
 
 #include <sqlite3.h>
 
+#include <climits>
 #include <cstdint>
-#include <string>
-#include <unordered_map>
 #include <vector>
 
+#include "db/column_index.h"
+#include "db/row_block.h"
 #include "keloplatform/kelodb.h"
 
-// All rows of one statement: the cells as offsets into one block of text.
+// All rows of one statement.
 struct DBResult_tag {
-    std::unordered_map<std::string, uint32_t> columns; // position by name
-    uint32_t columnCount = 0;
-    std::vector<uint64_t> cells; // row by row, offset into `text`; kNull for NULL
-    std::vector<char> text;
-    uint32_t rowCount = 0;
+    // KELODBNumRows counts in an int: a result with more rows fails instead of losing some.
+    static constexpr uint64_t kMaxRows = INT_MAX;
+
+    // Takes the column names of a statement. Throws std::bad_alloc.
+    explicit DBResult_tag(sqlite3_stmt *statement);
+
+    // Appends the row in `cells`. Throws std::bad_alloc, or std::length_error when the result is full.
+    void AddRow();
+
+    kelo::platform::ColumnIndex columns;
+    kelo::platform::RowBlock rows;
+    std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
     uint32_t nextRow = 0;
-
-    static constexpr uint64_t kNull = UINT64_MAX;
 };
-
-namespace kelo::platform {
-
-// Prepares the result for the columns of a statement.
-void TakeColumns(DBResult_tag &result, sqlite3_stmt *statement);
-// Appends the statement's current row.
-void TakeRow(DBResult_tag &result, sqlite3_stmt *statement);
-
-} // namespace kelo::platform

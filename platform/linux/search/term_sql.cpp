@@ -11,9 +11,10 @@
 namespace kelo::platform {
 namespace {
 
-// SQLite refuses LIKE and GLOB patterns beyond 50,000 bytes, and takes quadratic time for many wildcards.
+// SQLite refuses LIKE and GLOB patterns beyond 50,000 bytes, and matches them with a recursion for every
+// star.
 constexpr size_t kMaxPatternBytes = 40'000;
-constexpr size_t kMaxPatternPieces = 32;
+constexpr std::ptrdiff_t kMaxStars = 1'000;
 
 using Pieces = std::vector<Piece>;
 
@@ -85,21 +86,26 @@ std::string LiteralSql(const std::string &literal, bool ignoreCase, const std::s
 }
 
 std::string TextSql(const Pieces &pieces, const std::string &column, std::vector<BrokenRegex> &broken) {
-    const bool ignoreCase = LetterCaseOf(pieces) == LetterCase::kIgnored;
+    const LetterCase letterCase = LetterCaseOf(pieces);
+    // GLOB is the fastest search there is, as long as its pattern begins with a character and not with a set.
+    const bool globIsFast = kGlob.special.find(pieces[0].literal.substr(0, 1)) == std::string_view::npos;
+    const bool ignoreCase =
+        letterCase == LetterCase::kIgnored || (letterCase == LetterCase::kNoLetters && !globIsFast);
     const PatternSyntax &syntax = ignoreCase ? kLike : kGlob;
     const bool isLiteral = pieces.size() == 1 && pieces[0].kind == Piece::Kind::kLiteral;
+    const auto stars = std::count_if(pieces.begin(), pieces.end(),
+                                     [](const Piece &piece) { return piece.kind == Piece::Kind::kAnyText; });
     const std::string pattern = Pattern(pieces, syntax);
 
     if (isLiteral && pattern.size() > kMaxPatternBytes)
         return LiteralSql(pieces[0].literal, ignoreCase, column);
-    if (pattern.size() > kMaxPatternBytes || pieces.size() > kMaxPatternPieces)
+    if (pattern.size() > kMaxPatternBytes || stars > kMaxStars)
         return RegexSql("(?s)" + Pattern(pieces, kRegex), ignoreCase, column, broken);
     if (ignoreCase) {
         const bool hasEscapes = pattern.find('\\') != std::string::npos;
         return column + " LIKE " + Quoted("%" + pattern + "%") + (hasEscapes ? " ESCAPE '\\'" : "");
     }
-    // GLOB finds a literal by its first character, unless that is a set: then it is seven times slower.
-    if (isLiteral && pattern[0] == '[')
+    if (isLiteral && !globIsFast)
         return LiteralSql(pieces[0].literal, false, column);
     return column + " GLOB " + Quoted("*" + pattern + "*");
 }

@@ -4,18 +4,20 @@
 
 #include <malloc.h>
 
+#include <cstdlib>
 #include <cstring>
 #include <sstream>
 
 #include "kelosyslog/logparser.h"
 #include "log_text.h"
-#include "stopwatch.h"
+#include "support/measure.h"
 
 using namespace kelo::bench;
 
 namespace {
 
 constexpr int kLines = 1'000'000;
+constexpr int kRounds = 5;
 
 size_t CountLineFeeds(const std::string &text) {
     size_t count = 0;
@@ -63,7 +65,7 @@ size_t NecessaryBytes(const _SYSLOG_LOG_DATA_tag &log) {
     return bytes;
 }
 
-void CompareMemory(std::string &text) {
+bool CompareMemory(std::string &text) {
     LogParser parser;
     const size_t before = HeapBytes();
     parser.LogAdd(text);
@@ -71,28 +73,38 @@ void CompareMemory(std::string &text) {
     size_t necessary = 0;
     for (const _SYSLOG_LOG_DATA_tag &log : parser.LogListTake())
         necessary += NecessaryBytes(log);
-    std::printf("memory of LogAdd / of the bare records   %6.2f   (%zu / %zu MiB, at most 1.3)\n",
-                static_cast<double>(taken) / static_cast<double>(necessary), taken >> 20, necessary >> 20);
+    constexpr double kMiB = 1 << 20;
+    PrintHeading("Memory of LogAdd", "MiB");
+    return PrintRatio("heap after LogAdd", static_cast<double>(taken) / kMiB, "the bare records",
+                      static_cast<double>(necessary) / kMiB, 1.3);
 }
 
 } // namespace
 
-int main() {
-    std::string text = LogText(kLines);
-    const double memchrMs = BestOf(5, [&] { Keep(CountLineFeeds(text)); });
-    double logAddMs = 0;
-    double streamMs = 0;
+// bench_logadd [LINES]: fewer lines for a profiler.
+int main(int argc, char **argv) {
+    const int lines = argc > 1 ? std::atoi(argv[1]) : kLines;
+    std::string text = LogText(lines);
     // Freeing what was parsed is no part of parsing.
-    for (int run = 0; run < 5; ++run) {
+    const auto logAdd = [&text] {
         LogParser parser;
-        logAddMs = Best(logAddMs, ElapsedMs([&] { parser.LogAdd(text); }));
+        return Time([&] { parser.LogAdd(text); });
+    };
+    const auto streamParse = [&text] {
         std::list<_SYSLOG_LOG_DATA_tag> logs;
-        streamMs = Best(streamMs, ElapsedMs([&] { logs = StreamParse(text); }));
-    }
-    std::printf(
-        "%d lines of 200 bytes: memchr only %.0f ms, LogAdd %.0f ms, getline and istringstream %.0f ms\n",
-        kLines, memchrMs, logAddMs, streamMs);
-    std::printf("time of LogAdd / of memchr only          %6.2f\n", logAddMs / memchrMs);
-    std::printf("time of the stream parser / of LogAdd    %6.2f   (at least 3)\n", streamMs / logAddMs);
-    CompareMemory(text);
+        return Time([&] { logs = StreamParse(text); });
+    };
+    const auto countLines = [&text, lines] {
+        return Time([&] {
+            if (CountLineFeeds(text) != static_cast<size_t>(lines))
+                Fail("wrong number of lines");
+        });
+    };
+    const auto times =
+        MedianTimes({{"LogAdd", logAdd}, {"streams", streamParse}, {"line feeds only", countLines}}, kRounds);
+    PrintHeading(std::to_string(lines) + " lines of 200 bytes into records", "ms");
+    bool allKept = PrintRatio("LogAdd", times[0], "getline and istringstream", times[1], 1.0 / 3);
+    allKept = PrintRatio("LogAdd", times[0], "memchr for the line feeds only", times[2], 30) && allKept;
+    allKept = CompareMemory(text) && allKept;
+    return allKept ? 0 : 1;
 }

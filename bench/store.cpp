@@ -3,8 +3,6 @@
 
 #include <sqlite3.h>
 
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <vector>
 
@@ -12,7 +10,7 @@
 #include "log_store.h"
 #include "log_text.h"
 #include "logs_schema.h"
-#include "stopwatch.h"
+#include "support/measure.h"
 
 using namespace kelo::bench;
 using kelo::tool::LogStore;
@@ -24,10 +22,8 @@ constexpr size_t kBatchRows = 5000;
 using Logs = std::vector<_SYSLOG_LOG_DATA_tag>;
 
 void Require(int status) {
-    if (status != SQLITE_OK && status != SQLITE_DONE) {
-        std::fprintf(stderr, "SQLite: %s\n", sqlite3_errstr(status));
-        std::exit(1);
-    }
+    if (status != SQLITE_OK && status != SQLITE_DONE)
+        Fail(std::string("SQLite: ") + sqlite3_errstr(status));
 }
 
 void StoreBare(const std::string &path, const Logs &logs) {
@@ -76,7 +72,7 @@ void StoreThrough(const std::string &path, const Logs &logs) {
 template <typename Store>
 double FreshRunMs(Store store, const Logs &logs) {
     const std::string path = "bench_store.db";
-    const double elapsed = ElapsedMs([&] { store(path, logs); });
+    const double elapsed = Time([&] { store(path, logs); });
     for (const char *suffix : {"", "-wal", "-shm"})
         std::filesystem::remove(path + suffix);
     return elapsed;
@@ -91,13 +87,9 @@ int main() {
     std::list<_SYSLOG_LOG_DATA_tag> list = parser.LogListTake();
     const Logs logs(std::make_move_iterator(list.begin()), std::make_move_iterator(list.end()));
     list.clear();
-    double bareMs = 0;
-    double storeMs = 0;
-    for (int run = 0; run < 3; ++run) {
-        bareMs = Best(bareMs, FreshRunMs(StoreBare, logs));
-        storeMs = Best(storeMs, FreshRunMs(StoreThrough, logs));
-    }
-    std::printf("%d rows in batches of %zu: bare loop %.0f ms, LogStore %.0f ms\n", kRows, kBatchRows, bareMs,
-                storeMs);
-    std::printf("time of LogStore / of the bare loop      %6.2f   (at most 1.2)\n", storeMs / bareMs);
+    const auto times = MedianTimes({{"LogStore", [&] { return FreshRunMs(StoreThrough, logs); }},
+                                    {"bare loop", [&] { return FreshRunMs(StoreBare, logs); }}},
+                                   3);
+    PrintHeading("Storing 1000000 records in batches of 5000", "ms");
+    return PrintRatio("LogStore", times[0], "bare prepared inserts", times[1], 1.2) ? 0 : 1;
 }

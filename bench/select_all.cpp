@@ -1,0 +1,112 @@
+// Every row of a large log through SyslogDBSelect, against a plain SQLite loop that fills the same record.
+
+#include <sqlite3.h>
+
+#include <cstdio>
+#include <string>
+
+#include "kelosyslog/dbutil.h"
+#include "support/log_database.h"
+#include "support/measure.h"
+#include "support/memory.h"
+
+using namespace kelo::bench;
+
+namespace {
+
+constexpr int kRows = 1000000;
+constexpr int kRounds = 9;
+
+struct Total {
+    size_t rows = 0;
+    size_t bytes = 0;
+};
+
+int AddRow(_SYSLOG_LOG_DATA_tag &log, void *context) {
+    auto *total = static_cast<Total *>(context);
+    ++total->rows;
+    total->bytes += log.msg.size();
+    return 0;
+}
+
+Total SelectAll(const std::string &path) {
+    Total total;
+    if (SyslogDBSelect(path, {}, nullptr, nullptr, AddRow, &total, false) != 0)
+        Fail("SyslogDBSelect failed on " + path);
+    return total;
+}
+
+// Columns by position, as a caller writes who knows his table.
+Total LoopOverAll(const std::string &path) {
+    sqlite3 *db = nullptr;
+    sqlite3_stmt *statement = nullptr;
+    if (sqlite3_open_v2(path.c_str(), &db, SQLITE_OPEN_READWRITE, nullptr) != SQLITE_OK ||
+        sqlite3_prepare_v2(db, "SELECT * FROM logs", -1, &statement, nullptr) != SQLITE_OK)
+        Fail(path + ": " + sqlite3_errmsg(db));
+    const auto text = [&](int column) {
+        const auto *value = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
+        return value != nullptr ? value : "";
+    };
+    Total total;
+    _SYSLOG_LOG_DATA_tag log;
+    while (sqlite3_step(statement) == SQLITE_ROW) {
+        log.id = static_cast<uint64_t>(sqlite3_column_int64(statement, 0));
+        log.host = text(1);
+        log.ip = text(2);
+        log.fac = text(3);
+        log.prio = PriorStrToType(text(4));
+        log.tag = text(6);
+        log.utcsec = sqlite3_column_int64(statement, 7);
+        log.tzoffset = text(8);
+        log.ldate = text(9);
+        log.ltime = text(10);
+        log.prog = text(11);
+        log.msg = text(12);
+        AddRow(log, &total);
+    }
+    sqlite3_finalize(statement);
+    sqlite3_close(db);
+    return total;
+}
+
+// Bytes of the texts of all cells, without their NULs.
+double ResultBytes(const std::string &path) {
+    sqlite3 *db = nullptr;
+    double bytes = 0;
+    const auto add = [](void *sum, int, char **values, char **) {
+        *static_cast<double *>(sum) = std::stod(values[0]);
+        return 0;
+    };
+    if (sqlite3_open_v2(path.c_str(), &db, SQLITE_OPEN_READWRITE, nullptr) != SQLITE_OK ||
+        sqlite3_exec(
+            db,
+            "SELECT sum(length(CAST(id || host || ip || fac || prio || llevel || tag || utcsec || tzoffset ||"
+            " ldate || ltime || prog || msg AS BLOB))) FROM logs",
+            add, &bytes, nullptr) != SQLITE_OK)
+        Fail(path + ": " + sqlite3_errmsg(db));
+    sqlite3_close(db);
+    return bytes;
+}
+
+} // namespace
+
+int main() {
+    const std::string path = LogDatabase(kRows);
+    constexpr double kMiB = 1024 * 1024;
+
+    const double bytes = ResultBytes(path);
+    const auto peak = static_cast<double>(PeakMemoryOf([&] { SelectAll(path); }));
+    PrintHeading("Reading all of " + std::to_string(kRows) + " rows: peak memory", "MiB");
+    bool allKept = PrintRatio("SyslogDBSelect", peak / kMiB, "texts of the result", bytes / kMiB, 1.5);
+
+    Total selected;
+    Total looped;
+    const auto times = MedianTimes({{"select", [&] { return Time([&] { selected = SelectAll(path); }); }},
+                                    {"loop", [&] { return Time([&] { looped = LoopOverAll(path); }); }}},
+                                   kRounds);
+    if (selected.rows != kRows || selected.bytes != looped.bytes)
+        Fail("SyslogDBSelect and the loop read different rows");
+    PrintHeading("Reading all of " + std::to_string(kRows) + " rows: time", "ms");
+    allKept = PrintRatio("SyslogDBSelect", times[0], "sqlite3_step loop", times[1], 1.15) && allKept;
+    return allKept ? 0 : 1;
+}

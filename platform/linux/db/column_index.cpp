@@ -1,0 +1,54 @@
+#include "db/column_index.h"
+
+#include <cstring>
+
+namespace kelo::platform {
+namespace {
+
+// FNV-1a: column names are a few bytes long.
+size_t HashOf(const char *name) {
+    uint32_t hash = 2166136261U;
+    for (; *name != '\0'; ++name)
+        hash = (hash ^ static_cast<unsigned char>(*name)) * 16777619U;
+    return hash;
+}
+
+} // namespace
+
+void ColumnIndex::Add(std::string_view name) {
+    const uint32_t column = Count();
+    const auto offset = static_cast<uint32_t>(names_.size());
+    names_.insert(names_.end(), name.begin(), name.end());
+    names_.push_back('\0');
+    nameAt_.push_back(offset);
+    if (slots_.size() < 2 * nameAt_.size()) {
+        Grow();
+        return;
+    }
+    uint32_t &slot = slots_[SlotOf(Name(column))];
+    if (slot == kNone) // of columns with one name the first counts
+        slot = column;
+}
+
+void ColumnIndex::Grow() {
+    slots_.assign(slots_.empty() ? 32 : 2 * slots_.size(), kNone);
+    for (uint32_t column = 0; column < Count(); ++column) {
+        uint32_t &slot = slots_[SlotOf(Name(column))];
+        if (slot == kNone)
+            slot = column;
+    }
+}
+
+size_t ColumnIndex::SlotOf(const char *name) const {
+    const size_t mask = slots_.size() - 1;
+    size_t slot = HashOf(name) & mask;
+    while (slots_[slot] != kNone && std::strcmp(Name(slots_[slot]), name) != 0)
+        slot = (slot + 1) & mask;
+    return slot;
+}
+
+uint32_t ColumnIndex::Find(const char *name) const {
+    return slots_.empty() ? kNone : slots_[SlotOf(name)];
+}
+
+} // namespace kelo::platform

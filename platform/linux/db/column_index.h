@@ -1,0 +1,34 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+#include <vector>
+
+namespace kelo::platform {
+
+// Positions of a result's columns by their exact names.
+class ColumnIndex {
+public:
+    static constexpr uint32_t kNone = UINT32_MAX;
+
+    // Appends the next column. Throws std::bad_alloc.
+    void Add(std::string_view name);
+
+    uint32_t Count() const { return static_cast<uint32_t>(nameAt_.size()); }
+
+    // Position of the first column with this name, or kNone.
+    uint32_t Find(const char *name) const;
+
+private:
+    const char *Name(uint32_t column) const { return names_.data() + nameAt_[column]; }
+    // The slot that holds `name`, or the empty one where it belongs.
+    size_t SlotOf(const char *name) const;
+    void Grow();
+
+    std::vector<char> names_;      // one after the other, each NUL-terminated
+    std::vector<uint32_t> nameAt_; // by position, offset into `names_`
+    std::vector<uint32_t> slots_;  // open addressing; a power of two, half empty at the least
+};
+
+} // namespace kelo::platform

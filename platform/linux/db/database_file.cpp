@@ -1,0 +1,82 @@
+#include "db/database_file.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <system_error>
+#include <utility>
+
+namespace kelo::platform {
+namespace {
+
+Database OpenNamed(const char *name, int flags) {
+    sqlite3 *db = nullptr;
+    const int status = sqlite3_open_v2(name, &db, flags, nullptr);
+    Database owner(db);
+    return status == SQLITE_OK ? std::move(owner) : nullptr;
+}
+
+// Whether SQLite cannot even read the file behind `db`: without its "-shm" it fails to open or to write that.
+bool CannotRead(sqlite3 *db) {
+    const int status = sqlite3_exec(db, "SELECT 1 FROM sqlite_schema LIMIT 1", nullptr, nullptr, nullptr);
+    return status == SQLITE_CANTOPEN || status == SQLITE_READONLY;
+}
+
+// A "file:" URI of a path, whatever bytes it holds.
+std::string UriOf(const std::string &path) {
+    constexpr char kHex[] = "0123456789ABCDEF";
+    std::string uri = "file:";
+    for (const char byte : path) {
+        const auto value = static_cast<unsigned char>(byte);
+        uri.append({'%', kHex[value >> 4], kHex[value & 15]});
+    }
+    return uri;
+}
+
+} // namespace
+
+DatabaseFile::DatabaseFile(const char *path) {
+    std::error_code unresolved;
+    path_ = std::filesystem::canonical(path, unresolved).string();
+}
+
+bool DatabaseFile::IsAtRestInReadOnlyFolder() const {
+    const std::string folder = path_.substr(0, path_.rfind('/') + 1);
+    if (faccessat(AT_FDCWD, folder.c_str(), W_OK, AT_EACCESS) == 0)
+        return false;
+    struct stat info;
+    const bool hasRowsInWal = stat((path_ + "-wal").c_str(), &info) == 0 && info.st_size > 0;
+    return !hasRowsInWal && stat((path_ + "-shm").c_str(), &info) != 0;
+}
+
+Database DatabaseFile::OpenWithoutLocks() {
+    struct stat info;
+    if (stat(path_.c_str(), &info) != 0)
+        return nullptr;
+    atRest_ = info;
+    return OpenNamed((UriOf(path_) + "?immutable=1").c_str(),
+                     SQLITE_OPEN_READONLY | SQLITE_OPEN_URI | SQLITE_OPEN_NOMUTEX);
+}
+
+Database DatabaseFile::Open() {
+    struct stat info;
+    if (stat(path_.c_str(), &info) != 0 || !S_ISREG(info.st_mode))
+        return nullptr;
+    // SQLite itself falls back to reading where it may not write.
+    Database db = OpenNamed(path_.c_str(), SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX);
+    if (db != nullptr && IsAtRestInReadOnlyFolder() && CannotRead(db.get()))
+        return OpenWithoutLocks();
+    return db;
+}
+
+bool DatabaseFile::HasChanged() const {
+    if (!atRest_)
+        return false;
+    struct stat now;
+    return stat(path_.c_str(), &now) != 0 || now.st_ino != atRest_->st_ino ||
+           now.st_size != atRest_->st_size || now.st_mtim.tv_sec != atRest_->st_mtim.tv_sec ||
+           now.st_mtim.tv_nsec != atRest_->st_mtim.tv_nsec;
+}
+
+} // namespace kelo::platform

@@ -1,0 +1,231 @@
+#include <json/json.h>
+#include <sched.h>
+#include <sys/mount.h>
+#include <sys/stat.h>
+
+#include <filesystem>
+#include <fstream>
+#include <set>
+
+#include "keloplatform/kelonotify.h"
+#include "keloplatform/torvc.h"
+#include "notify/notify_fixture.h"
+
+using namespace kelo::test;
+using testing::AllOf;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+namespace {
+
+constexpr char kTexts[] = "/usr/kelo/keloman/webman/modules/Quillbay/texts/";
+constexpr char kAllOn[] =
+    "smtp_mail_enabled=\"yes\"\nsms_enabled=\"yes\"\npushservice_mobile_enabled=\"yes\"\n"
+    "pushservice_msn_enabled=\"no\"\npushservice_skype_enabled=\"yes\"\n";
+
+class NotificationService : public NotifyTest {
+protected:
+    NotificationService() { NotifyCalls::AnswerWith(std::nullopt); }
+
+    void InstallTexts() {
+        std::filesystem::create_directories(root_.Path() + kTexts);
+        std::filesystem::copy(std::string(KELO_SOURCE_DIR) + "/package/texts", root_.Path() + kTexts,
+                              std::filesystem::copy_options::recursive);
+    }
+
+    int Send(const char *tag, const std::map<std::string, std::string> &values) {
+        TORVSZHASH *hash = TORVCSzHashAlloc(8);
+        for (const auto &[key, value] : values)
+            TORVCSzHashSetValue(&hash, key.c_str(), value.c_str());
+        const int result = SyslogMailSend(tag, &hash);
+        TORVCSzHashFree(hash);
+        return result;
+    }
+
+    std::vector<std::filesystem::path> Spooled(const char *folder = "new") const {
+        std::set<std::filesystem::path> files;
+        std::error_code missing;
+        for (const auto &file :
+             std::filesystem::directory_iterator(root_.File("var/spool/kelonotify/") + folder, missing))
+            files.insert(file.path());
+        return {files.begin(), files.end()};
+    }
+
+    // The only entry of the spool, which is then taken out.
+    Json::Value Take() {
+        const std::vector<std::filesystem::path> files = Spooled();
+        EXPECT_EQ(files.size(), 1u);
+        Json::Value entry;
+        if (files.size() != 1)
+            return entry;
+        std::ifstream(files[0]) >> entry;
+        EXPECT_EQ(files[0].filename(), entry["id"].asString() + ".json");
+        std::filesystem::remove(files[0]);
+        EXPECT_THAT(Spooled("tmp"), IsEmpty());
+        return entry;
+    }
+
+    std::string TakeChannels() {
+        const Json::Value entry = Take();
+        std::string channels;
+        for (const Json::Value &channel : entry["channels"])
+            channels += channel.asString() + " ";
+        return channels;
+    }
+};
+
+} // namespace
+
+TEST_F(NotificationService, SpoolsTheRenderedMessageWithAllThatDeliveryNeeds) {
+    InstallTexts();
+    WriteSettings(kAllOn);
+    WriteRules(RuleText("r", 1, "0", "100", ""));
+    const time_t before = time(nullptr);
+    ASSERT_EQ(NotificationManager().NotificationSendKeyword("h\xFF\r\nBcc: x", "%HOST% \\n",
+                                                            "say \"%KEYWORD%\" \\o/\n\x1B[0m"),
+              0);
+    struct stat status;
+    ASSERT_EQ(stat(Spooled().at(0).c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 0007u, 0u);
+    const Json::Value entry = Take();
+    EXPECT_EQ(entry["version"].asInt(), 1);
+    EXPECT_GE(entry["time"].asInt64(), before);
+    EXPECT_EQ(entry["tag"].asString(), "KELOSYSLOG_KEYWORD_MATCH");
+    EXPECT_EQ(entry["language"].asString(), "enu");
+    EXPECT_EQ(entry["class"].asString(), "KELO.ZRT.Quillbay.BuiltIn");
+    EXPECT_EQ(entry["channels"].size(), 5u);
+    EXPECT_EQ(entry["title"].asString(), "Log with keyword %HOST% \\n from h\uFFFD  Bcc: x");
+    EXPECT_EQ(entry["body"].asString(),
+              "The log server received a log with the keyword %HOST% \\n.\n\nHost: h\uFFFD\\x0D\nBcc: x\n"
+              "Log: say \"%KEYWORD%\" \\o/\n\\x1B[0m\n");
+    EXPECT_EQ(entry["values"].size(), 3u);
+    EXPECT_EQ(entry["values"]["%SYSLOG_CONTENT%"].asString(), "say \\\"%KEYWORD%\\\" \\\\o/\n\x1B[0m");
+    EXPECT_THAT(Messages(), IsEmpty());
+}
+
+TEST_F(NotificationService, HasATextInEveryLanguageForEveryTag) {
+    InstallTexts();
+    const std::map<std::string, std::vector<std::string>> tags = {
+        {"KELOSYSLOG_EPS_EXCEED", {"%EPS%", "%TOLERNCE%"}},
+        {"KELOSYSLOG_SEV_EXCEED", {"%HOST%", "%SEV%", "%SYSLOG_CONTENT%"}},
+        {"KELOSYSLOG_KEYWORD_MATCH", {"%HOST%", "%KEYWORD%", "%SYSLOG_CONTENT%"}},
+        {"KELOSYSLOG_VOL_FULL", {"%SHARED_FOLDER%"}},
+        {"KELOSYSLOG_DB_CORRUPT", {"%DBPATH%"}},
+        {"KELOSYSLOG_ShareRemove", {"%SHARED_FOLDER%"}},
+        {"KELOSYSLOG_ShareRename", {"%SHARED_FOLDER%"}},
+        {"KELOSYSLOG_ShareEncMount", {"%SHARED_FOLDER%"}},
+        {"KELOSYSLOG_ShareEncUnmount", {"%SHARED_FOLDER%"}},
+    };
+    std::set<std::string> bodies;
+    for (const char *language : {"enu", "ger"}) {
+        WriteSettings(std::string("notify_language=\"") + language + "\"\n");
+        for (const auto &[tag, placeholders] : tags) {
+            std::map<std::string, std::string> values;
+            for (const std::string &placeholder : placeholders)
+                values[placeholder] = "<" + placeholder + ">";
+            ASSERT_EQ(Send(tag.c_str(), values), 0);
+            const std::string body = Take()["body"].asString();
+            for (const std::string &placeholder : placeholders)
+                EXPECT_THAT(body, HasSubstr("<" + placeholder + ">")) << language << " " << tag;
+            bodies.insert(body);
+        }
+    }
+    EXPECT_EQ(bodies.size(), 2 * tags.size());
+    EXPECT_THAT(Messages(), IsEmpty());
+}
+
+TEST_F(NotificationService, GivesAPlainMessageWhereThereIsNoText) {
+    InstallTexts();
+    WriteSettings("notify_language=\"../enu\"\n");
+    ASSERT_EQ(Send("KELOSYSLOG_SEV_EXCEED", {{"%SEV%", "err"}}), 0); // English, without a host
+    EXPECT_EQ(Take()["title"].asString(), "Log of severity err from -");
+    for (const std::string text : {"", "[NEW]\ntitle=\"x\"\n", "[NEW]\ntitle=\"x\"\nbody=\"open\n"}) {
+        Write(std::string(kTexts) + "enu/notify", text);
+        ASSERT_EQ(Send("NEW", {{"%A%", "1"}, {"DESKTOP_NOTIFY_CLASSNAME", "c"}}), 0);
+        const Json::Value entry = Take();
+        EXPECT_EQ(entry["title"].asString(), "Notification NEW");
+        EXPECT_EQ(entry["body"].asString(), "The log server sent the notification NEW.\n%A%: 1\n");
+    }
+    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("enu/notify:3: ")));
+}
+
+TEST_F(NotificationService, CutsATitleAtACharacter) {
+    Write(std::string(kTexts) + "enu/notify", "[T]\ntitle=\"50% %A% %\"\nbody=\"%A%%%B%\\q\"\n");
+    std::string value;
+    for (int i = 0; i < 200; ++i)
+        value += "é";
+    ASSERT_EQ(Send("T", {{"%A%", value}}), 0);
+    const Json::Value entry = Take();
+    EXPECT_EQ(entry["title"].asString(), "50% " + value.substr(0, 242) + "...");
+    EXPECT_EQ(entry["body"].asString(), value + "%-\\q\n");
+}
+
+TEST_F(NotificationService, UsesTheChannelsThatSettingsAndFilterAllow) {
+    ASSERT_EQ(Send("T", {}), 0);
+    EXPECT_EQ(TakeChannels(), "desktop ");
+    WriteSettings(std::string(kAllOn) + "desktop_enabled=\"no\"\n");
+    ASSERT_EQ(Send("T", {}), 0);
+    EXPECT_EQ(TakeChannels(), "mail sms push_mobile push_skype ");
+    WriteSettings(kAllOn);
+    Write("/etc/kelosyslog/notify.filter", "A=\"mail,desktop\"\nB = push_skype; sms push_msn\nC=\"push\"\n"
+                                           "D=\"all\"\nE=\"none\"\nF=\"\"\nG=\"fax mail\"\n");
+    for (const auto &[tag, channels] : {std::pair<const char *, const char *>{"A", "mail desktop "},
+                                        {"B", "sms push_skype "},
+                                        {"C", "push_mobile push_skype "},
+                                        {"D", "mail sms push_mobile push_skype desktop "},
+                                        {"other", "mail sms push_mobile push_skype desktop "}}) {
+        ASSERT_EQ(Send(tag, {}), 0);
+        EXPECT_EQ(TakeChannels(), channels) << tag;
+    }
+    EXPECT_EQ(Send("E", {}) + Send("F", {}), 0);
+    EXPECT_THAT(Spooled(), IsEmpty());
+    EXPECT_THAT(Messages(), IsEmpty());
+    ASSERT_EQ(Send("G", {}), 0);
+    EXPECT_EQ(TakeChannels(), "mail ");
+    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("notify.filter: no such channel: fax")));
+    // A filter that cannot be read takes no channel away.
+    std::filesystem::remove(root_.File("etc/kelosyslog/notify.filter"));
+    std::filesystem::create_directory(root_.File("etc/kelosyslog/notify.filter"));
+    ASSERT_EQ(Send("A", {}), 0);
+    EXPECT_EQ(TakeChannels(), "mail sms push_mobile push_skype desktop ");
+    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("every channel is used: Is a directory")));
+}
+
+TEST_F(NotificationService, KeepsNotificationsInTheOrderOfTheirSending) {
+    for (int i = 0; i < 20; ++i)
+        ASSERT_EQ(Send(("T" + std::to_string(i)).c_str(), {}), 0);
+    int number = 0;
+    for (const auto &file : Spooled())
+        EXPECT_THAT(ReadFile(file.string()), HasSubstr("\"T" + std::to_string(number++) + "\""));
+    EXPECT_EQ(number, 20);
+}
+
+TEST_F(NotificationService, ReportsASpoolThatTakesNothing) {
+    Write("/var/spool/kelonotify", "");
+    EXPECT_EQ(Send("T", {}), -1);
+    EXPECT_THAT(Messages(), ElementsAre("Cannot put notification \"T\" into the spool: Not a directory",
+                                        "Fail to send notification: T"));
+    EXPECT_EQ(KELOSysNotifySendNotificationCustomized("", "", "", nullptr, 0), -1);
+    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("Invalid argument")));
+}
+
+TEST_F(NotificationService, LeavesNothingBehindOnAFullDisk) {
+    const std::string spool = root_.File("var/spool/kelonotify");
+    std::filesystem::create_directories(spool);
+    // In a mount namespace of its own, which ends with the process.
+    if (unshare(CLONE_NEWNS) != 0 || mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
+        mount("tmpfs", spool.c_str(), "tmpfs", 0, "size=64k") != 0)
+        GTEST_SKIP() << "may not mount a small disk";
+    WriteFile(spool + "/filler", "");
+    std::ofstream(spool + "/filler") << std::string(100'000, 'x');
+    EXPECT_EQ(Send("T", {{"%A%", std::string(8000, 'a')}}), -1);
+    EXPECT_THAT(Messages().at(0), HasSubstr("No space left on device"));
+    EXPECT_THAT(Spooled("tmp"), IsEmpty());
+    EXPECT_THAT(Spooled(), IsEmpty());
+    std::filesystem::remove(spool + "/filler");
+    EXPECT_EQ(Send("T", {}), 0);
+    EXPECT_EQ(Take()["tag"].asString(), "T");
+    EXPECT_EQ(umount(spool.c_str()), 0);
+}

@@ -1,0 +1,170 @@
+#include "notify/notify_fixture.h"
+
+using namespace kelo::test;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+
+using RuleFile = NotifyTest;
+using NotificationSwitches = NotifyTest;
+
+TEST_F(RuleFile, WritesEveryFieldInItsForm) {
+    _SYSLOG_NOTIFY_RULES_tag rule{"R1", 2, SYSLOG_PRIO_EMERG, 0, "disk full", true};
+    Write("/etc/kelosyslog/other", "");
+    ASSERT_EQ(SyslogNotifyConfSet(RulePath(), "unused", rule), 0);
+    EXPECT_EQ(ReadFile(RulePath()), "[R1]\nnotify_type=\"2\"\nnotify_eps=\"0\"\nnotify_pri=\"0\"\n"
+                                    "notify_pat=\"disk full\"\nnotify_enable=\"1\"\n");
+}
+
+TEST_F(RuleFile, ReadsBackWhatTheFormOfTheNumbersKeeps) {
+    struct Case {
+        int32_t type;
+        int32_t pri;
+        uint64_t eps;
+        const char *written;
+        uint64_t read;
+    };
+    const Case cases[] = {
+        {0, 3, 100, "\"100\"", 100},
+        {1, 7, 2147483647, "\"2147483647\"", 2147483647},
+        {1, -1, 2147483648, "\"18446744071562067968\"", 9223372036854775807},
+        {-1, 0, 3000000000, "\"18446744072414584320\"", 9223372036854775807},
+        {2, 0, 4294967295, "\"18446744073709551615\"", 9223372036854775807},
+        {2, 0, 5000000000, "\"705032704\"", 705032704},
+    };
+    WriteRules("");
+    for (const Case &c : cases) {
+        _SYSLOG_NOTIFY_RULES_tag rule{"R",   c.type,   static_cast<_SYSLOG_DB_PRIORITY_tag>(c.pri),
+                                      c.eps, "p=\"\\", false};
+        ASSERT_EQ(SyslogNotifyConfSet(RulePath(), "", rule), 0);
+        EXPECT_THAT(ReadFile(RulePath()), HasSubstr(std::string("notify_eps=") + c.written + "\n"));
+        _SYSLOG_NOTIFY_RULES_tag read;
+        ASSERT_EQ(SyslogNotifyConfGet(RulePath(), "R", read), 0);
+        EXPECT_EQ(read.name, "R");
+        EXPECT_EQ(read.type, c.type);
+        EXPECT_EQ(read.pri, c.pri);
+        EXPECT_EQ(read.eps, c.read);
+        EXPECT_EQ(read.pattern, "p=\"\\");
+        EXPECT_FALSE(read.enable);
+    }
+    EXPECT_THAT(Messages(), IsEmpty());
+}
+
+TEST_F(RuleFile, ReadsOddAndMissingValues) {
+    WriteRules("[none]\n[true]\nnotify_enable=\"true\"\n[yes]\nnotify_enable=\"yes\"\n[blank]\nnotify_enable="
+               "\" 1\"\n"
+               "[plain]\nnotify_type=1x\nnotify_eps=9223372036854775808\nnotify_enable=1\nnotify_pat=a b\n");
+    for (const char *name : {"none", "true", "yes", "blank"}) {
+        _SYSLOG_NOTIFY_RULES_tag rule{"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
+        ASSERT_EQ(SyslogNotifyConfGet(RulePath(), name, rule), 0);
+        EXPECT_FALSE(rule.enable) << name;
+        EXPECT_EQ(rule.type + rule.pri + static_cast<int>(rule.eps), 0);
+        EXPECT_EQ(rule.pattern, "");
+    }
+    _SYSLOG_NOTIFY_RULES_tag rule;
+    ASSERT_EQ(SyslogNotifyConfGet(RulePath(), "plain", rule), 0);
+    EXPECT_EQ(rule.type, 1);
+    EXPECT_EQ(rule.eps, 9223372036854775807u);
+    EXPECT_TRUE(rule.enable);
+    EXPECT_EQ(rule.pattern, "a b");
+}
+
+TEST_F(RuleFile, ReportsFailureWithTheRecordUnchanged) {
+    WriteRules("[R]\nnotify_type=\"1\"\nbroken\n");
+    _SYSLOG_NOTIFY_RULES_tag rule{"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
+    EXPECT_EQ(SyslogNotifyConfGet(root_.File("missing"), "R", rule), -1);
+    EXPECT_EQ(SyslogNotifyConfGet(RulePath(), "missing", rule), -1);
+    EXPECT_THAT(Messages(), ElementsAre("utils:85 Fail to do TORVCFileGetSection",
+                                        "utils:85 Fail to do TORVCFileGetSection"));
+    EXPECT_EQ(SyslogNotifyConfGet(RulePath(), "R", rule), -1);
+    EXPECT_THAT(Messages(),
+                ElementsAre(HasSubstr("notify.conf:3: "), "utils:85 Fail to do TORVCFileGetSection"));
+    PlatformCalls::FailFrom(1, 1);
+    EXPECT_EQ(SyslogNotifyConfGet(RulePath(), "R", rule), -1);
+    EXPECT_THAT(Messages(), ElementsAre("utils:81 Fail to allocate memory"));
+    EXPECT_EQ(rule.name, "before");
+    EXPECT_EQ(rule.eps, 9u);
+    EXPECT_TRUE(rule.enable);
+}
+
+TEST_F(RuleFile, RefusesToWriteWhatItCouldNotReadBack) {
+    WriteRules("");
+    for (const auto &[name, pattern] : {std::pair<std::string, std::string>{"R", "a\nb"},
+                                        {"R", std::string("a\0b", 3)},
+                                        {std::string("R\0", 2), "a"},
+                                        {"", "a"},
+                                        {"[R]", "a"}}) {
+        _SYSLOG_NOTIFY_RULES_tag rule{name, 2, SYSLOG_PRIO_EMERG, 0, pattern, true};
+        EXPECT_EQ(SyslogNotifyConfSet(RulePath(), "", rule), -1);
+        EXPECT_EQ(Messages().back(), "utils:139 Fail set section to file");
+    }
+    EXPECT_EQ(ReadFile(RulePath()), "");
+}
+
+TEST_F(RuleFile, ReportsEveryFailedCallOfAWrite) {
+    WriteRules("");
+    _SYSLOG_NOTIFY_RULES_tag rule{"R", 2, SYSLOG_PRIO_EMERG, 0, "p", true};
+    for (int n = 1;; ++n) {
+        PlatformCalls::FailFrom(n, 1);
+        const int result = SyslogNotifyConfSet(RulePath(), "", rule);
+        if (!PlatformCalls::HasFailed()) {
+            EXPECT_EQ(result, 0);
+            break;
+        }
+        EXPECT_EQ(result, -1);
+        const bool isWrite = PlatformCalls::Recorded().back().function == "TORVCFileSetSection";
+        EXPECT_THAT(Messages(), ElementsAre(isWrite ? "utils:139 Fail set section to file"
+                                                    : "utils:124 Fail to allocate memory"));
+        EXPECT_EQ(ReadFile(RulePath()), "");
+    }
+}
+
+TEST_F(NotificationSwitches, AreOnWhenAnyChannelIs) {
+    const std::string server = "smtp_server=\"mx\"\n";
+    const std::string to = "smtp_to=\"a@b.c, d@e.f\"\n";
+    const std::string push = "pushservice_mobile_enabled=\"no\"\npushservice_msn_enabled=\"no\"\n"
+                             "pushservice_skype_enabled=\"no\"\n";
+    struct Case {
+        std::string settings;
+        bool isOn;
+        const char *message;
+    };
+    const Case cases[] = {
+        {"smtp_mail_enabled=\"no\"\n" + server + to + push, false, nullptr},
+        {"smtp_mail_enabled=\"yes\"\n" + server + to + push, true, nullptr},
+        {"smtp_mail_enabled=\"Yes\"\n" + server + to + push, false, nullptr},
+        {"smtp_mail_enabled=\"yes, but only here\"\n" + server + to + push, false, nullptr},
+        {"smtp_mail_enabled=\"yes\"\n" + to + push, false, nullptr},
+        {"smtp_mail_enabled=\"yes\"\nsmtp_to=\" , ;\"\n" + server + push, false, nullptr},
+        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\n" + push, true, nullptr},
+        {"smtp_mail_enabled=\"no\"\npushservice_skype_enabled=\"yes\"\n" + push, true, nullptr},
+        {"sms_enabled=\"yes\"\n" + push, false, "utils:166 Fail to get smtp mail setting"},
+        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\n", false, "utils:188 Fail to get mobile setting"},
+        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\npushservice_mobile_enabled=\"yes\"\n", false,
+         "utils:196 Fail to get msn setting"},
+        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\npushservice_mobile_enabled=\"yes\"\n"
+         "pushservice_msn_enabled=\"yes\"\n",
+         false, "utils:204 Fail to get skype setting"},
+    };
+    for (const Case &c : cases) {
+        WriteSettings(c.settings);
+        EXPECT_EQ(IsNotificationSet(), c.isOn) << c.settings;
+        const std::vector<std::string> expected =
+            c.message != nullptr ? std::vector<std::string>{c.message} : std::vector<std::string>{};
+        EXPECT_EQ(Messages(), expected) << c.settings;
+    }
+}
+
+TEST_F(NotificationSwitches, AreOffWhenTheRecordsCannotBeRead) {
+    EXPECT_FALSE(IsNotificationSet());
+    EXPECT_THAT(Messages(), ElementsAre("utils:161 Fail to get mail setting"));
+    WriteSettings("smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\n");
+    PlatformCalls::FailFrom(3, 1);
+    EXPECT_FALSE(IsNotificationSet());
+    EXPECT_THAT(Messages(), ElementsAre("utils:178 Fail to get sms setting"));
+    // A value that does not fit is named, but not shown.
+    WriteSettings("smtp_password=\"" + std::string(300, 'S') + "\"\n");
+    EXPECT_FALSE(IsNotificationSet());
+    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("the value of smtp_password is too long"),
+                                        "utils:161 Fail to get mail setting"));
+}

@@ -1,0 +1,172 @@
+#include <gmock/gmock.h>
+#include <sys/stat.h>
+
+#include <filesystem>
+
+#include "platform/db_fixture.h"
+
+using namespace kelo::test;
+using testing::HasSubstr;
+namespace fs = std::filesystem;
+
+namespace {
+
+class Connecting : public testing::Test {
+protected:
+    Connecting() { fs::permissions(root.Path(), fs::perms::all); }
+
+    std::string MakeLogs(const std::string &name, const std::string &journalMode = "delete") {
+        const std::string path = root.File(name);
+        RunSql(
+            path,
+            "PRAGMA journal_mode=" + journalMode +
+                "; CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT); INSERT INTO logs(msg) VALUES('one')");
+        return path;
+    }
+    static std::string CountLogs(const Connection &connection) {
+        const Outcome outcome = Execute(connection, "SELECT count(*) AS n FROM logs", {"n"});
+        return outcome.status == 0 ? *outcome.rows[0][0] : outcome.error;
+    }
+
+    TempRoot root;
+};
+
+// Goes back to the current folder at the end.
+struct InFolder {
+    explicit InFolder(const std::string &path) { fs::current_path(path); }
+    ~InFolder() { fs::current_path(before); }
+    fs::path before = fs::current_path();
+};
+
+} // namespace
+
+TEST_F(Connecting, GivesNullAndCreatesNothingForWhatIsNoFile) {
+    const InFolder folder(root.Path());
+    fs::create_directory(root.File("folder"));
+    fs::create_symlink("nowhere", root.File("dangling"));
+    ASSERT_EQ(mkfifo(root.File("fifo").c_str(), 0666), 0);
+    const std::string logs = MakeLogs("logs.db");
+    const size_t before = static_cast<size_t>(std::distance(fs::directory_iterator(root.Path()), {}));
+    for (const std::string &path :
+         {std::string(), root.File("missing.db"), root.File("missing/logs.db"), root.File("folder"),
+          root.File("folder/"), root.File("fifo"), root.File("dangling"), std::string("/dev/null"),
+          std::string(":memory:"), "file:" + logs, "file:" + logs + "?mode=rwc", logs + "/",
+          std::string(5000, 'x')})
+        EXPECT_EQ(ConnectTo(path), nullptr) << path;
+    EXPECT_EQ(KELODBConnect(nullptr, nullptr, nullptr, nullptr), nullptr);
+    EXPECT_EQ(std::distance(fs::directory_iterator(root.Path()), {}), static_cast<std::ptrdiff_t>(before));
+    EXPECT_EQ(KELODBClose(nullptr), 0);
+    EXPECT_EQ(KELODBInternalDBHdlGet(nullptr), nullptr);
+    EXPECT_STRNE(KELODBErrorGet(nullptr), "");
+}
+
+TEST_F(Connecting, TakesAnyNameAsItStands) {
+    const InFolder folder(root.Path());
+    const std::string logs = MakeLogs("logs.db");
+    for (const char *name : {"relative.db", "file:x.db", "file:x.db?mode=memory", ":memory:", "100%41.db",
+                             "a'b\"c.db", "blank and \n.db", "-wal"}) {
+        fs::copy_file(logs, name);
+        EXPECT_EQ(CountLogs(ConnectTo(name)), "1") << name;
+        EXPECT_EQ(CountLogs(ConnectTo(root.File(name))), "1") << name;
+    }
+}
+
+TEST_F(Connecting, TellsAtTheFirstStatementThatAFileIsNoDatabase) {
+    WriteFile(root.File("text"), std::string(4096, 'x'));
+    WriteFile(root.File("empty"), "");
+    const Connection text = ConnectTo(root.File("text"));
+    EXPECT_EQ(Execute(text, "SELECT * FROM logs").errorCode, SQLITE_NOTADB);
+    const Connection empty = ConnectTo(root.File("empty"));
+    EXPECT_EQ(Execute(empty, "SELECT * FROM logs").error, "no such table: logs");
+    EXPECT_EQ(ReadFile(root.File("empty")), "");
+}
+
+TEST_F(Connecting, KeepsSqlInsideTheFile) {
+    const std::string logs = MakeLogs("logs.db");
+    const std::string other = MakeLogs("other.db");
+    const Connection connection = ConnectTo(logs);
+    for (const std::string &sql :
+         {"ATTACH '" + other + "' AS other", std::string("ATTACH ':memory:' AS other"),
+          "VACUUM INTO '" + root.File("copy.db") + "'", std::string("SELECT load_extension('libm.so.6')"),
+          std::string("SELECT writefile('x', 'y')"), std::string("UPDATE sqlite_schema SET sql = 'x'"),
+          std::string("SELECT fts3_tokenizer('simple', x'00')")})
+        EXPECT_EQ(Execute(connection, sql).status, -1) << sql;
+    Execute(connection, "PRAGMA writable_schema=ON");
+    EXPECT_EQ(Execute(connection, "DELETE FROM sqlite_schema").status, -1);
+    EXPECT_FALSE(fs::exists(root.File("copy.db")));
+    // A view that a damaged or hostile file brings along may call nothing that has effects.
+    RunSql(logs, "CREATE VIEW bait AS SELECT fts3_tokenizer('simple') AS a, 1 AS b, 2 AS c");
+    EXPECT_THAT(Execute(connection, "SELECT * FROM bait").error, HasSubstr("unsafe use"));
+}
+
+TEST_F(Connecting, WaitsForAnotherWriterAndThenTellsThatTheDatabaseIsLocked) {
+    const std::string logs = MakeLogs("logs.db");
+    const Connection writer = ConnectTo(logs);
+    EXPECT_EQ(AskedBusyTimeout(), 5000);
+    ASSERT_EQ(Execute(writer, "BEGIN EXCLUSIVE").status, 0);
+    const Connection reader = ConnectTo(logs);
+    const Outcome outcome = Execute(reader, "SELECT id, msg, 1 FROM logs");
+    EXPECT_EQ(outcome.errorCode, SQLITE_BUSY);
+    EXPECT_EQ(outcome.error, "database is locked");
+    EXPECT_FALSE(outcome.hasResult);
+    ASSERT_EQ(Execute(writer, "COMMIT").status, 0);
+    EXPECT_EQ(CountLogs(reader), "1");
+}
+
+TEST_F(Connecting, ReadsWhatMayOnlyBeRead) {
+    const std::string logs = MakeLogs("logs.db");
+    fs::permissions(logs, fs::perms::owner_read | fs::perms::group_read | fs::perms::others_read);
+    const std::string secret = MakeLogs("secret.db");
+    fs::permissions(secret, fs::perms::none);
+    const Unprivileged rights;
+    const Connection connection = ConnectTo(logs);
+    EXPECT_EQ(CountLogs(connection), "1");
+    EXPECT_EQ(Execute(connection, "DELETE FROM logs").errorCode, SQLITE_READONLY);
+    EXPECT_EQ(ConnectTo(secret), nullptr);
+}
+
+// Databases in WAL mode, in a folder where the reader can create no file.
+class ReadingWalInReadOnlyFolder : public Connecting {
+protected:
+    void Protect() const {
+        for (const auto &entry : fs::directory_iterator(root.Path()))
+            fs::permissions(entry, fs::perms::owner_all | fs::perms::group_read | fs::perms::others_read);
+        fs::permissions(root.Path(), fs::perms::all & ~(fs::perms::owner_write | fs::perms::group_write |
+                                                        fs::perms::others_write));
+    }
+    ~ReadingWalInReadOnlyFolder() override { fs::permissions(root.Path(), fs::perms::owner_all); }
+};
+
+TEST_F(ReadingWalInReadOnlyFolder, AnswersAtRestUntilSomebodyWrites) {
+    const std::string logs = MakeLogs("logs ?#%41.db", "wal");
+    Protect();
+    Connection connection;
+    {
+        const Unprivileged rights;
+        connection = ConnectTo(logs);
+        EXPECT_EQ(CountLogs(connection), "1");
+        EXPECT_EQ(Execute(connection, "DELETE FROM logs").errorCode, SQLITE_READONLY);
+    }
+    if (getuid() != 0)
+        fs::permissions(root.Path(), fs::perms::owner_all);
+    RunSql(logs, "INSERT INTO logs(msg) VALUES('two')");
+    const Outcome outcome = Execute(connection, "SELECT * FROM logs");
+    EXPECT_EQ(outcome.errorCode, SQLITE_BUSY);
+    EXPECT_THAT(outcome.error, HasSubstr("changed"));
+    EXPECT_FALSE(outcome.hasResult);
+}
+
+TEST_F(ReadingWalInReadOnlyFolder, AnswersWithTheRowsInTheWalOrNotAtAll) {
+    const std::string logs = MakeLogs("logs.db", "wal");
+    // A copy of the files of an open database is what a killed writer or a snapshot leaves.
+    const Connection writer = ConnectTo(logs);
+    ASSERT_EQ(Execute(writer, "INSERT INTO logs(msg) VALUES('two')").status, 0);
+    for (const char *suffix : {"", "-wal", "-shm"})
+        fs::copy_file(logs + suffix, root.File("copy.db") + suffix);
+    for (const char *suffix : {"", "-wal"})
+        fs::copy_file(logs + suffix, root.File("cut.db") + suffix);
+    Protect();
+    const Unprivileged rights;
+    EXPECT_EQ(CountLogs(ConnectTo(root.File("copy.db"))), "2");
+    EXPECT_EQ(Execute(ConnectTo(root.File("cut.db")), "SELECT * FROM logs").errorCode, SQLITE_CANTOPEN);
+}

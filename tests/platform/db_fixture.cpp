@@ -1,0 +1,67 @@
+#include "platform/db_fixture.h"
+
+#include <dlfcn.h>
+#include <unistd.h>
+
+namespace kelo::test {
+namespace {
+
+int askedBusyTimeout = 0;
+constexpr uid_t kNobody = 65534;
+
+Outcome Read(const Connection &connection, int status, DBResult_tag *result,
+             const std::vector<std::string> &columns) {
+    Outcome outcome{.status = status, .hasResult = result != nullptr, .rows = {}, .error = {}};
+    outcome.errorCode = sqlite3_errcode(KELODBInternalDBHdlGet(connection.get()));
+    outcome.error = KELODBErrorGet(connection.get());
+    unsigned int row = 0;
+    while (KELODBFetchRow(result, &row) >= 0) {
+        auto &texts = outcome.rows.emplace_back();
+        for (const std::string &column : columns) {
+            const char *text = KELODBFetchField(result, row, column.c_str());
+            texts.push_back(text != nullptr ? std::optional<std::string>(text) : std::nullopt);
+        }
+    }
+    EXPECT_EQ(KELODBNumRows(result), static_cast<int>(outcome.rows.size()));
+    KELODBFreeResult(result);
+    return outcome;
+}
+
+} // namespace
+
+Outcome Execute(const Connection &connection, const std::string &sql,
+                const std::vector<std::string> &columns) {
+    DBResult_tag *result = nullptr;
+    const int status = KELODBExecute(connection.get(), sql.c_str(), &result);
+    return Read(connection, status, result, columns);
+}
+
+Outcome SelectLimit(const Connection &connection, const std::string &sql, unsigned int limit,
+                    unsigned int offset, const std::vector<std::string> &columns) {
+    DBResult_tag *result = nullptr;
+    const int status = KELODBSelectLimit(connection.get(), sql.c_str(), limit, offset, &result);
+    return Read(connection, status, result, columns);
+}
+
+int AskedBusyTimeout() {
+    return askedBusyTimeout;
+}
+
+Unprivileged::Unprivileged() {
+    if (getuid() == 0 && seteuid(kNobody) != 0)
+        throw std::runtime_error("cannot drop the rights of root");
+}
+Unprivileged::~Unprivileged() {
+    if (getuid() == 0 && seteuid(0) != 0)
+        std::abort();
+}
+
+} // namespace kelo::test
+
+// Replaces SQLite's for the whole program: no test waits for seconds.
+extern "C" int sqlite3_busy_timeout(sqlite3 *db, int milliseconds) {
+    kelo::test::askedBusyTimeout = milliseconds;
+    static const auto real =
+        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
+    return real(db, 1);
+}

@@ -1,0 +1,53 @@
+#pragma once
+
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "keloplatform/kelodb.h"
+#include "support/log_database.h"
+#include "support/temp_root.h"
+
+namespace kelo::test {
+
+struct CloseConnection {
+    void operator()(DBConnect_tag *connection) const { KELODBClose(connection); }
+};
+using Connection = std::unique_ptr<DBConnect_tag, CloseConnection>;
+
+inline Connection ConnectTo(const std::string &path) {
+    return Connection(KELODBConnect(nullptr, nullptr, nullptr, path.c_str()));
+}
+
+// What one call gave: its rows as texts, or the connection's error after it.
+struct Outcome {
+    int status = 0;
+    bool hasResult = false;
+    std::vector<std::vector<std::optional<std::string>>> rows;
+    int errorCode = SQLITE_OK;
+    std::string error;
+};
+
+// Runs a statement and reads the named columns of every row.
+Outcome Execute(const Connection &connection, const std::string &sql,
+                const std::vector<std::string> &columns = {});
+Outcome SelectLimit(const Connection &connection, const std::string &sql, unsigned int limit,
+                    unsigned int offset, const std::vector<std::string> &columns);
+
+// Milliseconds that connections wait for another writer: what the library asked for last, and what tests get.
+int AskedBusyTimeout();
+
+// Acts with the rights of nobody while the object lives; those of root would hide every permission.
+class Unprivileged {
+public:
+    Unprivileged();
+    ~Unprivileged();
+    Unprivileged(const Unprivileged &) = delete;
+    Unprivileged &operator=(const Unprivileged &) = delete;
+};
+
+} // namespace kelo::test

@@ -1,0 +1,76 @@
+// The shell completion and the manual page know what the program knows.
+
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdio>
+#include <memory>
+#include <regex>
+#include <set>
+#include <sstream>
+
+#include "program_run.h"
+#include "support/temp_root.h"
+
+namespace kelo::test {
+namespace {
+
+using Words = std::set<std::string>;
+
+const std::string kCompletion = KELO_SOURCE_DIR "/package/completion/kelosyslog";
+
+Words Matches(const std::string &text, const std::string &pattern) {
+    const std::regex regex(pattern, std::regex::ECMAScript | std::regex::multiline);
+    Words words;
+    for (std::sregex_iterator match(text.begin(), text.end(), regex), end; match != end; ++match)
+        words.insert((*match)[1]);
+    return words;
+}
+
+// What bash offers for the last of `words`, which are to be quoted for the shell.
+Words Complete(const std::string &words) {
+    const std::string command = "bash -c \". " + kCompletion + "; COMP_WORDS=(kelosyslog " + words +
+                                "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
+                                "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"";
+    const std::unique_ptr<FILE, int (*)(FILE *)> pipe(popen(command.c_str(), "r"), pclose);
+    std::string text;
+    std::array<char, 4096> buffer;
+    for (size_t size = 1; size > 0;) {
+        size = fread(buffer.data(), 1, buffer.size(), pipe.get());
+        text.append(buffer.data(), size);
+    }
+    return Matches(text, "^(.+)$");
+}
+
+TEST(Documentation, KnowsEveryCommandAndOption) {
+    const std::string manual = ReadFile(KELO_SOURCE_DIR "/package/man/kelosyslog.1");
+    const std::string help = RunTool({"--help"}).out;
+    const Words commands = Matches(help.substr(help.find("Subcommands:")), "^  ([a-z]+)  ");
+    ASSERT_GE(commands.size(), 4U);
+    Words offered = commands;
+    offered.insert({"--root", "--version", "--help"});
+    EXPECT_EQ(Complete("''"), offered);
+    for (const std::string &command : commands) {
+        Words options = Matches(RunTool({command, "--help"}).out, "^  (?:-[A-Za-z],)?(--[a-z-]+)");
+        options.insert("--root");
+        EXPECT_EQ(Complete(command + " --"), options) << command;
+        EXPECT_NE(manual.find(".B kelosyslog " + command), std::string::npos) << command;
+        for (const std::string &option : options) {
+            const std::string inRoff = std::regex_replace(option, std::regex("-"), "\\-");
+            EXPECT_TRUE(option == "--help" || manual.find(inRoff) != std::string::npos) << option;
+        }
+    }
+}
+
+TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
+    EXPECT_EQ(Complete("search -p e"), (Words{"emerg", "err"}));
+    EXPECT_EQ(Complete("count --priority = err,\\!e"), (Words{"err,!emerg", "err,!err"}));
+    EXPECT_EQ(Complete("search --facility local0,local7,ke"), (Words{"local0,local7,kern"}));
+    EXPECT_EQ(Complete("search --output = js"), (Words{"json", "jsonl"}));
+    EXPECT_EQ(Complete("values -o s"), Words{});
+    EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
+    EXPECT_EQ(Complete("search --host n"), Words{});
+}
+
+} // namespace
+} // namespace kelo::test
