@@ -8,7 +8,7 @@ enum ExitStatus : int {
     kExitNothing = 1,
     kExitUsage = 2,
     kExitDatabase = 3,
-    kExitOutput = 4, // what was found could not be written, for example to a full disk
+    kExitSystem = 4, // the output cannot be written, for example to a full disk, or memory ran out
 };
 
 } // namespace kelo::tool

@@ -46,9 +46,8 @@ public:
 
     // The id of the `index`-th newest selected log (0 is the newest); 0 when there are not that many.
     uint64_t IdFromNewest(uint64_t index) const;
-    // The smallest selected id in `range`, or the largest; 0 when there is none.
+    // The smallest selected id in `range`; 0 when there is none.
     uint64_t FirstId(const IdRange &range) const { return EndId(range, true); }
-    uint64_t LastId(const IdRange &range) const { return EndId(range, false); }
 
     // Hands the logs with an id in `range` to `handle`, oldest first or newest first, up to `limit` (0 for
     // all). Returns how many.

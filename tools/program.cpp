@@ -122,10 +122,13 @@ int RunProgram(Program &program, int argc, const char *const *argv) {
         return kExitDatabase;
     } catch (const OutputError &error) {
         PrintMessage(error.what());
-        return kExitOutput;
+        return kExitSystem;
     } catch (const std::bad_alloc &) {
         PrintMessage("out of memory");
-        return kExitOutput;
+        return kExitSystem;
+    } catch (const std::exception &error) { // for example a working folder that is gone
+        PrintMessage(error.what());
+        return kExitSystem;
     }
 }
 

@@ -1,13 +1,12 @@
 // The shell completion and the manual page know what the program knows.
 
 #include <gtest/gtest.h>
+#include <re2/re2.h>
 
 #include <array>
 #include <cstdio>
 #include <memory>
-#include <regex>
 #include <set>
-#include <sstream>
 
 #include "program_run.h"
 #include "support/temp_root.h"
@@ -19,11 +18,13 @@ using Words = std::set<std::string>;
 
 const std::string kCompletion = KELO_SOURCE_DIR "/package/completion/kelosyslog";
 
+// What the one group of `pattern` finds, anywhere in the text; '^' and '$' are line ends.
 Words Matches(const std::string &text, const std::string &pattern) {
-    const std::regex regex(pattern, std::regex::ECMAScript | std::regex::multiline);
+    const RE2 regex("(?m)" + pattern);
+    re2::StringPiece rest(text);
     Words words;
-    for (std::sregex_iterator match(text.begin(), text.end(), regex), end; match != end; ++match)
-        words.insert((*match)[1]);
+    for (std::string word; RE2::FindAndConsume(&rest, regex, &word);)
+        words.insert(word);
     return words;
 }
 
@@ -56,7 +57,8 @@ TEST(Documentation, KnowsEveryCommandAndOption) {
         EXPECT_EQ(Complete(command + " --"), options) << command;
         EXPECT_NE(manual.find(".B kelosyslog " + command), std::string::npos) << command;
         for (const std::string &option : options) {
-            const std::string inRoff = std::regex_replace(option, std::regex("-"), "\\-");
+            std::string inRoff = option;
+            RE2::GlobalReplace(&inRoff, "-", "\\\\-");
             EXPECT_TRUE(option == "--help" || manual.find(inRoff) != std::string::npos) << option;
         }
     }

@@ -44,8 +44,8 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsAfterDeletions) {
     }
     const LogReader reader(source_, {});
     EXPECT_EQ(reader.Count(), newestFirst.size());
-    for (const uint64_t limit : {0, 1, 50, 1000, 60000}) {
-        for (const uint64_t offset : {0, 1, 7, 186, 187, 500}) {
+    for (const uint64_t limit : {0U, 1U, 50U, 1000U, 60000U}) {
+        for (const uint64_t offset : {0U, 1U, 7U, 186U, 187U, 500U}) {
             SCOPED_TRACE(std::to_string(limit) + " after " + std::to_string(offset));
             const size_t begin = std::min<size_t>(offset, newestFirst.size());
             const size_t end =

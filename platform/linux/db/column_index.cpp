@@ -1,7 +1,5 @@
 #include "db/column_index.h"
 
-#include <cstring>
-
 namespace kelo::platform {
 namespace {
 
@@ -21,7 +19,7 @@ void ColumnIndex::Add(std::string_view name) {
     names_.insert(names_.end(), name.begin(), name.end());
     names_.push_back('\0');
     nameAt_.push_back(offset);
-    next_.push_back(0);
+    follower_.push_back(0);
     if (slots_.size() < 2 * nameAt_.size()) {
         Grow();
         return;
@@ -43,22 +41,18 @@ void ColumnIndex::Grow() {
 size_t ColumnIndex::SlotOf(const char *name) const {
     const size_t mask = slots_.size() - 1;
     size_t slot = HashOf(name) & mask;
-    while (slots_[slot] != kNone && std::strcmp(Name(slots_[slot]), name) != 0)
+    while (slots_[slot] != kNone && !IsSame(Name(slots_[slot]), name))
         slot = (slot + 1) & mask;
     return slot;
 }
 
-uint32_t ColumnIndex::Find(const char *name) {
-    if (slots_.empty())
-        return kNone;
-    // Rows are read with the same columns in the same order, so the guess is nearly always right.
-    const uint32_t guess = next_[last_];
-    if (std::strcmp(Name(guess), name) == 0)
-        return last_ = guess;
-    const uint32_t column = slots_[SlotOf(name)];
-    if (column != kNone)
-        last_ = next_[last_] = column;
-    return column;
+uint32_t ColumnIndex::Search(const char *name) {
+    const uint32_t found = slots_[SlotOf(name)];
+    if (found != kNone) {
+        follower_[last_] = found;
+        last_ = found;
+    }
+    return found;
 }
 
 } // namespace kelo::platform

@@ -6,7 +6,6 @@
 #include "search/regexp_function.h"
 
 using kelo::platform::Database;
-using kelo::platform::DatabaseFile;
 
 namespace {
 
@@ -18,11 +17,17 @@ struct Limit {
 };
 // Far above what a log needs and far below what a damaged file can ask for.
 constexpr Limit kLimits[] = {
-    {SQLITE_LIMIT_ATTACHED, 0},          // also VACUUM, which attaches its copy
+    {SQLITE_LIMIT_ATTACHED, 1},          // VACUUM attaches its copy
     {SQLITE_LIMIT_LENGTH, 64 << 20},     // bytes of a value or a row
     {SQLITE_LIMIT_SQL_LENGTH, 16 << 20}, // bytes of a statement
     {SQLITE_LIMIT_WORKER_THREADS, 0},
 };
+
+// Lets SQL attach nothing but a nameless temporary database, which is what VACUUM does.
+int Authorize(void *, int action, const char *file, const char *, const char *, const char *) {
+    const bool attachesFile = action == SQLITE_ATTACH && (file == nullptr || file[0] != '\0');
+    return attachesFile ? SQLITE_DENY : SQLITE_OK;
+}
 
 // What a file holds must not make SQLite do more than read it, and SQL must stay inside the file.
 bool Harden(sqlite3 *db) {
@@ -32,6 +37,7 @@ bool Harden(sqlite3 *db) {
            sqlite3_db_config(db, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr) == SQLITE_OK &&
            sqlite3_db_config(db, SQLITE_DBCONFIG_ENABLE_LOAD_EXTENSION, 0, nullptr) == SQLITE_OK &&
            sqlite3_db_config(db, SQLITE_DBCONFIG_ENABLE_FTS3_TOKENIZER, 0, nullptr) == SQLITE_OK &&
+           sqlite3_set_authorizer(db, Authorize, nullptr) == SQLITE_OK &&
            sqlite3_exec(db, "PRAGMA cell_size_check=ON", nullptr, nullptr, nullptr) == SQLITE_OK;
 }
 
@@ -41,7 +47,7 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
     if (path == nullptr || path[0] == '\0')
         return nullptr;
     try {
-        auto connection = std::make_unique<DBConnect_tag>(DatabaseFile(path));
+        auto connection = std::make_unique<DBConnect_tag>(path);
         Database db = connection->file.Open();
         if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
             sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)

@@ -6,6 +6,8 @@
 #include "keloplatform/kelodb.h"
 
 struct DBConnect_tag {
+    explicit DBConnect_tag(const char *path) : file(path) {}
+
     kelo::platform::DatabaseFile file;
     sqlite3 *db = nullptr; // closed by KELODBClose
 };

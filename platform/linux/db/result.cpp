@@ -4,8 +4,7 @@
 #include <stdexcept>
 
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
-    : rows(static_cast<size_t>(sqlite3_column_count(statement))),
-      cells(static_cast<size_t>(sqlite3_column_count(statement))) {
+    : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()) {
     for (int column = 0; column < sqlite3_column_count(statement); ++column) {
         const char *name = sqlite3_column_name(statement, column);
         if (name == nullptr)

@@ -2,6 +2,7 @@
 
 #include <sqlite3.h>
 
+#include <array>
 #include <climits>
 #include <cstdint>
 #include <vector>
@@ -24,5 +25,7 @@ struct DBResult_tag {
     kelo::platform::ColumnIndex columns;
     kelo::platform::RowBlock rows;
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
+    using Digits = std::array<char, 20>;     // -9223372036854775808
+    std::vector<Digits> digits;              // of the integers in `cells`
     uint32_t nextRow = 0;
 };

@@ -7,6 +7,7 @@
 #include <cstring>
 #include <new>
 #include <stdexcept>
+#include <utility>
 
 namespace kelo::platform {
 namespace {
@@ -14,12 +15,10 @@ namespace {
 // Chunks grow to the size of a huge page, which spares a large result most of its page faults.
 constexpr size_t kHugePage = size_t{2} << 20;
 
-// A row is a byte that tells the width of its offsets, the offsets of its texts from the row's start, and the
-// texts. No text starts at 0, so that offset stands for NULL.
-enum Width : char { kNarrow = 0, kWide = 1 };
+} // namespace
 
 template <typename Offset>
-void WriteRow(char *row, Width width, std::span<const Cell> cells) {
+void RowBlock::WriteRow(char *row, Width width, std::span<const Cell> cells) {
     row[0] = width;
     char *offsets = row + 1;
     char *text = offsets + cells.size() * sizeof(Offset);
@@ -35,15 +34,6 @@ void WriteRow(char *row, Width width, std::span<const Cell> cells) {
     }
 }
 
-template <typename Offset>
-const char *ReadText(const char *row, size_t column) {
-    Offset offset;
-    std::memcpy(&offset, row + 1 + column * sizeof offset, sizeof offset);
-    return offset != 0 ? row + offset : nullptr;
-}
-
-} // namespace
-
 void RowBlock::FreeChunk::operator()(char *chunk) const {
     std::free(chunk);
 }
@@ -51,15 +41,14 @@ void RowBlock::FreeChunk::operator()(char *chunk) const {
 char *RowBlock::Allocate(size_t size) {
     if (size > freeSize_) {
         const size_t chunkSize = std::max(size, nextChunkSize_);
-        chunks_.reserve(chunks_.size() + 1);
-        auto *chunk = static_cast<char *>(chunkSize == kHugePage ? std::aligned_alloc(kHugePage, chunkSize)
-                                                                 : std::malloc(chunkSize));
+        std::unique_ptr<char, FreeChunk> chunk(static_cast<char *>(
+            chunkSize == kHugePage ? std::aligned_alloc(kHugePage, chunkSize) : std::malloc(chunkSize)));
         if (chunk == nullptr)
             throw std::bad_alloc();
         if (chunkSize == kHugePage)
-            madvise(chunk, chunkSize, MADV_HUGEPAGE); // a hint: without huge pages it is only slower
-        chunks_.emplace_back(chunk);
-        free_ = chunk;
+            madvise(chunk.get(), chunkSize, MADV_HUGEPAGE); // a hint: without huge pages it is only slower
+        chunks_.push_back(std::move(chunk));
+        free_ = chunks_.back().get();
         freeSize_ = chunkSize;
         nextChunkSize_ = std::min(2 * nextChunkSize_, kHugePage);
     }
@@ -87,11 +76,6 @@ void RowBlock::Add(std::span<const Cell> cells) {
         WriteRow<uint32_t>(row, kWide, cells);
     tables_[count_ / kRowsPerTable][count_ % kRowsPerTable] = row;
     ++count_;
-}
-
-const char *RowBlock::Text(uint64_t row, size_t column) const {
-    const char *start = tables_[row / kRowsPerTable][row % kRowsPerTable];
-    return start[0] == kNarrow ? ReadText<uint16_t>(start, column) : ReadText<uint32_t>(start, column);
 }
 
 } // namespace kelo::platform

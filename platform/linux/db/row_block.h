@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <memory>
 #include <span>
 #include <vector>
@@ -18,18 +19,31 @@ struct Cell {
 // texts with their NULs, two bytes a cell (four where the row passes 64 KiB) and nine bytes.
 class RowBlock {
 public:
-    explicit RowBlock(size_t columnCount) : columnCount_(columnCount) {}
-
-    // Appends a row of `columnCount` cells. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
+    // Appends a row. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
     // either leaves the rows as they were.
     void Add(std::span<const Cell> cells);
 
     uint64_t Count() const { return count_; }
 
     // Text of a cell, null for NULL. Both positions have to exist.
-    const char *Text(uint64_t row, size_t column) const;
+    const char *Text(uint64_t row, size_t column) const {
+        const char *start = tables_[row / kRowsPerTable][row % kRowsPerTable];
+        return start[0] == kNarrow ? ReadText<uint16_t>(start, column) : ReadText<uint32_t>(start, column);
+    }
 
 private:
+    // A row is a byte that tells the width of its offsets, the offsets of its texts from the row's start, and
+    // the texts. No text starts at 0, so that offset stands for NULL.
+    enum Width : char { kNarrow = 0, kWide = 1 };
+    template <typename Offset>
+    static void WriteRow(char *row, Width width, std::span<const Cell> cells);
+    template <typename Offset>
+    static const char *ReadText(const char *row, size_t column) {
+        Offset offset;
+        std::memcpy(&offset, row + 1 + column * sizeof offset, sizeof offset);
+        return offset != 0 ? row + offset : nullptr;
+    }
+
     struct FreeChunk {
         void operator()(char *chunk) const;
     };
@@ -37,7 +51,6 @@ private:
 
     char *Allocate(size_t size);
 
-    size_t columnCount_;
     uint64_t count_ = 0;
     std::vector<std::unique_ptr<char, FreeChunk>> chunks_;
     char *free_ = nullptr; // rest of the newest chunk
