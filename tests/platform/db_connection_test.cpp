@@ -89,7 +89,7 @@ TEST_F(Connecting, KeepsSqlInsideTheFile) {
 
 TEST_F(Connecting, ReadsWhatMayOnlyBeRead) {
     const std::string logs = MakeLogs("logs.db");
-    fs::permissions(logs, fs::perms::owner_read | fs::perms::group_read | fs::perms::others_read);
+    fs::permissions(logs, fs::perms{0444});
     const std::string secret = MakeLogs("secret.db");
     fs::permissions(secret, fs::perms::none);
     const Unprivileged rights;
@@ -104,9 +104,8 @@ class ReadingWalInReadOnlyFolder : public Connecting {
 protected:
     void Protect() const {
         for (const auto &entry : fs::directory_iterator(root.Path()))
-            fs::permissions(entry, fs::perms::owner_all | fs::perms::group_read | fs::perms::others_read);
-        fs::permissions(root.Path(), fs::perms::all & ~(fs::perms::owner_write | fs::perms::group_write |
-                                                        fs::perms::others_write));
+            fs::permissions(entry, fs::perms{0744});
+        fs::permissions(root.Path(), fs::perms{0555});
     }
     ~ReadingWalInReadOnlyFolder() override { fs::permissions(root.Path(), fs::perms::owner_all); }
 };
