@@ -102,7 +102,7 @@ TEST(DBRecToLogInfo, ReadsNumbersFromTheLeadingDigitsAndNullAsNothing) {
 TEST(DBRecToLogInfo, LeavesTheRecordAloneWhenItFails) {
     const QueriedRow row(kEveryColumn);
     _SYSLOG_LOG_DATA_tag log = FilledLog();
-    for (const char *table : {"LOGS", "logs ", "", "db_info"})
+    for (const char *table : {"LOGS", "logs ", ""})
         EXPECT_EQ(row.ConvertTo(log, table), -1) << table;
     for (const char *table : {"logs", "general_log", "connection_log", "transfer_log"}) {
         EXPECT_EQ(DBRecToLogInfo(table, nullptr, 0, &log, true), -1) << table;

