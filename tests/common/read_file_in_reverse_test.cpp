@@ -3,6 +3,8 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <algorithm>
+
 #include "kelosyslog/utils.h"
 #include "support/syslog_capture.h"
 #include "support/temp_root.h"
@@ -26,6 +28,7 @@ Lines ReadReversed(FILE *stream, int32_t count, int32_t max) {
     Lines lines;
     lines.result = readfileinreverse(stream, &array, count, max);
     fclose(stream);
+    EXPECT_LE(count, std::max(first, max));
     for (int32_t i = 0; i < max; ++i) {
         EXPECT_EQ(array[i] != nullptr, i >= first && i < count) << i;
         if (array[i] != nullptr)

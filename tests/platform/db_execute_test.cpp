@@ -99,8 +99,10 @@ TEST_F(Executing, TellsWhatFailed) {
 }
 
 TEST(Escaping, FailsInsteadOfCuttingTheText) {
-    char out[8];
+    char out[8] = "#######";
     EXPECT_EQ(KELODBEscapeStringEX(nullptr, out, 6, "a'b'", 4), -1);
+    EXPECT_EQ(KELODBEscapeStringEX(nullptr, out, 5, "a'b'", 4), -1);
+    EXPECT_STREQ(out + 5, "##");
     EXPECT_EQ(KELODBEscapeStringEX(nullptr, out, 7, "a'b'", 4), 6);
     EXPECT_STREQ(out, "a''b''");
     EXPECT_EQ(KELODBEscapeStringEX2(nullptr, out, 8, "a\0b", 3), -1);
