@@ -40,9 +40,17 @@ void SetUpArchive(Ground &ground) {
     NotifyCalls::Reset();
     SystemCalls::Reset();
     SyslogRootSet(ground.root.Path());
-    ground.database = ground.root.File("logs.db");
-    CreateLogDatabase(ground.database, "archive.sql");
-    InsertSampleLogs(ground.database, 10);
+    CreateLogDatabase(ground.root.File("logs.db"), "archive.sql");
+    InsertSampleLogs(ground.root.File("logs.db"), 10);
+}
+
+// Where the database is. SQLite takes some failing reads for damage, which puts it aside.
+std::string SoundDatabase(const Ground &ground, const Outcome &outcome) {
+    const std::string path = ground.root.File("logs.db");
+    const std::string found = outcome.fault == "read" && !fs::exists(path) ? path + ".corrupt" : path;
+    EXPECT_TRUE(fs::exists(found));
+    EXPECT_EQ(QueryText(found, "PRAGMA integrity_check"), "ok");
+    return found;
 }
 
 int KeepId(DBResult_tag *result, void *context) {
@@ -78,7 +86,8 @@ int Change(Ground &ground) {
 }
 
 void CheckChange(const Ground &ground, const Outcome &outcome) {
-    const std::string row = QueryText(ground.database, "SELECT device || start_time FROM db_info");
+    const std::string row =
+        QueryText(SoundDatabase(ground, outcome), "SELECT device || start_time FROM db_info");
     if (outcome.IsDone())
         EXPECT_EQ(row, "it's7");
     else
@@ -93,7 +102,7 @@ void SetUpNothing(Ground &ground) {
 }
 
 int Create(Ground &ground) {
-    return Connected(ground).status;
+    return DBHandler(ground.root.File("logs.db"), kSchema).DBCreate();
 }
 
 // Without write-ahead logging it is done too, and says so.
@@ -103,7 +112,7 @@ void CheckCreation(const Ground &ground, const Outcome &outcome) {
         return testing::Value(outcome.messages, Contains(HasSubstr(text)));
     };
     if (!outcome.IsDone()) {
-        EXPECT_TRUE(outcome.outOfMemory || hasLine("Fail to create") || hasLine("Fail to open db: " + path));
+        EXPECT_TRUE(outcome.outOfMemory || hasLine("Fail to create"));
         return;
     }
     EXPECT_EQ(QueryText(path, "SELECT count(*) FROM db_info"), "1");
@@ -145,12 +154,13 @@ void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
 std::vector<Operation> HandlerOperations() {
     const std::vector<std::string> ids = {"1"};
     const auto checkRead = [=](const Ground &ground, const Outcome &outcome) {
+        SoundDatabase(ground, outcome);
         EXPECT_TRUE(ground.seen == ids ||
                     ((!outcome.IsDone() || outcome.fault == "KELODBFetchRow") && ground.seen.empty()));
     };
     return {
-        {"HandlerReads", false, SetUpArchive, Read, checkRead},
-        {"HandlerChanges", true, SetUpArchive, Change, CheckChange},
+        {"HandlerReads", false, SetUpArchive, Read, checkRead, true, false},
+        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, true, false},
         {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, true, false},
         {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, true, false},
     };
