@@ -16,9 +16,9 @@
 
 #include <cstdint>
 #include <list>
-#include <map>
 #include <string>
 #include <unordered_map>
+#include <utility>
 #include <vector>
 
 #include "kelosyslog/dbutil.h"
@@ -74,23 +74,29 @@ public:
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
 
 private:
-    struct Device {
-        KELOLOG_LOG_DEVICE_STATISTIC *statistic;
-        int32_t currentCount; // in the sample that is still open
+    struct Counts {
+        uint64_t total;       // in the histogram
+        int32_t inOpenSample; // since the last sample was closed
+    };
+    using Devices = std::unordered_map<std::string, Counts>;
+    using Device = Devices::value_type;
+
+    struct Sample {
+        int64_t stamp;
+        std::vector<std::pair<const Device *, int32_t>> devices; // with their counts, in any order
     };
 
     KELOSYSLOG_LOCAL Device &DeviceOf(const std::string &name);
-    KELOSYSLOG_LOCAL std::map<std::string, int32_t> CurrentDevices() const;
     KELOSYSLOG_LOCAL void NotifyEps(uint64_t eps);
 
     std::string dbPath_;
     int64_t totalCount_ = 0;
     int64_t currentSecond_ = 0;
     int64_t currentCount_ = 0;
-    std::vector<Device *> currentDevices_; // those with logs in the open sample
     int32_t lastFlushCheck_ = 0;
-    std::list<SYSLOG_LOG_EPS> samples_;
-    std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram_;
-    std::unordered_map<std::string, Device> devices_; // finds a device's histogram entry
+    Devices devices_;
+    std::vector<const Device *> histogram_; // the devices in the histogram's order
+    std::vector<Device *> openSample_;      // the devices with logs in the open sample
+    std::list<Sample> samples_;
     NotificationManager notifications_;
 };

@@ -1,6 +1,10 @@
 #include "kelosyslog/accounting.h"
 
+#include <syslog.h>
+
 #include <ctime>
+#include <exception>
+#include <utility>
 
 #include "common/root.h"
 #include "kelosyslog/debuger.h"
@@ -16,11 +20,15 @@ constexpr int32_t kFlushBeatSec = 5;
 AccountingManager::AccountingManager() {
     ConfigLoad();
     for (const auto &[device, count] : SyslogDBHistGet(dbPath_, 0))
-        DeviceOf(device).statistic->count = count;
+        DeviceOf(device).second.total = count;
 }
 
 AccountingManager::~AccountingManager() {
-    AccoutingFlush2DB();
+    try {
+        AccoutingFlush2DB();
+    } catch (const std::exception &error) {
+        syslog(LOG_ERR, "cannot flush the accounting at its end: %s", error.what());
+    }
 }
 
 int AccountingManager::ConfigLoad() {
@@ -29,44 +37,43 @@ int AccountingManager::ConfigLoad() {
 }
 
 AccountingManager::Device &AccountingManager::DeviceOf(const std::string &name) {
-    const auto [entry, isNew] = devices_.try_emplace(name, Device{nullptr, 0});
-    if (isNew)
-        entry->second.statistic = &histogram_.emplace_back(KELOLOG_LOG_DEVICE_STATISTIC{name, 0});
-    return entry->second;
+    if (const auto known = devices_.find(name); known != devices_.end())
+        return *known;
+    if (histogram_.size() == histogram_.capacity()) // so that the device is in both or in none
+        histogram_.reserve(2 * histogram_.size() + 1);
+    Device &device = *devices_.try_emplace(name, Counts{0, 0}).first;
+    histogram_.push_back(&device); // elements of the map keep their place in memory
+    return device;
 }
 
 int AccountingManager::LogInc(std::string device) {
-    ++totalCount_;
     CurEpsUpdate();
-    Device &counted = DeviceOf(device);
-    if (counted.currentCount == 0)
-        currentDevices_.push_back(&counted);
-    ++counted.currentCount;
+    Device &entry = DeviceOf(device);
+    if (entry.second.inOpenSample == 0)
+        openSample_.push_back(&entry);
+    // Nothing throws from here on: a log is in all figures or, without memory, in none.
+    ++entry.second.inOpenSample;
+    ++entry.second.total;
     ++currentCount_;
-    ++counted.statistic->count;
+    ++totalCount_;
     return 0;
-}
-
-std::map<std::string, int32_t> AccountingManager::CurrentDevices() const {
-    std::map<std::string, int32_t> counts;
-    for (const Device *device : currentDevices_)
-        counts.emplace(device->statistic->device, device->currentCount);
-    return counts;
 }
 
 int AccountingManager::CurEpsUpdate() {
     const int64_t now = std::time(nullptr);
     if (now == currentSecond_ || currentCount_ == 0)
         return 0;
+    Sample sample{now, {}};
+    sample.devices.reserve(openSample_.size());
+    samples_.push_back(std::move(sample));
+    // From here on nothing throws until the sample is closed, so that none is closed twice.
     currentSecond_ = now;
-    samples_.push_back({now, currentCount_, CurrentDevices()});
-    const auto eps = static_cast<uint64_t>(currentCount_);
+    for (Device *device : openSample_)
+        samples_.back().devices.emplace_back(device, std::exchange(device->second.inOpenSample, 0));
+    openSample_.clear();
+    const auto eps = static_cast<uint64_t>(std::exchange(currentCount_, 0));
     if (notifications_.CheckEps(eps))
         NotifyEps(eps);
-    currentCount_ = 0;
-    for (Device *device : currentDevices_)
-        device->currentCount = 0;
-    currentDevices_.clear();
     return 0;
 }
 
@@ -93,8 +100,8 @@ void AccountingManager::AccountingDump() {
     Debuger::MSG(2, "======Accounting Status dump======");
     Debuger::MSG(2, "Total: " + ullNumberToString(static_cast<uint64_t>(totalCount_)));
     Debuger::MSG(2, "EPS: " + ullNumberToString(static_cast<uint64_t>(currentCount_)));
-    for (const KELOLOG_LOG_DEVICE_STATISTIC &entry : histogram_)
-        Debuger::MSG(2, "Device: " + entry.device + ", count: " + ullNumberToString(entry.count));
+    for (const Device *entry : histogram_)
+        Debuger::MSG(2, "Device: " + entry->first + ", count: " + ullNumberToString(entry->second.total));
     Debuger::MSG(2, "==================================");
 }
 
@@ -107,5 +114,8 @@ int64_t AccountingManager::CurrentEpsGet() const {
 }
 
 std::list<KELOLOG_LOG_DEVICE_STATISTIC> AccountingManager::HistogramGet() const {
-    return histogram_;
+    std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram;
+    for (const Device *entry : histogram_)
+        histogram.push_back({entry->first, entry->second.total});
+    return histogram;
 }

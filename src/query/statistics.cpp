@@ -35,13 +35,22 @@ uint64_t AskNumber(const std::string &dbPath, const std::string &sql, const char
     return UnsignedField(answer.result.get(), row, column);
 }
 
-// Adds a row to the sample of its stamp. The accounting manager writes stamps, and the devices of a stamp, in
-// ascending order, so the ends of the maps are where to look first.
-void AddEpsRow(DBResult_tag *result, uint32_t row, std::map<int, SYSLOG_LOG_EPS> &samples) {
-    const int32_t stamp = Int32Field(result, row, "stamp");
-    const int32_t eps = Int32Field(result, row, "eps");
+using Samples = std::map<int, SYSLOG_LOG_EPS>;
+
+// The sample of a stamp. The accounting manager writes stamps in ascending order, so the last one is where to
+// look first.
+SYSLOG_LOG_EPS &SampleOf(Samples &samples, int32_t stamp) {
+    if (!samples.empty() && samples.rbegin()->first == stamp)
+        return samples.rbegin()->second;
     SYSLOG_LOG_EPS &sample = samples.try_emplace(samples.end(), stamp)->second;
     sample.stamp = stamp;
+    return sample;
+}
+
+// Adds a row to the sample of its stamp. The devices of a sample, too, come in ascending order.
+void AddEpsRow(DBResult_tag *result, uint32_t row, Samples &samples) {
+    SYSLOG_LOG_EPS &sample = SampleOf(samples, Int32Field(result, row, "stamp"));
+    const int32_t eps = Int32Field(result, row, "eps");
     // The total takes every row, the devices only the first of each name.
     sample.eps += eps;
     sample.devices.try_emplace(sample.devices.end(), FieldText(result, row, "device"), eps);
@@ -81,7 +90,7 @@ std::map<int, SYSLOG_LOG_EPS> SyslogDBEpsGet(const std::string &dbPath, int from
         return {};
     const std::string sql =
         "SELECT * FROM eps WHERE stamp >=" + WidenedText(from) + " and stamp <=" + WidenedText(to);
-    std::map<int, SYSLOG_LOG_EPS> samples;
+    Samples samples;
     const bool isComplete = AskRows(
         dbPath, sql, nullptr, [&](DBResult_tag *result, uint32_t row) { AddEpsRow(result, row, samples); });
     if (!isComplete)
