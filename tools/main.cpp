@@ -21,5 +21,6 @@ int main(int argc, char **argv) {
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
     kelo::tool::AddValues(program);
+    kelo::tool::AddStats(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

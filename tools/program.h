@@ -53,5 +53,6 @@ void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddValues(Program &program);
+void AddStats(Program &program);
 
 } // namespace kelo::tool

@@ -16,14 +16,19 @@
 
 #include <cstdint>
 #include <list>
+#include <memory>
 #include <string>
-#include <unordered_map>
 #include <utility>
 #include <vector>
 
 #include "kelosyslog/dbutil.h"
 #include "kelosyslog/export.h"
 #include "kelosyslog/notification.h"
+
+namespace kelo {
+struct Device;
+class DeviceTable;
+} // namespace kelo
 
 // One entry of the histogram.
 struct KELOLOG_LOG_DEVICE_STATISTIC {
@@ -74,19 +79,11 @@ public:
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
 
 private:
-    struct Counts {
-        uint64_t total;       // in the histogram
-        int32_t inOpenSample; // since the last sample was closed
-    };
-    using Devices = std::unordered_map<std::string, Counts>;
-    using Device = Devices::value_type;
-
     struct Sample {
         int64_t stamp;
-        std::vector<std::pair<const Device *, int32_t>> devices; // with their counts, in any order
+        std::vector<std::pair<const kelo::Device *, int32_t>> devices; // with their counts, in any order
     };
 
-    KELOSYSLOG_LOCAL Device &DeviceOf(const std::string &name);
     KELOSYSLOG_LOCAL void NotifyEps(uint64_t eps);
 
     std::string dbPath_;
@@ -94,9 +91,8 @@ private:
     int64_t currentSecond_ = 0;
     int64_t currentCount_ = 0;
     int32_t lastFlushCheck_ = 0;
-    Devices devices_;
-    std::vector<const Device *> histogram_; // the devices in the histogram's order
-    std::vector<Device *> openSample_;      // the devices with logs in the open sample
+    std::unique_ptr<kelo::DeviceTable> devices_; // in the histogram's order
+    std::vector<kelo::Device *> openSample_;     // the devices with logs in the open sample
     std::list<Sample> samples_;
     NotificationManager notifications_;
 };

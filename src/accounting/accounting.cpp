@@ -6,6 +6,7 @@
 #include <exception>
 #include <utility>
 
+#include "accounting/device_table.h"
 #include "common/root.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/logger.h"
@@ -17,10 +18,10 @@ constexpr int32_t kFlushBeatSec = 5;
 
 } // namespace
 
-AccountingManager::AccountingManager() {
+AccountingManager::AccountingManager() : devices_(std::make_unique<kelo::DeviceTable>()) {
     ConfigLoad();
     for (const auto &[device, count] : SyslogDBHistGet(dbPath_, 0))
-        DeviceOf(device).second.total = count;
+        devices_->Find(device).total = count;
 }
 
 AccountingManager::~AccountingManager() {
@@ -36,24 +37,14 @@ int AccountingManager::ConfigLoad() {
     return 0;
 }
 
-AccountingManager::Device &AccountingManager::DeviceOf(const std::string &name) {
-    if (const auto known = devices_.find(name); known != devices_.end())
-        return *known;
-    if (histogram_.size() == histogram_.capacity()) // so that the device is in both or in none
-        histogram_.reserve(2 * histogram_.size() + 1);
-    Device &device = *devices_.try_emplace(name, Counts{0, 0}).first;
-    histogram_.push_back(&device); // elements of the map keep their place in memory
-    return device;
-}
-
 int AccountingManager::LogInc(std::string device) {
     CurEpsUpdate();
-    Device &entry = DeviceOf(device);
-    if (entry.second.inOpenSample == 0)
+    kelo::Device &entry = devices_->Find(device);
+    if (entry.inOpenSample == 0)
         openSample_.push_back(&entry);
     // Nothing throws from here on: a log is in all figures or, without memory, in none.
-    ++entry.second.inOpenSample;
-    ++entry.second.total;
+    ++entry.inOpenSample;
+    ++entry.total;
     ++currentCount_;
     ++totalCount_;
     return 0;
@@ -68,8 +59,8 @@ int AccountingManager::CurEpsUpdate() {
     samples_.push_back(std::move(sample));
     // From here on nothing throws until the sample is closed, so that none is closed twice.
     currentSecond_ = now;
-    for (Device *device : openSample_)
-        samples_.back().devices.emplace_back(device, std::exchange(device->second.inOpenSample, 0));
+    for (kelo::Device *device : openSample_)
+        samples_.back().devices.emplace_back(device, std::exchange(device->inOpenSample, 0));
     openSample_.clear();
     const auto eps = static_cast<uint64_t>(std::exchange(currentCount_, 0));
     if (notifications_.CheckEps(eps))
@@ -100,8 +91,10 @@ void AccountingManager::AccountingDump() {
     Debuger::MSG(2, "======Accounting Status dump======");
     Debuger::MSG(2, "Total: " + ullNumberToString(static_cast<uint64_t>(totalCount_)));
     Debuger::MSG(2, "EPS: " + ullNumberToString(static_cast<uint64_t>(currentCount_)));
-    for (const Device *entry : histogram_)
-        Debuger::MSG(2, "Device: " + entry->first + ", count: " + ullNumberToString(entry->second.total));
+    for (size_t i = 0; i < devices_->Size(); ++i) {
+        const kelo::Device &device = (*devices_)[i];
+        Debuger::MSG(2, "Device: " + device.name + ", count: " + ullNumberToString(device.total));
+    }
     Debuger::MSG(2, "==================================");
 }
 
@@ -115,7 +108,7 @@ int64_t AccountingManager::CurrentEpsGet() const {
 
 std::list<KELOLOG_LOG_DEVICE_STATISTIC> AccountingManager::HistogramGet() const {
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram;
-    for (const Device *entry : histogram_)
-        histogram.push_back({entry->first, entry->second.total});
+    for (size_t i = 0; i < devices_->Size(); ++i)
+        histogram.push_back({(*devices_)[i].name, (*devices_)[i].total});
     return histogram;
 }

@@ -6,6 +6,7 @@
 #include <memory>
 #include <new>
 
+#include "accounting/device_table.h"
 #include "common/root.h"
 #include "kelosyslog/accounting.h"
 #include "kelosyslog/dbhandler.h"
@@ -111,15 +112,15 @@ int AccountingManager::AccoutingFlush2DB() {
         return -1;
     for (Sample &sample : samples_) {
         std::sort(sample.devices.begin(), sample.devices.end(),
-                  [](const auto &one, const auto &other) { return one.first->first < other.first->first; });
+                  [](const auto &one, const auto &other) { return one.first->name < other.first->name; });
         const std::string stamp = std::to_string(sample.stamp);
         for (const auto &[device, count] : sample.devices) {
-            if (!db.WriteEps(stamp, device->first, count))
+            if (!db.WriteEps(stamp, device->name, count))
                 return -1;
         }
     }
-    for (const Device *device : histogram_) {
-        if (!db.WriteHistogram(device->first, device->second.total))
+    for (size_t i = 0; i < devices_->Size(); ++i) {
+        if (!db.WriteHistogram((*devices_)[i].name, (*devices_)[i].total))
             return -1;
     }
     if (!db.Trim())

@@ -145,7 +145,8 @@ TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     const std::string old = "999 old 1";
     const std::string trim = "DELETE FROM eps WHERE stamp < strftime('%s', 'now') - 24*60*60;";
     // Within a day, with room for a slow machine.
-    const std::string recent = QueryText(path_, "SELECT (strftime('%s', 'now') - 24*60*60 + 600) || ' new 1'");
+    const std::string recentStamp = QueryText(path_, "SELECT strftime('%s', 'now') - 24*60*60 + 600");
+    const std::string recent = recentStamp + " new 1";
     const struct {
         const char *name;
         std::optional<struct stat> status;
@@ -178,8 +179,7 @@ TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name);
         Restart();
-        RunSql(path_, "INSERT INTO eps VALUES(NULL, 999, 'old', 1), (NULL, strftime('%s', 'now') - 24*60*60 "
-                      "+ 600, 'new', 1)");
+        RunSql(path_, "INSERT INTO eps VALUES(NULL, 999, 'old', 1), (NULL, " + recentStamp + ", 'new', 1)");
         machine.flushStat = [&] { return c.status; };
         if (c.failsTrim)
             PlatformCalls::FailFrom(9, 1);

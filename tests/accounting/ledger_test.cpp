@@ -13,7 +13,7 @@ using namespace kelo::test;
 namespace {
 
 constexpr int kDevices = 2000;
-constexpr int kLogsPerSecond = 20000;
+constexpr int kLogsPerSecond = 32000;
 constexpr int kAlways = std::numeric_limits<int>::max();
 
 std::string NameOf(int number) {
@@ -59,8 +59,8 @@ protected:
     void CountSecond() {
         ++machine.now;
         for (int i = 0; i < kLogsPerSecond; ++i) {
-            const int device = static_cast<int>(logs_ * logs_ % 4001 % kDevices);
             ++logs_;
+            const int device = static_cast<int>(logs_ % 3 == 0 ? logs_ % 7 : logs_ * 7919 % kDevices);
             CloseSample();
             accounting_.LogInc(NameOf(device));
             ++open_[NameOf(device)];

@@ -89,6 +89,7 @@ extern "C" {
 void *__libc_malloc(size_t size);
 void *__libc_calloc(size_t count, size_t size);
 void *__libc_realloc(void *block, size_t size);
+void *__libc_memalign(size_t alignment, size_t size);
 void __libc_free(void *block);
 
 void *malloc(size_t size) {
@@ -114,6 +115,15 @@ void *realloc(void *block, size_t size) {
     if (block == nullptr)
         CountBlock(moved, 1);
     return moved;
+}
+
+// What operator new takes for types with an alignment of their own.
+void *aligned_alloc(size_t alignment, size_t size) {
+    if (MustFail())
+        return nullptr;
+    void *block = __libc_memalign(alignment, size);
+    CountBlock(block, 1);
+    return block;
 }
 
 void free(void *block) {
