@@ -2,7 +2,9 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
+#include <ctime>
 #include <filesystem>
 #include <map>
 
@@ -267,6 +269,18 @@ void SetUpStatistics(Ground &ground) {
            "INSERT INTO eps VALUES (100, 1, 'a'), (100, 2, 'b'), (200, 4, 'a'), (400, 9, 'a')");
 }
 
+// Creates a file that the platform may keep in memory from the first reading on: it does so once the clock
+// that files are stamped with, which moves every few milliseconds, has left the stamp.
+void WriteSettledFile(const std::string &path, const std::string &content) {
+    WriteFile(path, content);
+    struct stat file {};
+    timespec now{};
+    do {
+        ASSERT_EQ(stat(path.c_str(), &file), 0);
+        clock_gettime(CLOCK_REALTIME_COARSE, &now);
+    } while (now.tv_sec == file.st_ctim.tv_sec && now.tv_nsec <= file.st_ctim.tv_nsec);
+}
+
 // The accounting database stands where the library looks for it: behind a link, for the ground has no
 // folders.
 void SetUpAccounting(Ground &ground) {
@@ -278,7 +292,7 @@ void SetUpAccounting(Ground &ground) {
     std::filesystem::create_directories(tree.File("var/log"));
     std::filesystem::create_directories(tree.File("etc/kelosyslog"));
     std::filesystem::create_directory_symlink(ground.root.Path(), tree.File("var/log/kelolog"));
-    WriteFile(tree.File("etc/kelosyslog/notify.conf"), "");
+    WriteSettledFile(tree.File("etc/kelosyslog/notify.conf"), "");
     SyslogRootSet(tree.Path());
 }
 
