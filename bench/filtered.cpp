@@ -75,8 +75,7 @@ constexpr Search kSearches[] = {
     {"count of a program's errors", "prog00,prog10", "err", "", Count, ""},
     {"count of a common word", "", "", "FAILED", Count, ""},
     {"count of a rare phrase", "", "", "\"request 54321 \"", Count, ""},
-    {"page of a rare phrase", "", "", "\"took 77 ms, status FAILED\"", SearchPage,
-     " LIMIT 50 OFFSET 0"},
+    {"page of a rare phrase", "", "", "\"took 77 ms, status FAILED\"", SearchPage, " LIMIT 50 OFFSET 0"},
 };
 
 } // namespace

@@ -22,5 +22,6 @@ int main(int argc, char **argv) {
     kelo::tool::AddDelete(program);
     kelo::tool::AddValues(program);
     kelo::tool::AddStats(program);
+    kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

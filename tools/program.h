@@ -54,5 +54,6 @@ void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddValues(Program &program);
 void AddStats(Program &program);
+void AddParse(Program &program);
 
 } // namespace kelo::tool

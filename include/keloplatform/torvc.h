@@ -26,9 +26,9 @@ struct TORVSZLIST {
 extern "C" {
 
 // Runs a program, given by its path, with up to four arguments, the first null one ending them, and waits for
-// it. The command gets default signal handling, no open file of the caller's but standard error, and /dev/null
-// as standard input and output. Other children of the process, and waits and signal handlers for them, do
-// not get in its way.
+// it. The command gets default signal handling, no open file of the caller's but standard error, and
+// /dev/null as standard input and output. Other children of the process, and waits and signal handlers for
+// them, do not get in its way.
 //
 // Returns 0 when the command ran and ended with exit status 0, else -1.
 KELOPLATFORM_API int TORVCExec(const char *program, const char *arg1, const char *arg2, const char *arg3,

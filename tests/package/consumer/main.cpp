@@ -1,5 +1,6 @@
 // Prints the messages of host "nas" in the database at argv[1], the newest first.
 
+#include <kelosyslog/cmdparser.h> // needs jsoncpp
 #include <kelosyslog/dbutil.h>
 
 #include <iostream>

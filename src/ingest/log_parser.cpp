@@ -1,0 +1,75 @@
+#include "kelosyslog/logparser.h"
+
+#include <utility>
+
+#include "ingest/lines.h"
+#include "ingest/log_entry.h"
+#include "kelosyslog/debuger.h"
+
+LogParser::LogParser() = default;
+LogParser::~LogParser() = default;
+
+uint32_t LogParser::LogAdd(std::string &text) {
+    if (!partialLog_.empty()) {
+        if (Debuger::ThresholdGet() >= 2)
+            Debuger::MSG(2, "Paritial log compensation: " + partialLog_ + " " + text);
+        text.insert(0, partialLog_);
+    }
+    kelo::ForEachLine(text, [this](std::string_view line) {
+        // Filled in its own list, so that the record is never moved, and gone if memory ends half-way.
+        std::list<_SYSLOG_LOG_DATA_tag> entry(1);
+        if (kelo::ParseLogEntry(line, entry.front()))
+            logList_.splice(logList_.end(), entry);
+        else
+            Debuger::MSG(0, "Fail to parse log");
+    });
+    return 0;
+}
+
+int32_t LogParser::ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record) {
+    return kelo::ParseLogEntry(line, record) ? 0 : -1;
+}
+
+std::list<std::string> LogParser::Tokenize(const std::string &text, const std::string &delimiters) {
+    std::list<std::string> pieces;
+    size_t start = text.find_first_not_of(delimiters);
+    while (start != std::string::npos) {
+        const size_t end = text.find_first_of(delimiters, start);
+        pieces.emplace_back(text, start, end - start);
+        start = text.find_first_not_of(delimiters, end);
+    }
+    return pieces;
+}
+
+int32_t LogParser::isValidLog(_SYSLOG_LOG_DATA_tag &record) {
+    for (const std::string *field :
+         {&record.host, &record.ip, &record.ldate, &record.ltime, &record.prog, &record.msg}) {
+        if (field->empty()) {
+            Debuger::MSG(0, "Invalid log!!!!!!!!!!!!! (Attention Please)");
+            partialLogList_.push_back(record);
+            return 0;
+        }
+    }
+    return 1;
+}
+
+int32_t LogParser::LogGetCount() {
+    return static_cast<int32_t>(logList_.size());
+}
+
+std::list<_SYSLOG_LOG_DATA_tag> LogParser::LogListGet() {
+    return logList_;
+}
+
+int32_t LogParser::LogReset() {
+    logList_.clear();
+    return 0;
+}
+
+void LogParser::PartialLogSet(std::string fragment) {
+    partialLog_ = std::move(fragment);
+}
+
+std::list<_SYSLOG_LOG_DATA_tag> LogParser::LogListTake() {
+    return std::exchange(logList_, {});
+}

@@ -1,0 +1,57 @@
+#include <algorithm>
+
+#include "kelosyslog/debuger.h"
+#include "kelosyslog/logparser.h"
+
+LogStream::LogStream(LogParser &parser, size_t maxLineBytes)
+    : parser_(parser), maxLineBytes_(std::max<size_t>(maxLineBytes, 1)) {}
+
+void LogStream::Add(std::string_view piece) {
+    // So cut, a line that lies within one part is short enough.
+    for (; !piece.empty(); piece.remove_prefix(std::min(piece.size(), maxLineBytes_)))
+        TakePart(piece.substr(0, maxLineBytes_));
+}
+
+void LogStream::TakePart(std::string_view piece) {
+    const size_t firstLineFeed = piece.find('\n');
+    Keep(piece.substr(0, firstLineFeed));
+    if (firstLineFeed == std::string_view::npos)
+        return;
+    const size_t lastLineFeed = piece.rfind('\n');
+    ParseLines(piece.substr(firstLineFeed, lastLineFeed + 1 - firstLineFeed));
+    Keep(piece.substr(lastLineFeed + 1));
+}
+
+void LogStream::Finish() {
+    ParseLines({});
+}
+
+uint64_t LogStream::OverlongCount() const {
+    return overlongCount_;
+}
+
+// Parses the waiting line, which ends here, and the complete `lines` behind it.
+void LogStream::ParseLines(std::string_view lines) {
+    std::string text(lines);
+    if (!waiting_.empty() || !text.empty()) {
+        parser_.PartialLogSet(std::move(waiting_));
+        parser_.LogAdd(text);
+        parser_.PartialLogSet({});
+    }
+    waiting_.clear();
+    isSkipping_ = false;
+}
+
+// Appends to the waiting line, or drops the line once it is too long.
+void LogStream::Keep(std::string_view part) {
+    if (isSkipping_)
+        return;
+    if (part.size() <= maxLineBytes_ - waiting_.size()) {
+        waiting_.append(part);
+        return;
+    }
+    waiting_ = {};
+    isSkipping_ = true;
+    ++overlongCount_;
+    Debuger::MSG(0, "Fail to parse log");
+}

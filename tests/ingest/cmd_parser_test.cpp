@@ -1,0 +1,76 @@
+#include "kelosyslog/cmdparser.h"
+
+#include <gmock/gmock.h>
+#include <syslog.h>
+
+#include "support/syslog_capture.h"
+
+using kelo::test::SyslogCapture;
+
+TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
+    const struct {
+        std::string text;
+        bool parses;
+        size_t values;
+    } kCases[] = {
+        {"", true, 0},
+        {"}", true, 0},
+        {"}}}", true, 0},
+        {R"({"a":1}{"b":[1,{}]})", false, 1},
+        {R"({"a":1}{"b":[1,2]})", true, 2},
+        {"{\"a\":1}\n{\"b\":2}", true, 2},
+        {"{\"a\":1}\n{\"b\":2}\n", false, 2},
+        {R"({"a":1} /* and */ {"b":2})", true, 2},
+        {R"({"a":1},{"b":2})", false, 1},
+        {R"({"a":{"b":1}})", false, 0},
+        {R"({"a":"}"})", false, 0},
+        {R"({"a":1}}{"b":2})", true, 2},
+        {R"({"a":1}[1,2])", true, 2},
+        {R"({"a":1}42)", true, 2},
+        {std::string("{\"a\":\"\0\xff\"}", 10), true, 1},
+        {"%s%n{", false, 0},
+    };
+    for (const auto &[text, parses, values] : kCases) {
+        SyslogCapture log;
+        std::string input = text;
+        std::vector<Json::Value> commands(3);
+        EXPECT_EQ(CmdParser().CmdParse(input, commands), parses) << text;
+        EXPECT_EQ(commands.size(), 3 + values) << text;
+        EXPECT_EQ(log.Messages().size(), parses ? 0U : 1U) << text;
+        EXPECT_EQ(input, text);
+    }
+}
+
+TEST(CmdParse, ReportsTheReadersOwnWords) {
+    SyslogCapture log;
+    std::string text = R"({"a" 1})";
+    std::vector<Json::Value> commands;
+    EXPECT_FALSE(CmdParser().CmdParse(text, commands));
+    EXPECT_THAT(log.Messages(),
+                testing::ElementsAre(kelo::test::SyslogMessage{
+                    LOG_ERR, "Error: parsing error, reason = * Line 1, Column 6\n  Missing ':' after object "
+                             "member name\n\n"}));
+}
+
+TEST(CmdParse, FailsCleanlyOnDeepNesting) {
+    for (const char *opening : {"[", "{\"a\":", "[[]", "{\"a\":["}) {
+        SyslogCapture log;
+        std::string text;
+        for (int level = 0; level < 100'000; ++level)
+            text += opening;
+        std::vector<Json::Value> commands;
+        EXPECT_FALSE(CmdParser().CmdParse(text, commands));
+        ASSERT_EQ(log.Texts().size(), 1U);
+        EXPECT_THAT(log.Texts()[0], testing::StartsWith("Error: parsing error, reason = "));
+    }
+}
+
+TEST(CmdParse, ReadsALargeFlatCommand) {
+    std::string text = R"({"ids":[0)";
+    for (int id = 1; id < 100'000; ++id)
+        text += "," + std::to_string(id);
+    text += "]}";
+    std::vector<Json::Value> commands;
+    ASSERT_TRUE(CmdParser().CmdParse(text, commands));
+    EXPECT_EQ(commands[0]["ids"].size(), 100'000U);
+}
