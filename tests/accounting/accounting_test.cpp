@@ -16,30 +16,23 @@ using Accounting = AccountingTest;
 
 TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
     const struct {
-        const char *name;
         std::vector<std::pair<time_t, Names>> logs; // devices by second
-        const char *samples;
+        std::string samples;
         int64_t open; // logs in the sample that is still open
     } cases[] = {
-        {"first logs of a fresh object", {{1000, {"a", "a"}}}, "1000 a 1", 1},
-        {"later in a second", {{1000, {"a", "b", "c"}}}, "1000 a 1", 2},
-        {"next second", {{1000, {"a", "b", "a", "a"}}, {1001, {"c"}}}, "1000 a 1;1001 a 2;1001 b 1", 1},
-        {"clock jumps back",
-         {{1000, {"a", "a"}}, {990, {"b"}}, {1000, {"c"}}},
-         "1000 a 1;990 a 1;1000 b 1",
-         1},
-        {"idle hour",
-         {{1000, {"a", "a"}}, {4600, {"b", "c"}}, {4601, {"d"}}},
-         "1000 a 1;4600 a 1;4601 b 1;4601 c 1",
-         1},
-        {"beyond 32 bits", {{5000000000, {"a", "a"}}}, "5000000000 a 1", 1},
-        {"devices by bytes",
-         {{1000, {"x", "b", "B", "\xff", "", "b"}}, {1001, {"x"}}},
-         "1000 x 1;1001  1;1001 B 1;1001 b 2;1001 \xff 1",
-         1},
+        {{{1000, {"a", "a"}}}, "1000 a 1", 1},
+        {{{1000, {"a", "b", "c"}}}, "1000 a 1", 2},
+        {{{1000, {"a", "b", "a", "a"}}, {1001, {"c"}}}, "1000 a 1;1001 a 2;1001 b 1", 1},
+        // The clock jumps back.
+        {{{1000, {"a", "a"}}, {990, {"b"}}, {1000, {"c"}}}, "1000 a 1;990 a 1;1000 b 1", 1},
+        // An idle hour.
+        {{{1000, {"a", "a"}}, {4600, {"b"}}, {4601, {"c"}}}, "1000 a 1;4600 a 1;4601 b 1", 1},
+        {{{5000000000, {"a", "a"}}}, "5000000000 a 1", 1},
+        // Devices stand in the order of their bytes.
+        {{{1, {"x", "b", "B", "\xff", "b"}}, {2, {"x", "x"}}}, "1 x 1;2 B 1;2 b 2;2 \xff 1", 2},
     };
     for (const auto &c : cases) {
-        SCOPED_TRACE(c.name);
+        SCOPED_TRACE(c.samples);
         RunSql(path_, "DELETE FROM eps");
         AccountingManager accounting;
         int64_t total = 0;
@@ -57,22 +50,17 @@ TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
 }
 
 TEST_F(Accounting, AsksForAFlushOnABeatAboveFiveSeconds) {
-    const struct {
-        const char *name;
-        std::vector<std::pair<time_t, bool>> calls;
-    } cases[] = {
-        {"first call", {{1000, true}}},
-        {"first call at the clock's beginning", {{5, false}, {11, true}}},
-        {"five and six seconds", {{1000, true}, {1005, false}, {1011, true}}},
-        {"polled too often", {{1000, true}, {1003, false}, {1006, false}, {1009, false}}},
-        {"clock jumps back", {{1000, true}, {900, false}, {906, true}}},
-        {"across 2038", {{0x7ffffffe, true}, {0x80000003, false}, {0x80000009, true}}},
-        {"first call after 2038", {{0x80000000, false}, {0x80000006, true}}},
+    const std::vector<std::pair<time_t, bool>> cases[] = {
+        {{1000, true}, {1005, false}, {1011, true}},
+        {{1000, true}, {1003, false}, {1006, false}, {1009, false}},
+        {{1000, true}, {900, false}, {906, true}}, // the clock jumps back
+        {{5, false}, {11, true}},
+        {{0x7ffffffe, true}, {0x80000003, false}, {0x80000009, true}}, // the clock passes 2038
+        {{0x80000000, false}, {0x80000006, true}},
     };
-    for (const auto &c : cases) {
-        SCOPED_TRACE(c.name);
+    for (const auto &calls : cases) {
         AccountingManager accounting;
-        for (const auto &[second, isDue] : c.calls) {
+        for (const auto &[second, isDue] : calls) {
             machine.now = second;
             EXPECT_EQ(accounting.isNeed2Flush(), isDue) << second;
         }

@@ -75,6 +75,7 @@ protected:
             const Obstacle obstacle(kind, first, times, path_);
             result = accounting_.AccoutingFlush2DB();
         }
+        EXPECT_TRUE(kind != Obstacle::kWriter || result == -1 || pending_.empty());
         const std::vector<std::string> messages = Messages();
         const auto has = [&](const std::string &text) {
             return std::any_of(messages.begin(), messages.end(),
