@@ -13,7 +13,7 @@ namespace {
 
 constexpr int kFirst = 1577836800;
 constexpr int kSamples = 86400;
-constexpr int kRounds = 5;
+constexpr int kRounds = 9;
 
 using Samples = std::map<int, SYSLOG_LOG_EPS>;
 

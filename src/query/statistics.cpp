@@ -1,5 +1,7 @@
 #include <algorithm>
+#include <charconv>
 #include <cstdlib>
+#include <cstring>
 #include <limits>
 
 #include "common/db_field.h"
@@ -22,7 +24,12 @@ uint64_t UnsignedField(DBResult_tag *result, uint32_t row, const char *column) {
 // Saturates at the ends of 32 bits.
 int32_t Int32Field(DBResult_tag *result, uint32_t row, const char *column) {
     using Limits = std::numeric_limits<int32_t>;
-    const long long number = std::strtoll(FieldText(result, row, column), nullptr, 10);
+    const char *text = FieldText(result, row, column);
+    const char *end = text + std::strlen(text);
+    int32_t plain = 0; // nearly all are plain numbers, which are read in a fraction of the time
+    if (const auto [stop, error] = std::from_chars(text, end, plain); error == std::errc() && stop == end)
+        return plain;
+    const long long number = std::strtoll(text, nullptr, 10);
     return static_cast<int32_t>(std::clamp<long long>(number, Limits::min(), Limits::max()));
 }
 

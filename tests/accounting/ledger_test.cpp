@@ -25,7 +25,7 @@ class Obstacle {
 public:
     enum Kind { kNone, kPlatformCall, kWrite, kFull, kRead, kWriter, kKinds };
 
-    Obstacle(Kind kind, int first, int times, const std::string &path) : kind_(kind) {
+    Obstacle(Kind kind, int first, int times, const std::string &path) {
         if (kind == kPlatformCall)
             PlatformCalls::FailFrom(first, times);
         else if (kind == kWriter)
@@ -48,7 +48,6 @@ private:
         EXPECT_EQ(sqlite3_exec(db, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
     }
 
-    Kind kind_;
     std::unique_ptr<sqlite3, decltype(&sqlite3_close)> writer_{nullptr, sqlite3_close};
 };
 
