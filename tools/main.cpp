@@ -21,6 +21,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
     kelo::tool::AddValues(program);
+    kelo::tool::AddStats(program);
     kelo::tool::AddParse(program);
     kelo::tool::AddDb(program);
     return kelo::tool::RunProgram(program, argc, argv);

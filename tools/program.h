@@ -56,6 +56,7 @@ void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddValues(Program &program);
+void AddStats(Program &program);
 void AddParse(Program &program);
 void AddDb(Program &program);
 
