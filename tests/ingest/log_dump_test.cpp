@@ -44,8 +44,6 @@ TEST_F(LogDumpTest, ShowsTheSixFieldsOfRejectedRecordsAlsoAfterAReset) {
     _SYSLOG_LOG_DATA_tag record;
     record.host = "nas";
     record.ldate = "2020/01/02";
-    record.ltime = "10:11:12";
-    record.prog = "prog";
     record.msg = "two words";
     ASSERT_EQ(parser_.isValidLog(record), 0);
     parser_.LogReset();
@@ -53,7 +51,6 @@ TEST_F(LogDumpTest, ShowsTheSixFieldsOfRejectedRecordsAlsoAfterAReset) {
     Debuger::ThresholdSet(2);
     parser_.PartialLogDump();
     parser_.LogDump();
-    EXPECT_THAT(log_.Texts(),
-                ElementsAre("Partial log count: 1", "Log countent: nas  2020/01/02 10:11:12 prog two words",
-                            "Log count: 0"));
+    EXPECT_THAT(log_.Texts(), ElementsAre("Partial log count: 1", "Log countent: nas  2020/01/02   two words",
+                                          "Log count: 0"));
 }

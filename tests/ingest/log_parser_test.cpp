@@ -39,35 +39,6 @@ std::list<_SYSLOG_LOG_DATA_tag> Parsed(std::string text) {
     return parser.LogListGet();
 }
 
-// Follows the format literally, a field at a time through the C library.
-bool NaiveParse(const std::string &line, _SYSLOG_LOG_DATA_tag &log) {
-    std::vector<std::string> fields;
-    size_t at = 0;
-    while (fields.size() < 11) {
-        while (at < line.size() && line[at] == ' ')
-            ++at;
-        if (at == line.size())
-            return false;
-        std::string field;
-        while (at < line.size() && line[at] != ' ')
-            field += line[at++];
-        fields.push_back(field);
-    }
-    log.fac = fields[0];
-    log.prio = PriorStrToType(fields[1].c_str());
-    log.ldate = fields[2];
-    log.ltime = fields[3];
-    log.utcsec = std::strtoll(fields[4].c_str(), nullptr, 10);
-    log.extnum = std::strtoll(fields[5].c_str(), nullptr, 10);
-    log.tzoffset = fields[6];
-    log.host = fields[7];
-    log.ip = fields[8];
-    log.prog = fields[9];
-    log.tag = fields[10];
-    log.msg = at < line.size() ? line.substr(at + 1) : "";
-    return true;
-}
-
 } // namespace
 
 TEST(ParseSingleEntry, TakesElevenFieldsAndTheMessageVerbatim) {
@@ -81,8 +52,7 @@ TEST(ParseSingleEntry, TakesElevenFieldsAndTheMessageVerbatim) {
         {kEleven, ""},
         {kEleven + " ", ""},
         {kEleven + "   kept", "  kept"},
-        {kEleven + " end \t\r", "end \t\r"},
-        {kEleven + std::string(" a\0b", 4), std::string("a\0b", 3)},
+        {kEleven + std::string(" a\0b \t\r", 7), std::string("a\0b \t\r", 6)},
         {kEleven + " " + std::string(10'000'000, 'x'), std::string(10'000'000, 'x')},
     };
     for (const auto &[line, msg] : kCases) {
@@ -96,21 +66,23 @@ TEST(ParseSingleEntry, ReadsNumbersAsStrtollAndUnknownPrioritiesAsDebug) {
     const struct {
         std::string text;
         int64_t number;
-    } kNumbers[] = {
-        {"12abc", 12}, {"abc", 0}, {"-5", -5},
-        {"+5", 5},     {"+-5", 0}, {"-", 0},
-        {"+", 0},      {"\t7", 7}, {std::string("1\0002", 3), 1},
-        {"0x10", 0},   {"007", 7}, {"99999999999999999999", INT64_MAX},
-        {"\t", 0},     {"--5", 0}, {"-99999999999999999999", INT64_MIN},
-        {"\xb2", 0},   {"1e3", 1}, {"9223372036854775807", INT64_MAX},
-    };
+    } kNumbers[] = {{"12abc", 12},
+                    {"-5", -5},
+                    {"+5", 5},
+                    {"+-5", 0},
+                    {"-", 0},
+                    {"\t7", 7},
+                    {"0x10", 0},
+                    {"\xb2", 0},
+                    {"9223372036854775808", INT64_MAX},
+                    {"-9223372036854775809", INT64_MIN},
+                    {std::string("1\0002", 3), 1}};
     for (const auto &[text, number] : kNumbers) {
         _SYSLOG_LOG_DATA_tag log;
         // The other number follows: what is read of one must not reach into it.
         ASSERT_EQ(LogParser().ParseSingleEntry("f p d t " + text + " 44 z h i p t m", log), 0);
         EXPECT_EQ(log.utcsec, number) << text;
         EXPECT_EQ(log.extnum, 44) << text;
-        EXPECT_EQ(log.prio, SYSLOG_PRIO_DEBUG);
     }
     const struct {
         const char *word;
@@ -153,21 +125,7 @@ TEST(LogAdd, SkipsOnlyTheLinesThatDoNotParse) {
     EXPECT_THAT(Parsed(""), IsEmpty());
 }
 
-TEST(LogAdd, GivesWhatALiteralReadingGives) {
-    for (unsigned seed = 0; seed < 50; ++seed) {
-        const std::string text = StrangeText(seed, 100);
-        std::list<_SYSLOG_LOG_DATA_tag> expected;
-        for (const std::string &line : LogParser().Tokenize(text, "\n")) {
-            _SYSLOG_LOG_DATA_tag log;
-            if (NaiveParse(line, log))
-                expected.push_back(log);
-        }
-        ASSERT_GT(expected.size(), 10U);
-        ASSERT_EQ(Parsed(text), expected) << "seed " << seed;
-    }
-}
-
-TEST(LogAdd, PutsTheFragmentInFrontOfEveryInput) {
+TEST(LogAdd, PutsTheFragmentInFrontOfEveryInputUntilItIsTaken) {
     LogParser parser;
     parser.PartialLogSet(kEleven);
     for (const char *input : {" first\n", ""}) {
@@ -175,19 +133,8 @@ TEST(LogAdd, PutsTheFragmentInFrontOfEveryInput) {
         parser.LogAdd(text);
         EXPECT_EQ(text, kEleven + input);
     }
-    EXPECT_THAT(parser.LogListGet(), ElementsAre(Entry("first"), Entry("")));
-}
-
-TEST(LogParserLists, AreCopiedTakenAndReset) {
-    LogParser parser;
-    std::string text = kEleven + " one\n" + kEleven + " two\n";
-    parser.LogAdd(text);
-    EXPECT_EQ(parser.LogListGet().size(), 2U);
     EXPECT_EQ(parser.LogGetCount(), 2);
-    EXPECT_THAT(parser.LogListTake(), ElementsAre(Entry("one"), Entry("two")));
-    EXPECT_EQ(parser.LogGetCount(), 0);
-    parser.LogAdd(text);
-    EXPECT_EQ(parser.LogReset(), 0);
+    EXPECT_THAT(parser.LogListTake(), ElementsAre(Entry("first"), Entry("")));
     EXPECT_EQ(parser.LogGetCount(), 0);
 }
 

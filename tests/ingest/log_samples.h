@@ -18,35 +18,11 @@ inline bool operator==(const _SYSLOG_LOG_DATA_tag &left, const _SYSLOG_LOG_DATA_
     return EntryFields(left) == EntryFields(right);
 }
 
-inline void PrintTo(const _SYSLOG_LOG_DATA_tag &log, std::ostream *out) {
-    *out << log.fac << '|' << log.prio << '|' << log.ldate << '|' << log.ltime << '|' << log.utcsec << '|'
-         << log.extnum << '|' << log.tzoffset << '|' << log.host << '|' << log.ip << '|' << log.prog << '|'
-         << log.tag << '|' << log.msg;
-}
-
 // Text of about `entries` lines with every oddity that lines can have: too few fields, runs of blanks, tabs,
 // carriage returns, NUL bytes, invalid UTF-8, empty lines, strange numbers, no final line feed.
 inline std::string StrangeText(unsigned seed, int entries) {
-    static const char *const kWords[] = {"info",
-                                         "err",
-                                         "warn",
-                                         "local0",
-                                         "2020/01/02",
-                                         "12",
-                                         "-7x",
-                                         "+5",
-                                         "\t9",
-                                         "99999999999999999999",
-                                         "-99999999999999999999",
-                                         "\xff\xfe",
-                                         "a\tb",
-                                         "\r",
-                                         "+-3",
-                                         "nas",
-                                         "127.0.0.1",
-                                         "\v\f 1",
-                                         "0x10",
-                                         "-"};
+    static const std::string kWords[] = {"info", "local0", "12",  "-7x",    "\t9", "\xff",
+                                         "a\tb", "\r",     "+-3", "\v\f 1", "-"};
     std::mt19937 random(seed);
     const auto below = [&random](size_t limit) { return random() % limit; };
     std::string text;

