@@ -145,21 +145,6 @@ TEST_F(ParseProgram, ResumesWhereTheSameInputEnded) {
     }
 }
 
-TEST_F(ParseProgram, StoresWhatThereIsBeforeItWaitsForMore) {
-    int ends[2];
-    ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
-    const pid_t child = StartStoring(ends[0]);
-    int status = 0;
-    for (int number = 0; number < 3; ++number) {
-        const std::string line = Lines(number, 1);
-        ASSERT_EQ(write(ends[1], line.data(), line.size()), static_cast<ssize_t>(line.size()));
-        ASSERT_TRUE(AwaitRows(child, number + 1, status)) << "round " << number;
-    }
-    close(ends[1]);
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_TRUE(HoldsMessages(3));
-}
-
 TEST_F(ParseProgram, LeavesNothingHalfWrittenWhenTheDiskIsFull) {
     constexpr int kTotal = 4 * kBatchRows;
     Write("in", Lines(0, kTotal));

@@ -7,16 +7,6 @@ using testing::IsEmpty;
 
 using NotificationRules = NotifyTest;
 
-TEST_F(NotificationRules, AreNoneWithoutARuleFile) {
-    NotificationManager manager;
-    EXPECT_THAT(Messages(), ElementsAre("Fail to do TORVCFileEnumSection", "Fail to load configuration"));
-    EXPECT_FALSE(manager.CheckEps(UINT64_MAX));
-    EXPECT_FALSE(manager.CheckSev(SYSLOG_PRIO_EMERG));
-    EXPECT_EQ(manager.CheckKeyword("anything"), "");
-    EXPECT_EQ(manager.NotificationSendEps(1), 0);
-    EXPECT_EQ(NotifyCalls::Sent().at(0).values.at("%TOLERNCE%"), "0");
-}
-
 TEST_F(NotificationRules, AreCheckedWhenEnabled) {
     WriteRules(RuleText("off", 1, "0", "0", "", "0") + RuleText("eps", 1, "0", "5000000000", "") +
                RuleText("sev", 0, "3", "0", "") + RuleText("sev off", 0, "7", "0", "", "0") +
@@ -45,20 +35,4 @@ TEST_F(NotificationRules, AreLoadedUpToTheFirstBrokenSection) {
     EXPECT_TRUE(manager.CheckEps(100));
     EXPECT_FALSE(manager.CheckSev(SYSLOG_PRIO_EMERG));
     EXPECT_EQ(manager.ConfigLoad(RulePath()), 0);
-}
-
-TEST_F(NotificationRules, AreNotLoadedWhenACallFails) {
-    WriteRules(RuleText("one", 1, "0", "100", ""));
-    const std::vector<std::string> messages[] = {
-        {"Fail to allocate memory", "Fail to load configuration"},
-        {"Fail to do TORVCFileEnumSection", "Fail to load configuration"},
-        {"utils:81 Fail to allocate memory", "Fail to get notification setting one"},
-        {"utils:85 Fail to do TORVCFileGetSection", "Fail to get notification setting one"},
-        {},
-    };
-    for (int call = 1; call <= 5; ++call) {
-        PlatformCalls::FailFrom(call, 1);
-        EXPECT_EQ(NotificationManager().CheckEps(100), call == 5);
-        EXPECT_EQ(Messages(), messages[call - 1]);
-    }
 }

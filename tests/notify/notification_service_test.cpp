@@ -1,6 +1,4 @@
 #include <json/json.h>
-#include <sched.h>
-#include <sys/mount.h>
 #include <sys/stat.h>
 
 #include <filesystem>
@@ -12,11 +10,9 @@
 #include "notify/notify_fixture.h"
 
 using namespace kelo::test;
-using testing::AnyOf;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::Not;
 
 namespace {
 
@@ -104,29 +100,6 @@ TEST_F(NotificationService, SpoolsTheRenderedMessageWithAllThatDeliveryNeeds) {
     EXPECT_THAT(Messages(), IsEmpty());
 }
 
-TEST_F(NotificationService, HasATextInEveryLanguageForEveryTag) {
-    InstallTexts();
-    const std::map<std::string, std::string> values = {
-        {"%EPS%", "1"},     {"%TOLERNCE%", "2"},         {"%HOST%", "h"},          {"%SEV%", "err"},
-        {"%KEYWORD%", "k"}, {"%SYSLOG_CONTENT%", "log"}, {"%SHARED_FOLDER%", "s"}, {"%DBPATH%", "db"}};
-    const std::vector<std::string> tags = {"EPS_EXCEED",  "SEV_EXCEED",    "KEYWORD_MATCH",
-                                           "VOL_FULL",    "DB_CORRUPT",    "ShareRemove",
-                                           "ShareRename", "ShareEncMount", "ShareEncUnmount"};
-    std::set<std::string> bodies;
-    for (const char *language : {"enu", "ger"}) {
-        WriteSettings(std::string("notify_language=\"") + language + "\"\n");
-        for (const std::string &tag : tags) {
-            ASSERT_EQ(Send(("KELOSYSLOG_" + tag).c_str(), values), 0);
-            const Json::Value entry = Take();
-            EXPECT_THAT(entry["title"].asString() + entry["body"].asString(),
-                        Not(AnyOf(HasSubstr("KELOSYSLOG_"), HasSubstr("%"))))
-                << tag;
-            bodies.insert(entry["body"].asString());
-        }
-    }
-    EXPECT_EQ(bodies.size(), 2 * tags.size());
-}
-
 TEST_F(NotificationService, GivesAPlainMessageWhereThereIsNoText) {
     InstallTexts();
     WriteSettings("notify_language=\"../enu\"\n");
@@ -140,17 +113,6 @@ TEST_F(NotificationService, GivesAPlainMessageWhereThereIsNoText) {
         EXPECT_EQ(entry["body"].asString(), "The log server sent the notification NEW.\n%A%: 1\n");
     }
     EXPECT_THAT(Messages(), ElementsAre(HasSubstr("enu/notify:3: ")));
-}
-
-TEST_F(NotificationService, CutsATitleAtACharacter) {
-    Write(std::string(kTexts) + "enu/notify", "[T]\ntitle=\"50% %A% %\"\nbody=\"%A%%%B%\\q\"\n");
-    std::string value;
-    while (value.size() < 400)
-        value += "é";
-    ASSERT_EQ(Send("T", {{"%A%", value}}), 0);
-    const Json::Value entry = Take();
-    EXPECT_EQ(entry["title"].asString(), "50% " + value.substr(0, 242) + "...");
-    EXPECT_EQ(entry["body"].asString(), value + "%-\\q\n");
 }
 
 TEST_F(NotificationService, UsesTheChannelsThatSettingsAndFilterAllow) {
@@ -202,23 +164,4 @@ TEST_F(NotificationService, ReportsASpoolThatTakesNothing) {
                                         "Fail to send notification: T"));
     EXPECT_EQ(KELOSysNotifySendNotificationCustomized("", "", "", nullptr, 0), -1);
     EXPECT_THAT(Messages(), ElementsAre(HasSubstr("Invalid argument")));
-}
-
-TEST_F(NotificationService, LeavesNothingBehindOnAFullDisk) {
-    const std::string spool = root_.File("var/spool/kelonotify");
-    std::filesystem::create_directories(spool);
-    // In a mount namespace of its own, which ends with the process.
-    if (unshare(CLONE_NEWNS) != 0 || mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
-        mount("tmpfs", spool.c_str(), "tmpfs", 0, "size=64k") != 0)
-        GTEST_SKIP() << "may not mount a small disk";
-    WriteFile(spool + "/filler", "");
-    std::ofstream(spool + "/filler") << std::string(100'000, 'x');
-    EXPECT_EQ(Send("T", {{"%A%", std::string(8000, 'a')}}), -1);
-    EXPECT_THAT(Messages().at(0), HasSubstr("No space left on device"));
-    EXPECT_THAT(Spooled("tmp"), IsEmpty());
-    EXPECT_THAT(Spooled(), IsEmpty());
-    std::filesystem::remove(spool + "/filler");
-    EXPECT_EQ(Send("T", {}), 0);
-    EXPECT_EQ(Take()["tag"].asString(), "T");
-    EXPECT_EQ(umount(spool.c_str()), 0);
 }

@@ -45,14 +45,6 @@ TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
     EXPECT_EQ(TakeStatement(), kCount + cases[0].text + " AND " + cases[1].text);
 }
 
-TEST_F(ConditionText, KeepsTheConditionWithoutItsValueWhenEscapingFails) {
-    for (const int failing : {1, 2}) {
-        PlatformCalls::FailFrom(failing, 1);
-        SyslogDBSelectCount(path_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_LIKE, "nas", {}}}, nullptr, nullptr);
-        EXPECT_EQ(TakeStatement(), std::string(kCount) + "(host LIKE '' escape '\\')");
-    }
-}
-
 TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
     InsertSampleLogs(path_, 3);
     const auto noAttribute = static_cast<_SYSLOG_DB_ATTRI_tag>(-1);

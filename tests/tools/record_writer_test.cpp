@@ -116,38 +116,5 @@ TEST(RecordWriter, AlignsColumnsByTheWidestValueSoFarAndColoursByLevel) {
     EXPECT_EQ(Print(layout, {narrow, wide}), "h     x\n\x1b[33m" + wide.host + "  x\x1b[0m\n");
 }
 
-TEST(RecordWriter, TakesTimeAndMessageFromTheColumnsOfTheTable) {
-    Log log;
-    log.ldate = "2020/01/02";
-    log.ltime = "10:11:12";
-    log.host = "h";
-    log.prog = "p";
-    log.luser = "joe";
-    log.event = "write";
-    log.fname = "/a b";
-    log.fsize = "1 KB";
-    log.xferip = "10.0.0.1";
-    RecordLayout layout;
-    layout.kind = TableKind::Transfer;
-    EXPECT_EQ(Print(layout, {log}), "TIME                 HOST  IP        LUSER  EVENT  FSIZE  FNAME\n"
-                                    "2020-01-02 10:11:12  h     10.0.0.1  joe    write  1 KB   /a b\n");
-    layout.format = OutputFormat::Short;
-    EXPECT_EQ(Print(layout, {log}), "2020-01-02 10:11:12 h p: joe (10.0.0.1) write /a b 1 KB\n");
-    layout.kind = TableKind::System;
-    layout.format = OutputFormat::Jsonl;
-    const Json::Value object = ParseJson(Print(layout, {log}));
-    EXPECT_EQ(object["msg"].asString(), "write");
-    EXPECT_EQ(object["llevel"].asString(), "emerg");
-    EXPECT_FALSE(object.isMember("utcsec"));
-}
-
-TEST(Colour, FollowsTheTerminalAndNoColorUnlessForced) {
-    EXPECT_TRUE(WantsColour(ColourMode::Auto, true, nullptr, "xterm"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, true, "1", "xterm"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, true, nullptr, "dumb"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, false, nullptr, "xterm"));
-    EXPECT_TRUE(WantsColour(ColourMode::Always, false, "1", "dumb"));
-}
-
 } // namespace
 } // namespace kelo::tool

@@ -57,9 +57,6 @@ TEST_F(SelectionTest, FindsWhatANaiveFilterFinds) {
          }},
         {{.hosts = {"!na[s]?'"}}, [](const Log &log) { return !log.host.starts_with("na"); }},
         {{.programs = {"!prog00"}, .keywords = {"*"}}, [](const Log &log) { return log.prog != "prog00"; }},
-        {{.levels = {"4"}, .facilities = {"0"}},
-         [](const Log &log) { return log.prio <= 4 && log.fac == "kern"; }},
-        {{.levels = {"err,debug"}}, [](const Log &log) { return log.prio == 3 || log.prio == 7; }},
         {{.levels = {"info..warning"}}, [](const Log &log) { return log.prio >= 4 && log.prio <= 6; }},
         {{.levels = {"!debug,!emerg..crit"}}, [](const Log &log) { return log.prio > 2 && log.prio < 7; }},
         {{.levels = {"warn,!alert"}}, [](const Log &log) { return log.prio <= 4 && log.prio != 1; }},
@@ -87,7 +84,6 @@ TEST_F(SelectionTest, KeepsRowsWithoutAValueWhenSomethingElseIsExcluded) {
     test::RunSql(source_.path,
                  "INSERT INTO logs(id,host,llevel) VALUES(1,NULL,NULL),(2,'a','err'),(3,'b','7')");
     EXPECT_EQ(Ids({.levels = {"!err"}, .hosts = {"!b"}}), (std::vector<uint64_t>{1}));
-    EXPECT_EQ(Ids({.hosts = {"!a*"}}), (std::vector<uint64_t>{1, 3}));
 }
 
 TEST_F(SelectionTest, BoundsTablesWithoutUtcsecByTheirDateAndTime) {
@@ -103,7 +99,6 @@ TEST_F(SelectionTest, BoundsTablesWithoutUtcsecByTheirDateAndTime) {
     EXPECT_EQ(Ids({.until = "2020-01-02 00:00", .levels = {"err"}}), (std::vector<uint64_t>{1, 3, 4}));
     EXPECT_THROW(MakeConditions({.facilities = {"kern"}}, source_, kEpoch), UsageError);
     source_.kind = TableKind::Transfer;
-    EXPECT_THROW(MakeConditions({.levels = {"err"}}, source_, kEpoch), UsageError);
     EXPECT_THROW(MakeConditions({.keywords = {"x"}}, source_, kEpoch), UsageError);
 }
 

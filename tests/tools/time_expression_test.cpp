@@ -42,23 +42,18 @@ TEST(TimeExpression, GivesTheSecondThatTheUserMeans) {
     } kCases[] = {
         {kUtc, "2020/01/02", 1577923200, true},
         {kUtc, "2020-01-02 10:11", 1577959860, false},
-        {kUtc, "2020-01-02T10:11:12", 1577959872, false},
         {kBerlin, "2020-01-02 10:11:12", 1577959872 - 3600, false},
         {kBerlin, "2020-07-02 00:00", 1593640800, false},
-        {kBerlin, "2020-01-02 10:11:12Z", 1577959872, false},
         {kKolkata, "2020-01-02", 1577923200 - 19800, true},
         {kNewYork, "today", 1582952400, true}, // there it is still 29 February
         {kUtc, "tomorrow 1:30", 1583107200 + 5400, false},
         {kUtc, "2000-02-29", 951782400, true},
-        {kUtc, "2038-01-19 03:14:08", 2147483648, false},
         {kUtc, "1969-12-31 23:59:59", -1, false},
         {kBerlin, "2020-03-29 02:30", 1585445400, false}, // skipped by the clocks: an hour later
         {kUtc, "now", kNow, false},
         {kUtc, "1h", kNow - 3600, false},
-        {kUtc, "+90min", kNow + 5400, false},
         {kUtc, "1h 30m ago", kNow - 5400, false},
         {kUtc, "1 month", kNow - 2629800, false},
-        {kUtc, "@-5", -5, false},
         {kUtc, "1577836800", 1577836800, false},
     };
     for (const auto &test : kCases) {
