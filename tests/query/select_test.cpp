@@ -23,23 +23,25 @@ TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
     const std::string start = "SELECT * FROM t",
                       page = "SELECT *, (SELECT max(rowid) FROM t) totalCount FROM t WHERE ";
     const std::string ofHost = start + " WHERE (host = 'host01')";
+    const char *const execute = "KELODBExecute";
+    const std::string newest = " ORDER BY id desc";
     struct Case {
         Conditions conditions;
         Limit limit;
         Order order;
         PlatformCall call;
     } cases[] = {
-        {none, {}, {}, {"KELODBExecute", start}},
-        {none, {{0, 7}}, {{1, SYSLOG_ATTRI_XFERIP}}, {"KELODBExecute", start + " ORDER BY ip asc"}},
+        {none, {}, {}, {execute, start}},
+        {none, {{0, 7}}, {{1, SYSLOG_ATTRI_XFERIP}}, {execute, start + " ORDER BY ip asc"}},
         {none,
          {{50, 0}},
          {{0, SYSLOG_ATTRI_ID}},
-         {"KELODBExecute", page + "( id > totalCount - 50 AND id <= totalCount - 0) ORDER BY id desc"}},
+         {execute, page + "( id > totalCount - 50 AND id <= totalCount - 0)" + newest}},
         {all,
          {{UINT64_MAX, 2}},
          {},
-         {"KELODBExecute", page + "(msg GLOB '**') AND ( id > totalCount - 1 AND id <= totalCount - 2)"}},
-        {host, {}, {{-1, SYSLOG_ATTRI_ID}}, {"KELODBExecute", ofHost + " ORDER BY id asc"}},
+         {execute, page + "(msg GLOB '**') AND ( id > totalCount - 1 AND id <= totalCount - 2)"}},
+        {host, {}, {{-1, SYSLOG_ATTRI_ID}}, {execute, ofHost + " ORDER BY id asc"}},
         {host, {{0, 5}}, {}, {"KELODBSelectLimit", ofHost, 0, 5}},
         {host, {{0x100000005, 0x200000003}}, {}, {"KELODBSelectLimit", ofHost, 5, 3}},
     };

@@ -47,14 +47,8 @@ RecordLayout Layout(OutputFormat format, const std::string &fields = "") {
 }
 
 Json::Value ParseJson(const std::string &text) {
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    builder["strictRoot"] = false;
     Json::Value value;
-    std::string errors;
-    std::istringstream stream(text);
-    if (!Json::parseFromStream(builder, stream, &value, &errors))
-        ADD_FAILURE() << errors << " in " << text;
+    std::istringstream(text) >> value; // throws for what is no JSON
     return value;
 }
 

@@ -51,21 +51,16 @@ TEST_F(SelectionTest, FindsWhatANaiveFilterFinds) {
     } kCases[] = {
         {{.hosts = {"host01,host02", "host03"}},
          [](const Log &log) { return log.host >= "host01" && log.host <= "host03"; }},
-        {{.hosts = {"host1*,!host11,!host?2"}},
-         [](const Log &log) {
-             return log.host.starts_with("host1") && log.host != "host11" && log.host != "host12";
-         }},
+        {{.hosts = {"host1*,!host?2"}},
+         [](const Log &log) { return log.host.starts_with("host1") && log.host != "host12"; }},
         {{.hosts = {"!na[s]?'"}}, [](const Log &log) { return !log.host.starts_with("na"); }},
         {{.programs = {"!prog00"}, .keywords = {"*"}}, [](const Log &log) { return log.prog != "prog00"; }},
         {{.levels = {"info..warning"}}, [](const Log &log) { return log.prio >= 4 && log.prio <= 6; }},
         {{.levels = {"!debug,!emerg..crit"}}, [](const Log &log) { return log.prio > 2 && log.prio < 7; }},
         {{.levels = {"warn,!alert"}}, [](const Log &log) { return log.prio <= 4 && log.prio != 1; }},
         {{.facilities = {"local0,23,!local7"}}, [](const Log &log) { return log.fac == "local0"; }},
-        {{.keywords = {"failed", "request 2*"}},
-         [](const Log &log) {
-             return log.msg.find("FAILED") != std::string::npos &&
-                    log.msg.find("request") < log.msg.rfind('2');
-         }},
+        {{.keywords = {"failed"}},
+         [](const Log &log) { return log.msg.find("FAILED") != std::string::npos; }},
         {{.since = "@1577836810", .until = "@1577836820"},
          [](const Log &log) { return log.utcsec >= kEpoch + 10 && log.utcsec <= kEpoch + 20; }},
     };
