@@ -21,6 +21,8 @@ int main(int argc, char **argv) {
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
     kelo::tool::AddValues(program);
+    kelo::tool::AddRules(program);
+    kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

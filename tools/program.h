@@ -53,6 +53,8 @@ void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddValues(Program &program);
+void AddRules(Program &program);
+void AddNotify(Program &program);
 void AddParse(Program &program);
 
 } // namespace kelo::tool
