@@ -44,8 +44,9 @@ class NotifyTest(unittest.TestCase):
         self.count += 1
         entry = {"version": 1, "id": f"{self.count:012d}.000000001-7-0", "time": int(time.time()), "tag": "KELOSYSLOG_TEST",
                  "class": "", "language": "enu", "channels": channels, "title": title, "body": body, "values": {}}
-        with open(f"{self.spool}/new/{entry['id']}.json", "wb") as file:
-            file.write(raw or json.dumps(entry).encode())
+        with open(self.spool + "/entry", "wb") as file:
+            file.write(json.dumps(entry).encode() if raw is None else raw)
+        os.rename(self.spool + "/entry", f"{self.spool}/new/{entry['id']}.json")
         return entry["id"]
 
     def deliver(self, *options, status=0):
@@ -201,9 +202,7 @@ class NotifyTest(unittest.TestCase):
         run = subprocess.Popen([BIN + "/kelonotify", "--root", self.root, "--watch"])
         try:
             for count in (1, 2):
-                entry = self.add()
-                os.rename(f"{self.spool}/new/{entry}.json", f"{self.spool}/new/{entry}.json.x")
-                os.rename(f"{self.spool}/new/{entry}.json.x", f"{self.spool}/new/{entry}.json")
+                self.add()
                 deadline = time.monotonic() + 30
                 while len(server.mails) < count and time.monotonic() < deadline:
                     time.sleep(0.01)
@@ -212,6 +211,40 @@ class NotifyTest(unittest.TestCase):
         finally:
             run.terminate()
         self.assertEqual(run.wait(10), 0)
+
+    def test_rules_are_stored_as_asked_or_refused_and_a_channel_can_be_tested(self):
+        server = self.start(MailServer())
+        self.write_settings()
+
+        def tool(*words, status=0):
+            run = subprocess.run([BIN + "/kelosyslog", "--root", self.root, *words], capture_output=True, text=True)
+            self.assertEqual(run.returncode, status, (words, run.stderr))
+            return run.stdout
+
+        os.mkdir(self.root + "/etc/kelosyslog")
+        hostile = ' "disk=full" # [x] \\ '
+        tool("rules", "add", "kw", "--keyword", hostile)
+        tool("rules", "add", "busy", "--eps", "2147483647", "--disabled")
+        tool("rules", "add", "huge", "--eps", "2147483648", status=2)
+        tool("rules", "add", "kw", "--severity", "err", status=2)
+        tool("rules", "remove", "kw", "none", status=2)
+        with open(self.root + "/etc/kelosyslog/notify.conf", "a") as file:
+            file.write('[byhand]\nnotify_type="1"\nnotify_eps="5000000000"\n')
+        tool("rules", "enable", "byhand", status=2)
+        rules = {rule["name"]: rule for rule in json.loads(tool("rules", "list", "-o", "json"))}
+        self.assertEqual((rules["kw"]["keyword"], rules["kw"]["enabled"]), (hostile, True))
+        self.assertEqual((rules["busy"]["eps"], rules["byhand"]["eps"]), (2147483647, 5000000000))
+        tool("rules", "test", "--eps", "4000000000", status=1)
+        tool("rules", "enable", "busy")
+        self.assertIn("busy", tool("rules", "test", "--eps", "4000000000"))
+        tool("rules", "test", "--text", hostile.strip(), status=1)
+        tool("rules", "remove", "kw", "busy", "byhand")
+        tool("rules", "list", status=1)
+        tool("notify", "test", "sms", status=2)
+        tool("notify", "test", "mail")
+        self.assertEqual(json.loads(tool("notify", "status", "-o", "json"))["waiting"], 1)
+        self.deliver()
+        self.assertIn(b"KELOSYSLOG_TEST", server.mails[0][2])
 
 
 if __name__ == "__main__":

@@ -54,6 +54,8 @@ void Deliverer::Deliver(const std::string &id) {
     std::string problem;
     try {
         DeliverEntry(spool_.ReadNew(id));
+    } catch (const EntryGone &) { // the administrator removed it
+        return;
     } catch (const SpoolError &) {
         throw;
     } catch (const std::runtime_error &error) {

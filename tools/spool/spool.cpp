@@ -69,6 +69,8 @@ std::vector<std::string> Spool::Ids(const std::string &folder) const {
 
 Entry Spool::ReadEntry(const std::string &name, const std::string &id) const {
     const std::optional<std::string> content = ReadWhole(File(name));
+    if (!content && errno == ENOENT)
+        throw EntryGone(File(name) + ": " + std::strerror(ENOENT));
     if (!content)
         throw std::runtime_error(File(name) + ": " + std::strerror(errno));
     return ParseEntry(*content, id);

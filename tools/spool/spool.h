@@ -15,6 +15,11 @@ struct SpoolError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
+// The entry is not there any more.
+struct EntryGone : std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
 // The folders of docs/notification-spool.md below `root`. What changes them is on the disk when the call
 // returns; every function throws SpoolError when that cannot be done.
 class Spool {
@@ -35,7 +40,7 @@ public:
     std::vector<std::string> NewIds() const { return Ids("new"); }
     std::vector<std::string> FailedIds() const { return Ids("failed"); }
 
-    // The entry of this id. Throws std::runtime_error with the reason when it is damaged.
+    // The entry of this id. Throws EntryGone, or std::runtime_error with the reason when it is damaged.
     Entry ReadNew(const std::string &id) const { return ReadEntry("new/" + id + ".json", id); }
     Entry ReadFailed(const std::string &id) const { return ReadEntry("failed/" + id + ".json", id); }
 
