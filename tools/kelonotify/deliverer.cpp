@@ -71,7 +71,7 @@ std::map<std::string, std::vector<std::string>> Deliverer::OpenTargets(const Ent
     for (const std::string &channel : entry.channels) {
         if (!IsChannel(channel))
             throw std::runtime_error("unknown channel '" + SafeLine(channel, 100) + "'");
-        if (settings_.Problem().empty() && !settings_.IsOn(channel))
+        if (settings_.IsReadable() && !settings_.IsOn(channel))
             continue; // switched off since
         for (const std::string &target : ChannelOf(channel).Targets()) {
             const auto found = progress.targets.find(target);
@@ -140,8 +140,8 @@ void Deliverer::SendOne(const Entry &entry, Progress &progress, const std::strin
     else
         attempts.reason = result.reason;
     if (result.outcome == Outcome::Refused && attempts.failures == 1)
-        syslog(LOG_WARNING, "%s %s, entry %s: %s", Words(channel), target.c_str(), entry.id.c_str(),
-               result.reason.c_str());
+        syslog(LOG_WARNING, "%s %s, entry %s: %s", Words(channel), SafeLine(target, 300).c_str(),
+               entry.id.c_str(), result.reason.c_str());
     NoteChannel(channel, result);
 }
 

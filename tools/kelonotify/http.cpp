@@ -18,6 +18,14 @@ bool IsLine(const std::string &text) {
                         [](char byte) { return static_cast<unsigned char>(byte) < 0x20 || byte == 0x7f; });
 }
 
+bool IsNumber(const std::string &text) {
+    return text.size() <= 50 && text.find_first_not_of("0123456789+-()./*#") == std::string::npos;
+}
+
+std::string NumberOf(const std::string &target) {
+    return target.substr(target.find(':') + 1);
+}
+
 // The answers that blame the request itself. The others of 400 to 499 tell about access, load or time, which
 // hold for the next request too.
 bool IsRefusal(long code) {
@@ -62,6 +70,8 @@ public:
             problem_ = "no encoding of values is known for the content type '" + contentType_ + "'";
         if (!problem_.empty())
             return {Outcome::Unreachable, problem_};
+        if (IsSms() && !IsNumber(NumberOf(target)))
+            return {Outcome::Refused, "sms_to: '" + SafeLine(NumberOf(target), 100) + "' is no phone number"};
         const TemplateWords words = WordsOf(entry, target);
         const std::string url = FillRequest(url_, words, Encoding::Url);
         const std::string body = FillRequest(body_, words, *encoding);
@@ -95,7 +105,7 @@ private:
                                {"%ID%", entry.id},
                                {"%TIME%", std::to_string(entry.time)}};
         if (IsSms())
-            words.emplace_back("%NUMBER%", target.substr(target.find(':') + 1));
+            words.emplace_back("%NUMBER%", NumberOf(target));
         return words;
     }
 

@@ -54,8 +54,12 @@ std::string Settings::Prefix(std::string_view channel) {
     return std::string(channel) + "_";
 }
 
+bool Settings::IsReadable() const {
+    return access(path_.c_str(), R_OK) == 0;
+}
+
 std::string Settings::Problem() const {
-    if (access(path_.c_str(), R_OK) == 0 || errno == ENOENT)
+    if (IsReadable() || errno == ENOENT)
         return "";
     return path_ + ": " + std::strerror(errno);
 }

@@ -27,6 +27,7 @@ public:
     // In front of the channel's keys: "pushservice_mobile_" for "push_mobile".
     static std::string Prefix(std::string_view channel);
 
+    bool IsReadable() const;
     // Why the file cannot be read; "" when it can, or is missing.
     std::string Problem() const;
     // Whether the file, which holds passwords, may be read by everybody.
