@@ -25,5 +25,6 @@ int main(int argc, char **argv) {
     kelo::tool::AddRules(program);
     kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
+    kelo::tool::AddDb(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

@@ -56,7 +56,12 @@ int ReportUsage(const std::string &text) {
 
 CLI::App *AddSubcommand(Program &program, const std::string &name, const std::string &description,
                         std::function<int()> run) {
-    CLI::App *command = program.app.add_subcommand(name, description);
+    return AddSubcommand(program, program.app, name, description, std::move(run));
+}
+
+CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &name,
+                        const std::string &description, std::function<int()> run) {
+    CLI::App *command = parent.add_subcommand(name, description);
     command->fallthrough();
     command->callback([&program, run = std::move(run)] { program.run = run; });
     return command;

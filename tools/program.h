@@ -29,6 +29,9 @@ struct Program {
 // Adds a subcommand; the program runs `run` after the whole command line was read and --root was applied.
 CLI::App *AddSubcommand(Program &program, const std::string &name, const std::string &description,
                         std::function<int()> run);
+// The same below a subcommand, `parent`.
+CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &name,
+                        const std::string &description, std::function<int()> run);
 
 // Adds an option whose values arrive as they were typed, one per occurrence; none is split or interpreted. An
 // empty value is a usage error: it is rather an unset shell variable than a wish.
@@ -57,5 +60,6 @@ void AddStats(Program &program);
 void AddRules(Program &program);
 void AddNotify(Program &program);
 void AddParse(Program &program);
+void AddDb(Program &program);
 
 } // namespace kelo::tool

@@ -118,8 +118,8 @@ private:
 
 // The reaction to a corrupt database: tells the administrator (notification "KELOSYSLOG_DB_CORRUPT"), renames
 // the file to its path followed by ".corrupt", which replaces an older one, and reloads syslog-ng so that it
-// starts a fresh database. The
-// "-wal" and "-shm" files stay where they are. `connection` is not used.
+// starts a fresh database. The "-wal" and "-shm" files stay where they are. `connection` is not used and
+// stays open: its owner disconnects, for a further statement on it would put the fresh database aside too.
 //
 // Returns 0, or -1: the notification could not be sent (the file keeps its name), the rename failed, or the
 // reload failed.
@@ -130,8 +130,8 @@ KELOSYSLOG_API int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, s
 KELOSYSLOG_API int32_t SyslogngHupSignalSend();
 
 // Deletes syslog-ng's working database and makes syslog-ng start a new one when the file is larger than
-// `limitKib` KiB (whole KiB count). "-wal" and "-shm" stay. Returns 0 when the file was examined, -1 when it
-// cannot be (silently) or is no regular file (reported).
+// `limitKib` KiB (whole KiB count); of a symbolic link the link. "-wal" and "-shm" stay. Returns 0 when the
+// file was examined, -1 when it cannot be (silently) or is no regular file (reported).
 KELOSYSLOG_API int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib);
 
 // Switches a database to write-ahead logging with the sqlite3 tool. The path goes through a shell without

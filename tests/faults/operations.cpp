@@ -4,8 +4,10 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <ctime>
 #include <filesystem>
+#include <iterator>
 #include <map>
 
 #include "keloplatform/torvc.h"
@@ -273,21 +275,25 @@ void CheckSection(const Ground &ground, const Outcome &outcome) {
 } // namespace
 
 const std::vector<Operation> &Operations() {
-    static const std::vector<Operation> operations = {
-        Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
-            "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
-        Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
-            "SELECT * FROM logs WHERE (prog LIKE "),
-        Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
-        Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-        WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
-        Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
-        {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
-        {"CountAndFlush", true, SetUpAccounting, CountAndFlush, CheckAccounting},
-        Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
-        Delete("DeleteAll", SetUpLogs, 0),
-        {"SetSection", true, SetUpSection, SetSection, CheckSection},
-    };
+    static const std::vector<Operation> operations = [] {
+        std::vector<Operation> all = {
+            Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
+                "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
+            Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
+                "SELECT * FROM logs WHERE (prog LIKE "),
+            Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
+            Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
+            WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
+            Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
+            {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
+            {"CountAndFlush", true, SetUpAccounting, CountAndFlush, CheckAccounting},
+            Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
+            Delete("DeleteAll", SetUpLogs, 0),
+            {"SetSection", true, SetUpSection, SetSection, CheckSection},
+        };
+        std::ranges::move(HandlerOperations(), std::back_inserter(all));
+        return all;
+    }();
     return operations;
 }
 

@@ -47,9 +47,15 @@ struct Operation {
     std::function<void(const Ground &, const Outcome &)> check;
     // RE2 does not: it frees blocks twice when std::bad_alloc passes through it, and may end the process.
     bool survivesOutOfMemory = true;
+    // Whether the same files are there afterwards. One that creates or moves a file checks itself what is
+    // there.
+    bool keepsFiles = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };
+
+// The operations of the database handler.
+std::vector<Operation> HandlerOperations();
 
 // Every operation that the fault loops drive.
 const std::vector<Operation> &Operations();

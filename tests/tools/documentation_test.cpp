@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <memory>
 #include <set>
+#include <vector>
 
 #include "program_run.h"
 #include "support/temp_root.h"
@@ -43,24 +44,43 @@ Words Complete(const std::string &words) {
     return Matches(text, "^(.+)$");
 }
 
+std::string InRoff(std::string text) {
+    RE2::GlobalReplace(&text, "-", "\\\\-");
+    return text;
+}
+
+// The commands that a help text lists; what it is the help of stands before each.
+Words CommandsOf(const std::vector<std::string> &parent) {
+    std::vector<std::string> arguments = parent;
+    arguments.push_back("--help");
+    const std::string help = RunTool(arguments).out;
+    return Matches(help.substr(help.find("Subcommands:")), "^  ([a-z-]+)  ");
+}
+
 TEST(Documentation, KnowsEveryCommandAndOption) {
     const std::string manual = ReadFile(KELO_SOURCE_DIR "/package/man/kelosyslog.1");
-    const std::string help = RunTool({"--help"}).out;
-    const Words commands = Matches(help.substr(help.find("Subcommands:")), "^  ([a-z]+)  ");
+    const Words commands = CommandsOf({});
     ASSERT_GE(commands.size(), 4U);
     Words offered = commands;
     offered.insert({"--root", "--version", "--help"});
     EXPECT_EQ(Complete("''"), offered);
-    for (const std::string &command : commands) {
-        Words options = Matches(RunTool({command, "--help"}).out, "^  (?:-[A-Za-z],)?(--[a-z-]+)");
+    EXPECT_EQ(Complete("db ''"), CommandsOf({"db"}));
+    std::vector<std::vector<std::string>> lines;
+    for (const std::string &command : commands)
+        lines.push_back({command});
+    for (const std::string &command : CommandsOf({"db"}))
+        lines.push_back({"db", command});
+    for (std::vector<std::string> arguments : lines) {
+        std::string line;
+        for (const std::string &word : arguments)
+            line += (line.empty() ? "" : " ") + word;
+        arguments.push_back("--help");
+        Words options = Matches(RunTool(arguments).out, "^  (?:-[A-Za-z],)?(--[a-z-]+)");
         options.insert("--root");
-        EXPECT_EQ(Complete(command + " --"), options) << command;
-        EXPECT_NE(manual.find(".B kelosyslog " + command), std::string::npos) << command;
-        for (const std::string &option : options) {
-            std::string inRoff = option;
-            RE2::GlobalReplace(&inRoff, "-", "\\\\-");
-            EXPECT_TRUE(option == "--help" || manual.find(inRoff) != std::string::npos) << option;
-        }
+        EXPECT_EQ(Complete(line + " --"), options) << line;
+        EXPECT_NE(manual.find(".B kelosyslog " + InRoff(line)), std::string::npos) << line;
+        for (const std::string &option : options)
+            EXPECT_TRUE(option == "--help" || manual.find(InRoff(option)) != std::string::npos) << option;
     }
 }
 
@@ -68,6 +88,9 @@ TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
     EXPECT_EQ(Complete("search -p e"), (Words{"emerg", "err"}));
     EXPECT_EQ(Complete("count --priority = err,\\!e"), (Words{"err,!emerg", "err,!err"}));
     EXPECT_EQ(Complete("search --facility local0,local7,ke"), (Words{"local0,local7,kern"}));
+    EXPECT_EQ(Complete("search --output = js"), (Words{"json", "jsonl"}));
+    EXPECT_EQ(Complete("values -o s"), Words{});
+    EXPECT_EQ(Complete("db info -o ''"), (Words{"text", "json"}));
     EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
 }
 

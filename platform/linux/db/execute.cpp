@@ -16,9 +16,13 @@ using kelo::platform::Statement;
 
 namespace {
 
-// A sink costs a second prepare: not worth it for a value or two, or for a page.
+// A sink costs a second prepare: not worth it for a value or two, or for a page. How many rows there are is
+// known only when they come, so the first ones are taken one by one and then taken again.
 constexpr size_t kSinkColumns = 3;
 constexpr unsigned int kSinkRows = 200;
+// Of SQLite's machine, up to the first kSinkRows rows: about a millisecond. A statement that needs more
+// spends its time on finding or sorting rows, not on their delivery.
+constexpr int kCheapSteps = 100000;
 
 enum class Delivery { kByRow, kBySink };
 
@@ -33,26 +37,54 @@ void TakeRow(sqlite3_stmt *statement, DBResult_tag &result) {
     result.AddRow();
 }
 
-bool StepToEnd(sqlite3_stmt *statement, DBResult_tag *result) {
+bool StepToEnd(sqlite3_stmt *statement) {
     int status;
     while ((status = sqlite3_step(statement)) == SQLITE_ROW) {
-        if (result != nullptr)
-            TakeRow(statement, *result);
     }
     return status == SQLITE_DONE;
+}
+
+enum class Progress { kDone, kFailed, kMore };
+
+// Takes rows until the result holds `most`.
+Progress TakeRows(sqlite3_stmt *statement, DBResult_tag &result, uint64_t most) {
+    while (result.rows.Count() < most) {
+        const int status = sqlite3_step(statement);
+        if (status != SQLITE_ROW)
+            return status == SQLITE_DONE ? Progress::kDone : Progress::kFailed;
+        TakeRow(statement, result);
+    }
+    return Progress::kMore;
+}
+
+bool TakeAllRows(sqlite3_stmt *statement, DBResult_tag &result) {
+    return TakeRows(statement, result, UINT64_MAX) == Progress::kDone;
+}
+
+// Whether to begin again costs next to nothing, and changes nothing.
+bool MayBeginAgain(sqlite3_stmt *statement) {
+    return sqlite3_stmt_readonly(statement) != 0 && sqlite3_stmt_isexplain(statement) == 0 &&
+           sqlite3_stmt_status(statement, SQLITE_STMTSTATUS_VM_STEP, 0) < kCheapSteps;
 }
 
 // Runs a prepared statement; `result` is null where its rows are not wanted.
 bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
              std::unique_ptr<DBResult_tag> &result) {
+    sqlite3_stmt *statement = single.prepared.get();
     if (result == nullptr)
-        return StepToEnd(single.prepared.get(), nullptr);
-    if (delivery == Delivery::kBySink && result->cells.size() >= kSinkColumns) {
-        const Statement sink = kelo::platform::PrepareRowSink(db, single, *result);
-        if (sink != nullptr)
-            return StepToEnd(sink.get(), nullptr);
-    }
-    return StepToEnd(single.prepared.get(), result.get());
+        return StepToEnd(statement);
+    if (delivery == Delivery::kByRow || result->cells.size() < kSinkColumns)
+        return TakeAllRows(statement, *result);
+    const Progress progress = TakeRows(statement, *result, kSinkRows);
+    if (progress != Progress::kMore)
+        return progress == Progress::kDone;
+    if (!MayBeginAgain(statement))
+        return TakeAllRows(statement, *result);
+    // The sink can be registered only while no statement runs.
+    sqlite3_reset(statement);
+    result->rows = {};
+    const Statement sink = kelo::platform::PrepareRowSink(db, single, *result);
+    return sink != nullptr ? StepToEnd(sink.get()) : TakeAllRows(statement, *result);
 }
 
 // Runs the one statement of `sql`; `rows` stays null where it has no columns or they are not wanted.

@@ -38,13 +38,35 @@ void ResetSignals() {
     sigprocmask(SIG_SETMASK, &none, nullptr);
 }
 
-// Leaves only standard input and output, both on /dev/null, and standard error.
+// Leaves only standard input and output, both on /dev/null, and standard error, which goes there too where
+// the caller has none: a file that the command opens must not become one of the three.
 void ResetDescriptors() {
-    const int null = open("/dev/null", O_RDWR | O_CLOEXEC);
+    close_range(STDERR_FILENO + 1, ~0U, 0);
+    const bool hasError = fcntl(STDERR_FILENO, F_GETFD) >= 0;
+    const int null = open("/dev/null", O_RDWR);
     dup2(null, STDIN_FILENO);
     dup2(null, STDOUT_FILENO);
+    if (!hasError)
+        dup2(null, STDERR_FILENO);
     close_range(STDERR_FILENO + 1, ~0U, 0);
 }
+
+// Keeps signals off this thread while it lives: a handler of the caller's must not run in the child, which
+// has it until it resets it.
+class SignalBlock {
+public:
+    SignalBlock() {
+        sigset_t all;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &before_);
+    }
+    ~SignalBlock() { pthread_sigmask(SIG_SETMASK, &before_, nullptr); }
+    SignalBlock(const SignalBlock &) = delete;
+    SignalBlock &operator=(const SignalBlock &) = delete;
+
+private:
+    sigset_t before_;
+};
 
 [[noreturn]] void RunCommand(const char *program, char *const *arguments) {
     const pid_t command = Fork(SIGCHLD);
@@ -63,13 +85,15 @@ int TORVCExec(const char *program, const char *arg1, const char *arg2, const cha
     // An exec makes a child visible to every wait again, so the command runs as the child of one that execs
     // nothing.
     const char *arguments[] = {program, arg1, arg2, arg3, arg4, nullptr};
-    const pid_t keeper = Fork(0);
-    if (keeper < 0)
-        return -1;
-    if (keeper == 0) {
-        ResetSignals();
-        ResetDescriptors();
-        RunCommand(program, const_cast<char *const *>(arguments));
+    pid_t keeper;
+    {
+        const SignalBlock block;
+        keeper = Fork(0);
+        if (keeper == 0) {
+            ResetSignals();
+            ResetDescriptors();
+            RunCommand(program, const_cast<char *const *>(arguments));
+        }
     }
-    return AwaitExitStatus(keeper) == 0 ? 0 : -1;
+    return keeper > 0 && AwaitExitStatus(keeper) == 0 ? 0 : -1;
 }

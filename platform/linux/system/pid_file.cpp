@@ -23,15 +23,11 @@ std::string NameOf(pid_t pid) {
     return name;
 }
 
-} // namespace
-
-std::string HangUpByPidFile(const std::string &service, const std::string &program) {
-    const std::string path = RootedPath("/run/" + service + ".pid");
+// Returns "" when the process that the file names has or will get the signal, else the reason.
+std::string HangUp(const std::string &path, const std::string &program) {
     std::ifstream file(path);
-    if (!file)
-        return "no systemd, and no pid file " + path;
     pid_t pid = 0;
-    if (!(file >> pid) || pid <= 0)
+    if (!(file >> pid) || pid <= 0 || !(file >> std::ws).eof())
         return "no process id in " + path;
     // The descriptor holds on to the process, so that the one that was checked is the one that gets the
     // signal.
@@ -42,6 +38,23 @@ std::string HangUpByPidFile(const std::string &service, const std::string &progr
     if (syscall(SYS_pidfd_send_signal, process.Get(), SIGHUP, nullptr, 0) != 0)
         return "process " + std::to_string(pid) + ": " + std::strerror(errno);
     return "";
+}
+
+} // namespace
+
+std::string HangUpByPidFile(const std::string &service, const std::string &program) {
+    const std::string ofInitScript = RootedPath("/run/" + service + ".pid");
+    const std::string ofDaemon = RootedPath("/var/lib/" + service + "/" + service + ".pid");
+    std::string problems;
+    for (const std::string &path : {ofInitScript, ofDaemon}) {
+        if (access(path.c_str(), F_OK) != 0)
+            continue;
+        const std::string problem = HangUp(path, program);
+        if (problem.empty())
+            return "";
+        problems += (problems.empty() ? "" : "; ") + problem;
+    }
+    return problems.empty() ? "no systemd, and no pid file " + ofInitScript + " or " + ofDaemon : problems;
 }
 
 } // namespace kelo::platform

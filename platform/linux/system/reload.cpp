@@ -3,6 +3,7 @@
 
 #include <new>
 
+#include "common/root.h"
 #include "keloplatform/kelosystem.h"
 #include "system/pid_file.h"
 #include "system/service_manager.h"
@@ -19,13 +20,18 @@ bool IsServiceName(const std::string &service) {
            service.find('\0') == std::string::npos;
 }
 
+// What stands under a root of its own is no service of this machine.
+bool IsManagedBySystemd() {
+    return kelo::platform::RootedPath("/") == "/" && sd_booted() > 0;
+}
+
 } // namespace
 
 bool KELOSystemdReload(const std::string &service) {
     std::string problem = "not a service name";
     if (IsServiceName(service)) {
-        problem = sd_booted() > 0 ? kelo::platform::ReloadUnit(service + ".service")
-                                  : kelo::platform::HangUpByPidFile(service, ProgramOf(service));
+        problem = IsManagedBySystemd() ? kelo::platform::ReloadUnit(service + ".service")
+                                       : kelo::platform::HangUpByPidFile(service, ProgramOf(service));
     }
     if (problem.empty())
         return true;

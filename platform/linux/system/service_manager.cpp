@@ -3,6 +3,7 @@
 #include <systemd/sd-bus.h>
 
 #include <chrono>
+#include <cstdlib>
 #include <cstring>
 #include <memory>
 
@@ -12,6 +13,7 @@ namespace {
 constexpr char kDestination[] = "org.freedesktop.systemd1";
 constexpr char kPath[] = "/org/freedesktop/systemd1";
 constexpr char kManager[] = "org.freedesktop.systemd1.Manager";
+constexpr char kUnit[] = "org.freedesktop.systemd1.Unit";
 constexpr std::chrono::seconds kPatience{30};
 
 struct BusCloser {
@@ -28,6 +30,7 @@ struct BusError {
     sd_bus_error error = SD_BUS_ERROR_NULL;
 };
 using Bus = std::unique_ptr<sd_bus, BusCloser>;
+using CText = std::unique_ptr<char, void (*)(void *)>;
 using Message = std::unique_ptr<sd_bus_message, MessageUnref>;
 
 // What has become of the jobs that ended since the reload was asked for.
@@ -62,6 +65,42 @@ std::string AwaitResult(sd_bus *bus, const AwaitedJob &job) {
     return job.result == "done" ? "" : "the reload ended as " + job.result;
 }
 
+// The job that is reloading the unit at the moment; "" for none, or when that cannot be told.
+std::string JobUnderWay(sd_bus *bus, const std::string &unit) {
+    char *rawObject = nullptr;
+    if (sd_bus_path_encode("/org/freedesktop/systemd1/unit", unit.c_str(), &rawObject) < 0)
+        return "";
+    const CText object(rawObject, std::free);
+    char *rawState = nullptr;
+    if (sd_bus_get_property_string(bus, kDestination, object.get(), kUnit, "ActiveState", nullptr,
+                                   &rawState) < 0)
+        return "";
+    const CText state(rawState, std::free);
+    if (std::strcmp(state.get(), "reloading") != 0)
+        return "";
+    sd_bus_message *rawJob = nullptr;
+    if (sd_bus_get_property(bus, kDestination, object.get(), kUnit, "Job", nullptr, &rawJob, "(uo)") < 0)
+        return "";
+    const Message job(rawJob);
+    uint32_t id = 0;
+    const char *path = nullptr;
+    return sd_bus_message_read(job.get(), "(uo)", &id, &path) >= 0 && id != 0 ? path : "";
+}
+
+// Stores the path of the job in `path`. Returns the status of the bus.
+int AskForReload(sd_bus *bus, const std::string &unit, BusError &error, std::string &path) {
+    sd_bus_message *rawReply = nullptr;
+    int status = sd_bus_call_method(bus, kDestination, kPath, kManager, "ReloadUnit", &error.error, &rawReply,
+                                    "ss", unit.c_str(), "replace");
+    const Message reply(rawReply);
+    const char *text = nullptr;
+    if (status >= 0)
+        status = sd_bus_message_read(reply.get(), "o", &text);
+    if (status >= 0)
+        path = text;
+    return status;
+}
+
 } // namespace
 
 std::string ReloadUnit(const std::string &unit) {
@@ -70,26 +109,19 @@ std::string ReloadUnit(const std::string &unit) {
     const Bus bus(rawBus);
     BusError error;
     AwaitedJob job;
-    // Signals are taken from the bus only after the answer below has been read, so none is missed before the
-    // path is known.
+    // Signals are taken from the bus only after the job's path has been read, so none is missed before it is
+    // known.
     if (status >= 0)
         status = sd_bus_match_signal(bus.get(), nullptr, kDestination, kPath, kManager, "JobRemoved",
                                      AwaitedJob::Removed, &job);
     if (status >= 0)
         status = sd_bus_call_method(bus.get(), kDestination, kPath, kManager, "Subscribe", &error.error,
                                     nullptr, "");
-    sd_bus_message *rawReply = nullptr;
     if (status >= 0)
-        status = sd_bus_call_method(bus.get(), kDestination, kPath, kManager, "ReloadUnit", &error.error,
-                                    &rawReply, "ss", unit.c_str(), "replace");
-    const Message reply(rawReply);
-    const char *path = nullptr;
-    if (status >= 0)
-        status = sd_bus_message_read(reply.get(), "o", &path);
-    if (status < 0)
-        return error.Text(status);
-    job.path = path;
-    return AwaitResult(bus.get(), job);
+        job.path = JobUnderWay(bus.get(), unit);
+    if (status >= 0 && job.path.empty())
+        status = AskForReload(bus.get(), unit, error, job.path);
+    return status < 0 ? error.Text(status) : AwaitResult(bus.get(), job);
 }
 
 } // namespace kelo::platform

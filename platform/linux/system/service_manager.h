@@ -5,7 +5,8 @@
 namespace kelo::platform {
 
 // Asks systemd over the system bus to reload a unit ("syslog-ng.service") and waits for the outcome. A reload
-// that has been asked for but not begun serves both who asked; systemd sees to that.
+// that is under way already, whoever asked for it, is awaited instead; one that has not begun systemd itself
+// makes one with ours.
 //
 // Returns "" when the unit was reloaded, else the reason.
 std::string ReloadUnit(const std::string &unit);

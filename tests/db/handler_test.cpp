@@ -1,0 +1,222 @@
+#include <sys/resource.h>
+
+#include <filesystem>
+#include <functional>
+
+#include "db/db_fixture.h"
+#include "keloplatform/kelodb.h"
+
+namespace kelo::test {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+namespace fs = std::filesystem;
+
+const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
+
+using DBHandlerTest = DbTest;
+
+TEST_F(DBHandlerTest, CreatesAMissingDatabaseInAMissingFolder) {
+    for (const char *name : {"/new/deep/logs.db", "/mit Leerzeichen/Größe 日本.db", "/it's/5 o'clock.db"}) {
+        const std::string path = root_.Path() + name;
+        SCOPED_TRACE(path);
+        PlatformCalls::Reset();
+        DBHandler db(path, kSchema);
+        EXPECT_EQ(db.DBCon(), 0);
+        EXPECT_TRUE(db.DBcheckTableExist("db_info"));
+        db.DBDiscon();
+        EXPECT_EQ(QueryText(path, "PRAGMA journal_mode"), "wal");
+        const std::string shell = "TORVCExec /bin/sh -c /usr/bin/sqlite3 \"" + path + "\" ";
+        EXPECT_THAT(Calls({"KELOFSMkdirP", "TORVCExec"}),
+                    ElementsAre("KELOFSMkdirP " + fs::path(path).parent_path().string() + " 0 1 -1 -1 777",
+                                shell + "< " + kSchema, shell + "\"PRAGMA journal_mode=WAL;\""));
+        EXPECT_THAT(Messages(), ElementsAre(Info("create database: " + path + " by " + kSchema)));
+    }
+}
+
+// What is left of a creation that failed is opened by the next handler, or created by it.
+TEST_F(DBHandlerTest, SaysWhatFailedOfACreation) {
+    const std::string path = root_.File("sub/logs.db");
+    const std::string schema = root_.File("schema.sql");
+    const std::string command = "/usr/bin/sqlite3 \"" + path + "\" \"PRAGMA journal_mode=WAL;\"";
+    const auto failCall = [](int number) { return [=] { PlatformCalls::FailFrom(number, 1); }; };
+    const auto writeSchema = [&](const std::string &sql) { return [=, this] { WriteFile(schema, sql); }; };
+    const auto notCreated = [&](const std::string &what) {
+        return std::vector{Error(what), Error("Fail to create database: " + path)};
+    };
+    const auto notBuilt = notCreated("Fail to create database: " + path + "," + schema);
+    const auto created = Info("create database: " + path + " by " + schema);
+    const struct {
+        const char *name;
+        std::function<void()> arrange;
+        int result;
+        std::vector<SyslogMessage> messages;
+    } cases[] = {
+        {"a file where the folder should be", [&] { WriteFile(root_.File("sub"), ""); }, -1,
+         notCreated("Fail to create folder: " + root_.File("sub"))},
+        {"no schema", [&] { fs::remove(schema); }, -1, notBuilt},
+        {"an error in the schema", writeSchema("CREATE TABLE a (b); CREATE TABEL c (d);"), -1, notBuilt},
+        {"no tool", failCall(2), -1, notBuilt},
+        {"no write-ahead logging",
+         failCall(3),
+         0,
+         {created, Error("Fail to set jounal mode as WAL, use DELETE by default " + command)}},
+        {"no connection", failCall(4), -1, {created, Error("Fail to open db: " + path)}},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        fs::remove_all(root_.File("sub"));
+        WriteFile(schema, "CREATE TABLE logs (id INTEGER);");
+        PlatformCalls::Reset();
+        c.arrange();
+        DBHandler db(path, schema);
+        EXPECT_EQ(db.DBCon(), c.result);
+        EXPECT_EQ(db.isConnected(), c.result == 0);
+        db.DBDiscon();
+        EXPECT_EQ(Messages(), c.messages);
+        PlatformCalls::Reset();
+        WriteFile(schema, "CREATE TABLE logs (id INTEGER);");
+        if (!fs::is_regular_file(root_.File("sub"))) {
+            EXPECT_EQ(db.DBCon(), 0);
+            EXPECT_EQ(db.DBExecute("PRAGMA integrity_check"), 0);
+            db.DBDiscon();
+        }
+        Messages();
+    }
+}
+
+TEST_F(DBHandlerTest, FailsWhereTheShellTakesThePathForSomethingElse) {
+    for (const char *name : {"say \"hello\".db", "`exit 3`.db", "$(exit 3)/logs.db"}) {
+        DBHandler db(root_.File(name), root_.File("no schema"));
+        EXPECT_EQ(db.DBCon(), -1) << name;
+        EXPECT_FALSE(fs::is_regular_file(root_.File(name)));
+    }
+    // The folder is the whole path where it has no slash.
+    PlatformCalls::Reset();
+    PlatformCalls::FailFrom(1, 1);
+    Messages();
+    EXPECT_EQ(DBHandler("logs.db", kSchema).DBCreate(), -1);
+    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to create folder: logs.db")));
+    EXPECT_THAT(Calls({"KELOFSMkdirP"}), ElementsAre("KELOFSMkdirP logs.db 0 1 -1 -1 777"));
+}
+
+TEST_F(DBHandlerTest, LeavesAUsableFileWhenTheDiskTakesNoMore) {
+    rlimit before{};
+    getrlimit(RLIMIT_FSIZE, &before);
+    const rlimit tight{16384, before.rlim_max};
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &tight), 0);
+    EXPECT_EQ(db_.DBCon(), -1);
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &before), 0);
+    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to create database: " + path_ + "," + kSchema),
+                                        Error("Fail to create database: " + path_)));
+    ASSERT_EQ(db_.DBCon(), 0);
+    EXPECT_EQ(db_.DBExecute("CREATE TABLE IF NOT EXISTS logs (id)"), 0);
+}
+
+TEST_F(DBHandlerTest, ConnectsOnceAtATimeAndAgainAfterwards) {
+    Connect();
+    EXPECT_EQ(db_.DBCon(), -1);
+    EXPECT_TRUE(db_.isConnected());
+    EXPECT_THAT(Messages(), ElementsAre(Error("Connection is already existed")));
+    EXPECT_EQ(db_.DBDiscon(), 0);
+    EXPECT_FALSE(db_.isConnected());
+    EXPECT_EQ(db_.DBDiscon(), 0);
+    EXPECT_EQ(db_.DBCon(), 0);
+    EXPECT_THAT(Calls({"KELOFSMkdirP", "TORVCExec"}), IsEmpty());
+}
+
+TEST_F(DBHandlerTest, HandsTheResultToTheCallbackWhateverItReturns) {
+    const auto keep = [](DBResult_tag *result, void *context) {
+        static_cast<std::vector<int> *>(context)->push_back(result != nullptr ? KELODBNumRows(result) : -1);
+        return -1;
+    };
+    std::vector<int> rows;
+    EXPECT_EQ(db_.DBExecute("SELECT 1", keep, &rows), -1);
+    EXPECT_THAT(Messages(), ElementsAre(Error("DB is not connected")));
+    EXPECT_EQ(db_.DBExecute("SELECT 1"), -1);
+    EXPECT_THAT(Messages(), IsEmpty());
+    Connect(3);
+    EXPECT_EQ(db_.DBExecute("SELECT * FROM logs", keep, &rows), 0);
+    EXPECT_EQ(db_.DBExecute("DELETE FROM logs WHERE id = 1", keep, &rows), 0);
+    EXPECT_EQ(db_.DBExecute("SELECT * FROM logs", nullptr, nullptr), 0);
+    EXPECT_EQ(db_.DBExecute("SELECT * FROM nothing", keep, &rows), -1);
+    EXPECT_THAT(rows, ElementsAre(3, -1));
+}
+
+TEST_F(DBHandlerTest, KeepsTheStateOfItsTransaction) {
+    using Member = int (DBHandler::*)();
+    const Member start = &DBHandler::DBTranStart;
+    const Member end = &DBHandler::DBTranEnd;
+    const Member rollback = &DBHandler::DBTranRollback;
+    const auto insane = [](const std::string &name) { return "Fail to check sanity (DBTran" + name + ")"; };
+    for (const auto &[run, name] : {std::pair(start, "Start"), {end, "End"}, {rollback, "Rollback"}}) {
+        EXPECT_EQ((db_.*run)(), -1);
+        EXPECT_THAT(Messages(), ElementsAre(Error(insane(name))));
+    }
+    Connect();
+    // Each step with the flag after it; `fails` is a failure of SQLite, which is no business of
+    // DBErrorHandle.
+    const struct {
+        Member run;
+        bool fails;
+        int result;
+        int flag;
+        std::string message;
+    } steps[] = {
+        {end, false, -1, 0, insane("End")},
+        {rollback, false, -1, 0, insane("Rollback")},
+        {start, true, -1, 0, "Fail to begin transaction"},
+        {start, false, 0, 1, ""},
+        {start, false, -1, 1, insane("Start")},
+        {end, true, -1, 1, "Fail to end transaction"},
+        {rollback, true, -1, 1, "Fail to rollback transaction"},
+        {end, false, 0, 0, ""},
+        {start, false, 0, 1, ""},
+        {rollback, false, 0, 0, ""},
+        {start, false, 0, 1, ""},
+    };
+    for (const auto &step : steps) {
+        PlatformCalls::FailFrom(step.fails ? 1 : 1000, 1);
+        EXPECT_EQ((db_.*step.run)(), step.result);
+        EXPECT_EQ(db_.isInTran(), step.flag);
+        const auto messages = Messages();
+        EXPECT_EQ(messages,
+                  step.message.empty() ? decltype(messages)() : decltype(messages){Error(step.message)});
+    }
+    EXPECT_THAT(PlatformCalls::Statements(), ElementsAre("BEGIN;", "BEGIN;", "END;", "ROLLBACK;", "END;",
+                                                         "BEGIN;", "ROLLBACK;", "BEGIN;"));
+    db_.DBDiscon();
+    EXPECT_EQ(db_.isInTran(), 1) << "only the three operations change it";
+}
+
+TEST_F(DBHandlerTest, EscapesChecksTablesAndCheckpoints) {
+    Connect();
+    EXPECT_EQ(db_.DBCmdEscape("it's"), "it''s");
+    EXPECT_EQ(db_.DBCmdEscape(""), "");
+    EXPECT_EQ(db_.DBCmdEscape(std::string("a\0b", 3)), "");
+    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to escapse string")));
+    EXPECT_TRUE(db_.DBcheckTableExist("logs"));
+    EXPECT_FALSE(db_.DBcheckTableExist("absent"));
+    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_FALSE(db_.DBcheckTableExist("it's"));
+    EXPECT_EQ(Messages().back(), Error("Fail to execute SQL command : SELECT count(*) as count_result FROM "
+                                       "sqlite_master WHERE type='table' AND name='it's'"));
+
+    InsertLogsIntoWal(path_, {SampleLog(1)});
+    EXPECT_EQ(db_.DBWalCheckpoint(false), 0);
+    EXPECT_TRUE(fs::exists(path_ + "-wal"));
+    PlatformCalls::FailFrom(1, 1);
+    EXPECT_EQ(db_.DBWalCheckpoint(true), -1);
+    EXPECT_TRUE(fs::exists(path_ + "-wal"));
+    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to force WAL checkpoint(FULL)")));
+    for (int i = 0; i < 2; ++i) // the second time there is nothing to remove
+        EXPECT_EQ(db_.DBWalCheckpoint(true), 0);
+    EXPECT_FALSE(fs::exists(path_ + "-wal") || fs::exists(path_ + "-shm"));
+    db_.DBDiscon();
+    EXPECT_EQ(QueryText(path_, "SELECT count(*) FROM logs"), "1");
+    EXPECT_EQ(db_.DBWalCheckpoint(false), -1);
+}
+
+} // namespace
+} // namespace kelo::test

@@ -1,0 +1,169 @@
+// The database handler in the fault loops.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <filesystem>
+
+#include "faults/operations.h"
+#include "keloplatform/kelodb.h"
+#include "kelosyslog/dbhandler.h"
+#include "kelosyslog/root.h"
+#include "support/fault_pause.h"
+#include "support/log_database.h"
+#include "support/notify_calls.h"
+#include "support/system_calls.h"
+
+namespace kelo::test {
+namespace {
+
+namespace fs = std::filesystem;
+using testing::Contains;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
+
+// A handler whose owner disconnects on every way out, as the handler asks for.
+struct Connected {
+    explicit Connected(const Ground &ground) : db(ground.root.File("logs.db"), kSchema), status(db.DBCon()) {}
+    ~Connected() { db.DBDiscon(); }
+    Connected(const Connected &) = delete;
+    Connected &operator=(const Connected &) = delete;
+
+    DBHandler db;
+    int status;
+};
+
+void SetUpArchive(Ground &ground) {
+    NotifyCalls::Reset();
+    SystemCalls::Reset();
+    SyslogRootSet(ground.root.Path());
+    CreateLogDatabase(ground.root.File("logs.db"), "archive.sql");
+    InsertSampleLogs(ground.root.File("logs.db"), 10);
+}
+
+// Where the database is. SQLite takes some failing reads for damage, which puts it aside.
+std::string SoundDatabase(const Ground &ground, const Outcome &outcome) {
+    const std::string path = ground.root.File("logs.db");
+    const std::string found = outcome.fault == "read" && !fs::exists(path) ? path + ".corrupt" : path;
+    EXPECT_TRUE(fs::exists(found));
+    EXPECT_EQ(QueryText(found, "PRAGMA integrity_check"), "ok");
+    return found;
+}
+
+int KeepId(DBResult_tag *result, void *context) {
+    uint32_t row = 0;
+    const FaultPause pause;
+    if (KELODBFetchRow(result, &row) >= 0)
+        static_cast<Ground *>(context)->seen.emplace_back(KELODBFetchField(result, row, "id"));
+    return 0;
+}
+
+int Read(Ground &ground) {
+    Connected connected(ground);
+    if (connected.status != 0 || connected.db.DBExecute("SELECT * FROM logs", KeepId, &ground) != 0)
+        return -1;
+    _ARCH_DB_INFO_tag info;
+    const bool isWhole = connected.db.DBcheckTableExist("logs") && connected.db.DBLogCountGet() == 10 &&
+                         connected.db.DBLogEndTimeGet() == 1577836809 && connected.db.DBInfoGet(info) == 0;
+    return isWhole ? 0 : -1;
+}
+
+int Change(Ground &ground) {
+    Connected connected(ground);
+    DBHandler &db = connected.db;
+    if (connected.status != 0 || db.DBTranStart() != 0)
+        return -1;
+    const std::string name = db.DBCmdEscape("it's");
+    const bool isChanged = db.DBInfoDevSet(name) == 0 && db.DBInfoStartSet(7) == 0 && !name.empty();
+    if (!isChanged || db.DBTranEnd() != 0) {
+        db.DBTranRollback();
+        return -1;
+    }
+    return db.DBWalCheckpoint(false);
+}
+
+void CheckChange(const Ground &ground, const Outcome &outcome) {
+    const std::string row =
+        QueryText(SoundDatabase(ground, outcome), "SELECT device || start_time FROM db_info");
+    if (outcome.IsDone())
+        EXPECT_EQ(row, "it's7");
+    else
+        EXPECT_TRUE(row == "it's7" || row == "0") << row;
+    EXPECT_TRUE(outcome.IsDone() || outcome.outOfMemory || !outcome.messages.empty());
+}
+
+void SetUpNothing(Ground &ground) {
+    NotifyCalls::Reset();
+    SystemCalls::Reset();
+    SyslogRootSet(ground.root.Path());
+}
+
+int Create(Ground &ground) {
+    return DBHandler(ground.root.File("logs.db"), kSchema).DBCreate();
+}
+
+// Without write-ahead logging it is done too, and says so.
+void CheckCreation(const Ground &ground, const Outcome &outcome) {
+    const std::string path = ground.root.File("logs.db");
+    const auto hasLine = [&](const std::string &text) {
+        return testing::Value(outcome.messages, Contains(HasSubstr(text)));
+    };
+    if (!outcome.IsDone()) {
+        EXPECT_TRUE(outcome.outOfMemory || hasLine("Fail to create"));
+        return;
+    }
+    EXPECT_EQ(QueryText(path, "SELECT count(*) FROM db_info"), "1");
+    EXPECT_EQ(QueryText(path, "PRAGMA journal_mode"), hasLine("Fail to set jounal mode") ? "delete" : "wal");
+}
+
+void SetUpDamaged(Ground &ground) {
+    SetUpNothing(ground);
+    WriteFile(ground.root.File("logs.db"), "damaged");
+}
+
+int Quarantine(Ground &ground) {
+    {
+        const FaultPause pause;
+        NotifyCalls::Reset();
+    }
+    return DBErrorHandle_SQLITE_CORRUPT(nullptr, ground.root.File("logs.db"));
+}
+
+// The file is moved once and only after the administrator was told, and never lost.
+void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
+    const bool isMoved = fs::exists(ground.root.File("logs.db.corrupt"));
+    EXPECT_NE(fs::exists(ground.root.File("logs.db")), isMoved);
+    EXPECT_TRUE(isMoved || !outcome.IsDone());
+    EXPECT_TRUE(!isMoved || NotifyCalls::Sent().size() == 1);
+    const auto isTold = [&](const std::string &text) {
+        return testing::Value(outcome.messages, Contains(HasSubstr(text)));
+    };
+    if (outcome.fault == "KELOSysNotifySendNotificationCustomized") {
+        EXPECT_TRUE(!isMoved && isTold("Fail to send notification when db corruption"));
+    } else if (outcome.fault == "KELOSystemdReload") {
+        EXPECT_TRUE(isMoved && !outcome.IsDone() && isTold("Fail to send HUP signal to syslog-ng"));
+    }
+    EXPECT_EQ(NotifyCalls::OpenHandles(), 0);
+}
+
+} // namespace
+
+std::vector<Operation> HandlerOperations() {
+    const std::vector<std::string> ids = {"1"};
+    const auto checkRead = [=](const Ground &ground, const Outcome &outcome) {
+        SoundDatabase(ground, outcome);
+        EXPECT_TRUE(ground.seen == ids ||
+                    ((!outcome.IsDone() || outcome.fault == "KELODBFetchRow") && ground.seen.empty()));
+    };
+    return {
+        {"HandlerReads", false, SetUpArchive, Read, checkRead, true, false},
+        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, true, false},
+        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, true, false},
+        {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, true, false},
+    };
+}
+
+} // namespace kelo::test

@@ -1,0 +1,89 @@
+// Works through a handler on a database that syslog-ng writes, until its standard input ends: use_database
+// ROOT DATABASE. Ends with 0 then; with 3 as soon as a statement fails and the file was put aside; with 1
+// when anything else is reported as an error.
+
+#include <poll.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cstdarg>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+
+#include "keloplatform/root.h"
+#include "kelosyslog/dbhandler.h"
+#include "kelosyslog/root.h"
+
+namespace {
+
+int errors = 0;
+int reports = 0;
+constexpr int kMostReports = 1000; // what does not end is an error
+
+void Report(int priority, const char *format, va_list arguments) {
+    errors += (priority & LOG_PRIMASK) <= LOG_ERR ? 1 : 0;
+    if (++reports > kMostReports)
+        ++errors;
+    std::vfprintf(stderr, format, arguments);
+    std::fputc('\n', stderr);
+}
+
+bool HasInputEnded() {
+    pollfd input{STDIN_FILENO, POLLIN, 0};
+    char byte;
+    return poll(&input, 1, 0) > 0 && read(STDIN_FILENO, &byte, 1) <= 0;
+}
+
+// One of everything, up to a query that fails: with the file put aside, a further statement would put the
+// fresh one aside too. The transaction changes a row into what it is, so that the rows stay those sent.
+bool Use(DBHandler &db) {
+    if (db.DBExecute("SELECT count(*), max(length(msg)), max(id) FROM logs NOT INDEXED") != 0)
+        return false;
+    if (db.DBTranStart() == 0) {
+        const bool isDone =
+            db.DBExecute("UPDATE logs SET tag = tag || '' WHERE id = (SELECT max(id) FROM logs)") == 0;
+        isDone ? db.DBTranEnd() : db.DBTranRollback();
+    }
+    return db.DBWalCheckpoint(false) == 0;
+}
+
+} // namespace
+
+// In place of the C library's, for the libraries too.
+extern "C" void syslog(int priority, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    Report(priority, format, arguments);
+    va_end(arguments);
+}
+
+extern "C" void __syslog_chk(int priority, int, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    Report(priority, format, arguments);
+    va_end(arguments);
+}
+
+int main(int argc, char **argv) {
+    if (argc != 3 || SyslogRootSet(argv[1]) != 0 || KELORootSet(argv[1]) != 0)
+        return 2;
+    const std::string path = argv[2];
+    DBHandler db(path, "");
+    int rounds = 0;
+    while (!HasInputEnded()) {
+        if (!db.isConnected() && db.DBCon() != 0)
+            return 1;
+        const bool isSound = Use(db);
+        if (!isSound)
+            db.DBDiscon();
+        if (!isSound && access((path + ".corrupt").c_str(), F_OK) == 0)
+            return 3;
+        if (errors > 0)
+            return 1;
+        ++rounds;
+    }
+    db.DBDiscon();
+    std::printf("%d\n", rounds);
+    return 0;
+}
