@@ -22,6 +22,8 @@ int main(int argc, char **argv) {
     kelo::tool::AddDelete(program);
     kelo::tool::AddValues(program);
     kelo::tool::AddStats(program);
+    kelo::tool::AddRules(program);
+    kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
     kelo::tool::AddDb(program);
     return kelo::tool::RunProgram(program, argc, argv);

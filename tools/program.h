@@ -57,6 +57,8 @@ void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddValues(Program &program);
 void AddStats(Program &program);
+void AddRules(Program &program);
+void AddNotify(Program &program);
 void AddParse(Program &program);
 void AddDb(Program &program);
 

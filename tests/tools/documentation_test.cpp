@@ -92,7 +92,6 @@ TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
     EXPECT_EQ(Complete("values -o s"), Words{});
     EXPECT_EQ(Complete("db info -o ''"), (Words{"text", "json"}));
     EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
-    EXPECT_EQ(Complete("search --host n"), Words{});
 }
 
 } // namespace

@@ -1,0 +1,116 @@
+// kelonotify: delivers the notification spool.
+
+#include <syslog.h>
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+#include <curl/curl.h>
+
+#include <csignal>
+#include <cstdio>
+#include <filesystem>
+#include <memory>
+
+#include "kelonotify/deliverer.h"
+#include "kelonotify/watcher.h"
+#include "keloplatform/root.h"
+#include "text_encoding.h"
+
+namespace kelo::tool {
+namespace {
+
+enum ExitStatus : int {
+    kExitDelivered = 0,
+    kExitLeft = 1, // something waits, or was given up
+    kExitUsage = 2,
+    kExitBusy = 3, // another instance delivers
+    kExitSpool = 4,
+};
+
+struct Options {
+    std::string root;
+    bool mustStay = false;
+    DelivererOptions delivery;
+};
+
+void WarnOfOpenSettings(const Settings &settings) {
+    if (settings.IsOpenToOthers())
+        syslog(LOG_WARNING, "%s holds passwords and may be read by everybody: give it mode 0600",
+               settings.Path().c_str());
+}
+
+int Run(const Options &options) {
+    const Spool spool(options.root);
+    const Settings settings(options.root);
+    spool.CreateFolders();
+    const FileHandle lock = spool.Lock();
+    if (!lock) {
+        syslog(LOG_NOTICE, "Another kelonotify delivers %s", spool.Path().c_str());
+        return kExitBusy;
+    }
+    WarnOfOpenSettings(settings);
+    Watcher watcher(spool.File("new"));
+    Deliverer deliverer(spool, settings, options.delivery, [&] { return watcher.ShouldStop(); });
+    int64_t next = deliverer.Pass();
+    while (options.mustStay && !watcher.ShouldStop()) {
+        watcher.Wait(next);
+        if (!watcher.ShouldStop())
+            next = deliverer.Pass();
+    }
+    return deliverer.IsAllDelivered() ? kExitDelivered : kExitLeft;
+}
+
+void AddOptions(CLI::App &app, Options &options) {
+    app.set_version_flag("--version", "kelonotify " KELOSYSLOG_VERSION);
+    app.add_option("--root", options.root, "Work on the spool and the settings below DIR")->type_name("DIR");
+    app.add_flag("--watch", options.mustStay, "Stay, and deliver what comes");
+    app.add_option("--timeout", options.delivery.timeoutSec, "End a step on a network after SECONDS (30)")
+        ->type_name("SECONDS")
+        ->check(CLI::Range(1, 600));
+    app.add_option("--give-up-after", options.delivery.giveUpAfterSec,
+                   "Put what is not delivered at this age into failed/ (259200, three days)")
+        ->type_name("SECONDS")
+        ->check(CLI::Range(0, 31536000));
+    app.footer("Exit status: 0 everything delivered, 1 something waits or was given up, 2 usage, 3 another "
+               "instance delivers, 4 the spool cannot be read or written.");
+}
+
+void ApplyRoot(std::string &root) {
+    if (root.empty())
+        return;
+    root = std::filesystem::absolute(root).lexically_normal().string();
+    if (root.back() == '/')
+        root.pop_back();
+    if (KELORootSet(root.c_str()) != 0)
+        throw CLI::ValidationError("--root", "cannot use '" + root + "'");
+}
+
+} // namespace
+
+int Main(int argc, char **argv) {
+    std::signal(SIGPIPE, SIG_IGN); // a server that goes away is noticed by the failing write
+    openlog("kelonotify", LOG_PID | LOG_PERROR, LOG_DAEMON);
+    Options options;
+    CLI::App app("Deliver the notifications that wait in the spool.", "kelonotify");
+    AddOptions(app, options);
+    try {
+        app.parse(argc, argv);
+        ApplyRoot(options.root);
+        curl_global_init(CURL_GLOBAL_DEFAULT);
+        return Run(options);
+    } catch (const CLI::Success &request) { // --help, --version
+        return app.exit(request);
+    } catch (const CLI::ParseError &error) {
+        std::fprintf(stderr, "kelonotify: %s (see --help)\n", VisibleText(error.what()).c_str());
+        return kExitUsage;
+    } catch (const std::exception &error) {
+        syslog(LOG_ERR, "%s", VisibleText(error.what()).c_str());
+        return kExitSpool;
+    }
+}
+
+} // namespace kelo::tool
+
+int main(int argc, char **argv) {
+    return kelo::tool::Main(argc, argv);
+}

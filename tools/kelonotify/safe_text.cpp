@@ -1,0 +1,43 @@
+#include "kelonotify/safe_text.h"
+
+#include <algorithm>
+
+#include "text_encoding.h"
+
+namespace kelo::tool {
+namespace {
+
+std::string Cut(std::string text, size_t maxBytes) {
+    constexpr std::string_view kCut = "...";
+    if (text.size() <= maxBytes)
+        return text;
+    size_t end = maxBytes - kCut.size();
+    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
+        --end;
+    return text.substr(0, end).append(kCut);
+}
+
+} // namespace
+
+std::string SafeLine(std::string_view text, size_t maxBytes) {
+    std::string folded(text);
+    for (char &byte : folded) {
+        if (byte == '\r' || byte == '\n' || byte == '\t')
+            byte = ' ';
+    }
+    return Cut(VisibleText(folded), maxBytes);
+}
+
+std::string SafeLines(std::string_view text, size_t maxBytes) {
+    std::string safe;
+    for (size_t at = 0; at < text.size();) {
+        const size_t end = std::min(text.find_first_of("\n\t", at), text.size());
+        safe += VisibleText(text.substr(at, end - at));
+        if (end < text.size())
+            safe += text[end];
+        at = end + 1;
+    }
+    return Cut(std::move(safe), maxBytes);
+}
+
+} // namespace kelo::tool

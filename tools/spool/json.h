@@ -1,0 +1,15 @@
+#pragma once
+
+#include <json/json.h>
+
+#include <string>
+
+namespace kelo::tool {
+
+// The object that the text holds. Throws std::runtime_error when it holds none or is nested deeply.
+Json::Value ParseJson(const std::string &text);
+
+// The value on one line that ends in a line feed.
+std::string WriteJsonLine(const Json::Value &value);
+
+} // namespace kelo::tool
