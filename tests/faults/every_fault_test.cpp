@@ -68,7 +68,7 @@ std::vector<Parameters> Combinations() {
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : FaultSources()) {
             const bool isMet = source.start != AllocationFaults::Start ||
-                               (AllocationFaults::IsSupported() && operation.survivesOutOfMemory);
+                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
             if (isMet)
                 combinations.emplace_back(operation, source);
         }

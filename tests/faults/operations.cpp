@@ -6,6 +6,7 @@
 #include <map>
 
 #include "kelosyslog/dbhandler.h"
+#include "kelosyslog/logger.h"
 #include "support/fault_pause.h"
 #include "support/log_database.h"
 
@@ -115,8 +116,8 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
-Operation WithRegexes(Operation operation) {
-    operation.survivesOutOfMemory = false;
+Operation WithoutAllocationFaults(Operation operation) {
+    operation.meetsAllocationFaults = false;
     return operation;
 }
 
@@ -270,6 +271,82 @@ void SetUpLogsOfTwoPrograms(Ground &ground) {
                          {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
 }
 
+// The server's event log: `rows` events, the last two of which have lost their time.
+template <int Rows>
+void SetUpEvents(Ground &ground) {
+    ground.database = ground.root.File("events.db");
+    const std::string rows = std::to_string(Rows);
+    RunSql(ground.database, "PRAGMA journal_mode=WAL; PRAGMA synchronous=OFF;" +
+                                ReadFile(KELO_SOURCE_DIR "/package/schema/kelosyslog.sql") +
+                                "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < " + rows +
+                                ") INSERT INTO log SELECT i, 1, iif(i > " + rows +
+                                " - 2, 0, i), 'u', 'e' FROM n");
+}
+
+constexpr int kFewEvents = 3;
+constexpr int kFullOfEvents = 20000;
+const std::string kEventsLeft = "SELECT count(*) FROM log";
+
+// The event is in unless its transaction could not be ended, which is told.
+void CheckEventAdded(const Ground &ground, const Outcome &outcome) {
+    const std::string added = std::to_string(kFewEvents + 1);
+    const std::string rows = QueryText(ground.database, kEventsLeft);
+    const bool lostAtEnd = testing::Matches(testing::Contains("Fail to end transaction"))(outcome.messages);
+    if (outcome.IsDone() && !lostAtEnd)
+        EXPECT_EQ(rows, added);
+    else if (!outcome.IsDone() && !outcome.outOfMemory)
+        EXPECT_EQ(rows, std::to_string(kFewEvents));
+    else
+        EXPECT_THAT(rows, AnyOf(added, std::to_string(kFewEvents)));
+    if (!outcome.outOfMemory && !outcome.IsDone()) {
+        EXPECT_FALSE(outcome.messages.empty());
+    }
+}
+
+// Events with a time stay, those without go together.
+void CheckRotation(const Ground &ground, const Outcome &outcome) {
+    const std::string tidy = std::to_string(kFullOfEvents - 2);
+    EXPECT_THAT(QueryText(ground.database, kEventsLeft), AnyOf(tidy, std::to_string(kFullOfEvents)));
+    if (outcome.fault.empty()) {
+        EXPECT_EQ(QueryText(ground.database, kEventsLeft), tidy);
+    }
+    if (!outcome.outOfMemory && !outcome.IsDone()) {
+        EXPECT_FALSE(outcome.messages.empty());
+    }
+}
+
+int EnumerateEvents(Ground &ground) {
+    const std::list<_SSYSLOG_LOG_LOG_tag> events = Logger().LogEnum(ground.database, 0, kFewEvents);
+    const FaultPause pause;
+    for (const _SSYSLOG_LOG_LOG_tag &event : events)
+        ground.seen.push_back(std::to_string(event.id));
+    return events.empty() ? -1 : 0;
+}
+
+// All events or none, but for those before a row that could not be fetched; and a failure is told.
+void CheckEvents(const Ground &ground, const Outcome &outcome) {
+    const bool isCut = outcome.fault == "KELODBFetchRow";
+    if (outcome.IsDone() && !isCut) {
+        EXPECT_EQ(ground.seen, (Lines{"1", "3", "2"}));
+    }
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone() || isCut);
+    }
+}
+
+int CountEvents(Ground &ground) {
+    return TakeCount(ground, Logger().LogCount(ground.database));
+}
+
+void CheckEventCount(const Ground &ground, const Outcome &outcome) {
+    if (outcome.IsDone()) {
+        EXPECT_EQ(ground.seen, Lines{std::to_string(kFewEvents)});
+    }
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone());
+    }
+}
+
 } // namespace
 
 const std::vector<Operation> &Operations() {
@@ -287,11 +364,18 @@ const std::vector<Operation> &Operations() {
         Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
         Ask("CountFiltered", SetUpLogsOfHost3, Count, {"1"}, {"0"}),
         Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-        WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
+        WithoutAllocationFaults(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
         Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
         {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
         {"CountByHandler", false, SetUpLogs, CountByHandler, CheckCountByHandler},
         {"ReplaceInTransaction", true, SetUpLogs, ReplaceInTransaction, CheckTransaction},
+        {"AddEvent", true, SetUpEvents<kFewEvents>,
+         [](Ground &ground) { return Logger().LogAdd(ground.database, 1, "o'", "e"); }, CheckEventAdded},
+        WithoutAllocationFaults({"RotateEvents", true, SetUpEvents<kFullOfEvents>,
+                                 [](Ground &ground) { return Logger().LogRotation(ground.database); },
+                                 CheckRotation}),
+        {"EnumerateEvents", false, SetUpEvents<kFewEvents>, EnumerateEvents, CheckEvents},
+        {"CountEvents", false, SetUpEvents<kFewEvents>, CountEvents, CheckEventCount},
         Delete("DeleteFiltered", SetUpLogsOfHost3, Ids(1, kRows, 4)),
         Delete("DeleteAll", SetUpLogs, ""),
     };

@@ -45,8 +45,9 @@ struct Operation {
     std::function<int(Ground &)> run;
     // Whether what was promised holds, whatever failed.
     std::function<void(const Ground &, const Outcome &)> check;
-    // RE2 does not: it frees blocks twice when std::bad_alloc passes through it, and may end the process.
-    bool survivesOutOfMemory = true;
+    // Not so for RE2, which frees blocks twice when std::bad_alloc passes through it and may end the process,
+    // nor for what takes too long to be run a thousand times.
+    bool meetsAllocationFaults = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };
