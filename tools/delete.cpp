@@ -1,12 +1,10 @@
 // kelosyslog delete: removes logs.
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <ctime>
-#include <iostream>
 
 #include "common_options.h"
+#include "confirm.h"
 #include "errors.h"
 #include "exit_status.h"
 #include "log_reader.h"
@@ -38,15 +36,6 @@ struct Options {
 
 std::string Logs(uint64_t count) {
     return std::to_string(count) + (count == 1 ? " matching log" : " matching logs");
-}
-
-bool Confirm(const std::string &question) {
-    if (isatty(STDIN_FILENO) == 0)
-        throw UsageError("delete: no terminal to ask on; add --yes to delete " + question);
-    std::cerr << "Delete " << question << "? [y/N] " << std::flush;
-    std::string answer;
-    std::getline(std::cin, answer);
-    return answer == "y" || answer == "Y" || answer == "yes";
 }
 
 // Deletes what is selected up to `lastId`, range by range, hopping over ranges without a match. Returns how
@@ -90,7 +79,7 @@ int Run(const Options &options, const std::string &root) {
         output.Finish();
         return count > 0 ? kExitFound : kExitNothing;
     }
-    if (!options.isConfirmed && !Confirm(what)) {
+    if (!options.isConfirmed && !ConfirmDeletion("delete", what)) {
         PrintMessage("nothing deleted");
         return kExitNothing;
     }

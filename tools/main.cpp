@@ -20,6 +20,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddSearch(program);
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
+    kelo::tool::AddEvents(program);
     kelo::tool::AddValues(program);
     kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);

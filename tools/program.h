@@ -52,6 +52,7 @@ int RunProgram(Program &program, int argc, const char *const *argv);
 void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
+void AddEvents(Program &program);
 void AddValues(Program &program);
 void AddParse(Program &program);
 
