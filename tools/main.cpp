@@ -21,6 +21,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
     kelo::tool::AddEvents(program);
+    kelo::tool::AddReport(program);
     kelo::tool::AddValues(program);
     kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);

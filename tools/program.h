@@ -53,6 +53,7 @@ void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
 void AddEvents(Program &program);
+void AddReport(Program &program);
 void AddValues(Program &program);
 void AddParse(Program &program);
 
