@@ -57,9 +57,9 @@ std::string Counted(uint64_t number, const std::string &noun) {
 }
 
 std::string Rate(double perSecond) {
-    if (perSecond >= 100)
+    if (perSecond >= 100 || perSecond == std::floor(perSecond))
         return Count(static_cast<uint64_t>(std::llround(perSecond)));
-    return Formatted(perSecond >= 1 ? "%.1f" : perSecond == 0 ? "%.0f" : "%.2g", perSecond);
+    return Formatted(perSecond >= 1 ? "%.1f" : "%.2g", perSecond);
 }
 
 std::string Share(uint64_t part, uint64_t whole) {
@@ -267,15 +267,16 @@ List Tiles(const Report &report, const TimeFormat &time) {
             busiest = i;
     }
     const auto seconds = static_cast<double>(report.period.to - report.period.from + 1);
+    const std::string spanName = SpanName(logs.grid.widthSec);
     List tiles;
     tiles.push_back(
         Tile("Logs", Count(logs.total), Rate(static_cast<double>(logs.total) / seconds) + " a second"));
     if (!logs.spans.empty())
         tiles.push_back(Tile(
-            "Busiest " + SpanName(logs.grid.widthSec),
+            "Busiest " + (spanName.starts_with("1 ") ? spanName.substr(2) : spanName),
             Rate(static_cast<double>(Sum(logs.spans[busiest])) / static_cast<double>(logs.grid.widthSec)) +
                 "/s",
-            "from " + time.Plain(logs.grid.Begin(busiest))));
+            "from " + time.Plain(logs.grid.Begin(busiest)).substr(0, 16)));
     tiles.push_back(Tile("Errors and worse", Count(errors), Share(errors, logs.total)));
     tiles.push_back(Tile("Devices", Count(logs.deviceCount), "that sent logs"));
     if (report.events)
