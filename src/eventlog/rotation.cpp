@@ -22,7 +22,7 @@ std::string RunRotation(DBHandler &db) {
     // Rows are removed by a cut-off of its own that stays 0: rotation never removes an event with a real
     // time.
     int64_t timeOfOldestKept = 0;
-    const std::string select = "SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000";
+    const char *const select = "SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000";
     if (db.DBExecute(select, ReadTime, &timeOfOldestKept) < 0)
         return select;
     for (const char *sql : {"DELETE FROM log WHERE time <= 0", "VACUUM"}) {
