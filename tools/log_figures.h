@@ -52,7 +52,7 @@ struct LogFigures {
 std::optional<Period> LogPeriod(const LogSource &source, std::optional<int64_t> since,
                                 std::optional<int64_t> until);
 
-// Reads the figures in two statements, which group the rows inside the database: a few hundred milliseconds a
+// Reads the figures in two statements, which group the rows inside the database: less than a second a
 // million rows. `isWhole` tells that the period leaves no log out, which saves looking. Both functions throw
 // DatabaseError.
 LogFigures ReadLogFigures(const LogSource &source, const Period &period, bool isWhole, size_t topDevices);
