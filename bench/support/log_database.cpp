@@ -55,8 +55,7 @@ std::string LogDatabase(int rows) {
     fs::permissions(folder, fs::perms::owner_all);
     const std::string schema = SchemaText();
     const size_t contents = std::hash<std::string>()(schema + kRows); // other contents, other file
-    std::string path =
-        folder / ("logs-" + std::to_string(rows) + "-" + std::to_string(contents) + ".db");
+    std::string path = folder / ("logs-" + std::to_string(rows) + "-" + std::to_string(contents) + ".db");
     if (!fs::exists(path)) {
         const std::string unfinished = path + "." + std::to_string(getpid());
         Make(unfinished, schema, rows);

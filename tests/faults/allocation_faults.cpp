@@ -17,12 +17,10 @@ namespace kelo::test {
 namespace {
 
 struct State {
-    bool isFailing = false;
-    int count = 0;
     int failFirst = 0;
-    int failTimes = 0;
+    int failTimes = 0; // 0 while nothing is to fail
+    int count = 0;
     bool hasFailed = false;
-    bool isCounting = false;
     int liveBlocks = 0;
 };
 constinit thread_local State state;
@@ -34,55 +32,43 @@ bool AllocationFaults::IsSupported() {
 }
 
 void AllocationFaults::Start(int first, int times) {
-    state.isFailing = true;
-    state.count = 0;
-    state.failFirst = first;
-    state.failTimes = times;
-    state.hasFailed = false;
+    state = {first, times, 0, false, state.liveBlocks};
 }
 
 bool AllocationFaults::Stop() {
-    state.isFailing = false;
+    state.failTimes = 0;
     return state.hasFailed;
 }
 
-void AllocationFaults::StartCounting() {
-    state.isCounting = true;
-    state.liveBlocks = 0;
-}
-
-int AllocationFaults::StopCounting() {
-    state.isCounting = false;
+int AllocationFaults::LiveBlocks() {
     return state.liveBlocks;
 }
 
+} // namespace kelo::test
+
 #if KELO_OWN_ALLOCATOR
+using namespace kelo::test;
+
 namespace {
 
 // Counts an allocation and tells whether it has to fail.
 bool MustFail() {
-    if (!state.isFailing || FaultPause::IsActive())
+    if (state.failTimes == 0 || FaultPause::IsActive())
         return false;
-    ++state.count;
-    if (state.count < state.failFirst || state.count - state.failFirst >= state.failTimes)
+    const int past = ++state.count - state.failFirst;
+    if (past < 0 || past >= state.failTimes)
         return false;
     state.hasFailed = true;
     errno = ENOMEM;
     return true;
 }
 
-void CountBlock(const void *block, int change) {
-    if (block != nullptr && state.isCounting && !FaultPause::IsActive())
-        state.liveBlocks += change;
+void *Counted(void *block) {
+    state.liveBlocks += block != nullptr && !FaultPause::IsActive();
+    return block;
 }
 
 } // namespace
-#endif
-
-} // namespace kelo::test
-
-#if KELO_OWN_ALLOCATOR
-using namespace kelo::test;
 
 extern "C" {
 
@@ -92,32 +78,21 @@ void *__libc_realloc(void *block, size_t size);
 void __libc_free(void *block);
 
 void *malloc(size_t size) {
-    if (MustFail())
-        return nullptr;
-    void *block = __libc_malloc(size);
-    CountBlock(block, 1);
-    return block;
+    return MustFail() ? nullptr : Counted(__libc_malloc(size));
 }
 
 void *calloc(size_t count, size_t size) {
-    if (MustFail())
-        return nullptr;
-    void *block = __libc_calloc(count, size);
-    CountBlock(block, 1);
-    return block;
+    return MustFail() ? nullptr : Counted(__libc_calloc(count, size));
 }
 
 void *realloc(void *block, size_t size) {
     if (MustFail())
         return nullptr;
-    void *moved = __libc_realloc(block, size);
-    if (block == nullptr)
-        CountBlock(moved, 1);
-    return moved;
+    return block != nullptr ? __libc_realloc(block, size) : Counted(__libc_malloc(size));
 }
 
 void free(void *block) {
-    CountBlock(block, -1);
+    state.liveBlocks -= block != nullptr && !FaultPause::IsActive();
     __libc_free(block);
 }
 

@@ -15,10 +15,9 @@ public:
     // Makes nothing fail any more. Returns whether an allocation failed since Start.
     static bool Stop();
 
-    // Counts blocks that are allocated and not freed, but those under a FaultPause, until the count is taken.
-    // Always 0 where this is not supported.
-    static void StartCounting();
-    static int StopCounting();
+    // Blocks that were allocated and not freed, but those under a FaultPause. Only differences of it mean
+    // something. Always 0 where this is not supported.
+    static int LiveBlocks();
 };
 
 } // namespace kelo::test

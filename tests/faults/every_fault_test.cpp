@@ -27,9 +27,10 @@ constexpr int kAlways = std::numeric_limits<int>::max();
 // A way to make the `first`-th of some calls fail, `times` times.
 struct FaultSource {
     const char *name;
-    bool needsWrites; // reached only by operations that write
+    const char *fault; // as an outcome names it
+    bool needsWrites;  // reached only by operations that write
     void (*start)(int first, int times);
-    std::string (*stop)(); // ends it; what failed, "" for nothing
+    bool (*stop)(); // ends it; whether something failed
 
     friend void PrintTo(const FaultSource &source, std::ostream *out) { *out << source.name; }
 };
@@ -39,26 +40,14 @@ void StartFileFaults(int first, int times) {
     FileFaults::Start(Kind, first, times);
 }
 
-const std::vector<FaultSource> &FaultSources() {
-    using Kind = FileFaults::Kind;
-    static const std::vector<FaultSource> sources = {
-        {"PlatformCall", false, PlatformCalls::FailFrom,
-         [] {
-             const std::string failed = PlatformCalls::FailedFunction();
-             PlatformCalls::Reset();
-             return failed;
-         }},
-        {"Allocation", false, AllocationFaults::Start,
-         [] { return std::string(AllocationFaults::Stop() ? "allocation" : ""); }},
-        {"Write", true, StartFileFaults<Kind::kWrite>,
-         [] { return std::string(FileFaults::Stop() ? "write" : ""); }},
-        {"FullDisk", true, StartFileFaults<Kind::kFull>,
-         [] { return std::string(FileFaults::Stop() ? "full disk" : ""); }},
-        {"Read", false, StartFileFaults<Kind::kRead>,
-         [] { return std::string(FileFaults::Stop() ? "read" : ""); }},
-    };
-    return sources;
-}
+using Kind = FileFaults::Kind;
+constexpr FaultSource kFaultSources[] = {
+    {"PlatformCall", "", false, PlatformCalls::FailFrom, PlatformCalls::HasFailed},
+    {"Allocation", "allocation", false, AllocationFaults::Start, AllocationFaults::Stop},
+    {"Write", "write", true, StartFileFaults<Kind::kWrite>, FileFaults::Stop},
+    {"FullDisk", "full disk", true, StartFileFaults<Kind::kFull>, FileFaults::Stop},
+    {"Read", "read", false, StartFileFaults<Kind::kRead>, FileFaults::Stop},
+};
 
 using Parameters = std::tuple<Operation, FaultSource>;
 
@@ -66,9 +55,10 @@ using Parameters = std::tuple<Operation, FaultSource>;
 std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
-        for (const FaultSource &source : FaultSources()) {
-            const bool isMet = source.start != AllocationFaults::Start ||
-                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
+        for (const FaultSource &source : kFaultSources) {
+            const bool isMet = source.stop == AllocationFaults::Stop
+                                   ? AllocationFaults::IsSupported() && operation.meetsAllocationFaults
+                                   : source.fault != std::string("read") || operation.meetsReadFaults;
             if (isMet)
                 combinations.emplace_back(operation, source);
         }
@@ -91,21 +81,15 @@ protected:
         return static_cast<size_t>(std::distance(begin(files), end(files)));
     }
 
-    // SQLite keeps these beside a database after a failure.
-    static bool IsCompanion(const std::string &name) {
-        return name.ends_with("-wal") || name.ends_with("-shm") || name.ends_with("-journal");
-    }
-
-    void CheckFileNames() const {
-        std::set<std::string> before;
-        std::set<std::string> after;
-        for (const auto &[name, content] : pristine_)
-            before.insert(name);
+    // The names of all files, without what SQLite keeps beside a database after a failure.
+    std::set<std::string> FileNames() const {
+        std::set<std::string> names;
         for (const auto &file : fs::directory_iterator(ground_.root.Path()))
-            after.insert(file.path().filename());
-        std::erase_if(before, IsCompanion);
-        std::erase_if(after, IsCompanion);
-        EXPECT_EQ(after, before);
+            names.insert(file.path().filename());
+        std::erase_if(names, [](const std::string &name) {
+            return name.ends_with("-wal") || name.ends_with("-shm") || name.ends_with("-journal");
+        });
+        return names;
     }
 
     void PutBackFiles() {
@@ -113,6 +97,7 @@ protected:
             fs::remove_all(file);
         for (const auto &[name, content] : pristine_)
             WriteFile(ground_.root.File(name), content);
+        fileNames_ = FileNames();
         ground_.seen.clear();
     }
 
@@ -121,14 +106,17 @@ protected:
         SyslogCapture capture;
         Outcome outcome;
         source_.start(first, times);
-        AllocationFaults::StartCounting();
+        const int liveBlocks = AllocationFaults::LiveBlocks();
         try {
             outcome.result = operation_.run(ground_);
         } catch (const std::bad_alloc &) {
             outcome.outOfMemory = true;
         }
-        leakedBlocks_ = AllocationFaults::StopCounting();
-        outcome.fault = source_.stop();
+        const bool hasFailed = source_.stop();
+        leakedBlocks_ = AllocationFaults::LiveBlocks() - liveBlocks;
+        if (hasFailed)
+            outcome.fault = PlatformCalls::HasFailed() ? PlatformCalls::FailedFunction() : source_.fault;
+        PlatformCalls::Reset();
         outcome.messages = capture.Texts();
         return outcome;
     }
@@ -138,7 +126,7 @@ protected:
         EXPECT_EQ(PlatformCalls::OpenResults(), 0);
         EXPECT_EQ(leakedBlocks_, 0);
         EXPECT_EQ(CountOpenFiles(), openFiles_);
-        CheckFileNames();
+        EXPECT_EQ(FileNames(), fileNames_);
         if (!ground_.database.empty()) {
             EXPECT_EQ(QueryText(ground_.database, "PRAGMA integrity_check"), "ok");
         }
@@ -162,6 +150,7 @@ protected:
 
 private:
     std::map<std::string, std::string> pristine_; // content by name
+    std::set<std::string> fileNames_;
     size_t openFiles_ = 0;
     int leakedBlocks_ = 0;
 };
@@ -185,8 +174,8 @@ INSTANTIATE_TEST_SUITE_P(Operations, EveryFault, testing::ValuesIn(Combinations(
                                     std::get<1>(info.param).name;
                          });
 
-// What a deletion reported as done must outlive a loss of power.
-TEST(SyslogDBDelete, IsOnDiskWhenItReturns) {
+// What was reported as done must outlive a loss of power.
+TEST(WritingOperation, IsOnDiskWhenItReturns) {
     for (const Operation &operation : Operations()) {
         if (!operation.writes)
             continue;

@@ -1,8 +1,11 @@
 #include "faults/file_faults.h"
 
-#include <sqlite3.h>
+#include <dlfcn.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
-#include <new>
+#include <cerrno>
+#include <cstdio>
 #include <set>
 
 #include "support/fault_pause.h"
@@ -11,144 +14,62 @@ namespace kelo::test {
 namespace {
 
 struct State {
-    bool isActive = false;
     FileFaults::Kind kind = FileFaults::Kind::kWrite;
-    int count = 0;
     int failFirst = 0;
-    int failTimes = 0;
+    int failTimes = 0; // 0 while nothing is to fail
+    int count = 0;
     bool hasFailed = false;
-    std::set<const void *> unsynced;
+    std::set<ino_t> unsynced;
 };
 State state;
 
-// The result of an operation that has to fail, or SQLITE_OK. `error` is the input/output error to give.
-int Injected(bool isRead, int error) {
-    if (!state.isActive || isRead != (state.kind == FileFaults::Kind::kRead))
-        return SQLITE_OK;
-    ++state.count;
-    if (state.count < state.failFirst || state.count - state.failFirst >= state.failTimes)
-        return SQLITE_OK;
+bool MustFail(bool isRead) {
+    if (state.failTimes == 0 || isRead != (state.kind == FileFaults::Kind::kRead))
+        return false;
+    const int past = ++state.count - state.failFirst;
+    if (past < 0 || past >= state.failTimes)
+        return false;
     state.hasFailed = true;
-    return state.kind == FileFaults::Kind::kFull ? SQLITE_FULL : error;
+    errno = state.kind == FileFaults::Kind::kFull ? ENOSPC : EIO;
+    return true;
 }
 
-// A file of ours: SQLite's part first, then the real file in the same block.
-struct ShimFile {
-    sqlite3_file base;
-    sqlite3_file *Real() { return reinterpret_cast<sqlite3_file *>(this + 1); }
-};
-
-sqlite3_file *Real(sqlite3_file *file) {
-    return reinterpret_cast<ShimFile *>(file)->Real();
-}
-
-void MarkUnsynced(sqlite3_file *file) {
+// How much of `size` bytes is written at once; the file then has to be synced.
+size_t Share(int fd, size_t size) {
+    // SQLite makes room for shared memory by single bytes, which need not reach the disk.
+    if (state.failTimes == 0 || size <= 1)
+        return size;
     const FaultPause pause;
-    state.unsynced.insert(file);
+    struct stat file;
+    if (fstat(fd, &file) == 0)
+        state.unsynced.insert(file.st_ino);
+    return size / 2;
 }
 
-void MarkSynced(sqlite3_file *file) {
+int Sync(int fd) {
+    if (MustFail(false))
+        return -1;
     const FaultPause pause;
-    state.unsynced.erase(file);
+    struct stat file;
+    if (fstat(fd, &file) == 0)
+        state.unsynced.erase(file.st_ino);
+    return 0;
 }
 
-int Write(sqlite3_file *file, const void *data, int size, sqlite3_int64 offset) {
-    if (const int error = Injected(false, SQLITE_IOERR_WRITE); error != SQLITE_OK)
-        return error;
-    MarkUnsynced(file);
-    return Real(file)->pMethods->xWrite(Real(file), data, size, offset);
-}
-
-int Truncate(sqlite3_file *file, sqlite3_int64 size) {
-    if (const int error = Injected(false, SQLITE_IOERR_TRUNCATE); error != SQLITE_OK)
-        return error;
-    MarkUnsynced(file);
-    return Real(file)->pMethods->xTruncate(Real(file), size);
-}
-
-// Nothing here survives a real power loss, so the wait for the disk is spared.
-int Sync(sqlite3_file *file, int) {
-    if (const int error = Injected(false, SQLITE_IOERR_FSYNC); error != SQLITE_OK)
-        return error;
-    MarkSynced(file);
-    return SQLITE_OK;
-}
-
-int Read(sqlite3_file *file, void *data, int size, sqlite3_int64 offset) {
-    if (const int error = Injected(true, SQLITE_IOERR_READ); error != SQLITE_OK)
-        return error;
-    return Real(file)->pMethods->xRead(Real(file), data, size, offset);
-}
-
-int Close(sqlite3_file *file) {
-    return Real(file)->pMethods->xClose(Real(file));
-}
-
-// Hands an operation on to the real file.
-template <auto Method, typename... Arguments>
-int Forward(sqlite3_file *file, Arguments... arguments) {
-    return (Real(file)->pMethods->*Method)(Real(file), arguments...);
-}
-
-void ShmBarrier(sqlite3_file *file) {
-    Real(file)->pMethods->xShmBarrier(Real(file));
-}
-
-// Version 2: with shared memory, as a WAL needs it; without memory-mapped pages, which no read would go
-// through.
-const sqlite3_io_methods kMethods = {
-    2,
-    Close,
-    Read,
-    Write,
-    Truncate,
-    Sync,
-    Forward<&sqlite3_io_methods::xFileSize>,
-    Forward<&sqlite3_io_methods::xLock>,
-    Forward<&sqlite3_io_methods::xUnlock>,
-    Forward<&sqlite3_io_methods::xCheckReservedLock>,
-    Forward<&sqlite3_io_methods::xFileControl>,
-    Forward<&sqlite3_io_methods::xSectorSize>,
-    Forward<&sqlite3_io_methods::xDeviceCharacteristics>,
-    Forward<&sqlite3_io_methods::xShmMap>,
-    Forward<&sqlite3_io_methods::xShmLock>,
-    ShmBarrier,
-    Forward<&sqlite3_io_methods::xShmUnmap>,
-    nullptr,
-    nullptr,
-};
-
-sqlite3_vfs *realVfs = nullptr;
-
-int Open(sqlite3_vfs *, const char *name, sqlite3_file *file, int flags, int *outFlags) {
-    auto *shim = new (file) ShimFile{};
-    const int status = realVfs->xOpen(realVfs, name, shim->Real(), flags, outFlags);
-    if (shim->Real()->pMethods != nullptr)
-        shim->base.pMethods = &kMethods;
-    MarkSynced(file);
-    return status;
+template <auto *Function>
+auto Real(const char *name) {
+    const FaultPause pause;
+    return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
 }
 
 } // namespace
 
-void FileFaults::Install() {
-    if (realVfs != nullptr)
-        return;
-    realVfs = sqlite3_vfs_find(nullptr);
-    static sqlite3_vfs shim = *realVfs;
-    shim.zName = "kelo-file-faults";
-    shim.szOsFile = static_cast<int>(sizeof(ShimFile)) + realVfs->szOsFile;
-    shim.xOpen = Open;
-    sqlite3_vfs_register(&shim, 1);
-}
-
 void FileFaults::Start(Kind kind, int first, int times) {
-    Install();
-    state = {true, kind, 0, first, times, false, {}};
+    state = {kind, first, times, 0, false, {}};
 }
 
 bool FileFaults::Stop() {
-    state.isActive = false;
+    state.failTimes = 0;
     return state.hasFailed;
 }
 
@@ -157,3 +78,47 @@ bool FileFaults::HasUnsynced() {
 }
 
 } // namespace kelo::test
+
+using namespace kelo::test;
+
+extern "C" {
+
+ssize_t read(int fd, void *data, size_t size) {
+    static const auto real = Real<&read>("read");
+    return MustFail(true) ? -1 : real(fd, data, size);
+}
+ssize_t pread64(int fd, void *data, size_t size, off64_t offset) {
+    static const auto real = Real<&pread64>("pread64");
+    return MustFail(true) ? -1 : real(fd, data, size, offset);
+}
+ssize_t write(int fd, const void *data, size_t size) {
+    static const auto real = Real<&write>("write");
+    return MustFail(false) ? -1 : real(fd, data, Share(fd, size));
+}
+ssize_t pwrite64(int fd, const void *data, size_t size, off64_t offset) {
+    static const auto real = Real<&pwrite64>("pwrite64");
+    return MustFail(false) ? -1 : real(fd, data, Share(fd, size), offset);
+}
+int ftruncate64(int fd, off64_t size) noexcept {
+    static const auto real = Real<&ftruncate64>("ftruncate64");
+    return MustFail(false) ? -1 : real(fd, size);
+}
+int fchmod(int fd, mode_t mode) noexcept {
+    static const auto real = Real<&fchmod>("fchmod");
+    return MustFail(false) ? -1 : real(fd, mode);
+}
+int fsync(int fd) {
+    return Sync(fd);
+}
+int fdatasync(int fd) {
+    return Sync(fd);
+}
+int renameat(int oldFolder, const char *oldName, int newFolder, const char *newName) noexcept {
+    static const auto real = Real<&renameat>("renameat");
+    if (MustFail(false))
+        return -1;
+    Share(newFolder, 2);
+    return real(oldFolder, oldName, newFolder, newName);
+}
+
+} // extern "C"

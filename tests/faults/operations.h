@@ -45,9 +45,11 @@ struct Operation {
     std::function<int(Ground &)> run;
     // Whether what was promised holds, whatever failed.
     std::function<void(const Ground &, const Outcome &)> check;
-    // Not so for RE2, which frees blocks twice when std::bad_alloc passes through it and may end the process,
-    // nor for what takes too long to be run a thousand times.
+    // RE2 does not meet them: it frees blocks twice when std::bad_alloc passes through it, and may end the
+    // process.
     bool meetsAllocationFaults = true;
+    // Whether a read that fails leaves the file where it is; a DBHandler moves one that seems corrupt away.
+    bool meetsReadFaults = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };

@@ -1,12 +1,10 @@
 #include "platform/db_fixture.h"
 
-#include <dlfcn.h>
 #include <unistd.h>
 
 namespace kelo::test {
 namespace {
 
-int askedBusyTimeout = 0;
 constexpr uid_t kNobody = 65534;
 
 Outcome Read(const Connection &connection, int status, DBResult_tag *result,
@@ -43,10 +41,6 @@ Outcome SelectLimit(const Connection &connection, const std::string &sql, unsign
     return Read(connection, status, result, columns);
 }
 
-int AskedBusyTimeout() {
-    return askedBusyTimeout;
-}
-
 Unprivileged::Unprivileged() {
     if (getuid() == 0 && seteuid(kNobody) != 0)
         throw std::runtime_error("cannot drop the rights of root");
@@ -57,11 +51,3 @@ Unprivileged::~Unprivileged() {
 }
 
 } // namespace kelo::test
-
-// Replaces SQLite's for the whole program: no test waits for seconds.
-extern "C" int sqlite3_busy_timeout(sqlite3 *db, int milliseconds) {
-    kelo::test::askedBusyTimeout = milliseconds;
-    static const auto real =
-        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
-    return real(db, 1);
-}

@@ -38,9 +38,6 @@ Outcome Execute(const Connection &connection, const std::string &sql,
 Outcome SelectLimit(const Connection &connection, const std::string &sql, unsigned int limit,
                     unsigned int offset, const std::vector<std::string> &columns);
 
-// Milliseconds that connections wait for another writer: what the library asked for last, and what tests get.
-int AskedBusyTimeout();
-
 // Acts with the rights of nobody while the object lives; those of root would hide every permission.
 class Unprivileged {
 public:

@@ -1,35 +1,26 @@
 #pragma once
 
-#include <string>
-#include <vector>
-
-#include "support/temp_root.h"
-
-struct DBConnect_tag;
+#include "platform/db_fixture.h"
 
 namespace kelo::test {
 
-// A table "logs" of texts (column "msg") and one row whose text is NULL, searched through the platform's own
-// connections.
+// A table "logs" of texts (column "msg") and one row whose text is NULL, searched through a connection of the
+// platform's.
 class SearchTable {
 public:
     explicit SearchTable(const std::vector<std::string> &texts);
-    ~SearchTable();
-    SearchTable(const SearchTable &) = delete;
-    SearchTable &operator=(const SearchTable &) = delete;
 
     // The texts that the keyword finds, in their order. A statement that fails gives its error text.
     std::vector<std::string> Matching(const std::string &keyword) const;
-    bool MatchesNull(const std::string &keyword) const;
-    // -1 when the statement fails.
+    // How many rows a condition is true for; -1 when the statement fails.
     int CountWhere(const std::string &condition) const;
-    int Run(const std::string &sql) const;
-    std::string Error() const;
+
+    const Connection &Database() const { return connection_; }
 
 private:
     TempRoot root_;
     std::vector<std::string> texts_;
-    DBConnect_tag *connection_ = nullptr;
+    Connection connection_;
 };
 
 } // namespace kelo::test

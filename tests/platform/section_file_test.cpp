@@ -2,11 +2,11 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <filesystem>
-#include <memory>
 
 #include "keloplatform/torvc.h"
 #include "support/syslog_capture.h"
@@ -16,29 +16,24 @@ using kelo::test::ReadFile;
 using kelo::test::SyslogCapture;
 using kelo::test::TempRoot;
 using kelo::test::WriteFile;
+using testing::AllOf;
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::StartsWith;
 
 namespace {
 
 constexpr char kFormat[] = "%s=\"%s\"\n";
 using Pairs = std::vector<std::pair<std::string, std::string>>;
 
-struct FreeHash {
-    void operator()(TORVSZHASH *hash) const { TORVCSzHashFree(hash); }
-};
-using Hash = std::unique_ptr<TORVSZHASH, FreeHash>;
-
-Hash MakeHash(const Pairs &pairs) {
-    TORVSZHASH *hash = TORVCSzHashAlloc(4);
-    for (const auto &[key, value] : pairs)
-        EXPECT_EQ(TORVCSzHashSetValue(&hash, key.c_str(), value.c_str()), 0);
-    return Hash(hash);
-}
-
 int Set(const std::string &path, const char *section, const char *newName, const Pairs &pairs,
         const char *format = kFormat) {
-    return TORVCFileSetSection(path.c_str(), section, newName, MakeHash(pairs).get(), format);
+    TORVSZHASH *hash = TORVCSzHashAlloc(1);
+    for (const auto &[key, value] : pairs)
+        EXPECT_EQ(TORVCSzHashSetValue(&hash, key.c_str(), value.c_str()), 0);
+    const int status = TORVCFileSetSection(path.c_str(), section, newName, hash, format);
+    TORVCSzHashFree(hash);
+    return status;
 }
 
 // The value of one key of a section; "(none)" where it or the section is missing, "(failed)" on failure.
@@ -59,41 +54,15 @@ std::vector<std::string> Names(const std::string &path, int expectedStatus = 0) 
     return names;
 }
 
-std::vector<std::string> FilesIn(const std::string &folder) {
-    std::vector<std::string> names;
-    for (const auto &entry : std::filesystem::directory_iterator(folder))
-        names.push_back(entry.path().filename().string());
-    return names;
-}
-
 } // namespace
 
 TEST(SectionFile, GivesBackEveryValueThatALineCanHold) {
     const TempRoot root;
     const std::string path = root.File("notify.conf");
-    const std::vector<std::string> values = {"disk full",
-                                             "",
-                                             "\"",
-                                             "a\"b\"",
-                                             "\"quoted\"",
-                                             "ends in \\",
-                                             "\\\"",
-                                             "a=b",
-                                             "=",
-                                             "# no",
-                                             "; no",
-                                             "[R2]",
-                                             "  blanks  ",
-                                             "\ttab\t",
-                                             "cr\r",
-                                             "%s %n %%",
-                                             "日本\xF0\x9F\x98\x80",
-                                             "\xFF\xFE raw",
-                                             "\x01\x1B[0m",
-                                             std::string(10 << 20, 'x')};
-    for (const std::string &value : values) {
+    for (const std::string value : {"", "\"", "a\"b\"", "\"quoted\"", "ends in \\", "\\\"", "=", "# no",
+                                    "[R2]", "  blanks  ", "\tcr\r", "%s %n %%", "\xFF\xFE \x01\x1B[0m"}) {
         ASSERT_EQ(Set(path, "R 1", "R 1", {{"before", "1"}, {"key", value}, {"after", "2"}}), 0) << value;
-        EXPECT_TRUE(Get(path, "R 1", "key") == value) << value.substr(0, 80);
+        EXPECT_EQ(Get(path, "R 1", "key"), value);
         EXPECT_EQ(Get(path, "R 1", "after"), "2");
         EXPECT_THAT(Names(path), ElementsAre("R 1"));
     }
@@ -109,16 +78,11 @@ TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     };
     const Case cases[] = {
         {"R1", "R1", "key", "two\nlines", kFormat, "value of key"},
-        {"R1", "R1", "a=b", "1", kFormat, "value of a=b"},
         {"R1", "R1", "#key", "1", kFormat, "value of #key"},
-        {"R1", "R1", "", "1", kFormat, "value of "},
         {"R1", "R1", "key", " blank", "%s=%s\n", "value of key"},
         {"R1", "R1", "key", "1", "%s=%s%n\n", "line format"},
-        {"R1", "R1", "key", "1", "%s=%5s\n", "line format"},
         {"R1", "R1", "key", "1", "%s\n", "line format"},
-        {"R1", "R1", "key", "1", "%s=%s=%s\n", "line format"},
         {"R1", "R1", "key", "1", "%s=%s", "line format"},
-        {"R1", "R1", "key", "1", "%s=%s\n%", "line format"},
         {"R1", "R[1]", "key", "1", kFormat, "\"R[1]\""},
         {"R1", "R\n1", "key", "1", kFormat, "not a section name"},
         {"R1", "", "key", "1", kFormat, "not a section name"},
@@ -127,8 +91,7 @@ TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     for (const Case &c : cases) {
         SyslogCapture log;
         EXPECT_EQ(Set(path, c.section, c.newName, {{c.key, c.value}}, c.format), -1) << c.message;
-        EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr(path + ": "))) << c.message;
-        EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr(c.message)));
+        EXPECT_THAT(log.Texts(), ElementsAre(AllOf(StartsWith(path + ": "), HasSubstr(c.message))));
     }
     EXPECT_EQ(ReadFile(path), content);
 }
@@ -137,8 +100,8 @@ TEST(SectionFile, ChangesNothingButTheSection) {
     const TempRoot root;
     const std::string path = root.File("notify.conf");
     const std::string head = "\xEF\xBB\xBF# rules\r\nloose = 1\r\n\r\n";
-    const std::string tail =
-        "; about R2\n  [R2] # second\nkey=\"2\"\nno entry\n[bad\nx=1\n[R1]\nkey=\"late\"";
+    const std::string broken = "[bad\nx=1\n[R1]\nkey=\"late\"";
+    const std::string tail = "; about R2\n  [R2] # second\nkey=\"2\"\nno entry\n" + broken;
     const std::string before = head + "[R1]\n# why\nkey = 'old'\ngone=\"1\"\nkey=\"twice\"\n\n" + tail;
     struct Case {
         const char *section, *newName;
@@ -148,13 +111,9 @@ TEST(SectionFile, ChangesNothingButTheSection) {
     const Case cases[] = {
         {"R1", "R1", {{"new", "n"}, {"key", "k"}}, head + "[R1]\n# why\nkey=\"k\"\nnew=\"n\"\n\n" + tail},
         {"R1", "R9", {{"key", "k"}}, head + "[R9]\n# why\nkey=\"k\"\n\n" + tail},
+        {"R2", "R4", {}, before.substr(0, before.find("[R2]")) + "[R4] # second\n" + broken},
         {"R3", "R3", {{"key", "k"}}, before + "\n\n[R3]\nkey=\"k\"\n"},
         {"R1", nullptr, {}, head + "\n" + tail},
-        {"R2",
-         "R4",
-         {},
-         head + "[R1]\n# why\nkey = 'old'\ngone=\"1\"\nkey=\"twice\"\n\n; about R2\n  [R4] # "
-                "second\n[bad\nx=1\n[R1]\nkey=\"late\""},
     };
     for (const Case &c : cases) {
         WriteFile(path, before);
@@ -173,7 +132,6 @@ TEST(SectionFile, ReadsWhatPeopleWrite) {
     EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr(path + ":11: not a section header")));
     EXPECT_EQ(Get(path, "R1", "a"), "plain text # all of it");
     EXPECT_EQ(Get(path, "R1", "b"), "x");
-    EXPECT_EQ(Get(path, "R1", "c"), "");
     EXPECT_EQ(Get(path, "R9", "a"), "(none)");
     log.Clear();
     EXPECT_EQ(Get(path, " R2 ", "fine"), "(failed)");
@@ -189,40 +147,18 @@ TEST(SectionFile, AnswersForEveryKindOfFile) {
     EXPECT_EQ(errno, ENOENT);
     EXPECT_EQ(Set(root.File("no/folder"), "R", "R", {}), -1);
     EXPECT_EQ(errno, ENOENT);
-    Names(root.Path(), -1);
-    EXPECT_EQ(errno, EISDIR);
     EXPECT_EQ(Set(root.Path(), "R", "R", {}), -1);
+    EXPECT_EQ(errno, EISDIR);
     ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
     Names(path, -1);
     EXPECT_EQ(Set(path, "R", "R", {}), -1);
     std::filesystem::remove(path);
-
-    std::string garbage;
-    for (unsigned seed = 1; garbage.size() < 100'000; seed = seed * 1103515245 + 12345)
-        garbage += static_cast<char>(seed >> 16);
-    for (const std::string &content : {std::string(), garbage + "\n", std::string(4096, '\0') + "\n"}) {
+    for (const std::string &content : {std::string(), std::string("\xFF[\0=\n\x01", 6) + "\n"}) {
         WriteFile(path, content);
-        Names(path);
-        EXPECT_EQ(Get(path, "R1", "key"), "(none)");
         EXPECT_EQ(Set(path, "R1", "R1", {{"key", "1"}}), 0);
         EXPECT_EQ(Get(path, "R1", "key"), "1");
         EXPECT_TRUE(ReadFile(path).starts_with(content));
     }
-}
-
-TEST(SectionFile, ReadsAHundredThousandSectionsOneByOne) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
-    std::string content;
-    for (int i = 0; i < 100'000; ++i)
-        content += "[R" + std::to_string(i) + "]\nkey=\"" + std::to_string(i) + "\"\n";
-    WriteFile(path, content);
-    const std::vector<std::string> names = Names(path);
-    ASSERT_EQ(names.size(), 100'000u);
-    for (size_t i = 0; i < names.size(); ++i)
-        ASSERT_EQ(Get(path, names[i].c_str(), "key"), std::to_string(i));
-    EXPECT_EQ(Set(path, "R50000", "R50000", {{"key", "new"}}), 0);
-    EXPECT_EQ(Get(path, "R50000", "key"), "new");
 }
 
 TEST(SectionFile, SeesEveryChangeInPlace) {
@@ -240,43 +176,59 @@ TEST(SectionFile, KeepsModeOwnerAndLinksWhenItIsReplaced) {
     const std::string real = root.File("real/notify.conf");
     const std::string link = root.File("notify.conf");
     WriteFile(real, "[R]\n");
+    WriteFile(root.File("real/.notify.conf.new"), "left by a writer that was killed");
+    struct stat before, after;
     ASSERT_EQ(chmod(real.c_str(), 0640), 0);
-    const bool isRoot = geteuid() == 0;
-    if (isRoot) {
-        ASSERT_EQ(chown(real.c_str(), 12345, 23456), 0);
-    }
+    ASSERT_TRUE(geteuid() != 0 || chown(real.c_str(), 12345, 23456) == 0);
+    ASSERT_EQ(lstat(real.c_str(), &before), 0);
     std::filesystem::create_symlink("real/notify.conf", link);
     ASSERT_EQ(Set(link, "R", "R", {{"key", "1"}}), 0);
-    struct stat status;
-    ASSERT_EQ(lstat(real.c_str(), &status), 0);
-    EXPECT_EQ(status.st_mode, static_cast<mode_t>(S_IFREG | 0640));
-    if (isRoot) {
-        EXPECT_EQ(status.st_uid, 12345u);
-        EXPECT_EQ(status.st_gid, 23456u);
-    }
+    ASSERT_EQ(lstat(real.c_str(), &after), 0);
+    EXPECT_EQ(after.st_mode, before.st_mode);
+    EXPECT_EQ(after.st_uid, before.st_uid);
+    EXPECT_EQ(after.st_gid, before.st_gid);
     EXPECT_EQ(Get(real, "R", "key"), "1");
     EXPECT_TRUE(std::filesystem::is_symlink(link));
-    EXPECT_THAT(FilesIn(root.File("real")), ElementsAre("notify.conf"));
+    EXPECT_FALSE(std::filesystem::exists(root.File("real/.notify.conf.new")));
 
     std::filesystem::remove(real);
-    SyslogCapture log;
+    const SyslogCapture log;
     EXPECT_EQ(Set(link, "R", "R", {{"key", "1"}}), -1);
     EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr("symbolic link to nothing")));
+}
+
+TEST(SectionFile, TwoWritersOfDifferentSectionsLoseNothing) {
+    constexpr int kSections = 50;
+    const TempRoot root;
+    const std::string path = root.File("notify.conf"); // does not exist at the start
+    const auto write = [&](const std::string &writer) {
+        int failures = 0;
+        for (int i = 0; i < kSections; ++i) {
+            const std::string name = writer + std::to_string(i);
+            failures += Set(path, name.c_str(), name.c_str(), {{"key", name}}) != 0;
+        }
+        return failures;
+    };
+    const pid_t child = fork();
+    if (child == 0)
+        _exit(write("child"));
+    EXPECT_EQ(write("parent"), 0);
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+    EXPECT_EQ(Names(path).size(), 2U * kSections);
 }
 
 TEST(KeyValueFile, GivesTheFirstValueAndTellsWhenItIsCut) {
     const TempRoot root;
     const std::string path = root.File("keloinfo.conf");
-    WriteFile(
-        path,
-        "# smtp=\"no\"\nsmtp=\"yes\"\nsmtp=\"no\"\nopen=\"x\n[mail]\nlong=\"0123456789\"\nempty=\"\"\n");
-    struct Case {
+    WriteFile(path, "# smtp=\"no\"\nsmtp=\"yes\"\nsmtp=\"no\"\nopen=\"x\n[mail]\nlong=\"0123456789\"\n");
+    const struct {
         const char *key;
         int result;
         const char *text;
-    };
-    for (const Case &c : {Case{"smtp", 3, "yes"}, Case{"long", 10, "012"}, Case{"empty", 0, ""},
-                          Case{"none", -1, ""}, Case{"open", -1, ""}}) {
+    } cases[] = {{"smtp", 3, "yes"}, {"long", 10, "012"}, {"none", -1, ""}, {"open", -1, ""}};
+    for (const auto &c : cases) {
         char buffer[5] = {'#', '#', '#', '#', '#'};
         EXPECT_EQ(TORVCFileGetKeyValue(path.c_str(), c.key, buffer, 4, 0), c.result) << c.key;
         EXPECT_STREQ(buffer, c.text);
@@ -289,17 +241,10 @@ TEST(KeyValueFile, GivesTheFirstValueAndTellsWhenItIsCut) {
 
 TEST(SzHash, GrowsAndReplaces) {
     TORVSZHASH *hash = TORVCSzHashAlloc(0);
-    for (int round = 0; round < 2; ++round) {
-        for (int i = 0; i < 5000; ++i)
-            ASSERT_EQ(
-                TORVCSzHashSetValue(&hash, std::to_string(i).c_str(), std::to_string(i + round).c_str()), 0);
-    }
-    EXPECT_STREQ(TORVCSzHashGetValue(hash, "4999"), "5000");
+    for (int i = 0; i < 10000; ++i)
+        ASSERT_EQ(TORVCSzHashSetValue(&hash, std::to_string(i % 5000).c_str(), std::to_string(i).c_str()), 0);
+    EXPECT_STREQ(TORVCSzHashGetValue(hash, "4999"), "9999");
     EXPECT_EQ(TORVCSzHashGetValue(hash, "5000"), nullptr);
-    EXPECT_EQ(TORVCSzHashGetValue(nullptr, "1"), nullptr);
     EXPECT_EQ(TORVCSzHashSetValue(&hash, "key", nullptr), -1);
     TORVCSzHashFree(hash);
-    TORVCSzHashFree(nullptr);
-    TORVCSzListFree(nullptr);
-    TORVCStrPut(nullptr);
 }

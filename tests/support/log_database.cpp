@@ -12,14 +12,8 @@
 namespace kelo::test {
 namespace {
 
-struct CloseDatabase {
-    void operator()(sqlite3 *db) const { sqlite3_close(db); }
-};
-struct FinalizeStatement {
-    void operator()(sqlite3_stmt *statement) const { sqlite3_finalize(statement); }
-};
-using Database = std::unique_ptr<sqlite3, CloseDatabase>;
-using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
+using Database = std::unique_ptr<sqlite3, decltype(&sqlite3_close)>;
+using Statement = std::unique_ptr<sqlite3_stmt, decltype(&sqlite3_finalize)>;
 
 [[noreturn]] void Fail(sqlite3 *db, const std::string &what) {
     throw std::runtime_error(what + ": " + sqlite3_errmsg(db));
@@ -28,7 +22,7 @@ using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
 Database Open(const std::string &path) {
     sqlite3 *db = nullptr;
     const int status = sqlite3_open(path.c_str(), &db);
-    Database owner(db);
+    Database owner(db, sqlite3_close);
     if (status != SQLITE_OK)
         Fail(db, path);
     sqlite3_busy_timeout(db, 10000);
@@ -44,7 +38,7 @@ Statement Prepare(sqlite3 *db, const std::string &sql) {
     sqlite3_stmt *statement = nullptr;
     if (sqlite3_prepare_v2(db, sql.c_str(), -1, &statement, nullptr) != SQLITE_OK)
         Fail(db, sql);
-    return Statement(statement);
+    return Statement(statement, sqlite3_finalize);
 }
 
 std::string FormatTime(int64_t utcsec, const char *format) {
@@ -82,31 +76,23 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
     const Database db = Open(path);
     Run(db.get(), "BEGIN IMMEDIATE");
     const Statement statement = Prepare(
-        db.get(), "INSERT INTO logs(id,host,ip,fac,prio,llevel,tag,utcsec,tzoffset,ldate,ltime,prog,msg) "
+        db.get(), "INSERT INTO logs(id,host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec) "
                   "VALUES(?1,?2,?3,?4,?5,?5,?6,?7,?8,?9,?10,?11,?12)");
-    const auto bind = [&](int index, const std::string &text) {
-        sqlite3_bind_text(statement.get(), index, text.data(), static_cast<int>(text.size()), SQLITE_STATIC);
-    };
     for (const _SYSLOG_LOG_DATA_tag &log : logs) {
         if (log.id != 0)
             sqlite3_bind_int64(statement.get(), 1, static_cast<sqlite3_int64>(log.id));
-        else
-            sqlite3_bind_null(statement.get(), 1);
-        bind(2, log.host);
-        bind(3, log.ip);
-        bind(4, log.fac);
-        const std::string prio = PriorTypeToStr(log.prio);
-        bind(5, prio);
-        bind(6, log.tag);
-        sqlite3_bind_int64(statement.get(), 7, log.utcsec);
-        bind(8, log.tzoffset);
-        bind(9, log.ldate);
-        bind(10, log.ltime);
-        bind(11, log.prog);
-        bind(12, log.msg);
+        const std::string columns[] = {log.host, log.ip,       log.fac,   PriorTypeToStr(log.prio),
+                                       log.tag,  log.tzoffset, log.ldate, log.ltime,
+                                       log.prog, log.msg};
+        int index = 2;
+        for (const std::string &text : columns)
+            sqlite3_bind_text(statement.get(), index++, text.data(), static_cast<int>(text.size()),
+                              SQLITE_STATIC);
+        sqlite3_bind_int64(statement.get(), index, log.utcsec);
         if (sqlite3_step(statement.get()) != SQLITE_DONE)
             Fail(db.get(), "insert");
         sqlite3_reset(statement.get());
+        sqlite3_clear_bindings(statement.get());
     }
     Run(db.get(), "COMMIT");
 }

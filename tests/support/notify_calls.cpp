@@ -4,6 +4,7 @@
 
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/torvc.h"
+#include "support/fault_pause.h"
 #include "support/platform_calls.h"
 
 namespace kelo::test {
@@ -20,6 +21,7 @@ State state;
 
 template <auto *Function>
 auto Real(const char *name) {
+    const FaultPause pause;
     return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
 }
 
@@ -51,7 +53,9 @@ TORVSZHASH *TORVCSzHashAlloc(size_t size) {
     if (PlatformCalls::MustFail("TORVCSzHashAlloc", ""))
         return nullptr;
     TORVSZHASH *hash = KELO_REAL(TORVCSzHashAlloc)(size);
-    state.hashes[hash];
+    const FaultPause pause;
+    if (hash != nullptr)
+        state.hashes[hash];
     return hash;
 }
 
@@ -59,21 +63,26 @@ int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, const char *value) {
     if (PlatformCalls::MustFail("TORVCSzHashSetValue", key))
         return -1;
     const int status = KELO_REAL(TORVCSzHashSetValue)(hash, key, value);
+    const FaultPause pause;
     if (status >= 0)
         state.hashes[*hash][key] = value;
     return status;
 }
 
 void TORVCSzHashFree(TORVSZHASH *hash) {
-    state.hashes.erase(hash);
+    {
+        const FaultPause pause;
+        state.hashes.erase(hash);
+    }
     KELO_REAL(TORVCSzHashFree)(hash);
 }
 
 TORVSZLIST *TORVCSzListAlloc(size_t size) {
     if (PlatformCalls::MustFail("TORVCSzListAlloc", ""))
         return nullptr;
-    ++state.openLists;
-    return KELO_REAL(TORVCSzListAlloc)(size);
+    TORVSZLIST *list = KELO_REAL(TORVCSzListAlloc)(size);
+    state.openLists += list != nullptr;
+    return list;
 }
 
 void TORVCSzListFree(TORVSZLIST *list) {
@@ -128,6 +137,7 @@ int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDi
                                             TORVSZHASH **hash, int zero) {
     if (PlatformCalls::MustFail("KELOSysNotifySendNotificationCustomized", tag))
         return -1;
+    const FaultPause pause;
     const bool hasValues = hash != nullptr && *hash != nullptr;
     state.sent.push_back(
         {tag, textsDir, filterFile, hasValues ? state.hashes[*hash] : decltype(SentNotification::values)()});

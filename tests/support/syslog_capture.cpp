@@ -61,22 +61,14 @@ std::vector<std::string> SyslogCapture::Texts() const {
 
 } // namespace kelo::test
 
-// Fortified builds call the _chk forms.
+// Fortified builds call the _chk form.
 extern "C" {
-
-void vsyslog(int priority, const char *format, va_list arguments) {
-    kelo::test::Capture(priority, format, arguments);
-}
 
 void syslog(int priority, const char *format, ...) {
     va_list arguments;
     va_start(arguments, format);
     kelo::test::Capture(priority, format, arguments);
     va_end(arguments);
-}
-
-void __vsyslog_chk(int priority, int, const char *format, va_list arguments) {
-    kelo::test::Capture(priority, format, arguments);
 }
 
 void __syslog_chk(int priority, int, const char *format, ...) {
