@@ -47,8 +47,7 @@ TEST_F(Enumeration, GivesPagesNewestFirstAndNothingWhereItFails) {
         EXPECT_EQ(Ids(offset, limit), ids == "failed" ? "" : ids) << statement;
         EXPECT_THAT(PlatformCalls::Statements(), ElementsAre(statement));
         EXPECT_EQ(PlatformCalls::OpenConnections(), 0) << statement;
-        EXPECT_EQ(Messages(),
-                  ids == "failed" ? Lines{"Fail to execute SQL command " + statement} : Lines{});
+        EXPECT_EQ(Messages(), ids == "failed" ? Lines{"Fail to execute SQL command " + statement} : Lines{});
     }
     PlatformCalls::FailFrom(1, 1);
     EXPECT_EQ(Ids(0, 0), "");
@@ -79,9 +78,9 @@ TEST_F(Enumeration, FindsItsRowsThroughTheIndexOnTime) {
         *static_cast<std::string *>(text) += values[3];
         return 0;
     };
-    for (const std::string sql : {"SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000",
-                                  "DELETE FROM log WHERE time <= 0", "SELECT COUNT(*) FROM log",
-                                  "SELECT * FROM log ORDER BY time DESC LIMIT 50 OFFSET 100"}) {
+    for (const std::string sql :
+         {"SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000", "DELETE FROM log WHERE time <= 0",
+          "SELECT COUNT(*) FROM log", "SELECT * FROM log ORDER BY time DESC LIMIT 50 OFFSET 100"}) {
         std::string plan;
         EXPECT_EQ(sqlite3_exec(db, ("EXPLAIN QUERY PLAN " + sql).c_str(), take, &plan, nullptr), SQLITE_OK);
         EXPECT_THAT(plan, testing::HasSubstr("INDEX log_time")) << sql;
@@ -130,8 +129,8 @@ TEST(Levels, HaveNamesThatAreCutToTheBufferAndNoneBeyondTheTable) {
         int level;
         int size;
         const char *text;
-    } cases[] = {{0, 12, "Information"}, {0, 11, "Informatio"}, {1, 4, "War"},     {2, 1, ""},
-                 {2, 0, "unchanged"},    {2, -1, "unchanged"},  {-1, 64, ""},      {3, 64, ""},
+    } cases[] = {{0, 12, "Information"}, {0, 11, "Informatio"}, {1, 4, "War"},  {2, 1, ""},
+                 {2, 0, "unchanged"},    {2, -1, "unchanged"},  {-1, 64, ""},   {3, 64, ""},
                  {2147483647, 64, ""},   {1, 64, "Warning"},    {2, 6, "Error"}};
     for (const auto &[level, size, text] : cases) {
         char buffer[64] = "unchanged";

@@ -37,15 +37,15 @@ TEST_F(LoggerTest, StoresEveryKindOfEventWithItsLevelTextAndUser) {
          "0|SYSTEM|Log database [a.db] has been archived."},
         {[](Logger &l) { return l.LogAddArchFailed("a.db"); },
          "0|SYSTEM|Log database [a.db] is failed to archived."},
-        {[](Logger &l) { return l.LogAddLogClear("/a%d.db", "ann"); },
-         "0|SYSTEM|/a%d.db was cleared by ann"},
+        {[](Logger &l) { return l.LogAddLogClear("/a%d.db", "ann"); }, "0|SYSTEM|/a%d.db was cleared by ann"},
         {[](Logger &l) { return l.LogAddVolFull(); }, "1|SYSTEM|Volume space is not enough."},
         {[this](Logger &l) { return l.LogAdd(db_, -7, "o'", ""); }, "-7|o'|"},
     };
     const std::string before = std::to_string(time(nullptr));
     for (const auto &[add, row] : cases) {
         EXPECT_EQ(add(logger_), 0) << row;
-        EXPECT_EQ(Query("SELECT level || '|' || user || '|' || event FROM log ORDER BY id DESC LIMIT 1"), row);
+        EXPECT_EQ(Query("SELECT level || '|' || user || '|' || event FROM log ORDER BY id DESC LIMIT 1"),
+                  row);
     }
     EXPECT_EQ(Query("SELECT min(time) >= " + before + " AND max(time) <= unixepoch() FROM log"), "1");
     EXPECT_EQ(Query("PRAGMA journal_mode"), "wal");
@@ -205,7 +205,8 @@ TEST_F(LoggerTest, KeepsEveryAcknowledgedEventWhenItIsKilled) {
         while (read(acknowledged.ends[0], &last, sizeof last) > 0) {
         }
         EXPECT_GE(logger_.LogCount(db_), last + 1);
-        EXPECT_EQ(Query("SELECT count(DISTINCT event) FROM log WHERE CAST(event AS INTEGER) <= " + std::to_string(last)),
+        EXPECT_EQ(Query("SELECT count(DISTINCT event) FROM log WHERE CAST(event AS INTEGER) <= " +
+                        std::to_string(last)),
                   std::to_string(last + 1));
         EXPECT_EQ(Query("PRAGMA integrity_check"), "ok");
     }
