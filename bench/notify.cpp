@@ -13,6 +13,7 @@
 #include "keloplatform/root.h"
 #include "kelosyslog/notification.h"
 #include "kelosyslog/root.h"
+#include "support/folder.h"
 #include "support/measure.h"
 
 using namespace kelo::bench;
@@ -22,18 +23,6 @@ namespace {
 constexpr int kRules = 1000;
 constexpr int kRounds = 9;
 constexpr int kSends = 50; // in a round
-
-// A folder that ends with the program.
-struct Folder {
-    std::string path = (std::filesystem::temp_directory_path() / "bench-notify-XXXXXX").string();
-    Folder() {
-        if (mkdtemp(path.data()) == nullptr)
-            Fail("no folder " + path);
-    }
-    ~Folder() { std::filesystem::remove_all(path); }
-    Folder(const Folder &) = delete;
-    Folder &operator=(const Folder &) = delete;
-};
 
 // The last rule is the one that fires.
 void WriteRules(const std::string &root) {
@@ -83,13 +72,13 @@ void CheckAndSend(NotificationManager &manager, const _SYSLOG_LOG_DATA_tag &log)
 } // namespace
 
 int main() {
-    const Folder folder;
-    SyslogRootSet(folder.path);
-    KELORootSet(folder.path.c_str());
-    WriteRules(folder.path);
-    InstallTexts(folder.path);
-    std::filesystem::create_directories(folder.path + "/bare/tmp");
-    std::filesystem::create_directories(folder.path + "/bare/new");
+    const Folder folder("bench-notify");
+    SyslogRootSet(folder.Path());
+    KELORootSet(folder.Path().c_str());
+    WriteRules(folder.Path());
+    InstallTexts(folder.Path());
+    std::filesystem::create_directories(folder.Path() + "/bare/tmp");
+    std::filesystem::create_directories(folder.Path() + "/bare/new");
 
     NotificationManager manager;
     _SYSLOG_LOG_DATA_tag log;
@@ -97,7 +86,7 @@ int main() {
     log.msg = "session of user 17 from 192.168.1.17 closed with keyword" + std::to_string(kRules - 1) +
               ". after 3 s";
     CheckAndSend(manager, log);
-    const std::string entry = SpooledEntry(folder.path);
+    const std::string entry = SpooledEntry(folder.Path());
 
     const auto repeat = [](const std::function<void()> &work) {
         return [work] {
@@ -109,7 +98,7 @@ int main() {
     };
     const std::vector<double> times =
         MedianTimes({{"send", repeat([&] { CheckAndSend(manager, log); })},
-                     {"bare", repeat([&] { WriteDurably(folder.path + "/bare", entry); })}},
+                     {"bare", repeat([&] { WriteDurably(folder.Path() + "/bare", entry); })}},
                     kRounds);
     PrintHeading("A log checked against " + std::to_string(kRules) + " rules and sent", "ms each");
     return PrintRatio("check and send", times[0] / kSends, "bare durable write", times[1] / kSends, 1.5) ? 0

@@ -133,7 +133,7 @@ void AddExport(Program &program, CLI::App &events, const SharedEventsOptions &op
     auto target = std::make_shared<std::string>();
     CLI::App *command = AddEventsAction(
         events, options, "export", "Write all events to an HTML page; FILE is replaced only by a whole one",
-        [options, target, &program] { return Export(*options, *target, program.root); });
+        [state = options.get(), target, &program] { return Export(*state, *target, program.root); });
     AddText(*command, "file", *target, "FILE", "")->required();
 }
 
@@ -191,7 +191,7 @@ void AddEvents(Program &program) {
     command->footer(kFooter);
     command->require_subcommand(0, 1);
     AddEventsAction(*command, options, "count", "Print the number of events",
-                    [options, &program] { return Count(*options, program.root); });
+                    [state = options.get(), &program] { return Count(*state, program.root); });
     AddEventsAdd(program, *command, options);
     AddExport(program, *command, options);
     AddEventsClearLog(program, *command, options);

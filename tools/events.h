@@ -19,7 +19,8 @@ struct EventsOptions {
 };
 using SharedEventsOptions = std::shared_ptr<EventsOptions>;
 
-// Adds a subcommand below "events". Options that it does not have itself are those of "events".
+// Adds a subcommand below "events". Options that it does not have itself are those of "events". `action` goes
+// into `options` when the subcommand is chosen, so it must not own them.
 CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
                           const std::string &description, std::function<int()> action);
 

@@ -142,9 +142,10 @@ void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions 
         Arguments arguments;
     };
     auto add = std::make_shared<AddOptions>();
-    CLI::App *command = AddEventsAction(
-        events, options, "add", "Add an event of the server's user SYSTEM",
-        [options, add, &program] { return Add(*options, add->kind, add->arguments, program.root); });
+    CLI::App *command = AddEventsAction(events, options, "add", "Add an event of the server's user SYSTEM",
+                                        [state = options.get(), add, &program] {
+                                            return Add(*state, add->kind, add->arguments, program.root);
+                                        });
     std::string footer = "Kinds and their values:\n";
     for (const Kind &kind : kKinds)
         footer += std::string("  ") + kind.name + " " + kind.arguments + "\n";
@@ -155,9 +156,9 @@ void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions 
 
 void AddEventsClearLog(Program &program, CLI::App &events, const SharedEventsOptions &options) {
     auto clear = std::make_shared<ClearOptions>();
-    CLI::App *command =
-        AddEventsAction(events, options, "clear-log", "Delete a log database and record who did it",
-                        [options, clear, &program] { return ClearLog(*options, *clear, program.root); });
+    CLI::App *command = AddEventsAction(
+        events, options, "clear-log", "Delete a log database and record who did it",
+        [state = options.get(), clear, &program] { return ClearLog(*state, *clear, program.root); });
     AddText(*command, "database", clear->database, "DATABASE", "")->required();
     AddText(*command, "--user", clear->user, "NAME", "Who clears it (default: the user of this process)");
     command->add_flag("-y,--yes", clear->isConfirmed, "Do not ask");

@@ -23,6 +23,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddEvents(program);
     kelo::tool::AddReport(program);
     kelo::tool::AddValues(program);
+    kelo::tool::AddStats(program);
     kelo::tool::AddParse(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

@@ -55,6 +55,7 @@ void AddDelete(Program &program);
 void AddEvents(Program &program);
 void AddReport(Program &program);
 void AddValues(Program &program);
+void AddStats(Program &program);
 void AddParse(Program &program);
 
 } // namespace kelo::tool

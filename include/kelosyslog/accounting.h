@@ -16,14 +16,19 @@
 
 #include <cstdint>
 #include <list>
-#include <map>
+#include <memory>
 #include <string>
-#include <unordered_map>
+#include <utility>
 #include <vector>
 
 #include "kelosyslog/dbutil.h"
 #include "kelosyslog/export.h"
 #include "kelosyslog/notification.h"
+
+namespace kelo {
+struct Device;
+class DeviceTable;
+} // namespace kelo
 
 // One entry of the histogram.
 struct KELOLOG_LOG_DEVICE_STATISTIC {
@@ -74,23 +79,20 @@ public:
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
 
 private:
-    struct Device {
-        KELOLOG_LOG_DEVICE_STATISTIC *statistic;
-        int32_t currentCount; // in the sample that is still open
+    struct Sample {
+        int64_t stamp;
+        std::vector<std::pair<const kelo::Device *, int32_t>> devices; // with their counts, in any order
     };
 
-    KELOSYSLOG_LOCAL Device &DeviceOf(const std::string &name);
-    KELOSYSLOG_LOCAL std::map<std::string, int32_t> CurrentDevices() const;
     KELOSYSLOG_LOCAL void NotifyEps(uint64_t eps);
 
     std::string dbPath_;
     int64_t totalCount_ = 0;
     int64_t currentSecond_ = 0;
     int64_t currentCount_ = 0;
-    std::vector<Device *> currentDevices_; // those with logs in the open sample
     int32_t lastFlushCheck_ = 0;
-    std::list<SYSLOG_LOG_EPS> samples_;
-    std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram_;
-    std::unordered_map<std::string, Device> devices_; // finds a device's histogram entry
+    std::unique_ptr<kelo::DeviceTable> devices_; // in the histogram's order
+    std::vector<kelo::Device *> openSample_;     // the devices with logs in the open sample
+    std::list<Sample> samples_;
     NotificationManager notifications_;
 };

@@ -1,7 +1,12 @@
 #include "kelosyslog/accounting.h"
 
-#include <ctime>
+#include <syslog.h>
 
+#include <ctime>
+#include <exception>
+#include <utility>
+
+#include "accounting/device_table.h"
 #include "common/root.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/logger.h"
@@ -13,14 +18,18 @@ constexpr int32_t kFlushBeatSec = 5;
 
 } // namespace
 
-AccountingManager::AccountingManager() {
+AccountingManager::AccountingManager() : devices_(std::make_unique<kelo::DeviceTable>()) {
     ConfigLoad();
     for (const auto &[device, count] : SyslogDBHistGet(dbPath_, 0))
-        DeviceOf(device).statistic->count = count;
+        devices_->Find(device).total = count;
 }
 
 AccountingManager::~AccountingManager() {
-    AccoutingFlush2DB();
+    try {
+        AccoutingFlush2DB();
+    } catch (const std::exception &error) {
+        syslog(LOG_ERR, "cannot flush the accounting at its end: %s", error.what());
+    }
 }
 
 int AccountingManager::ConfigLoad() {
@@ -28,45 +37,34 @@ int AccountingManager::ConfigLoad() {
     return 0;
 }
 
-AccountingManager::Device &AccountingManager::DeviceOf(const std::string &name) {
-    const auto [entry, isNew] = devices_.try_emplace(name, Device{nullptr, 0});
-    if (isNew)
-        entry->second.statistic = &histogram_.emplace_back(KELOLOG_LOG_DEVICE_STATISTIC{name, 0});
-    return entry->second;
-}
-
 int AccountingManager::LogInc(std::string device) {
-    ++totalCount_;
     CurEpsUpdate();
-    Device &counted = DeviceOf(device);
-    if (counted.currentCount == 0)
-        currentDevices_.push_back(&counted);
-    ++counted.currentCount;
+    kelo::Device &entry = devices_->Find(device);
+    if (entry.inOpenSample == 0)
+        openSample_.push_back(&entry);
+    // Nothing throws from here on: a log is in all figures or, without memory, in none.
+    ++entry.inOpenSample;
+    ++entry.total;
     ++currentCount_;
-    ++counted.statistic->count;
+    ++totalCount_;
     return 0;
-}
-
-std::map<std::string, int32_t> AccountingManager::CurrentDevices() const {
-    std::map<std::string, int32_t> counts;
-    for (const Device *device : currentDevices_)
-        counts.emplace(device->statistic->device, device->currentCount);
-    return counts;
 }
 
 int AccountingManager::CurEpsUpdate() {
     const int64_t now = std::time(nullptr);
     if (now == currentSecond_ || currentCount_ == 0)
         return 0;
+    Sample sample{now, {}};
+    sample.devices.reserve(openSample_.size());
+    samples_.push_back(std::move(sample));
+    // From here on nothing throws until the sample is closed, so that none is closed twice.
     currentSecond_ = now;
-    samples_.push_back({now, currentCount_, CurrentDevices()});
-    const auto eps = static_cast<uint64_t>(currentCount_);
+    for (kelo::Device *device : openSample_)
+        samples_.back().devices.emplace_back(device, std::exchange(device->inOpenSample, 0));
+    openSample_.clear();
+    const auto eps = static_cast<uint64_t>(std::exchange(currentCount_, 0));
     if (notifications_.CheckEps(eps))
         NotifyEps(eps);
-    currentCount_ = 0;
-    for (Device *device : currentDevices_)
-        device->currentCount = 0;
-    currentDevices_.clear();
     return 0;
 }
 
@@ -93,8 +91,10 @@ void AccountingManager::AccountingDump() {
     Debuger::MSG(2, "======Accounting Status dump======");
     Debuger::MSG(2, "Total: " + ullNumberToString(static_cast<uint64_t>(totalCount_)));
     Debuger::MSG(2, "EPS: " + ullNumberToString(static_cast<uint64_t>(currentCount_)));
-    for (const KELOLOG_LOG_DEVICE_STATISTIC &entry : histogram_)
-        Debuger::MSG(2, "Device: " + entry.device + ", count: " + ullNumberToString(entry.count));
+    for (size_t i = 0; i < devices_->Size(); ++i) {
+        const kelo::Device &device = (*devices_)[i];
+        Debuger::MSG(2, "Device: " + device.name + ", count: " + ullNumberToString(device.total));
+    }
     Debuger::MSG(2, "==================================");
 }
 
@@ -107,5 +107,8 @@ int64_t AccountingManager::CurrentEpsGet() const {
 }
 
 std::list<KELOLOG_LOG_DEVICE_STATISTIC> AccountingManager::HistogramGet() const {
-    return histogram_;
+    std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram;
+    for (size_t i = 0; i < devices_->Size(); ++i)
+        histogram.push_back({(*devices_)[i].name, (*devices_)[i].total});
+    return histogram;
 }

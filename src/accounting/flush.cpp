@@ -1,9 +1,12 @@
 #include <sqlite3.h>
 #include <sys/stat.h>
+#include <syslog.h>
 
+#include <algorithm>
 #include <memory>
 #include <new>
 
+#include "accounting/device_table.h"
 #include "common/root.h"
 #include "kelosyslog/accounting.h"
 #include "kelosyslog/dbhandler.h"
@@ -36,7 +39,11 @@ public:
     explicit FlushDatabase(const std::string &path)
         : path_(path), db_(path, kelo::RootedPath("/usr/kelo/syslog/schema/accinfo.sql")) {}
     ~FlushDatabase() {
-        db_.DBTranEnd();
+        try {
+            db_.DBTranEnd();
+        } catch (const std::bad_alloc &) {
+            syslog(LOG_ERR, "Fail to end transaction");
+        }
         db_.DBDiscon();
     }
     FlushDatabase(const FlushDatabase &) = delete;
@@ -51,24 +58,20 @@ public:
         return true;
     }
 
-    // A failure leaves the samples before it in the transaction, to be committed.
-    bool WriteSample(const SYSLOG_LOG_EPS &sample) {
-        const std::string stamp = std::to_string(sample.stamp);
-        for (const auto &[device, count] : sample.devices) {
-            const std::string sql = Format("INSERT INTO eps VALUES(NULL, '%q', '%q', '%q');", stamp.c_str(),
-                                           device.c_str(), std::to_string(count).c_str());
-            if (db_.DBExecute(sql) < 0) {
-                ReportFailedStatement(sql);
-                return false;
-            }
-        }
-        return true;
+    // A failure leaves the rows before it in the transaction, to be committed.
+    bool WriteEps(const std::string &stamp, const std::string &device, int32_t count) {
+        const std::string sql = Format("INSERT INTO eps VALUES(NULL, '%q', '%q', '%q');", stamp.c_str(),
+                                       device.c_str(), std::to_string(count).c_str());
+        if (db_.DBExecute(sql) >= 0)
+            return true;
+        ReportFailedStatement(sql);
+        return false;
     }
 
     // A failure rolls the whole flush back.
-    bool WriteStatistic(const KELOLOG_LOG_DEVICE_STATISTIC &statistic) {
+    bool WriteHistogram(const std::string &device, uint64_t count) {
         const std::string sql = Format("INSERT OR REPLACE INTO histogram VALUES(NULL, '%q', %q);",
-                                       statistic.device.c_str(), ullNumberToString(statistic.count).c_str());
+                                       device.c_str(), ullNumberToString(count).c_str());
         if (db_.DBExecute(sql) >= 0)
             return true;
         db_.DBTranRollback();
@@ -107,12 +110,17 @@ int AccountingManager::AccoutingFlush2DB() {
     FlushDatabase db(dbPath_);
     if (!db.Connect())
         return -1;
-    for (const SYSLOG_LOG_EPS &sample : samples_) {
-        if (!db.WriteSample(sample))
-            return -1;
+    for (Sample &sample : samples_) {
+        std::sort(sample.devices.begin(), sample.devices.end(),
+                  [](const auto &one, const auto &other) { return one.first->name < other.first->name; });
+        const std::string stamp = std::to_string(sample.stamp);
+        for (const auto &[device, count] : sample.devices) {
+            if (!db.WriteEps(stamp, device->name, count))
+                return -1;
+        }
     }
-    for (const KELOLOG_LOG_DEVICE_STATISTIC &statistic : histogram_) {
-        if (!db.WriteStatistic(statistic))
+    for (size_t i = 0; i < devices_->Size(); ++i) {
+        if (!db.WriteHistogram((*devices_)[i].name, (*devices_)[i].total))
             return -1;
     }
     if (!db.Trim())

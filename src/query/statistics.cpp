@@ -1,5 +1,7 @@
 #include <algorithm>
+#include <charconv>
 #include <cstdlib>
+#include <cstring>
 #include <limits>
 
 #include "common/db_field.h"
@@ -22,7 +24,12 @@ uint64_t UnsignedField(DBResult_tag *result, uint32_t row, const char *column) {
 // Saturates at the ends of 32 bits.
 int32_t Int32Field(DBResult_tag *result, uint32_t row, const char *column) {
     using Limits = std::numeric_limits<int32_t>;
-    const long long number = std::strtoll(FieldText(result, row, column), nullptr, 10);
+    const char *text = FieldText(result, row, column);
+    const char *end = text + std::strlen(text);
+    int32_t plain = 0; // nearly all are plain numbers, which are read in a fraction of the time
+    if (const auto [stop, error] = std::from_chars(text, end, plain); error == std::errc() && stop == end)
+        return plain;
+    const long long number = std::strtoll(text, nullptr, 10);
     return static_cast<int32_t>(std::clamp<long long>(number, Limits::min(), Limits::max()));
 }
 
@@ -35,13 +42,22 @@ uint64_t AskNumber(const std::string &dbPath, const std::string &sql, const char
     return UnsignedField(answer.result.get(), row, column);
 }
 
-// Adds a row to the sample of its stamp. The accounting manager writes stamps, and the devices of a stamp, in
-// ascending order, so the ends of the maps are where to look first.
-void AddEpsRow(DBResult_tag *result, uint32_t row, std::map<int, SYSLOG_LOG_EPS> &samples) {
-    const int32_t stamp = Int32Field(result, row, "stamp");
-    const int32_t eps = Int32Field(result, row, "eps");
+using Samples = std::map<int, SYSLOG_LOG_EPS>;
+
+// The sample of a stamp. The accounting manager writes stamps in ascending order, so the last one is where to
+// look first.
+SYSLOG_LOG_EPS &SampleOf(Samples &samples, int32_t stamp) {
+    if (!samples.empty() && samples.rbegin()->first == stamp)
+        return samples.rbegin()->second;
     SYSLOG_LOG_EPS &sample = samples.try_emplace(samples.end(), stamp)->second;
     sample.stamp = stamp;
+    return sample;
+}
+
+// Adds a row to the sample of its stamp. The devices of a sample, too, come in ascending order.
+void AddEpsRow(DBResult_tag *result, uint32_t row, Samples &samples) {
+    SYSLOG_LOG_EPS &sample = SampleOf(samples, Int32Field(result, row, "stamp"));
+    const int32_t eps = Int32Field(result, row, "eps");
     // The total takes every row, the devices only the first of each name.
     sample.eps += eps;
     sample.devices.try_emplace(sample.devices.end(), FieldText(result, row, "device"), eps);
@@ -81,7 +97,7 @@ std::map<int, SYSLOG_LOG_EPS> SyslogDBEpsGet(const std::string &dbPath, int from
         return {};
     const std::string sql =
         "SELECT * FROM eps WHERE stamp >=" + WidenedText(from) + " and stamp <=" + WidenedText(to);
-    std::map<int, SYSLOG_LOG_EPS> samples;
+    Samples samples;
     const bool isComplete = AskRows(
         dbPath, sql, nullptr, [&](DBResult_tag *result, uint32_t row) { AddEpsRow(result, row, samples); });
     if (!isComplete)

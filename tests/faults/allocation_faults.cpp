@@ -75,6 +75,7 @@ extern "C" {
 void *__libc_malloc(size_t size);
 void *__libc_calloc(size_t count, size_t size);
 void *__libc_realloc(void *block, size_t size);
+void *__libc_memalign(size_t alignment, size_t size);
 void __libc_free(void *block);
 
 void *malloc(size_t size) {
@@ -89,6 +90,11 @@ void *realloc(void *block, size_t size) {
     if (MustFail())
         return nullptr;
     return block != nullptr ? __libc_realloc(block, size) : Counted(__libc_malloc(size));
+}
+
+// What operator new takes for types with an alignment of their own.
+void *aligned_alloc(size_t alignment, size_t size) {
+    return MustFail() ? nullptr : Counted(__libc_memalign(alignment, size));
 }
 
 void free(void *block) {

@@ -2,9 +2,9 @@
 
 namespace kelo::test {
 
-// Makes chosen allocations of the whole process fail: malloc, calloc and realloc, and with them operator new
-// and SQLite. The program replaces the allocator's functions, so this is not there in sanitizer builds, which
-// do so themselves. For one thread.
+// Makes chosen allocations of the whole process fail: malloc, calloc, realloc and aligned_alloc, and with
+// them operator new and SQLite. The program replaces the allocator's functions, so this is not there in
+// sanitizer builds, which do so themselves. For one thread.
 class AllocationFaults {
 public:
     static bool IsSupported();

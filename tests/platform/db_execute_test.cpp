@@ -111,3 +111,49 @@ TEST(Escaping, FailsInsteadOfCuttingTheText) {
     EXPECT_STREQ(out, "a\\%\\_\\\\");
     EXPECT_EQ(KELODBEscapeBackslashEX2(nullptr, out, 7, "a%_\\"), -1);
 }
+
+// Inserts of one form are compiled once; what is stored and what fails must be as without that.
+TEST_F(Executing, InsertsTheSameByARepeatedFormAsSQLite) {
+    const std::vector<std::string> inserts = {
+        "INSERT INTO t VALUES(NULL, 'a', 1)",
+        "INSERT INTO t VALUES(NULL, '12', 12);",
+        "INSERT INTO t VALUES(NULL, -5, '')",
+        "INSERT INTO t VALUES(NULL, 'O''Brien''''s', '\xff %q')",
+        "INSERT INTO t VALUES(NULL, NULL, 007)",
+        "INSERT INTO t VALUES(NULL, NULL, 'x' )",
+        "INSERT INTO t VALUES(NULL, 999999999999999999, 9999999999999999999)",
+        "INSERT INTO t VALUES(NULL, 1.5, 0x1F)",
+        "INSERT INTO t VALUES(NULL, x'41', 'a' || 'b')",
+        "INSERT INTO t VALUES(NULL, 'a', 1), (NULL, 'b', 2)",
+        "insert into t(b, a) values ('lower', 2)",
+        "INSERT OR REPLACE INTO t(id, a) VALUES (1, 'new')",
+        "INSERT OR REPLACE INTO t(id, a) VALUES (1, 'newer')",
+        "INSERT INTO t SELECT NULL, 'c', 1 UNION VALUES (NULL, 'd', 2)",
+        "INSERT INTO t(id, a) VALUES (2, 'id is taken')",
+        "INSERT INTO t(id, a) VALUES (3, 'id is taken')",
+        "INSERT INTO t VALUES(NULL, 'no end)",
+        "INSERT INTO t VALUES(NULL, 'a', 1",
+        "INSERT INTO t VALUES(NULL, 'a', 1) garbage",
+        "INSERT INTO t VALUES('a', 1)",
+        "INSERT INTO t VALUES('a', 2)",
+        "INSERT INTO t VALUES(NULL, 'after errors', 1)",
+        "INSERT INTO t VALUES(NULL, 'and again', 1)",
+    };
+    const std::string twin = root.File("twin.db");
+    for (const std::string &file : {path, twin})
+        RunSql(file, "CREATE TABLE t(id INTEGER PRIMARY KEY, a, b TEXT)");
+    sqlite3 *db = nullptr;
+    ASSERT_EQ(sqlite3_open(twin.c_str(), &db), SQLITE_OK);
+    const std::unique_ptr<sqlite3, decltype(&sqlite3_close)> owner(db, sqlite3_close);
+    for (const std::string &sql : inserts) {
+        const bool isGood = sqlite3_exec(db, sql.c_str(), nullptr, nullptr, nullptr) == SQLITE_OK;
+        const Outcome outcome = Execute(connection, sql);
+        EXPECT_EQ(outcome.status == 0, isGood) << sql;
+        EXPECT_EQ(outcome.errorCode, sqlite3_errcode(db)) << sql;
+        EXPECT_EQ(outcome.error, sqlite3_errmsg(db)) << sql;
+    }
+    const std::string rows = "SELECT group_concat(id || quote(a) || quote(b)) FROM t";
+    EXPECT_EQ(QueryText(path, rows), QueryText(twin, rows));
+    RunSql(path, "DROP TABLE t");
+    EXPECT_EQ(Execute(connection, inserts.back()).error, "no such table: t");
+}

@@ -68,10 +68,7 @@ TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
     EXPECT_EQ(Complete("search -p e"), (Words{"emerg", "err"}));
     EXPECT_EQ(Complete("count --priority = err,\\!e"), (Words{"err,!emerg", "err,!err"}));
     EXPECT_EQ(Complete("search --facility local0,local7,ke"), (Words{"local0,local7,kern"}));
-    EXPECT_EQ(Complete("search --output = js"), (Words{"json", "jsonl"}));
-    EXPECT_EQ(Complete("values -o s"), Words{});
     EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
-    EXPECT_EQ(Complete("search --host n"), Words{});
 }
 
 } // namespace

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 
-#include "errors.h"
 #include "support/log_database.h"
 #include "support/platform_calls.h"
 #include "support/temp_root.h"
@@ -47,11 +46,11 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsAfterDeletions) {
     for (const uint64_t limit : {0U, 1U, 50U, 1000U, 60000U}) {
         for (const uint64_t offset : {0U, 1U, 7U, 186U, 187U, 500U}) {
             SCOPED_TRACE(std::to_string(limit) + " after " + std::to_string(offset));
-            const size_t begin = std::min<size_t>(offset, newestFirst.size());
-            const size_t end =
-                limit == 0 ? newestFirst.size() : std::min<size_t>(begin + limit, newestFirst.size());
-            Ids expected(newestFirst.begin() + static_cast<long>(begin),
-                         newestFirst.begin() + static_cast<long>(end));
+            Ids expected(newestFirst.begin() +
+                             static_cast<long>(std::min<size_t>(offset, newestFirst.size())),
+                         newestFirst.end());
+            if (limit != 0)
+                expected.resize(std::min<size_t>(limit, expected.size()));
             EXPECT_EQ(Collect(reader, {limit, offset}, false), expected);
             std::reverse(expected.begin(), expected.end());
             EXPECT_EQ(Collect(reader, {limit, offset}, true), expected);
@@ -65,51 +64,20 @@ TEST_F(LogReaderTest, WalksAndCountsOverChunksAndGaps) {
                  "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 60000) "
                  "INSERT INTO logs(id, host) SELECT i + 99000, 'a' FROM n;"
                  "INSERT INTO logs(id, host) VALUES (5000000000, 'b'), (9000000000000, 'a')");
-    for (const bool oldestFirst : {true, false}) {
-        Ids expected;
-        for (uint64_t id = 99001; id <= 159000; ++id)
-            expected.push_back(id);
-        expected.push_back(5000000000);
-        expected.push_back(9000000000000);
-        if (!oldestFirst)
-            std::reverse(expected.begin(), expected.end());
-        EXPECT_TRUE(Collect(LogReader(source_, {}), {}, oldestFirst) == expected);
-        Ids part = Collect(LogReader(source_, {}), {55000, 2}, oldestFirst);
-        ASSERT_EQ(part.size(), 55000U);
-        EXPECT_EQ(oldestFirst ? part.back() : part.front(), 159000U);
-        EXPECT_EQ(oldestFirst ? part.front() : part.back(), 104001U);
-    }
+    Ids expected;
+    for (uint64_t id = 99001; id <= 159000; ++id)
+        expected.push_back(id);
+    expected.insert(expected.end(), {5000000000, 9000000000000});
+    EXPECT_EQ(Collect(LogReader(source_, {}), {}, true), expected);
+    const Ids part = Collect(LogReader(source_, {}), {55000, 2}, true);
+    EXPECT_EQ(part, Ids(expected.end() - 55002, expected.end() - 2));
+    EXPECT_EQ(Collect(LogReader(source_, {}), {55000, 2}, false), Ids(part.rbegin(), part.rend()));
     const LogReader onHost(source_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "a", {}}});
     EXPECT_EQ(onHost.Count(), 60001U);
     EXPECT_EQ(onHost.IdFromNewest(1), 159000U);
     PlatformCalls::Reset();
     EXPECT_EQ(LogReader(source_, {}).Count(), 60002U);
     EXPECT_LT(PlatformCalls::Statements().size(), 20U); // gaps are not searched bit by bit
-}
-
-TEST_F(LogReaderTest, ReportsEveryFailingCallAndLetsAHandlersExceptionPass) {
-    test::InsertSampleLogs(source_.path, 20);
-    const LogReader reader(source_, {});
-    int failures = 0;
-    for (int call = 1;; ++call) {
-        PlatformCalls::Reset();
-        PlatformCalls::FailFrom(call, 1);
-        try {
-            reader.Count();
-            Collect(reader, {}, true);
-            if (!PlatformCalls::HasFailed())
-                break;
-            ADD_FAILURE() << "call " << call << " failed unnoticed";
-        } catch (const DatabaseError &error) {
-            EXPECT_NE(std::string(error.what()).find(source_.path), std::string::npos);
-            ++failures;
-        }
-    }
-    EXPECT_GT(failures, 5);
-    PlatformCalls::Reset();
-    EXPECT_THROW(reader.WalkPage({}, true, [](const auto &) { throw OutputClosed(); }), OutputClosed);
-    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
-    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
 }
 
 } // namespace

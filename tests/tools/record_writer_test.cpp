@@ -3,10 +3,10 @@
 #include <gtest/gtest.h>
 #include <json/json.h>
 
+#include <algorithm>
 #include <memory>
 #include <sstream>
 
-#include "errors.h"
 #include "output.h"
 #include "text_encoding.h"
 
@@ -47,36 +47,9 @@ RecordLayout Layout(OutputFormat format, const std::string &fields = "") {
 }
 
 Json::Value ParseJson(const std::string &text) {
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    builder["strictRoot"] = false;
     Json::Value value;
-    std::string errors;
-    std::istringstream stream(text);
-    if (!Json::parseFromStream(builder, stream, &value, &errors))
-        ADD_FAILURE() << errors << " in " << text;
+    std::istringstream(text) >> value; // throws for what is no JSON
     return value;
-}
-
-// Reads the records of RFC 4180 back.
-std::vector<std::vector<std::string>> ParseCsv(const std::string &text) {
-    std::vector<std::vector<std::string>> records = {{""}};
-    bool isQuoted = false;
-    for (size_t i = 0; i < text.size(); ++i) {
-        std::string &field = records.back().back();
-        if (isQuoted && text.compare(i, 2, "\"\"") == 0)
-            field += text[i++];
-        else if (text[i] == '"')
-            isQuoted = !isQuoted;
-        else if (!isQuoted && text[i] == ',')
-            records.back().emplace_back();
-        else if (!isQuoted && text.compare(i, 2, "\r\n") == 0 && ++i)
-            records.push_back({""});
-        else
-            field += text[i];
-    }
-    records.pop_back();
-    return records;
 }
 
 TEST(RecordWriter, WritesValidJsonWhateverALogHolds) {
@@ -96,23 +69,17 @@ TEST(RecordWriter, WritesValidJsonWhateverALogHolds) {
                                             "31m \xe2\x80\xae \xe6\x97\xa5\xe6\x9c\xac");
     EXPECT_EQ(ParseJson(Print(Layout(OutputFormat::Json), {})).size(), 0U);
 
-    const std::string lines = Print(Layout(OutputFormat::Jsonl), {log, log});
-    const std::string line = lines.substr(0, lines.find('\n'));
-    EXPECT_EQ(lines, line + "\n" + line + "\n");
+    const std::string line = Print(Layout(OutputFormat::Jsonl), {log});
     EXPECT_EQ(ParseJson(line), object);
-    for (const char byte : line)
-        EXPECT_GE(static_cast<unsigned char>(byte), 0x20);
+    EXPECT_EQ(std::count_if(line.begin(), line.end(), [](unsigned char byte) { return byte < 0x20; }), 1);
+    EXPECT_EQ(line.back(), '\n');
 }
 
-TEST(RecordWriter, WritesCsvThatReadsBackByteForByte) {
+TEST(RecordWriter, WritesCsvByteForByte) {
     const Log log = HostileLog();
-    const auto records = ParseCsv(Print(Layout(OutputFormat::Csv, "host,prog,msg,llevel,id"), {log, Log{}}));
-    ASSERT_EQ(records.size(), 3U);
-    EXPECT_EQ(records[0], (std::vector<std::string>{"host", "prog", "msg", "prio", "id"}));
-    EXPECT_EQ(records[1],
-              (std::vector<std::string>{log.host, log.prog, log.msg, "err", "18446744073709551615"}));
-    EXPECT_EQ(records[2], (std::vector<std::string>{"", "", "", "emerg", "0"}));
-
+    EXPECT_EQ(Print(Layout(OutputFormat::Csv, "host,prog,msg,llevel,id"), {log, Log{}}),
+              "host,prog,msg,prio,id\r\n\"h\"\"o,s't\"," + log.prog + ",\"" + log.msg +
+                  "\",err,18446744073709551615\r\n,,,emerg,0\r\n");
     RecordLayout bare = Layout(OutputFormat::Csv, "msg");
     bare.hasHeader = false;
     EXPECT_EQ(Print(bare, {Log{}}), "\"\"\r\n");
@@ -141,48 +108,6 @@ TEST(RecordWriter, AlignsColumnsByTheWidestValueSoFarAndColoursByLevel) {
     layout.hasHeader = false;
     layout.hasColour = true;
     EXPECT_EQ(Print(layout, {narrow, wide}), "h     x\n\x1b[33m" + wide.host + "  x\x1b[0m\n");
-}
-
-TEST(RecordWriter, TakesTimeAndMessageFromTheColumnsOfTheTable) {
-    Log log;
-    log.ldate = "2020/01/02";
-    log.ltime = "10:11:12";
-    log.host = "h";
-    log.prog = "p";
-    log.luser = "joe";
-    log.event = "write";
-    log.fname = "/a b";
-    log.fsize = "1 KB";
-    log.xferip = "10.0.0.1";
-    RecordLayout layout;
-    layout.kind = TableKind::Transfer;
-    EXPECT_EQ(Print(layout, {log}), "TIME                 HOST  IP        LUSER  EVENT  FSIZE  FNAME\n"
-                                    "2020-01-02 10:11:12  h     10.0.0.1  joe    write  1 KB   /a b\n");
-    layout.format = OutputFormat::Short;
-    EXPECT_EQ(Print(layout, {log}), "2020-01-02 10:11:12 h p: joe (10.0.0.1) write /a b 1 KB\n");
-    layout.kind = TableKind::System;
-    layout.format = OutputFormat::Jsonl;
-    const Json::Value object = ParseJson(Print(layout, {log}));
-    EXPECT_EQ(object["msg"].asString(), "write");
-    EXPECT_EQ(object["llevel"].asString(), "emerg");
-    EXPECT_FALSE(object.isMember("utcsec"));
-}
-
-TEST(RecordWriter, RefusesFieldsAndFormatsThatDoNotExist) {
-    EXPECT_THROW(ParseFields("host,fname", TableKind::Logs), UsageError);
-    EXPECT_THROW(ParseFields("host,", TableKind::Logs), UsageError);
-    EXPECT_THROW(ParseFields("fac", TableKind::Transfer), UsageError);
-    EXPECT_THROW(ParseOutputFormat("xml"), UsageError);
-}
-
-TEST(Colour, FollowsTheTerminalAndNoColorUnlessForced) {
-    EXPECT_TRUE(WantsColour(ColourMode::Auto, true, nullptr, "xterm"));
-    EXPECT_TRUE(WantsColour(ColourMode::Auto, true, "", "xterm"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, true, "1", "xterm"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, true, nullptr, "dumb"));
-    EXPECT_FALSE(WantsColour(ColourMode::Auto, false, nullptr, "xterm"));
-    EXPECT_TRUE(WantsColour(ColourMode::Always, false, "1", "dumb"));
-    EXPECT_FALSE(WantsColour(ColourMode::Never, true, nullptr, "xterm"));
 }
 
 } // namespace

@@ -62,6 +62,7 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
 int KELODBClose(DBConnect_tag *connection) {
     if (connection == nullptr)
         return 0;
+    connection->inserts.Clear();
     const int status = sqlite3_close(connection->db);
     delete connection;
     return status == SQLITE_OK ? 0 : -1;

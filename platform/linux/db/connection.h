@@ -3,6 +3,7 @@
 #include <sqlite3.h>
 
 #include "db/database_file.h"
+#include "db/insert_cache.h"
 #include "keloplatform/kelodb.h"
 
 struct DBConnect_tag {
@@ -10,4 +11,5 @@ struct DBConnect_tag {
 
     kelo::platform::DatabaseFile file;
     sqlite3 *db = nullptr; // closed by KELODBClose
+    kelo::platform::InsertCache inserts = {};
 };

@@ -1,5 +1,6 @@
 #include <memory>
 #include <new>
+#include <optional>
 #include <stdexcept>
 #include <string>
 
@@ -68,6 +69,8 @@ bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
 }
 
 bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+    if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
+        return *isInserted;
     std::unique_ptr<DBResult_tag> rows;
     if (!RunSingle(connection.db, sql, delivery, result != nullptr, rows))
         return false;

@@ -1,0 +1,79 @@
+#include "accounting/accounting_fixture.h"
+
+#include <dlfcn.h>
+#include <sqlite3.h>
+
+#include <cerrno>
+#include <filesystem>
+
+namespace kelo::test {
+
+Machine machine;
+
+AccountingTest::AccountingTest() {
+    machine = {};
+    std::filesystem::create_directories(root_.File("var/log/kelolog"));
+    std::filesystem::create_directories(root_.File("usr/kelo/etc"));
+    CreateLogDatabase(path_, "accinfo.sql");
+    CreateLogDatabase(root_.File("usr/kelo/etc/kelosyslog.db"), "kelosyslog.sql");
+    WriteRules("");
+}
+
+AccountingTest::~AccountingTest() {
+    machine = {};
+    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
+    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
+}
+
+std::string AccountingTest::Samples() const {
+    return QueryText(path_, "SELECT group_concat(stamp || ' ' || device || ' ' || eps, ';') FROM (SELECT * "
+                            "FROM eps ORDER BY id)");
+}
+
+std::string AccountingTest::Histogram() const {
+    return QueryText(path_, "SELECT group_concat(device || ' ' || count, ';') FROM (SELECT * FROM histogram "
+                            "ORDER BY device)");
+}
+
+} // namespace kelo::test
+
+using kelo::test::machine;
+using kelo::test::PlatformCalls;
+
+extern "C" {
+
+time_t time(time_t *seconds) noexcept {
+    if (seconds != nullptr)
+        *seconds = machine.now;
+    return machine.now;
+}
+
+int stat(const char *path, struct stat *status) noexcept {
+    static const auto real = reinterpret_cast<decltype(&stat)>(dlsym(RTLD_NEXT, "stat"));
+    const auto &calls = PlatformCalls::Recorded();
+    if (!machine.flushStat || calls.empty() || !calls.back().text.starts_with("INSERT OR REPLACE"))
+        return real(path, status);
+    const std::optional<struct stat> answer = machine.flushStat();
+    if (answer) {
+        *status = *answer;
+        return 0;
+    }
+    errno = EIO;
+    return -1;
+}
+
+int sqlite3_step(sqlite3_stmt *statement) {
+    static const auto real = reinterpret_cast<decltype(&sqlite3_step)>(dlsym(RTLD_NEXT, "sqlite3_step"));
+    if (machine.beforeStep)
+        machine.beforeStep();
+    return real(statement);
+}
+
+// Waiting for another writer's lock is cut short.
+int sqlite3_busy_timeout(sqlite3 *db, int) {
+    static const auto real =
+        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
+    return real(db, 1);
+}
+
+} // extern "C"
