@@ -20,6 +20,8 @@ int main(int argc, char **argv) {
     kelo::tool::AddSearch(program);
     kelo::tool::AddCount(program);
     kelo::tool::AddDelete(program);
+    kelo::tool::AddEvents(program);
+    kelo::tool::AddReport(program);
     kelo::tool::AddValues(program);
     kelo::tool::AddStats(program);
     kelo::tool::AddRules(program);

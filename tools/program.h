@@ -55,6 +55,8 @@ int RunProgram(Program &program, int argc, const char *const *argv);
 void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);
+void AddEvents(Program &program);
+void AddReport(Program &program);
 void AddValues(Program &program);
 void AddStats(Program &program);
 void AddRules(Program &program);

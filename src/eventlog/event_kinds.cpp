@@ -24,30 +24,30 @@ int AddServerEvent(Logger &logger, int level, const char *event) {
     return 0;
 }
 
-// Adds an event of one kind; `arguments` fill its format.
-template <typename... Arguments>
-int AddEvent(Logger &logger, kelo::EventKind kind, Arguments... arguments) {
-    const kelo::EventKindRow &row = kelo::kEventKinds[kind];
-    const std::unique_ptr<char, StringPut> event(TORVCStrGet(row.format, arguments...));
-    return AddServerEvent(logger, row.level, event.get());
+// Adds an event of one kind; `arguments` fill its format, which the compiler checks.
+template <kelo::EventKind Kind, typename... Arguments>
+int AddEvent(Logger &logger, Arguments... arguments) {
+    constexpr const char *format = kelo::kEventKinds[Kind].format;
+    const std::unique_ptr<char, StringPut> event(TORVCStrGet(format, arguments...));
+    return AddServerEvent(logger, kelo::kEventKinds[Kind].level, event.get());
 }
 
 } // namespace
 
 int Logger::LogAddServStart(std::string text) {
-    return AddEvent(*this, kelo::kServerStart, text.c_str());
+    return AddEvent<kelo::kServerStart>(*this, text.c_str());
 }
 
 int Logger::LogAddServStop(std::string text) {
-    return AddEvent(*this, kelo::kServerStop, text.c_str());
+    return AddEvent<kelo::kServerStop>(*this, text.c_str());
 }
 
 int Logger::LogAddNotifyEps(uint64_t eps) {
-    return AddEvent(*this, kelo::kNotifyEps, static_cast<unsigned long long>(eps));
+    return AddEvent<kelo::kNotifyEps>(*this, static_cast<unsigned long long>(eps));
 }
 
 int Logger::LogAddNotifySev(std::string sev, std::string content) {
-    return AddEvent(*this, kelo::kNotifySeverity, sev.c_str(), content.c_str());
+    return AddEvent<kelo::kNotifySeverity>(*this, sev.c_str(), content.c_str());
 }
 
 int Logger::LogAddNotifySev(_SYSLOG_DB_PRIORITY_tag prio, std::string content) {
@@ -55,24 +55,25 @@ int Logger::LogAddNotifySev(_SYSLOG_DB_PRIORITY_tag prio, std::string content) {
 }
 
 int Logger::LogAddNotifyKw(std::string keyword, std::string content) {
-    return AddEvent(*this, kelo::kNotifyKeyword, keyword.c_str(), content.c_str());
+    return AddEvent<kelo::kNotifyKeyword>(*this, keyword.c_str(), content.c_str());
 }
 
 int Logger::LogAddArchStart(std::string dbName) {
-    return AddEvent(*this, kelo::kArchiveStart, dbName.c_str());
+    return AddEvent<kelo::kArchiveStart>(*this, dbName.c_str());
 }
 
 int Logger::LogAddArchFinish(std::string dbName) {
-    return AddEvent(*this, kelo::kArchiveFinish, dbName.c_str());
+    return AddEvent<kelo::kArchiveFinish>(*this, dbName.c_str());
 }
 
 int Logger::LogAddArchFailed(std::string dbName) {
-    return AddEvent(*this, kelo::kArchiveFailed, dbName.c_str());
+    return AddEvent<kelo::kArchiveFailed>(*this, dbName.c_str());
 }
 
 int Logger::LogAddVolFull() {
     const kelo::EventKindRow &row = kelo::kEventKinds[kelo::kVolumeFull];
-    return AddServerEvent(*this, row.level, row.format);
+    const std::unique_ptr<char, StringPut> event(TORVCStrGet("%s", row.format));
+    return AddServerEvent(*this, row.level, event.get());
 }
 
 int Logger::LogAddLogClear(std::string dbPath, std::string user) {

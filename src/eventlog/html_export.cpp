@@ -61,6 +61,7 @@ int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPa
     if (events.empty())
         return 0;
     const File page(std::fopen(outPath.c_str(), "w+"));
+    tzset(); // localtime_r alone would not notice that TZ or the machine's time zone has changed
     if (page != nullptr)
         WritePage(page.get(), events);
     return 0;

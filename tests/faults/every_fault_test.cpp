@@ -56,8 +56,10 @@ std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : kFaultSources) {
-            if (source.stop != AllocationFaults::Stop ||
-                (AllocationFaults::IsSupported() && operation.survivesOutOfMemory))
+            const bool isMet = source.stop == AllocationFaults::Stop
+                                   ? AllocationFaults::IsSupported() && operation.meetsAllocationFaults
+                                   : source.fault != std::string("read") || operation.meetsReadFaults;
+            if (isMet)
                 combinations.emplace_back(operation, source);
         }
     }

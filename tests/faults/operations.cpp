@@ -12,6 +12,7 @@
 
 #include "keloplatform/torvc.h"
 #include "kelosyslog/accounting.h"
+#include "kelosyslog/logger.h"
 #include "kelosyslog/root.h"
 #include "support/fault_pause.h"
 #include "support/log_database.h"
@@ -92,8 +93,13 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
-Operation WithRegexes(Operation operation) {
-    operation.survivesOutOfMemory = false;
+Operation WithoutReadFaults(Operation operation) {
+    operation.meetsReadFaults = false;
+    return operation;
+}
+
+Operation WithoutAllocationFaults(Operation operation) {
+    operation.meetsAllocationFaults = false;
     return operation;
 }
 
@@ -247,6 +253,66 @@ void SetUpLogsOfTwoPrograms(Ground &ground) {
                          {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
 }
 
+constexpr int kFewEvents = 3;
+
+// The server's event log with kFewEvents events, the newest of which has lost its time.
+void SetUpEvents(Ground &ground) {
+    ground.database = ground.root.File("events.db");
+    RunSql(ground.database,
+           "PRAGMA journal_mode=WAL;" + ReadFile(KELO_SOURCE_DIR "/package/schema/kelosyslog.sql") +
+               "INSERT INTO log VALUES (1, 1, 1, 'u', 'e'), (2, 1, 2, 'u', 'e'), (3, 1, 0, 'u', 'e')");
+}
+
+const std::string kEventsLeft = "SELECT count(*) FROM log";
+
+// The event is in unless its transaction could not be ended, which is told.
+void CheckEventAdded(const Ground &ground, const Outcome &outcome) {
+    const std::string added = std::to_string(kFewEvents + 1);
+    const std::string rows = QueryText(ground.database, kEventsLeft);
+    const bool lostAtEnd = testing::Matches(testing::Contains("Fail to end transaction"))(outcome.messages);
+    if (outcome.IsDone() && !lostAtEnd)
+        EXPECT_EQ(rows, added);
+    else if (!outcome.IsDone() && !outcome.outOfMemory)
+        EXPECT_EQ(rows, std::to_string(kFewEvents));
+    else
+        EXPECT_THAT(rows, AnyOf(added, std::to_string(kFewEvents)));
+    if (!outcome.outOfMemory && !outcome.IsDone()) {
+        EXPECT_FALSE(outcome.messages.empty());
+    }
+}
+
+int EnumerateEvents(Ground &ground) {
+    const std::list<_SSYSLOG_LOG_LOG_tag> events = Logger().LogEnum(ground.database, 0, kFewEvents);
+    const FaultPause pause;
+    for (const _SSYSLOG_LOG_LOG_tag &event : events)
+        ground.seen.push_back(std::to_string(event.id));
+    return events.empty() ? -1 : 0;
+}
+
+// All events or none, but for those before a row that could not be fetched; and a failure is told.
+void CheckEvents(const Ground &ground, const Outcome &outcome) {
+    const bool isCut = outcome.fault == "KELODBFetchRow";
+    if (outcome.IsDone() && !isCut) {
+        EXPECT_EQ(ground.seen, (Lines{"2", "1", "3"}));
+    }
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone() || isCut);
+    }
+}
+
+int CountEvents(Ground &ground) {
+    return TakeCount(ground, Logger().LogCount(ground.database));
+}
+
+void CheckEventCount(const Ground &ground, const Outcome &outcome) {
+    if (outcome.IsDone()) {
+        EXPECT_EQ(ground.seen, Lines{std::to_string(kFewEvents)});
+    }
+    if (!outcome.outOfMemory) {
+        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone());
+    }
+}
+
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
 const std::string kNewSection = "[R]\nkey=\"new\"\n";
 
@@ -283,9 +349,14 @@ const std::vector<Operation> &Operations() {
                 "SELECT * FROM logs WHERE (prog LIKE "),
             Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
             Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-            WithRegexes(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
+            WithoutAllocationFaults(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
             Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
             {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
+            WithoutReadFaults({"AddEvent", true, SetUpEvents,
+                               [](Ground &ground) { return Logger().LogAdd(ground.database, 1, "o'", "e"); },
+                               CheckEventAdded}),
+            WithoutReadFaults({"EnumerateEvents", false, SetUpEvents, EnumerateEvents, CheckEvents}),
+            {"CountEvents", false, SetUpEvents, CountEvents, CheckEventCount},
             {"CountAndFlush", true, SetUpAccounting, CountAndFlush, CheckAccounting},
             Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
             Delete("DeleteAll", SetUpLogs, 0),
