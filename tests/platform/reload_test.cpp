@@ -85,20 +85,17 @@ protected:
 };
 
 TEST_F(Reload, HangsUpTheProgramThatAPidFileNames) {
-    const struct {
-        const char *service;
-        const char *file;
-    } cases[] = {
+    const std::pair<const char *, const char *> cases[] = {
         {"syslog-ng", "/run/syslog-ng.pid"},
         {"syslog-ng", "/var/lib/syslog-ng/syslog-ng.pid"}, // the other one is stale by then
         {"pkg-Quillbay-syslog", "/run/pkg-Quillbay-syslog.pid"},
         {"a-service-with-a-long-name", "/run/a-service-with-a-long-name.pid"},
     };
     isBooted = 1; // is nothing to what stands under a root
-    for (const auto &c : cases) {
-        Daemon daemon(std::string(c.service).starts_with("pkg") ? "syslog-ng" : c.service);
-        WritePidFile(c.file, daemon.Pid() + "\n");
-        EXPECT_TRUE(KELOSystemdReload(c.service)) << c.file;
+    for (const auto &[service, file] : cases) {
+        Daemon daemon(std::string(service).starts_with("pkg") ? "syslog-ng" : service);
+        WritePidFile(file, daemon.Pid() + "\n");
+        EXPECT_TRUE(KELOSystemdReload(service)) << file;
         EXPECT_EQ(daemon.Stop(), SIGHUP);
     }
     EXPECT_THAT(log_.Texts(), IsEmpty());
@@ -110,9 +107,7 @@ TEST_F(Reload, SparesEveryOtherProcess) {
     const std::string stale = gone.Pid();
     gone.Stop(SIGKILL);
     const struct {
-        std::string service;
-        std::string content;
-        std::string reason;
+        std::string service, content, reason;
     } cases[] = {
         {"syslog-ng", other.Pid(), "is not syslog-ng"},
         {"syslog-ng", stale, "is not syslog-ng"},
