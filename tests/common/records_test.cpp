@@ -19,7 +19,6 @@ TEST(LogAttriType, FindsTheFirstExactName) {
 
 TEST(XferlogDBPathGet, KnowsTypeNamesOnly) {
     EXPECT_STREQ(XferlogDBPathGet("smbxfer"), "/var/log/kelolog/.SMBXFERDB");
-    EXPECT_STREQ(XferlogDBPathGet("tftpxfer"), "/var/log/kelolog/.TFTPXFERDB");
     for (const char *name : {"ftpxferlog", "", "FTPXFER", static_cast<const char *>(nullptr)})
         EXPECT_STREQ(XferlogDBPathGet(name), "");
 }

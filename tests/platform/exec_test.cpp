@@ -20,7 +20,6 @@ int Shell(const std::string &command) {
 
 TEST(TORVCExec, SaysWhetherTheCommandSucceeded) {
     EXPECT_EQ(TORVCExec("/bin/true", nullptr, nullptr, nullptr, nullptr), 0);
-    EXPECT_EQ(Shell("exit 255"), -1);
     EXPECT_EQ(Shell("kill -9 $$"), -1);
     EXPECT_EQ(TORVCExec("/no/such/program", nullptr, nullptr, nullptr, nullptr), -1);
     EXPECT_EQ(TORVCExec(nullptr, nullptr, nullptr, nullptr, nullptr), -1);

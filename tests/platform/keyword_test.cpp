@@ -27,7 +27,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         {"É x", {"É X"}, {"é x"}},
         // OR is a word where it joins nothing.
         {"OR", {"xORx"}, {"or", "x"}},
-        {"OR b", {"OR b"}, {"b"}},
         {"a \"OR\" b", {"a OR b"}, {"a", "b", "a or b"}},
         // Exclusion.
         {"--x", {"x", "-"}, {"a-x"}},
@@ -42,7 +41,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
         {R"(/a\/b\\/)", {R"(a/b\)"}, {"a/b", "ab"}},
         {"/var /usr/", {"/var /usr"}, {"var usr", "/var"}},
         // Bytes that are not UTF-8 count as Latin-1 in keywords, and in rows for regexes.
-        {"caf\xe9", {"café"}, {"caf\xc3", "cafe"}},
         {"/caf\xe9 .$/", {"caf\xe9 \xff", "CAFÉ x"}, {"cafe x"}},
         {"/\xed\xa0\x80/", {"\xc3\xad\xc2\xa0\xc2\x80"}, {"x"}},
         {std::string("a\0b", 3), {"b a"}, {"a"}},
