@@ -49,7 +49,6 @@ TEST(Readfileinreverse, GivesLinesFromTheLast) {
         {"", 0, 9, {""}},
         {"\na\nb\n", 0, 9, {"", "b", "a", ""}},
         {std::string("ab\0cd\nx\0\0y", 11), 0, 9, {"x", "ab"}},
-        {std::string("\0abc", 4), 0, 9, {""}},
         {"a\nb\nc", 2, 4, {"c", "b"}},
         {"a\nb\nc", 3, 2, {}},
     };

@@ -111,7 +111,6 @@ TEST_F(Reload, SparesEveryOtherProcess) {
     } cases[] = {
         {"syslog-ng", other.Pid(), "is not syslog-ng"},
         {"syslog-ng", stale, "is not syslog-ng"},
-        {"syslog-ng", "", "no process id"},
         {"syslog-ng", "-1", "no process id"},
         {"syslog-ng", "0", "no process id"},
         {"syslog-ng", other.Pid() + " 1", "no process id"},
