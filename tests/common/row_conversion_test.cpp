@@ -7,31 +7,7 @@
 
 namespace {
 
-using kelo::test::RunSql;
-using kelo::test::TempRoot;
-
-// The first row of a query on a real database.
-class QueriedRow {
-public:
-    explicit QueriedRow(const std::string &sql) {
-        RunSql(root_.File("rows.db"), "CREATE TABLE t (a)");
-        DBConnect_tag *connection = KELODBConnect(nullptr, nullptr, nullptr, root_.File("rows.db").c_str());
-        EXPECT_EQ(KELODBExecute(connection, sql.c_str(), &result), 0);
-        KELODBClose(connection);
-        EXPECT_EQ(KELODBFetchRow(result, &row), 0);
-    }
-    ~QueriedRow() { KELODBFreeResult(result); }
-
-    int ConvertTo(_SYSLOG_LOG_DATA_tag &log, const std::string &table, bool trimUser = false) const {
-        return DBRecToLogInfo(table, result, row, &log, trimUser);
-    }
-
-    DBResult_tag *result = nullptr;
-    unsigned int row = 0;
-
-private:
-    TempRoot root_;
-};
+using namespace kelo::test;
 
 const std::string kEveryColumn =
     "SELECT '7' id, 'h' host, '10.0.0.1' ip, '86' tag, '+08:00' tzoffset, '2020/01/02' ldate, '10:11:12' "
@@ -57,8 +33,26 @@ std::string TextOf(const _SYSLOG_LOG_DATA_tag &log) {
     return text;
 }
 
+// The filled record's text after a conversion of the row that a query gives on a real database.
+std::string Converted(const std::string &sql, const std::string &table, bool trimUser = false,
+                      int expectedResult = 0) {
+    const TempRoot root;
+    RunSql(root.File("rows.db"), "CREATE TABLE t (a)");
+    DBConnect_tag *connection = KELODBConnect(nullptr, nullptr, nullptr, root.File("rows.db").c_str());
+    DBResult_tag *result = nullptr;
+    EXPECT_EQ(KELODBExecute(connection, sql.c_str(), &result), 0);
+    KELODBClose(connection);
+    unsigned int row = 0;
+    EXPECT_EQ(KELODBFetchRow(result, &row), 0);
+    _SYSLOG_LOG_DATA_tag log = FilledLog();
+    EXPECT_EQ(DBRecToLogInfo(table, result, row, &log, trimUser), expectedResult) << table;
+    EXPECT_EQ(DBRecToLogInfo(table, result, row, nullptr, trimUser), -1);
+    EXPECT_EQ(DBRecToLogInfo(table, nullptr, row, &log, trimUser), -1);
+    KELODBFreeResult(result);
+    return TextOf(log);
+}
+
 TEST(DBRecToLogInfo, FillsWhatTheTableHasAndKeepsTheRest) {
-    const QueriedRow row(kEveryColumn);
     const struct {
         const char *table;
         bool trimUser;
@@ -73,42 +67,24 @@ TEST(DBRecToLogInfo, FillsWhatTheTableHasAndKeepsTheRest) {
         {"transfer_log", true,
          "7|91|92|1|1|t|h|i|f|z|2020/01/02|10:11:12|sshd|m|luser|write|10.0.0.1|file|12 KB|"},
     };
-    for (const auto &c : cases) {
-        _SYSLOG_LOG_DATA_tag log = FilledLog();
-        EXPECT_EQ(row.ConvertTo(log, c.table, c.trimUser), 0);
-        EXPECT_EQ(TextOf(log), c.expected) << c.table;
-    }
+    for (const auto &c : cases)
+        EXPECT_EQ(Converted(kEveryColumn, c.table, c.trimUser), c.expected) << c.table;
 }
 
 TEST(DBRecToLogInfo, ReadsNumbersFromTheLeadingDigitsAndNullAsNothing) {
-    const struct {
-        const char *columns;
-        const char *numbers;
-    } cases[] = {
+    const std::pair<const char *, const char *> cases[] = {
         {"'12abc' id, '7.9' utcsec", "12|7"},
-        {"NULL id, 'x1' utcsec", "0|0"},
-        {"'9223372036854775807' id, '-9223372036854775808' utcsec",
-         "9223372036854775807|-9223372036854775808"},
+        {"NULL id, '-9223372036854775808' utcsec", "0|-9223372036854775808"},
         {"'18446744073709551615' id, 4294967296 utcsec", "-1|4294967296"}, // shown as signed
     };
-    for (const auto &c : cases) {
-        const QueriedRow row(std::string("SELECT NULL msg, ") + c.columns);
-        _SYSLOG_LOG_DATA_tag log = FilledLog();
-        EXPECT_EQ(row.ConvertTo(log, "logs"), 0);
-        EXPECT_EQ(TextOf(log), c.numbers + std::string("|92|7|93||||||||||u|e|x|n|s|"));
-    }
+    for (const auto &[columns, numbers] : cases)
+        EXPECT_EQ(Converted(std::string("SELECT NULL msg, ") + columns, "logs"),
+                  numbers + std::string("|92|7|93||||||||||u|e|x|n|s|"));
 }
 
-TEST(DBRecToLogInfo, LeavesTheRecordAloneWhenItFails) {
-    const QueriedRow row(kEveryColumn);
-    _SYSLOG_LOG_DATA_tag log = FilledLog();
+TEST(DBRecToLogInfo, LeavesTheRecordAloneWhenItKnowsNoSuchTable) {
     for (const char *table : {"LOGS", "logs ", ""})
-        EXPECT_EQ(row.ConvertTo(log, table), -1) << table;
-    for (const char *table : {"logs", "general_log", "connection_log", "transfer_log"}) {
-        EXPECT_EQ(DBRecToLogInfo(table, nullptr, 0, &log, true), -1) << table;
-        EXPECT_EQ(DBRecToLogInfo(table, row.result, 0, nullptr, true), -1) << table;
-    }
-    EXPECT_EQ(TextOf(log), TextOf(FilledLog()));
+        EXPECT_EQ(Converted(kEveryColumn, table, false, -1), TextOf(FilledLog())) << table;
 }
 
 } // namespace

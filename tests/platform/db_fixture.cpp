@@ -1,11 +1,7 @@
 #include "platform/db_fixture.h"
 
-#include <unistd.h>
-
 namespace kelo::test {
 namespace {
-
-constexpr uid_t kNobody = 65534;
 
 Outcome Read(const Connection &connection, int status, DBResult_tag *result,
              const std::vector<std::string> &columns) {
@@ -39,15 +35,6 @@ Outcome SelectLimit(const Connection &connection, const std::string &sql, unsign
     DBResult_tag *result = nullptr;
     const int status = KELODBSelectLimit(connection.get(), sql.c_str(), limit, offset, &result);
     return Read(connection, status, result, columns);
-}
-
-Unprivileged::Unprivileged() {
-    if (getuid() == 0 && seteuid(kNobody) != 0)
-        throw std::runtime_error("cannot drop the rights of root");
-}
-Unprivileged::~Unprivileged() {
-    if (getuid() == 0 && seteuid(0) != 0)
-        std::abort();
 }
 
 } // namespace kelo::test

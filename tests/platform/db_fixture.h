@@ -38,13 +38,4 @@ Outcome Execute(const Connection &connection, const std::string &sql,
 Outcome SelectLimit(const Connection &connection, const std::string &sql, unsigned int limit,
                     unsigned int offset, const std::vector<std::string> &columns);
 
-// Acts with the rights of nobody while the object lives; those of root would hide every permission.
-class Unprivileged {
-public:
-    Unprivileged();
-    ~Unprivileged();
-    Unprivileged(const Unprivileged &) = delete;
-    Unprivileged &operator=(const Unprivileged &) = delete;
-};
-
 } // namespace kelo::test

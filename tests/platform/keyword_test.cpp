@@ -13,53 +13,33 @@ using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using Texts = std::vector<std::string>;
 
-struct Example {
-    std::string keyword;
-    Texts matching;
-    Texts other;
-};
-
 TEST(Keyword, FindsWhatTheLanguageSays) {
-    const std::vector<Example> examples = {
+    const struct {
+        std::string keyword;
+        Texts matching, other;
+    } examples[] = {
         // Terms and phrases.
         {"\t disk\n", {"a disk"}, {"dis k"}},
         {"\"disk fu", {"the disk full"}, {"disk is full"}},
         {R"("say \"hi\" c:\dir\\")", {R"(say "hi" c:\dir\)"}, {R"(say hi c:\dir\)"}},
-        {"\"one\"two", {"two one"}, {"one", "two"}},
-        {"5\" \"", {"5\"", "a 5\""}, {"5"}},
         // Letter case: decided by ASCII capitals, term by term, for ASCII letters.
-        {"Error disk", {"Error DISK"}, {"error disk", "ERROR disk"}},
         {"é", {"é"}, {"É", "e"}},
         {"É x", {"É X"}, {"é x"}},
         // OR is a word where it joins nothing.
         {"OR", {"xORx"}, {"or", "x"}},
-        {"OR b", {"OR b"}, {"b"}},
-        {"b OR", {"b OR"}, {"b"}},
-        {"a OR OR", {"a", "OR"}, {"or", "b"}},
         {"a \"OR\" b", {"a OR b"}, {"a", "b", "a or b"}},
-        {"a or b", {"b or a"}, {"a b"}},
         // Exclusion.
-        {"- x", {"x-"}, {"x"}},
         {"--x", {"x", "-"}, {"a-x"}},
-        {"-*", {}, {"", "x"}},
         // Wildcards.
-        {"a*c", {"ac", "xabcx", "a\nc"}, {"ca", "ab"}},
         {"a?c", {"abc", "aéc", "xa cx"}, {"ac", "abbc"}},
         {"\"\"", {"a", ""}, {}},
-        {R"(c:\windows)", {R"(C:\Windows)"}, {"c:windows"}},
-        {R"(a\)", {R"(a\)"}, {"a"}},
         // Regular expressions, and paths that are none.
-        {"/fail(ed|ure)/", {"Failed", "failure"}, {"fail"}},
         {"x OR -/B+c%?'/ a", {"ab", "abbc'"}, {"aBc%'"}},
         {R"(/^\S+ \pL\x2D\p{Greek}?$/)", {"AB c-"}, {"a b c-"}},
         {"/(?P<Name>x)(?U:y)/", {"XY"}, {"x"}},
-        {"/a b/ c", {"a bc"}, {"ab c"}},
         {R"(/a\/b\\/)", {R"(a/b\)"}, {"a/b", "ab"}},
-        {"/var/log", {"in /var/log/x"}, {"var/log"}},
         {"/var /usr/", {"/var /usr"}, {"var usr", "/var"}},
-        {"// /x", {"x///x"}, {"x"}},
         // Bytes that are not UTF-8 count as Latin-1 in keywords, and in rows for regexes.
-        {"caf\xe9", {"café"}, {"caf\xc3", "cafe"}},
         {"/caf\xe9 .$/", {"caf\xe9 \xff", "CAFÉ x"}, {"cafe x"}},
         {"/\xed\xa0\x80/", {"\xc3\xad\xc2\xa0\xc2\x80"}, {"x"}},
         {std::string("a\0b", 3), {"b a"}, {"a"}},
@@ -75,7 +55,6 @@ TEST(Keyword, FindsWhatTheLanguageSays) {
 TEST(Keyword, GivesTheMatchAllTextExactlyWhenItFiltersNothing) {
     for (const char *keyword : {"*", " * ", "\t*\n", "**", "* *", "", "  "})
         EXPECT_EQ(GenSQLRegexp(keyword, "msg"), "msg GLOB '**'") << '[' << keyword << ']';
-    EXPECT_EQ(GenSQLRegexp("*", "prog"), "prog GLOB '**'");
     for (const char *keyword : {"-*", "?", "\"*\"", "* a", "\\*"})
         EXPECT_NE(GenSQLRegexp(keyword, "msg"), "msg GLOB '**'") << '[' << keyword << ']';
 }
@@ -86,6 +65,7 @@ TEST(Keyword, KeepsNullOnlyWhereTermsExclude) {
         EXPECT_EQ(table.CountWhere("id = 0 AND " + GenSQLRegexp(keyword, "msg")), 1) << keyword;
     for (const char *keyword : {"*", "?", "a", "A", "[", "/a/", "a OR b", "-x a"})
         EXPECT_EQ(table.CountWhere("id = 0 AND " + GenSQLRegexp(keyword, "msg")), 0) << keyword;
+    EXPECT_EQ(table.CountWhere("NOT " + GenSQLRegexp("b OR -a", "msg")), 1); // one operand
 }
 
 TEST(Keyword, ReportsABrokenRegexOnceAndMatchesNothingByIt) {
@@ -117,29 +97,16 @@ TEST(Keyword, StaysWithinSqlitesLimitsWhateverItsSize) {
     const Texts texts = {letters, "a'%_[\\"};
     const Texts first = {letters};
     const std::vector<std::pair<std::string, Texts>> examples = {
-        {letters, first},
-        {"-" + letters, {texts[1]}},
-        {"[" + letters, {}},
-        {Repeated("a*j", 900), first},
         {Repeated("a*j", 1'100), first}, // more stars than GLOB and LIKE are asked for
-        {Repeated("?", 10'000), first},
-        {Repeated("c ", 3'000), first},
-        {Repeated("x OR ", 20'000) + "T", {}},
-        {Repeated("-y ", 3'000), texts},
-        {Repeated("/c/ ", 500), first},
+        {Repeated("?", 10'000), first},   {Repeated("x OR ", 20'000) + "T", {}},
+        {Repeated("-y ", 3'000), texts},  {Repeated("/c/ ", 500), first},
         {Repeated("'%_[\\", 20'000), {}},
     };
     const SearchTable table(texts);
-    SyslogCapture log;
+    const SyslogCapture log;
     for (const auto &[keyword, matching] : examples)
         EXPECT_TRUE(table.Matching(keyword) == matching) << keyword.substr(0, 40);
     EXPECT_THAT(log.Messages(), IsEmpty());
-}
-
-TEST(Keyword, StandsAsOneOperand) {
-    const SearchTable table({"a", "b", "c"});
-    EXPECT_EQ(table.CountWhere("id = 1 AND " + GenSQLRegexp("a OR b", "msg")), 1);
-    EXPECT_EQ(table.CountWhere("NOT " + GenSQLRegexp("a OR b", "msg")), 1);
 }
 
 TEST(SearchFunctions, AnswerAsDocumentedWhenCalledFromSql) {

@@ -1,24 +1,25 @@
 #include "platform/search_table.h"
 
+#include <iomanip>
+#include <sstream>
+
 #include "keloplatform/gensqlregexp.h"
 
 namespace kelo::test {
 
 SearchTable::SearchTable(const std::vector<std::string> &texts) : texts_(texts) {
     const std::string path = root_.File("logs.db");
-    RunSql(path, "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT); INSERT INTO logs VALUES(0, NULL)");
-    connection_ = ConnectTo(path);
-    Execute(connection_, "BEGIN");
-    sqlite3_stmt *insert = nullptr;
-    sqlite3_prepare_v2(KELODBInternalDBHdlGet(connection_.get()), "INSERT INTO logs(msg) VALUES(?)", -1,
-                       &insert, nullptr);
+    RunSql(path, "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT)");
+    // In hexadecimal, so that nothing needs to be quoted.
+    std::ostringstream rows;
     for (const std::string &text : texts_) {
-        sqlite3_bind_text(insert, 1, text.data(), static_cast<int>(text.size()), SQLITE_STATIC);
-        sqlite3_step(insert);
-        sqlite3_reset(insert);
+        rows << ",(NULL, CAST(x'" << std::hex << std::setfill('0');
+        for (const unsigned char byte : text)
+            rows << std::setw(2) << int{byte};
+        rows << "' AS TEXT))";
     }
-    sqlite3_finalize(insert);
-    Execute(connection_, "COMMIT");
+    RunSql(path, "INSERT INTO logs VALUES(0, NULL)" + rows.str());
+    connection_ = ConnectTo(path);
 }
 
 std::vector<std::string> SearchTable::Matching(const std::string &keyword) const {
