@@ -56,9 +56,8 @@ std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : kFaultSources) {
-            const bool isMet = source.stop == AllocationFaults::Stop
-                                   ? AllocationFaults::IsSupported() && operation.meetsAllocationFaults
-                                   : source.fault != std::string("read") || operation.meetsReadFaults;
+            const bool isMet = source.stop != AllocationFaults::Stop ||
+                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
             if (isMet)
                 combinations.emplace_back(operation, source);
         }

@@ -51,8 +51,6 @@ struct Operation {
     // Whether the same files are there afterwards. One that creates or moves a file checks itself what is
     // there.
     bool keepsFiles = true;
-    // Whether a read that fails leaves the file where it is; a DBHandler moves one that seems corrupt away.
-    bool meetsReadFaults = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };
