@@ -1,6 +1,5 @@
 #include "faults/file_faults.h"
 
-#include <dlfcn.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -9,6 +8,7 @@
 #include <set>
 
 #include "support/fault_pause.h"
+#include "support/real_function.h"
 
 namespace kelo::test {
 namespace {
@@ -54,12 +54,6 @@ int Sync(int fd) {
     if (fstat(fd, &file) == 0)
         state.unsynced.erase(file.st_ino);
     return 0;
-}
-
-template <auto *Function>
-auto Real(const char *name) {
-    const FaultPause pause;
-    return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
 }
 
 } // namespace

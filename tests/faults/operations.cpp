@@ -2,21 +2,14 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 
 #include <algorithm>
-#include <ctime>
-#include <filesystem>
 #include <iterator>
 #include <map>
 
 #include "keloplatform/torvc.h"
-#include "kelosyslog/accounting.h"
-#include "kelosyslog/logger.h"
-#include "kelosyslog/root.h"
 #include "support/fault_pause.h"
 #include "support/log_database.h"
-#include "support/notify_calls.h"
 
 namespace kelo::test {
 namespace {
@@ -93,16 +86,6 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
-Operation WithoutReadFaults(Operation operation) {
-    operation.meetsReadFaults = false;
-    return operation;
-}
-
-Operation WithoutAllocationFaults(Operation operation) {
-    operation.meetsAllocationFaults = false;
-    return operation;
-}
-
 // A deletion, after which `left` rows are left. A failed one has deleted either everything it should or
 // nothing, and nothing when the statement never ran.
 Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left) {
@@ -132,17 +115,9 @@ void CheckStatistics(const Ground &ground, const Outcome &outcome) {
     EXPECT_THAT(outcome.messages, IsEmpty());
 }
 
-int SelectPage(Ground &ground, _SYSLOG_SQL_LIMIT_tag page, _SYSLOG_SQL_ORDER_tag *order) {
-    return SyslogDBSelect(ground.database, ground.conditions, &page, order, TakeId, &ground, true);
-}
-
 int SelectNewest(Ground &ground) {
-    return SelectPage(ground, {10, 5}, nullptr);
-}
-
-int SelectSorted(Ground &ground) {
-    _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
-    return SelectPage(ground, {3, 1}, &newestFirst);
+    _SYSLOG_SQL_LIMIT_tag page{10, 5};
+    return SyslogDBSelect(ground.database, ground.conditions, &page, nullptr, TakeId, &ground, true);
 }
 
 int Count(Ground &ground) {
@@ -157,10 +132,6 @@ int CountByKeyword(Ground &ground, const char *keyword) {
 
 int CountByForm(Ground &ground) {
     return CountByKeyword(ground, "\"request 3\" FAILED OR clos?d -absent");
-}
-
-int CountByRegex(Ground &ground) {
-    return CountByKeyword(ground, "/request 3.*closed/ -/request \\d\\d/");
 }
 
 int GetHosts(Ground &ground) {
@@ -191,126 +162,6 @@ void SetUpStatistics(Ground &ground) {
            "CREATE TABLE eps (stamp INTEGER, eps INTEGER, device TEXT);"
            "INSERT INTO histogram VALUES ('a', 5), ('b', 7), ('c', 1);"
            "INSERT INTO eps VALUES (100, 1, 'a'), (100, 2, 'b'), (200, 4, 'a'), (400, 9, 'a')");
-}
-
-// Creates a file that the platform may keep in memory from the first reading on: it does so once the clock
-// that files are stamped with, which moves every few milliseconds, has left the stamp.
-void WriteSettledFile(const std::string &path, const std::string &content) {
-    WriteFile(path, content);
-    struct stat file {};
-    timespec now{};
-    do {
-        ASSERT_EQ(stat(path.c_str(), &file), 0);
-        clock_gettime(CLOCK_REALTIME_COARSE, &now);
-    } while (now.tv_sec == file.st_ctim.tv_sec && now.tv_nsec <= file.st_ctim.tv_nsec);
-}
-
-// The accounting database stands where the library looks for it: behind a link, for the ground has no
-// folders.
-void SetUpAccounting(Ground &ground) {
-    static const TempRoot tree;
-    ground.database = ground.root.File(".KELOACCOUNTDB");
-    CreateLogDatabase(ground.database, "accinfo.sql");
-    RunSql(ground.database, "INSERT INTO histogram VALUES(NULL, 'a', 5)");
-    std::filesystem::remove(tree.File("var/log/kelolog"));
-    std::filesystem::create_directories(tree.File("var/log"));
-    std::filesystem::create_directories(tree.File("etc/kelosyslog"));
-    std::filesystem::create_directory_symlink(ground.root.Path(), tree.File("var/log/kelolog"));
-    WriteSettledFile(tree.File("etc/kelosyslog/notify.conf"), "");
-    SyslogRootSet(tree.Path());
-    // SQLite calls a database corrupt that the disk cannot read. It keeps its name where nobody can be told.
-    NotifyCalls::AnswerWith(-1);
-}
-
-// One sample of one log, and another log. The destructor flushes once more what is left.
-int CountAndFlush(Ground &) {
-    AccountingManager accounting;
-    accounting.LogInc("a");
-    accounting.LogInc("a");
-    return accounting.AccoutingFlush2DB();
-}
-
-// The sample is stored once for each of the two flushes that wrote it, and the count follows the first one
-// that was whole. It starts at 0 where the stored one could not be read.
-void CheckAccounting(const Ground &ground, const Outcome &outcome) {
-    const std::string samples = QueryText(ground.database, "SELECT count(*) FROM eps");
-    const std::string count = QueryText(ground.database, "SELECT group_concat(count) FROM histogram");
-    if (outcome.fault.empty()) {
-        EXPECT_EQ(samples, "1");
-        EXPECT_EQ(count, "7");
-        EXPECT_THAT(outcome.messages, IsEmpty());
-    } else {
-        EXPECT_THAT(samples, AnyOf("0", "1", "2"));
-        EXPECT_THAT(count, AnyOf("5", "6", "7", "1", "2"));
-    }
-    // A flush that says nothing is done.
-    EXPECT_TRUE(!outcome.IsDone() || !outcome.messages.empty() || samples == "1");
-}
-
-void SetUpLogsOfTwoPrograms(Ground &ground) {
-    SetUpLogs(ground);
-    ground.conditions = {{SYSLOG_ATTRI_PROG, SYSLOG_OP_LIKE, "prog?1", {}},
-                         {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
-}
-
-constexpr int kFewEvents = 3;
-
-// The server's event log with kFewEvents events, the newest of which has lost its time.
-void SetUpEvents(Ground &ground) {
-    ground.database = ground.root.File("events.db");
-    RunSql(ground.database,
-           "PRAGMA journal_mode=WAL;" + ReadFile(KELO_SOURCE_DIR "/package/schema/kelosyslog.sql") +
-               "INSERT INTO log VALUES (1, 1, 1, 'u', 'e'), (2, 1, 2, 'u', 'e'), (3, 1, 0, 'u', 'e')");
-}
-
-const std::string kEventsLeft = "SELECT count(*) FROM log";
-
-// The event is in unless its transaction could not be ended, which is told.
-void CheckEventAdded(const Ground &ground, const Outcome &outcome) {
-    const std::string added = std::to_string(kFewEvents + 1);
-    const std::string rows = QueryText(ground.database, kEventsLeft);
-    const bool lostAtEnd = testing::Matches(testing::Contains("Fail to end transaction"))(outcome.messages);
-    if (outcome.IsDone() && !lostAtEnd)
-        EXPECT_EQ(rows, added);
-    else if (!outcome.IsDone() && !outcome.outOfMemory)
-        EXPECT_EQ(rows, std::to_string(kFewEvents));
-    else
-        EXPECT_THAT(rows, AnyOf(added, std::to_string(kFewEvents)));
-    if (!outcome.outOfMemory && !outcome.IsDone()) {
-        EXPECT_FALSE(outcome.messages.empty());
-    }
-}
-
-int EnumerateEvents(Ground &ground) {
-    const std::list<_SSYSLOG_LOG_LOG_tag> events = Logger().LogEnum(ground.database, 0, kFewEvents);
-    const FaultPause pause;
-    for (const _SSYSLOG_LOG_LOG_tag &event : events)
-        ground.seen.push_back(std::to_string(event.id));
-    return events.empty() ? -1 : 0;
-}
-
-// All events or none, but for those before a row that could not be fetched; and a failure is told.
-void CheckEvents(const Ground &ground, const Outcome &outcome) {
-    const bool isCut = outcome.fault == "KELODBFetchRow";
-    if (outcome.IsDone() && !isCut) {
-        EXPECT_EQ(ground.seen, (Lines{"2", "1", "3"}));
-    }
-    if (!outcome.outOfMemory) {
-        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone() || isCut);
-    }
-}
-
-int CountEvents(Ground &ground) {
-    return TakeCount(ground, Logger().LogCount(ground.database));
-}
-
-void CheckEventCount(const Ground &ground, const Outcome &outcome) {
-    if (outcome.IsDone()) {
-        EXPECT_EQ(ground.seen, Lines{std::to_string(kFewEvents)});
-    }
-    if (!outcome.outOfMemory) {
-        EXPECT_EQ(outcome.messages.empty(), outcome.IsDone());
-    }
 }
 
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
@@ -345,19 +196,10 @@ const std::vector<Operation> &Operations() {
         std::vector<Operation> all = {
             Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
                 "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
-            Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
-                "SELECT * FROM logs WHERE (prog LIKE "),
             Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
             Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-            WithoutAllocationFaults(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
             Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
             {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
-            WithoutReadFaults({"AddEvent", true, SetUpEvents,
-                               [](Ground &ground) { return Logger().LogAdd(ground.database, 1, "o'", "e"); },
-                               CheckEventAdded}),
-            WithoutReadFaults({"EnumerateEvents", false, SetUpEvents, EnumerateEvents, CheckEvents}),
-            {"CountEvents", false, SetUpEvents, CountEvents, CheckEventCount},
-            {"CountAndFlush", true, SetUpAccounting, CountAndFlush, CheckAccounting},
             Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
             Delete("DeleteAll", SetUpLogs, 0),
             {"SetSection", true, SetUpSection, SetSection, CheckSection},

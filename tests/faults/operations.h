@@ -45,14 +45,9 @@ struct Operation {
     std::function<int(Ground &)> run;
     // Whether what was promised holds, whatever failed.
     std::function<void(const Ground &, const Outcome &)> check;
-    // RE2 does not meet them: it frees blocks twice when std::bad_alloc passes through it, and may end the
-    // process.
-    bool meetsAllocationFaults = true;
     // Whether the same files are there afterwards. One that creates or moves a file checks itself what is
     // there.
     bool keepsFiles = true;
-    // Whether a read that fails leaves the file where it is; a DBHandler moves one that seems corrupt away.
-    bool meetsReadFaults = true;
 
     friend void PrintTo(const Operation &operation, std::ostream *out) { *out << operation.name; }
 };

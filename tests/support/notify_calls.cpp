@@ -1,11 +1,10 @@
 #include "support/notify_calls.h"
 
-#include <dlfcn.h>
-
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/torvc.h"
 #include "support/fault_pause.h"
 #include "support/platform_calls.h"
+#include "support/real_function.h"
 
 namespace kelo::test {
 namespace {
@@ -18,12 +17,6 @@ struct State {
     int openSmsConfs = 0;
 };
 State state;
-
-template <auto *Function>
-auto Real(const char *name) {
-    const FaultPause pause;
-    return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
-}
 
 } // namespace
 

@@ -1,11 +1,10 @@
 #include "support/platform_calls.h"
 
-#include <dlfcn.h>
-
 #include <mutex>
 
 #include "keloplatform/kelodb.h"
 #include "support/fault_pause.h"
+#include "support/real_function.h"
 
 namespace kelo::test {
 namespace {
@@ -28,10 +27,7 @@ private:
 // Calls the platform library's own function behind one of ours.
 template <auto *Function, typename... Arguments>
 auto CallReal(const char *name, Arguments... arguments) {
-    static const auto real = [name] {
-        const FaultPause pause;
-        return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
-    }();
+    static const auto real = Real<Function>(name);
     const PlatformVisit visit;
     return real(arguments...);
 }

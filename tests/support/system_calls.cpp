@@ -1,7 +1,5 @@
 #include "support/system_calls.h"
 
-#include <dlfcn.h>
-
 #include <cstdio>
 #include <initializer_list>
 #include <string>
@@ -10,18 +8,13 @@
 #include "keloplatform/torvc.h"
 #include "support/fault_pause.h"
 #include "support/platform_calls.h"
+#include "support/real_function.h"
 
 namespace kelo::test {
 namespace {
 
 bool reloadAnswer = true;
 std::function<void()> lookAtReload;
-
-template <auto *Function>
-auto Real(const char *name) {
-    const FaultPause pause;
-    return reinterpret_cast<decltype(Function)>(dlsym(RTLD_NEXT, name));
-}
 
 bool MustFailToRun(std::initializer_list<const char *> words) {
     const FaultPause pause;
