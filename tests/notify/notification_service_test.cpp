@@ -100,6 +100,22 @@ TEST_F(NotificationService, SpoolsTheRenderedMessageWithAllThatDeliveryNeeds) {
     EXPECT_THAT(Messages(), IsEmpty());
 }
 
+TEST_F(NotificationService, HasATextForEveryTagInEnglishAndGerman) {
+    InstallTexts();
+    for (const std::string language : {"enu", "ger"}) {
+        WriteSettings("notify_language=\"" + language + "\"\n");
+        for (const std::string tag :
+             {"EPS_EXCEED", "SEV_EXCEED", "KEYWORD_MATCH", "VOL_FULL", "DB_CORRUPT", "ShareRemove",
+              "ShareRename", "ShareEncMount", "ShareEncUnmount", "TEST"}) {
+            ASSERT_EQ(Send(("KELOSYSLOG_" + tag).c_str(), {}), 0);
+            const Json::Value entry = Take();
+            EXPECT_EQ(entry["language"].asString(), language);
+            EXPECT_NE(entry["title"].asString(), "Notification KELOSYSLOG_" + tag);
+            EXPECT_NE(entry["body"].asString(), "");
+        }
+    }
+}
+
 TEST_F(NotificationService, GivesAPlainMessageWhereThereIsNoText) {
     InstallTexts();
     WriteSettings("notify_language=\"../enu\"\n");

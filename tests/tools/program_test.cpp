@@ -190,16 +190,5 @@ TEST_F(Program, NoticesAFullDisk) {
     EXPECT_NE(OnlyLine(full).find("No space left"), std::string::npos);
 }
 
-TEST_F(Program, FindsTheFixedLogsBelowARoot) {
-    const std::string folder = root_.Path() + "/var/log/kelolog";
-    std::filesystem::create_directories(folder);
-    std::filesystem::copy(db_, folder + "/logs.db");
-    InsertSampleLogs(folder + "/logs.db", 3);
-    EXPECT_EQ(RunTool({"count", "--root", root_.Path()}).out, "3\n");
-    EXPECT_EQ(RunTool({"--root", root_.Path() + "/", "count", "--log", "logs"}).out, "3\n");
-    const ProgramResult missing = RunTool({"search", "--root", root_.Path(), "--log", "afpxfer"});
-    EXPECT_NE(OnlyLine(missing).find(folder + "/.AFPXFERDB: no such file"), std::string::npos);
-}
-
 } // namespace
 } // namespace kelo::test

@@ -94,21 +94,5 @@ TEST(RecordWriter, ShowsControlBytesInsteadOfSendingThemToTheTerminal) {
               "PROG              MSG\n\\x1b]0;owned\\x07  " + message + "\n");
 }
 
-TEST(RecordWriter, AlignsColumnsByTheWidestValueSoFarAndColoursByLevel) {
-    Log wide;
-    wide.host = "\xc3\xa4\xc3\xb6\xc3\xbc\xc3\x9f\xc3\x9f"; // five characters, ten bytes
-    wide.prio = SYSLOG_PRIO_WARNING;
-    wide.msg = "x";
-    Log narrow = wide;
-    narrow.host = "h";
-    narrow.prio = SYSLOG_PRIO_INFO;
-    RecordLayout layout = Layout(OutputFormat::Text, "host,msg");
-    EXPECT_EQ(Print(layout, {wide, narrow}), "HOST   MSG\n" + wide.host + "  x\nh      x\n");
-    EXPECT_EQ(Print(layout, {}), "");
-    layout.hasHeader = false;
-    layout.hasColour = true;
-    EXPECT_EQ(Print(layout, {narrow, wide}), "h     x\n\x1b[33m" + wide.host + "  x\x1b[0m\n");
-}
-
 } // namespace
 } // namespace kelo::tool

@@ -95,13 +95,5 @@ TEST_F(Stats, RefusesWhatItCannotDo) {
     }
 }
 
-TEST(Bar, IsRoundedToAnEighthButNeverVanishes) {
-    EXPECT_EQ(Bar(0, 8, 4, true), "");
-    EXPECT_EQ(Bar(0.001, 8, 4, true), "▏");
-    EXPECT_EQ(Bar(5, 8, 4, true), "██▌");
-    EXPECT_EQ(Bar(8, 8, 4, true), "████");
-    EXPECT_EQ(Bar(5, 8, 4, false), "###");
-}
-
 } // namespace
 } // namespace kelo::test
