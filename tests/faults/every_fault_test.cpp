@@ -56,7 +56,9 @@ std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : kFaultSources) {
-            if (source.stop != AllocationFaults::Stop || AllocationFaults::IsSupported())
+            const bool isMet = source.stop != AllocationFaults::Stop ||
+                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
+            if (isMet)
                 combinations.emplace_back(operation, source);
         }
     }

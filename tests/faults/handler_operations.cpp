@@ -119,6 +119,36 @@ void CheckCreation(const Ground &ground, const Outcome &outcome) {
     EXPECT_EQ(QueryText(path, "PRAGMA journal_mode"), hasLine("Fail to set jounal mode") ? "delete" : "wal");
 }
 
+void SetUpDamaged(Ground &ground) {
+    SetUpNothing(ground);
+    WriteFile(ground.root.File("logs.db"), "damaged");
+}
+
+int Quarantine(Ground &ground) {
+    {
+        const FaultPause pause;
+        NotifyCalls::Reset();
+    }
+    return DBErrorHandle_SQLITE_CORRUPT(nullptr, ground.root.File("logs.db"));
+}
+
+// The file is moved once and only after the administrator was told, and never lost.
+void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
+    const bool isMoved = fs::exists(ground.root.File("logs.db.corrupt"));
+    EXPECT_NE(fs::exists(ground.root.File("logs.db")), isMoved);
+    EXPECT_TRUE(isMoved || !outcome.IsDone());
+    EXPECT_TRUE(!isMoved || NotifyCalls::Sent().size() == 1);
+    const auto isTold = [&](const std::string &text) {
+        return testing::Value(outcome.messages, Contains(HasSubstr(text)));
+    };
+    if (outcome.fault == "KELOSysNotifySendNotificationCustomized") {
+        EXPECT_TRUE(!isMoved && isTold("Fail to send notification when db corruption"));
+    } else if (outcome.fault == "KELOSystemdReload") {
+        EXPECT_TRUE(isMoved && !outcome.IsDone() && isTold("Fail to send HUP signal to syslog-ng"));
+    }
+    EXPECT_EQ(NotifyCalls::OpenHandles(), 0);
+}
+
 } // namespace
 
 std::vector<Operation> HandlerOperations() {
@@ -129,9 +159,10 @@ std::vector<Operation> HandlerOperations() {
                     ((!outcome.IsDone() || outcome.fault == "KELODBFetchRow") && ground.seen.empty()));
     };
     return {
-        {"HandlerReads", false, SetUpArchive, Read, checkRead, false},
-        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, false},
-        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, false},
+        {"HandlerReads", false, SetUpArchive, Read, checkRead, true, false},
+        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, true, false},
+        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, true, false},
+        {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, true, false},
     };
 }
 

@@ -86,6 +86,11 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
+Operation WithoutAllocationFaults(Operation operation) {
+    operation.meetsAllocationFaults = false;
+    return operation;
+}
+
 // A deletion, after which `left` rows are left. A failed one has deleted either everything it should or
 // nothing, and nothing when the statement never ran.
 Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left) {
@@ -115,9 +120,17 @@ void CheckStatistics(const Ground &ground, const Outcome &outcome) {
     EXPECT_THAT(outcome.messages, IsEmpty());
 }
 
+int SelectPage(Ground &ground, _SYSLOG_SQL_LIMIT_tag page, _SYSLOG_SQL_ORDER_tag *order) {
+    return SyslogDBSelect(ground.database, ground.conditions, &page, order, TakeId, &ground, true);
+}
+
 int SelectNewest(Ground &ground) {
-    _SYSLOG_SQL_LIMIT_tag page{10, 5};
-    return SyslogDBSelect(ground.database, ground.conditions, &page, nullptr, TakeId, &ground, true);
+    return SelectPage(ground, {10, 5}, nullptr);
+}
+
+int SelectSorted(Ground &ground) {
+    _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
+    return SelectPage(ground, {3, 1}, &newestFirst);
 }
 
 int Count(Ground &ground) {
@@ -132,6 +145,10 @@ int CountByKeyword(Ground &ground, const char *keyword) {
 
 int CountByForm(Ground &ground) {
     return CountByKeyword(ground, "\"request 3\" FAILED OR clos?d -absent");
+}
+
+int CountByRegex(Ground &ground) {
+    return CountByKeyword(ground, "/request 3.*closed/ -/request \\d\\d/");
 }
 
 int GetHosts(Ground &ground) {
@@ -162,6 +179,12 @@ void SetUpStatistics(Ground &ground) {
            "CREATE TABLE eps (stamp INTEGER, eps INTEGER, device TEXT);"
            "INSERT INTO histogram VALUES ('a', 5), ('b', 7), ('c', 1);"
            "INSERT INTO eps VALUES (100, 1, 'a'), (100, 2, 'b'), (200, 4, 'a'), (400, 9, 'a')");
+}
+
+void SetUpLogsOfTwoPrograms(Ground &ground) {
+    SetUpLogs(ground);
+    ground.conditions = {{SYSLOG_ATTRI_PROG, SYSLOG_OP_LIKE, "prog?1", {}},
+                         {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
 }
 
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
@@ -196,8 +219,11 @@ const std::vector<Operation> &Operations() {
         std::vector<Operation> all = {
             Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
                 "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
+            Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
+                "SELECT * FROM logs WHERE (prog LIKE "),
             Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
             Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
+            WithoutAllocationFaults(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
             Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
             {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
             Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
