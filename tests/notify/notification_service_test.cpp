@@ -102,6 +102,7 @@ TEST_F(NotificationService, SpoolsTheRenderedMessageWithAllThatDeliveryNeeds) {
 
 TEST_F(NotificationService, HasATextForEveryTagInEnglishAndGerman) {
     InstallTexts();
+    std::set<std::string> bodies; // a missing German text would be the English one again
     for (const std::string language : {"enu", "ger"}) {
         WriteSettings("notify_language=\"" + language + "\"\n");
         for (const std::string tag :
@@ -109,9 +110,8 @@ TEST_F(NotificationService, HasATextForEveryTagInEnglishAndGerman) {
               "ShareRename", "ShareEncMount", "ShareEncUnmount", "TEST"}) {
             ASSERT_EQ(Send(("KELOSYSLOG_" + tag).c_str(), {}), 0);
             const Json::Value entry = Take();
-            EXPECT_EQ(entry["language"].asString(), language);
             EXPECT_NE(entry["title"].asString(), "Notification KELOSYSLOG_" + tag);
-            EXPECT_NE(entry["body"].asString(), "");
+            EXPECT_TRUE(bodies.insert(entry["body"].asString()).second) << language << " " << tag;
         }
     }
 }
