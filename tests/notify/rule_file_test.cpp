@@ -45,6 +45,24 @@ TEST_F(RuleFile, ReadsBackWhatTheFormOfTheNumbersKeeps) {
     EXPECT_THAT(Messages(), IsEmpty());
 }
 
+TEST_F(RuleFile, ReadsOddAndMissingValues) {
+    WriteRules(
+        "[none]\n[true]\nnotify_enable=\"true\"\n[blank]\nnotify_enable=\" 1\"\n[plain]\nnotify_type=1x\n"
+        "notify_eps=9223372036854775808\nnotify_enable=1\nnotify_pat=a b\n");
+    _SYSLOG_NOTIFY_RULES_tag rule;
+    ASSERT_EQ(SyslogNotifyConfGet(RulePath(), "plain", rule), 0);
+    EXPECT_EQ(rule.type, 1);
+    EXPECT_EQ(rule.eps, 9223372036854775807u);
+    EXPECT_TRUE(rule.enable);
+    EXPECT_EQ(rule.pattern, "a b");
+    for (const char *name : {"none", "true", "blank"}) {
+        rule = {"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};
+        ASSERT_EQ(SyslogNotifyConfGet(RulePath(), name, rule), 0);
+        EXPECT_FALSE(rule.enable) << name;
+        EXPECT_EQ(rule.eps, 0u);
+    }
+}
+
 TEST_F(RuleFile, ReportsFailureWithTheRecordUnchanged) {
     WriteRules("[R]\nnotify_type=\"1\"\nbroken\n");
     _SYSLOG_NOTIFY_RULES_tag rule{"before", 2, SYSLOG_PRIO_ERR, 9, "old", true};

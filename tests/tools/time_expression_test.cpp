@@ -65,6 +65,14 @@ TEST(TimeExpression, GivesTheSecondThatTheUserMeans) {
     }
 }
 
+// Midnight to midnight has 23 hours on the day that the clocks go forward.
+TEST(TimeExpression, CountsDaysByTheCalendarWhenClocksChange) {
+    const TimeZone zone(kBerlin);
+    constexpr int64_t kMonday = 1585558800; // 2020-03-30 11:00 local time
+    const int64_t today = ParseTimeExpression("--since", "today", kMonday).seconds;
+    EXPECT_EQ(today - ParseTimeExpression("--since", "yesterday", kMonday).seconds, 23 * 3600);
+}
+
 TEST(TimeExpression, RefusesWhatIsNoTimeAndNamesIt) {
     const std::string kBad[] = {"",           "foo",         "2021-02-29", "1900-02-29",   "2020-13-01",
                                 "2020-04-31", "2020-01/02",  "1",          "20200102",     "@x",

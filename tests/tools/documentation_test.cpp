@@ -1,0 +1,98 @@
+// The shell completion and the manual page know what the program knows.
+
+#include <gtest/gtest.h>
+#include <re2/re2.h>
+
+#include <array>
+#include <cstdio>
+#include <memory>
+#include <set>
+#include <vector>
+
+#include "program_run.h"
+#include "support/temp_root.h"
+
+namespace kelo::test {
+namespace {
+
+using Words = std::set<std::string>;
+
+const std::string kCompletion = KELO_SOURCE_DIR "/package/completion/kelosyslog";
+
+// What the one group of `pattern` finds, anywhere in the text; '^' and '$' are line ends.
+Words Matches(const std::string &text, const std::string &pattern) {
+    const RE2 regex("(?m)" + pattern);
+    re2::StringPiece rest(text);
+    Words words;
+    for (std::string word; RE2::FindAndConsume(&rest, regex, &word);)
+        words.insert(word);
+    return words;
+}
+
+// What bash offers for the last of `words`, which are to be quoted for the shell.
+Words Complete(const std::string &words) {
+    const std::string command = "bash -c \". " + kCompletion + "; COMP_WORDS=(kelosyslog " + words +
+                                "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
+                                "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"";
+    const std::unique_ptr<FILE, int (*)(FILE *)> pipe(popen(command.c_str(), "r"), pclose);
+    std::string text;
+    std::array<char, 4096> buffer;
+    for (size_t size = 1; size > 0;) {
+        size = fread(buffer.data(), 1, buffer.size(), pipe.get());
+        text.append(buffer.data(), size);
+    }
+    return Matches(text, "^(.+)$");
+}
+
+std::string InRoff(std::string text) {
+    RE2::GlobalReplace(&text, "-", "\\\\-");
+    return text;
+}
+
+// The commands that a help text lists; what it is the help of stands before each.
+Words CommandsOf(const std::vector<std::string> &parent) {
+    std::vector<std::string> arguments = parent;
+    arguments.push_back("--help");
+    const std::string help = RunTool(arguments).out;
+    return Matches(help.substr(help.find("Subcommands:")), "^  ([a-z-]+)  ");
+}
+
+TEST(Documentation, KnowsEveryCommandAndOption) {
+    const std::string manual = ReadFile(KELO_SOURCE_DIR "/package/man/kelosyslog.1");
+    const Words commands = CommandsOf({});
+    ASSERT_GE(commands.size(), 4U);
+    Words offered = commands;
+    offered.insert({"--root", "--version", "--help"});
+    EXPECT_EQ(Complete("''"), offered);
+    EXPECT_EQ(Complete("db ''"), CommandsOf({"db"}));
+    std::vector<std::vector<std::string>> lines;
+    for (const std::string &command : commands)
+        lines.push_back({command});
+    for (const std::string &command : CommandsOf({"db"}))
+        lines.push_back({"db", command});
+    for (std::vector<std::string> arguments : lines) {
+        std::string line;
+        for (const std::string &word : arguments)
+            line += (line.empty() ? "" : " ") + word;
+        arguments.push_back("--help");
+        Words options = Matches(RunTool(arguments).out, "^  (?:-[A-Za-z],)?(--[a-z-]+)");
+        options.insert("--root");
+        EXPECT_EQ(Complete(line + " --"), options) << line;
+        EXPECT_NE(manual.find(".B kelosyslog " + InRoff(line)), std::string::npos) << line;
+        for (const std::string &option : options)
+            EXPECT_TRUE(option == "--help" || manual.find(InRoff(option)) != std::string::npos) << option;
+    }
+}
+
+TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
+    EXPECT_EQ(Complete("search -p e"), (Words{"emerg", "err"}));
+    EXPECT_EQ(Complete("count --priority = err,\\!e"), (Words{"err,!emerg", "err,!err"}));
+    EXPECT_EQ(Complete("search --facility local0,local7,ke"), (Words{"local0,local7,kern"}));
+    EXPECT_EQ(Complete("search --output = js"), (Words{"json", "jsonl"}));
+    EXPECT_EQ(Complete("values -o s"), Words{});
+    EXPECT_EQ(Complete("db info -o ''"), (Words{"text", "json"}));
+    EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
+}
+
+} // namespace
+} // namespace kelo::test
