@@ -1,6 +1,7 @@
 // Any file can be read, and what a write to it accepts is read back, with all other sections as before.
 
 #include <fuzzer/FuzzedDataProvider.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <cstdlib>
@@ -11,7 +12,6 @@
 #include <string>
 
 #include "keloplatform/torvc.h"
-#include "support/temp_root.h"
 
 // A fuzzer must neither fill the machine's log nor wait for its disk.
 extern "C" void syslog(int, const char *, ...) {}
@@ -25,6 +25,15 @@ namespace {
 [[noreturn]] void Fail(const char *what, const std::string &name) {
     std::fprintf(stderr, "%s: %s\n", what, name.c_str());
     std::abort();
+}
+
+// A folder of this process's own.
+std::string Folder() {
+    const char *parent = std::getenv("TMPDIR");
+    std::string path = std::string(parent != nullptr ? parent : "/tmp") + "/fuzz-XXXXXX";
+    if (mkdtemp(path.data()) == nullptr)
+        Fail("no folder", path);
+    return path;
 }
 
 struct FreeHash {
@@ -56,8 +65,7 @@ std::map<std::string, std::optional<std::string>> Sections(const std::string &pa
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    static const kelo::test::TempRoot root;
-    const std::string path = root.File("file");
+    static const std::string path = Folder() + "/file";
     FuzzedDataProvider input(data, size);
     // As C strings, which end at the first NUL byte.
     const std::string section = input.ConsumeRandomLengthString(16).c_str();
