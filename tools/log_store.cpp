@@ -80,7 +80,12 @@ LogStore::LogStore(const std::string &path, const LogStoreOptions &options)
     insertLog_ = Prepare(kInsertLog);
 }
 
-LogStore::~LogStore() = default;
+LogStore::~LogStore() {
+    // SQLite leaves the write-ahead log of a moved file behind, where a fresh database would be taken for its
+    // owner.
+    if (db_ != nullptr && HasMoved())
+        sqlite3_wal_checkpoint_v2(db_.get(), nullptr, SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr);
+}
 
 void LogStore::Create() {
     file_ = path_ + ".new-" + std::to_string(getpid());
