@@ -23,9 +23,10 @@ constexpr const char *kFolder = "/var/log/kelolog";
 
 constexpr int64_t kSecondMs = 1000;
 constexpr int64_t kBeatMs = 6000;
-constexpr int64_t kHoldMs = 20;       // between looks at the clock while no log may be counted
-constexpr int64_t kSilenceMs = 1000;  // after a signal to stop, this is the end of the input
-constexpr int64_t kFinishMs = 20'000; // for storing and flushing at the end
+constexpr int64_t kHoldMs = 20;          // between looks at the clock while no log may be counted
+constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
+constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
+constexpr int64_t kLeastFinishMs = 2000; // of it, where waiting for the database has taken the time before
 constexpr int64_t kFinishRetryMs = 200;
 
 std::string FolderOf(const ReceiverOptions &options) {
@@ -176,12 +177,13 @@ void Receiver::WriteState() {
 }
 
 void Receiver::Finish() {
-    const int64_t deadline = NowMs() + kFinishMs;
+    now_ = NowMs();
+    const int64_t deadline = std::max(stopTime_.value_or(now_) + kFinishMs, now_ + kLeastFinishMs);
     const auto isOver = [&] { return (now_ = NowMs()) >= deadline; };
     while (writer_ && !isOver() && !writer_->Advance(now_, true))
         poll(nullptr, 0, kFinishRetryMs);
     if (writer_ && writer_->Waiting() > 0)
-        syslog(LOG_ERR, "%zu logs are lost, and what was not read: %s", writer_->Waiting(),
+        syslog(LOG_ERR, "%zu logs are lost, and those not read yet: %s", writer_->Waiting(),
                writer_->Reason().c_str());
     bool isFlushed = accounting_.Finish();
     while (!isFlushed && !isOver()) {
