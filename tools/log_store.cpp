@@ -103,7 +103,7 @@ void LogStore::Create() {
 
 void LogStore::Open(int flags) {
     sqlite3 *db = nullptr;
-    const int status = sqlite3_open_v2(file_.c_str(), &db, flags, nullptr);
+    const int status = sqlite3_open_v2(file_.c_str(), &db, flags | SQLITE_OPEN_NOMUTEX, nullptr);
     db_.reset(db);
     if (status != SQLITE_OK)
         Fail();

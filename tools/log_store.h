@@ -40,8 +40,8 @@ struct LogStoreOptions {
     bool mustSyncCommits = true;
 };
 
-// An open log database. Batches are transactions: after a failure, a kill or a loss of power the database
-// holds whole batches, each with the progress that belongs to it.
+// An open log database, used by one thread at a time. Batches are transactions: after a failure, a kill or a
+// loss of power the database holds whole batches, each with the progress that belongs to it.
 class LogStore {
 public:
     // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
