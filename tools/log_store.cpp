@@ -75,6 +75,7 @@ LogStore::LogStore(const std::string &path, const LogStoreOptions &options)
         Create();
     file_ = path_;
     Open(SQLITE_OPEN_READWRITE);
+    FillEmpty();
     if (!options_.mustSyncCommits)
         Run("PRAGMA synchronous=NORMAL");
     insertLog_ = Prepare(kInsertLog);
@@ -99,6 +100,38 @@ void LogStore::Create() {
     if (renameat2(AT_FDCWD, file_.c_str(), AT_FDCWD, path_.c_str(), RENAME_NOREPLACE) != 0 && errno != EEXIST)
         throw StoreError(path_ + ": " + std::strerror(errno), SQLITE_CANTOPEN, errno);
     SyncFolderOf(path_);
+}
+
+template <typename Work>
+void LogStore::InTransaction(Work work) {
+    Run("BEGIN IMMEDIATE");
+    try {
+        work();
+        Run("COMMIT");
+    } catch (const DatabaseError &) {
+        sqlite3_reset(insertLog_.get());
+        sqlite3_reset(saveProgress_.get());
+        sqlite3_exec(db_.get(), "ROLLBACK", nullptr, nullptr, nullptr);
+        throw;
+    }
+}
+
+// A file that somebody has opened before anybody stored something in it has no table yet.
+void LogStore::FillEmpty() {
+    const auto isEmpty = [this] {
+        const Statement anything = Prepare("SELECT 1 FROM sqlite_schema");
+        const int status = sqlite3_step(anything.get());
+        if (status != SQLITE_ROW && status != SQLITE_DONE)
+            Fail();
+        return status == SQLITE_DONE;
+    };
+    if (!isEmpty())
+        return;
+    Run("PRAGMA journal_mode=WAL");
+    InTransaction([&] {
+        if (isEmpty())
+            Run(kLogsSchema);
+    });
 }
 
 void LogStore::Open(int flags) {
@@ -155,20 +188,6 @@ std::optional<StoreProgress> LogStore::ProgressGet(const std::string &source) {
     progress.offset = static_cast<uint64_t>(sqlite3_column_int64(statement.get(), 1));
     progress.lines = static_cast<uint64_t>(sqlite3_column_int64(statement.get(), 2));
     return progress;
-}
-
-template <typename Work>
-void LogStore::InTransaction(Work work) {
-    Run("BEGIN IMMEDIATE");
-    try {
-        work();
-        Run("COMMIT");
-    } catch (const DatabaseError &) {
-        sqlite3_reset(insertLog_.get());
-        sqlite3_reset(saveProgress_.get());
-        sqlite3_exec(db_.get(), "ROLLBACK", nullptr, nullptr, nullptr);
-        throw;
-    }
 }
 
 void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs) {

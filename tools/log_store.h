@@ -45,8 +45,8 @@ struct LogStoreOptions {
 class LogStore {
 public:
     // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
-    // missing; it appears under its name only when it is complete. All functions throw StoreError, or another
-    // DatabaseError.
+    // missing; it appears under its name only when it is complete. A database without any table gets the
+    // schema too. All functions throw StoreError, or another DatabaseError.
     explicit LogStore(const std::string &path, const LogStoreOptions &options = {});
     ~LogStore();
     LogStore(const LogStore &) = delete;
@@ -78,6 +78,7 @@ private:
 
     void Open(int flags);
     void Create();
+    void FillEmpty();
     void Run(const char *sql);
     Statement Prepare(const char *sql);
     void StepToEnd(sqlite3_stmt *statement);

@@ -1,9 +1,14 @@
 // kelosyslog receive: counts, checks and stores the logs that syslog-ng hands over.
 
+#include <fcntl.h>
+#include <sys/file.h>
 #include <syslog.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
+#include <cstring>
+#include <filesystem>
 #include <system_error>
 
 #include "errors.h"
@@ -28,12 +33,32 @@ struct Options {
     bool verbose = false;
 };
 
+// Held as long as the program runs: two receivers would overwrite each other's counts. After a restart of
+// syslog-ng the old one may still be storing, and is waited for.
+FileHandle LockAgainstOthers(const std::string &root) {
+    const std::filesystem::path path = root + "/run/kelosyslog/receive.lock";
+    std::error_code ignored; // opening fails then, and says why
+    std::filesystem::create_directories(path.parent_path(), ignored);
+    FileHandle file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
+    if (file && flock(file.Get(), LOCK_EX | LOCK_NB) == 0)
+        return file;
+    if (file && errno == EWOULDBLOCK) {
+        syslog(LOG_NOTICE, "waiting for another receiver to end: %s", path.c_str());
+        while (flock(file.Get(), LOCK_EX) != 0 && errno == EINTR) {
+        }
+        return file;
+    }
+    syslog(LOG_WARNING, "cannot lock %s: %s", path.c_str(), std::strerror(errno));
+    return file;
+}
+
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
     // A limit of the file size is a full disk like any other.
     std::signal(SIGXFSZ, SIG_IGN);
     openlog("kelosyslog", LOG_PID | (options.verbose ? LOG_PERROR : 0), LOG_DAEMON);
+    const FileHandle lock = LockAgainstOthers(root);
     try {
         Receiver(options.receiver).Run(STDIN_FILENO);
     } catch (const std::system_error &error) {
