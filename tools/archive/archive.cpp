@@ -301,9 +301,9 @@ int Run(const Options &options, const std::string &root) {
     try {
         const StopSignals signals;
         return command.Make(source);
-    } catch (const Interrupted &) {
+    } catch (const Interrupted &interruption) {
         // Ends as the signal would have ended it.
-        std::raise(StopSignals::Received());
+        std::raise(interruption.signal);
         return kExitSystem;
     }
 }

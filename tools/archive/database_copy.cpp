@@ -17,7 +17,6 @@ namespace kelo::tool {
 namespace {
 
 constexpr int kPagesPerStep = 1024;
-constexpr int64_t kLockTimeoutMs = 10'000;
 
 SqliteFile OpenSource(const std::string &path) {
     if (!std::filesystem::is_regular_file(path)) // a pipe would wait for its other end
@@ -55,8 +54,7 @@ void CopyPages(SqliteFile &source, SqliteFile &copy, const std::function<void(ui
 // Returns the number of the order's logs at the moment that was copied.
 uint64_t CopySnapshot(const CopyOrder &order, const std::string &target) {
     SqliteFile source = OpenSource(order.source);
-    source.Run("BEGIN");
-    source.RunWaiting("SELECT 1 FROM sqlite_schema", kLockTimeoutMs);
+    source.Run("BEGIN; SELECT 1 FROM sqlite_schema");
     const uint64_t logs = CountIn(source, order.host);
     SqliteFile copy(target, SqliteFile::Mode::kWrite);
     copy.Run("PRAGMA synchronous=OFF; PRAGMA journal_mode=OFF"); // a copy that fails is thrown away
@@ -132,27 +130,22 @@ uint64_t CountLogs(const std::string &source, const std::string &host) {
 DatabaseCopy CopyDatabase(const CopyOrder &order, ArchiveFolder &folder) {
     DatabaseCopy copy;
     const std::string whole = folder.NewTemporary();
-    try {
-        copy.logs = CopySnapshot(order, whole);
-        copy.path = Refine(order, whole, folder);
-        if (copy.path != whole)
-            folder.RemoveTemporary(whole);
-        Describe(order.device, copy);
-        SqliteFile written(copy.path, SqliteFile::Mode::kRead);
-        if (const uint64_t found = CountIn(written, ""); found != copy.logs)
-            throw DatabaseError(order.source + ": the copy holds " + std::to_string(found) +
-                                " logs instead of " + std::to_string(copy.logs));
-    } catch (...) {
+    copy.logs = CopySnapshot(order, whole);
+    copy.path = Refine(order, whole, folder);
+    if (copy.path != whole)
         folder.RemoveTemporary(whole);
-        folder.RemoveTemporary(copy.path);
-        throw;
-    }
+    Describe(order.device, copy);
+    SqliteFile written(copy.path, SqliteFile::Mode::kRead);
+    if (const uint64_t found = CountIn(written, ""); found != copy.logs)
+        throw DatabaseError(order.source + ": the copy holds " + std::to_string(found) + " logs instead of " +
+                            std::to_string(copy.logs));
     return copy;
 }
 
 DatabaseCopy MakeArchive(const CopyOrder &order, ArchiveFolder &folder, bool willRemove) {
     DatabaseCopy archive = CopyDatabase(order, folder);
     const std::string name = folder.FreeName(order.device, archive.firstDate, archive.lastDate);
+    StopSignals::Check();
     if (willRemove)
         folder.NoteRemoval(name, order.source);
     archive.path = folder.Publish(archive.path, name, order.source);

@@ -35,7 +35,7 @@ uint64_t CountLogs(const std::string &source, const std::string &host);
 // damage, and is one file in rollback-journal mode that can be read from anywhere.
 //
 // Throws DatabaseError (the source cannot be read or is damaged, the disk is full), OutputError and
-// Interrupted; then nothing is left in the folder.
+// Interrupted; what was copied goes with `folder`.
 DatabaseCopy CopyDatabase(const CopyOrder &order, ArchiveFolder &folder);
 
 // Copies and gives the copy its name; returns what was made, with the archive's path. With `willRemove` the

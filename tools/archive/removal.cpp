@@ -16,7 +16,7 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-constexpr int64_t kLockTimeoutMs = 30'000;
+constexpr int kLockTimeoutMs = 30'000;
 constexpr int64_t kFirstRowLimit = 10'000;
 constexpr int64_t kLeastRowLimit = 100;
 constexpr int64_t kMostRowLimit = 100'000;
@@ -28,7 +28,6 @@ constexpr int kRowsPerLook = 100;
 constexpr off_t kLargestWal = off_t{32} << 20;
 // A checkpoint that waits for readers keeps writers waiting with it.
 constexpr int kCheckpointTimeoutMs = 200;
-constexpr int kBusyTimeoutMs = 1000;
 
 constexpr const char *kRows = "SELECT id, utcsec, host, prog, msg FROM logs WHERE id >= ?1 ORDER BY id";
 constexpr const char *kRemove =
@@ -44,13 +43,16 @@ off_t SizeOf(const std::string &path) {
 
 Removal::Removal(const std::string &source, const std::string &archive)
     : source_(source, SqliteFile::Mode::kWrite), archive_(archive, SqliteFile::Mode::kRead),
-      rows_(archive_.Prepare(kRows)), remove_(source_.Prepare(kRemove)), rowLimit_(kFirstRowLimit) {}
+      rows_(archive_.Prepare(kRows)), remove_(source_.Prepare(kRemove)), rowLimit_(kFirstRowLimit) {
+    source_.SetBusyTimeout(kLockTimeoutMs);
+}
 
 void Removal::Run() {
     try {
         sqlite3_bind_int64(rows_.get(), 1, source_.Number("SELECT min(id) FROM logs"));
         hasRow_ = archive_.Step(rows_.get());
         while (hasRow_) {
+            StopSignals::Check();
             const auto start = steady_clock::now();
             if (RemoveSome())
                 std::this_thread::sleep_for(
@@ -65,12 +67,12 @@ void Removal::Run() {
 
 // One transaction. Returns whether it removed anything.
 bool Removal::RemoveSome() {
-    source_.RunWaiting("BEGIN IMMEDIATE", kLockTimeoutMs);
+    source_.Run("BEGIN IMMEDIATE");
     const auto start = steady_clock::now();
     uint64_t count = 0;
     try {
         count = RemoveRows();
-        source_.RunWaiting("COMMIT", kLockTimeoutMs);
+        source_.Run("COMMIT");
     } catch (...) {
         sqlite3_reset(remove_.get());
         sqlite3_exec(source_.Get(), "ROLLBACK", nullptr, nullptr, nullptr);
@@ -105,9 +107,9 @@ void Removal::BoundWriteAheadLog() {
         return;
     // Most of it first, without keeping writers out.
     sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_PASSIVE, nullptr, nullptr);
-    sqlite3_busy_timeout(source_.Get(), kCheckpointTimeoutMs);
+    source_.SetBusyTimeout(kCheckpointTimeoutMs);
     sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr);
-    sqlite3_busy_timeout(source_.Get(), kBusyTimeoutMs);
+    source_.SetBusyTimeout(kLockTimeoutMs);
 }
 
 } // namespace kelo::tool

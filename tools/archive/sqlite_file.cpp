@@ -4,6 +4,7 @@
 
 #include <chrono>
 #include <cstring>
+#include <thread>
 #include <utility>
 
 #include "archive/stop_signals.h"
@@ -12,11 +13,20 @@
 namespace kelo::tool {
 namespace {
 
-constexpr int kBusyTimeoutMs = 1000; // so that a signal is noticed
+constexpr int kBusyTimeoutMs = 10'000;
 constexpr int kInstructionsPerCheck = 10000;
 
 int MustStop(void *) {
     return StopSignals::Received() != 0 ? 1 : 0;
+}
+
+// Asks for a lock every millisecond: with growing pauses, as SQLite makes them by itself, it would hardly
+// ever meet the short moment between two transactions of a busy writer.
+int WaitForLock(void *timeoutMs, int calls) {
+    if (StopSignals::Received() != 0 || calls >= *static_cast<int *>(timeoutMs))
+        return 0;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return 1;
 }
 
 void Bind(sqlite3_stmt *statement, const std::string &value) {
@@ -33,14 +43,15 @@ void SqliteFile::Close::operator()(sqlite3 *db) const {
     sqlite3_close(db);
 }
 
-SqliteFile::SqliteFile(std::string path, Mode mode) : path_(std::move(path)) {
+SqliteFile::SqliteFile(std::string path, Mode mode)
+    : path_(std::move(path)), busyTimeoutMs_(std::make_unique<int>(kBusyTimeoutMs)) {
     sqlite3 *db = nullptr;
     const int flags = mode == Mode::kRead ? SQLITE_OPEN_READONLY : SQLITE_OPEN_READWRITE;
     const int status = sqlite3_open_v2(path_.c_str(), &db, flags, nullptr);
     db_.reset(db);
     if (status != SQLITE_OK)
         Fail(status);
-    sqlite3_busy_timeout(db, kBusyTimeoutMs);
+    SetBusyTimeout(kBusyTimeoutMs);
     sqlite3_progress_handler(db, kInstructionsPerCheck, MustStop, nullptr);
     // What the file's schema holds must do nothing but store.
     sqlite3_db_config(db, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
@@ -49,8 +60,8 @@ SqliteFile::SqliteFile(std::string path, Mode mode) : path_(std::move(path)) {
 }
 
 void SqliteFile::Fail(int status) {
-    if (status == SQLITE_INTERRUPT)
-        throw Interrupted();
+    if (status == SQLITE_INTERRUPT || status == SQLITE_BUSY)
+        StopSignals::Check();
     std::string cause = db_ != nullptr ? sqlite3_errmsg(db_.get()) : sqlite3_errstr(status);
     const int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
     if (systemError != 0)
@@ -71,17 +82,9 @@ void SqliteFile::Run(const std::string &sql, const std::string &value) {
     }
 }
 
-void SqliteFile::RunWaiting(const std::string &sql, int64_t timeoutMs) {
-    using std::chrono::steady_clock;
-    const auto end = steady_clock::now() + std::chrono::milliseconds(timeoutMs);
-    for (;;) {
-        StopSignals::Check();
-        const int status = sqlite3_exec(db_.get(), sql.c_str(), nullptr, nullptr, nullptr);
-        if (status == SQLITE_OK)
-            return;
-        if ((status != SQLITE_BUSY && status != SQLITE_LOCKED) || steady_clock::now() >= end)
-            Fail(status);
-    }
+void SqliteFile::SetBusyTimeout(int timeoutMs) {
+    *busyTimeoutMs_ = timeoutMs;
+    sqlite3_busy_handler(db_.get(), WaitForLock, busyTimeoutMs_.get());
 }
 
 SqliteStatement SqliteFile::Prepare(const std::string &sql) {

@@ -26,12 +26,13 @@ public:
     // reading in both modes.
     SqliteFile(std::string path, Mode mode);
 
+    // How long a statement waits for a locked database; at first ten seconds.
+    void SetBusyTimeout(int timeoutMs);
+
     // Runs any number of statements without values, and drops their rows.
     void Run(const std::string &sql);
     // The same with one value for ?1.
     void Run(const std::string &sql, const std::string &value);
-    // Runs one statement that may find the database locked; waits up to `timeoutMs` in all.
-    void RunWaiting(const std::string &sql, int64_t timeoutMs);
     SqliteStatement Prepare(const std::string &sql);
     // Returns whether there is a row.
     bool Step(sqlite3_stmt *statement);
@@ -51,6 +52,7 @@ private:
         void operator()(sqlite3 *db) const;
     };
     std::string path_;
+    std::unique_ptr<int> busyTimeoutMs_; // SQLite knows its address
     std::unique_ptr<sqlite3, Close> db_;
 };
 

@@ -12,7 +12,6 @@ void Note(int signal) {
 } // namespace
 
 StopSignals::StopSignals() {
-    received = 0;
     struct sigaction action {};
     action.sa_handler = Note;
     sigemptyset(&action.sa_mask);
@@ -27,6 +26,7 @@ StopSignals::StopSignals() {
 StopSignals::~StopSignals() {
     for (size_t i = 0; i < 3; ++i)
         sigaction(kSignals[i], &before_[i], nullptr);
+    received = 0;
 }
 
 int StopSignals::Received() {
@@ -35,7 +35,7 @@ int StopSignals::Received() {
 
 void StopSignals::Check() {
     if (received != 0)
-        throw Interrupted();
+        throw Interrupted(received);
 }
 
 } // namespace kelo::tool

@@ -6,7 +6,10 @@
 namespace kelo::tool {
 
 // The user or the service manager asked the program to stop; what was half done has been undone.
-struct Interrupted : std::exception {};
+struct Interrupted : std::exception {
+    explicit Interrupted(int by) : signal(by) {}
+    int signal;
+};
 
 // While the object lives, INT, TERM and HUP only leave a mark, so that the work can end tidily. One object at
 // a time.
