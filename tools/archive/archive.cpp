@@ -91,8 +91,8 @@ class ArchiveCommand {
 public:
     ArchiveCommand(const Options &options, const std::string &root)
         : options_(options),
-          folder_(options.to.empty() ? ArchiveFolderPath(root)
-                                     : fs::absolute(options.to).lexically_normal().string()) {
+          folder_(options.to.empty() ? ArchiveFolderPath(root) : fs::absolute(options.to).string()) {
+        folder_ = fs::weakly_canonical(folder_).string();
         RequireSense();
         if (!options.keep.empty()) {
             const int64_t now = std::time(nullptr);
@@ -126,7 +126,7 @@ public:
     }
 
     int Prune() {
-        const ArchiveFolder folder(folder_, false);
+        const ArchiveFolder folder(folder_, options_.to.empty());
         const std::vector<Archive> expired = Expired(ListArchives(folder_), retention_);
         if (expired.empty()) {
             Print("no archive to remove in " + folder_ + "\n");
@@ -147,10 +147,9 @@ public:
             return kExitNothing;
         ArchiveFolder folder(folder_, options_.to.empty());
         const uint64_t resumed = options_.isRemoving ? ResumeRemovals(source.path, folder) : 0;
-        if (!Copy(source.path, folder))
-            return resumed > 0 ? kExitFound : kExitNothing;
+        const bool isMade = Copy(source.path, folder);
         RemoveExpired(Expired(ListArchives(folder_), retention_));
-        return kExitFound;
+        return isMade || resumed > 0 ? kExitFound : kExitNothing;
     }
 
     void RefuseArchive(const LogSource &source) const {
@@ -294,7 +293,8 @@ int Run(const Options &options, const std::string &root) {
         return command.List();
     if (options.isPruning)
         return command.Prune();
-    const LogSource source = ResolveLogSource(options.source, root);
+    LogSource source = ResolveLogSource(options.source, root);
+    source.path = fs::weakly_canonical(source.path).string(); // one name for the note of a removal
     if (source.kind != TableKind::Logs)
         throw UsageError("--log: only logs in table logs can be archived, not '" + options.source.log + "'");
     command.RefuseArchive(source);
