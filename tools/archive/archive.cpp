@@ -1,24 +1,18 @@
 // kelosyslog archive: copies a log database into an archive, and keeps the archives.
 
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <climits>
 #include <csignal>
 #include <ctime>
+#include <exception>
 #include <filesystem>
 
+#include "archive/archive_run.h"
 #include "archive/database_copy.h"
-#include "archive/removal.h"
 #include "archive/retention.h"
 #include "archive/stop_signals.h"
 #include "common_options.h"
 #include "confirm.h"
 #include "errors.h"
 #include "exit_status.h"
-#include "kelosyslog/logger.h"
-#include "log_message_capture.h"
-#include "progress_bar.h"
 #include "statistics_table.h"
 #include "time_expression.h"
 
@@ -58,34 +52,6 @@ struct Options {
     bool inUtc = false;
 };
 
-std::string Logs(uint64_t count) {
-    return std::to_string(count) + (count == 1 ? " log" : " logs");
-}
-
-std::string NameOfThisMachine() {
-    char name[HOST_NAME_MAX + 1] = {};
-    gethostname(name, sizeof name - 1);
-    return name;
-}
-
-uint64_t SizeOf(const std::string &path) {
-    struct stat status {};
-    return stat(path.c_str(), &status) == 0 ? static_cast<uint64_t>(status.st_size) : 0;
-}
-
-// An event that cannot be written must not cost the archive.
-void AddEvent(int (Logger::*add)(std::string), const std::string &source) {
-    std::string reason;
-    {
-        const LogMessageCapture messages;
-        Logger logger;
-        if ((logger.*add)(source) == 0)
-            return;
-        reason = messages.FirstLine();
-    }
-    PrintMessage("warning: the server's event log does not record this: " + reason);
-}
-
 // The command as the options say, with the folder that it works in.
 class ArchiveCommand {
 public:
@@ -122,7 +88,7 @@ public:
                        isText ? time.Plain(archive.last) : time.Iso(archive.last),
                        std::to_string(archive.logs), std::to_string(archive.bytes)});
         Print(table.Write(format, !options_.noHeader));
-        return table.IsEmpty() ? kExitNothing : kExitFound;
+        return Finish(table.IsEmpty() ? kExitNothing : kExitFound);
     }
 
     int Prune() {
@@ -130,32 +96,35 @@ public:
         const std::vector<Archive> expired = Expired(ListArchives(folder_), retention_);
         if (expired.empty()) {
             Print("no archive to remove in " + folder_ + "\n");
-            return kExitNothing;
+            return Finish(kExitNothing);
         }
         const std::string action = "remove " + std::to_string(expired.size()) +
                                    (expired.size() == 1 ? " archive from " : " archives from ") + folder_;
         if (!MayRemove(action))
             return kExitNothing;
         RemoveExpired(expired);
-        return kExitFound;
+        return Finish(kExitFound);
     }
 
     int Make(const LogSource &source) {
         if (options_.isDryRun)
             return Preview(source.path);
-        if (!MayRemove(PlannedRemovals(source.path)))
-            return kExitNothing;
         ArchiveFolder folder(folder_, options_.to.empty());
-        const uint64_t resumed = options_.isRemoving ? ResumeRemovals(source.path, folder) : 0;
-        const bool isMade = Copy(source.path, folder);
+        ArchiveRun run({source.path, options_.device, options_.isRemoving}, folder,
+                       [this](const std::string &text) { Print(text); });
+        const bool hasDone = run.Run();
+        retention_.spared = run.Made();
         RemoveExpired(Expired(ListArchives(folder_), retention_));
-        return isMade || resumed > 0 ? kExitFound : kExitNothing;
+        return Finish(hasDone ? kExitFound : kExitNothing);
     }
 
     void RefuseArchive(const LogSource &source) const {
         if (fs::path(source.path).parent_path() == folder_)
             throw UsageError(source.path + " is in the folder of the archives already");
     }
+
+    // Asks, where something is to be removed.
+    bool MayMake(const LogSource &source) const { return MayRemove(PlannedRemovals(source.path)); }
 
 private:
     // Refuses an option that would silently do nothing.
@@ -180,10 +149,21 @@ private:
             throw UsageError("--output: goes with --list only");
     }
 
-    static void Print(const std::string &text) {
-        Output output(false);
-        output.Write(text);
-        output.Finish();
+    // What cannot be told must not keep from doing the rest.
+    void Print(const std::string &text) {
+        try {
+            Output output(false);
+            output.Write(text);
+            output.Finish();
+        } catch (const std::exception &) {
+            outputFailure_ = std::current_exception();
+        }
+    }
+
+    int Finish(int status) const {
+        if (outputFailure_)
+            std::rethrow_exception(outputFailure_);
+        return status;
     }
 
     bool MayRemove(const std::string &action) const {
@@ -202,72 +182,12 @@ private:
         return action;
     }
 
-    std::string WhatLogs(uint64_t count) const {
-        return Logs(count) + (options_.device.empty() ? "" : " of " + options_.device);
-    }
-
     int Preview(const std::string &source) {
         const uint64_t count = CountLogs(source, options_.device);
-        Print("would archive " + WhatLogs(count) + " from " + source + " to " + folder_ +
-              (options_.isRemoving ? " and remove them there" : "") + "\n");
+        Print("would archive " + LogsOf(count, options_.device) + " from " + source + " to " + folder_ +
+              (options_.isRemoving ? ", and remove them from the database" : "") + "\n");
         RemoveExpired(Expired(ListArchives(folder_), retention_));
-        return count > 0 ? kExitFound : kExitNothing;
-    }
-
-    // Returns whether there was something to archive.
-    bool Copy(const std::string &source, ArchiveFolder &folder) {
-        DatabaseCopy archive;
-        try {
-            if (CountLogs(source, options_.device) == 0) {
-                PrintMessage(source + " holds no logs" +
-                             (options_.device.empty() ? "" : " of " + options_.device) +
-                             "; nothing archived");
-                return false;
-            }
-            AddEvent(&Logger::LogAddArchStart, source);
-            ProgressBar bar(SizeOf(source));
-            CopyOrder order{source, options_.device, options_.device};
-            if (options_.device.empty())
-                order.device = NameOfThisMachine();
-            order.onCopied = [&bar](uint64_t bytes) { bar.Add(bytes); };
-            archive = MakeArchive(order, folder, options_.isRemoving);
-        } catch (const Interrupted &) {
-            PrintMessage("interrupted; nothing archived");
-            AddEvent(&Logger::LogAddArchFailed, source);
-            throw;
-        } catch (const std::exception &) {
-            AddEvent(&Logger::LogAddArchFailed, source);
-            throw;
-        }
-        AddEvent(&Logger::LogAddArchFinish, source);
-        Print("archived " + WhatLogs(archive.logs) + " from " + source + " to " + archive.path + " (" +
-              FormatSize(SizeOf(archive.path)) + ")\n");
-        retention_.spared = fs::path(archive.path).filename().string();
-        if (options_.isRemoving)
-            RemoveArchived(source, folder, retention_.spared);
-        return true;
-    }
-
-    // What earlier runs archived and could not remove.
-    uint64_t ResumeRemovals(const std::string &source, ArchiveFolder &folder) {
-        uint64_t removed = 0;
-        for (const std::string &name : folder.PendingRemovals(source))
-            removed += RemoveArchived(source, folder, name);
-        return removed;
-    }
-
-    uint64_t RemoveArchived(const std::string &source, ArchiveFolder &folder, const std::string &name) {
-        Removal removal(source, folder.Path() + "/" + name);
-        try {
-            removal.Run();
-        } catch (const Interrupted &) {
-            PrintMessage("interrupted; " + Logs(removal.Removed()) + " of " + name + " were removed from " +
-                         source + ", the next run with --remove-archived removes the others");
-            throw;
-        }
-        folder.ForgetRemoval(name);
-        Print("removed " + Logs(removal.Removed()) + " from " + source + ", which " + name + " holds\n");
-        return removal.Removed();
+        return Finish(count > 0 ? kExitFound : kExitNothing);
     }
 
     void RemoveExpired(const std::vector<Archive> &expired) {
@@ -276,7 +196,7 @@ private:
             if (!options_.isDryRun && !RemoveDurably(path))
                 throw OutputError("cannot remove " + path);
             Print(std::string(options_.isDryRun ? "would remove " : "removed ") + path + " (" +
-                  Logs(archive.logs) + " up to " + TimeFormat(false).Plain(archive.last) + ", " +
+                  LogsOf(archive.logs, "") + " up to " + TimeFormat(false).Plain(archive.last) + ", " +
                   FormatSize(archive.bytes) + ")\n");
         }
     }
@@ -284,6 +204,7 @@ private:
     const Options &options_;
     std::string folder_;
     Retention retention_;
+    std::exception_ptr outputFailure_;
 };
 
 int Run(const Options &options, const std::string &root) {
@@ -298,6 +219,8 @@ int Run(const Options &options, const std::string &root) {
     if (source.kind != TableKind::Logs)
         throw UsageError("--log: only logs in table logs can be archived, not '" + options.source.log + "'");
     command.RefuseArchive(source);
+    if (!command.MayMake(source))
+        return kExitNothing;
     try {
         const StopSignals signals;
         return command.Make(source);
