@@ -64,5 +64,6 @@ void AddNotify(Program &program);
 void AddParse(Program &program);
 void AddReceive(Program &program);
 void AddDb(Program &program);
+void AddArchive(Program &program);
 
 } // namespace kelo::tool
