@@ -22,7 +22,7 @@ void LookAtSyslogNg(const SyslogNgStatus &status, Lines &lines) {
                         ")");
     for (const SyslogNgCounters &destination : status.destinations) {
         if (destination.dropped > 0)
-            lines.push_back("syslog-ng dropped " + Grouped(destination.dropped) + " messages for " +
+            lines.push_back("syslog-ng dropped " + Counted(destination.dropped, "message") + " for " +
                             destination.id + " (" + destination.instance + ")");
     }
 }
@@ -66,7 +66,7 @@ void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &l
     if (!status.problem.empty())
         lines.push_back("notifications: " + status.problem);
     if (status.failed > 0)
-        lines.push_back(Grouped(status.failed) + " notifications were given up (kelosyslog notify list)");
+        lines.push_back("given up: " + Counted(status.failed, "notification") + " (kelosyslog notify list)");
     if (status.oldest != 0 && now - status.oldest > kLongestWaitSec)
         lines.push_back("a notification has waited for " + Duration(now - status.oldest) +
                         "; does kelonotify run?");

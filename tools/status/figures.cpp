@@ -12,6 +12,10 @@ std::string Grouped(uint64_t number) {
     return text;
 }
 
+std::string Counted(uint64_t number, const std::string &noun) {
+    return Grouped(number) + " " + noun + (number == 1 ? "" : "s");
+}
+
 std::string Bytes(int64_t bytes) {
     constexpr const char *kUnits[] = {"KiB", "MiB", "GiB", "TiB"};
     if (bytes < 1024)

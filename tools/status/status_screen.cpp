@@ -41,7 +41,8 @@ std::string Rate(double perSecond) {
 void AddSection(Lines &lines, const std::string &name, const std::string &text, const char *colour) {
     constexpr size_t kColumn = 15;
     lines.push_back({});
-    lines.push_back({name + std::string(kColumn - name.size(), ' ') + VisibleText(text), colour});
+    const std::string value = VisibleText(text);
+    lines.push_back({value.empty() ? name : name + std::string(kColumn - name.size(), ' ') + value, colour});
 }
 
 void AddText(Lines &lines, const std::string &text, const char *colour = kPlain) {
@@ -68,8 +69,8 @@ void AddSyslogNg(Lines &lines, const SyslogNgStatus &status) {
         AddText(lines, "no counters: " + status.control + ": " + status.problem);
         return;
     }
-    AddText(lines, Grouped(status.Received()) + " messages received by " +
-                       std::to_string(status.sources.size()) + " sources");
+    AddText(lines, Counted(status.Received(), "message") + " received by " +
+                       Counted(status.sources.size(), "source"));
     StatisticsTable table({{"destination", false},
                            {"processed", true},
                            {"written", true},
@@ -139,7 +140,7 @@ void AddDatabases(Lines &lines, const ServerStatus &status) {
     }
     AddTable(lines, table, colours);
     const ArchiveStatus &archives = status.archives;
-    AddText(lines, Grouped(static_cast<uint64_t>(archives.files)) + " archives, " + Bytes(archives.size) +
+    AddText(lines, Counted(static_cast<uint64_t>(archives.files), "archive") + ", " + Bytes(archives.size) +
                        (archives.problem.empty() ? "" : ": " + archives.problem));
 }
 

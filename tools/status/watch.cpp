@@ -97,12 +97,12 @@ private:
     bool isKeyboardGone_ = false;
 };
 
-// The screen over the one before: each line ends with the erasure of what stood behind it.
+// The screen over the one before: each line is erased before it is written.
 std::string InPlace(const std::string &screen) {
     std::string text = "\x1b[H";
     for (size_t at = 0; at < screen.size();) {
         const size_t end = std::min(screen.find('\n', at), screen.size());
-        text += (at == 0 ? "" : "\r\n") + screen.substr(at, end - at) + "\x1b[K";
+        text += (at == 0 ? "" : "\n") + ("\x1b[K" + screen.substr(at, end - at));
         at = end + 1;
     }
     return text + "\x1b[J";
