@@ -294,8 +294,10 @@ TEST_F(Status, FitsTheScreenWhateverTheTextsHold) {
     ASSERT_TRUE(status.accounting);
     EXPECT_DOUBLE_EQ(status.accounting->perSecond, 2);
     const std::string whole = RenderStatus(status, {});
-    for (const char *part : {"All is well", "7 messages received by 1 source\n", "line\\nfeed",
-                             "b\\x1b[7m\\xff   180     75.0", TimeFormat(false).Plain(1577836802).c_str()})
+    const std::vector<std::string> parts = {"All is well", "7 messages received by 1 source\n", "line\\nfeed",
+                                            "b\\x1b[7m\\xff   180     75.0",
+                                            TimeFormat(false).Plain(1577836802)};
+    for (const std::string &part : parts)
         EXPECT_NE(whole.find(part), std::string::npos) << part << " in\n" << whole;
     std::istringstream lines(RenderStatus(status, {30, 12, false}));
     size_t count = 0;
