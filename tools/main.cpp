@@ -30,5 +30,6 @@ int main(int argc, char **argv) {
     kelo::tool::AddReceive(program);
     kelo::tool::AddDb(program);
     kelo::tool::AddArchive(program);
+    kelo::tool::AddStatus(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

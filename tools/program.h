@@ -65,5 +65,6 @@ void AddParse(Program &program);
 void AddReceive(Program &program);
 void AddDb(Program &program);
 void AddArchive(Program &program);
+void AddStatus(Program &program);
 
 } // namespace kelo::tool
