@@ -28,5 +28,6 @@ int main(int argc, char **argv) {
     kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
     kelo::tool::AddDb(program);
+    kelo::tool::AddArchive(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

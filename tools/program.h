@@ -63,5 +63,6 @@ void AddRules(Program &program);
 void AddNotify(Program &program);
 void AddParse(Program &program);
 void AddDb(Program &program);
+void AddArchive(Program &program);
 
 } // namespace kelo::tool
