@@ -13,11 +13,8 @@ namespace {
 
 // Logs a second of the `seconds` that end with `newest`.
 double MeanRate(const std::string &path, int64_t newest, int64_t seconds) {
-    EpsSeries series(EpsInterval::Hour);
-    ReadEps(path, newest - seconds + 1, newest, series);
-    uint64_t logs = 0;
-    for (const auto &[start, bucket] : series.Buckets())
-        logs += bucket.logs;
+    int64_t logs = 0;
+    ReadEps(path, newest - seconds + 1, newest, [&](const SYSLOG_LOG_EPS &sample) { logs += sample.eps; });
     return static_cast<double>(logs) / static_cast<double>(seconds);
 }
 

@@ -133,9 +133,9 @@ std::vector<DatabaseStatus> GatherDatabases(const std::string &root, const std::
     all.push_back(Look("logs", ResolveLogSource({}, root).path, "logs"));
     for (int32_t i = 0; i < g_xferlog_info_count - 1; ++i) {
         const std::string name = g_xferlog_info[i].name;
-        const DatabaseStatus log = Look(name, ResolveLogSource({"", name, ""}, root).path, "transfer_log");
-        if (log.state != State::Missing || log.quarantined)
-            all.push_back(log);
+        const std::string path = ResolveLogSource({"", name, ""}, root).path;
+        if (SizeOf(path) || SizeOf(path + ".corrupt"))
+            all.push_back(Look(name, path, "transfer_log"));
     }
     all.push_back(Look("accounting", AccountingPath("", root), "eps"));
     all.push_back(Look("events", EventDatabasePath("", root), "log"));

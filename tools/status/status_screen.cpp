@@ -65,6 +65,8 @@ void AddSyslogNg(Lines &lines, const SyslogNgStatus &status) {
     if (status.pid != 0)
         text += ", process " + std::to_string(status.pid);
     AddSection(lines, "syslog-ng", text, isGood ? kHeading : kBad);
+    if (status.state == SyslogNgStatus::State::Stopped)
+        return;
     if (!status.problem.empty()) {
         AddText(lines, "no counters: " + status.control + ": " + status.problem);
         return;
