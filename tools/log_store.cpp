@@ -104,6 +104,7 @@ void LogStore::Create() {
 
 template <typename Work>
 void LogStore::InTransaction(Work work) {
+    errno = 0; // what an earlier operation left there is no reason for a failure of ours
     Run("BEGIN IMMEDIATE");
     try {
         work();
@@ -144,12 +145,16 @@ void LogStore::Open(int flags) {
 }
 
 void LogStore::Fail() {
+    const int lastError = errno;
     std::string cause = db_ != nullptr ? sqlite3_errmsg(db_.get()) : "out of memory";
-    const int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
+    const int code = db_ != nullptr ? sqlite3_errcode(db_.get()) & 0xff : SQLITE_NOMEM;
+    // SQLite forgets the reason of a write that fails within a statement.
+    int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
+    if (systemError == 0 && code == SQLITE_IOERR)
+        systemError = lastError;
     if (systemError != 0)
         cause += std::string(" (") + std::strerror(systemError) + ")";
-    throw StoreError(path_ + ": " + cause, db_ != nullptr ? sqlite3_errcode(db_.get()) & 0xff : SQLITE_NOMEM,
-                     systemError);
+    throw StoreError(path_ + ": " + cause, code, systemError);
 }
 
 void LogStore::Run(const char *sql) {

@@ -15,9 +15,9 @@ namespace kelo::tool {
 namespace {
 
 constexpr int64_t kBatchMs = 500;
-// For a lock SQLite itself waits a second each time.
+// SQLite itself waits a second for a lock, at each try.
 constexpr LogStoreOptions kStoreOptions{.busyTimeoutMs = 1000, .mustSyncCommits = false};
-constexpr int64_t kRetryLockedMs = 100;
+constexpr int64_t kRetrySoonMs = 100;
 constexpr int64_t kRetryMs = 1000;
 constexpr int64_t kRetryDamagedMs = 60'000; // each try notifies the administrator
 
@@ -84,14 +84,16 @@ void LogWriter::Open() {
     if (store_)
         return;
     // A write-ahead log that was left alone would be taken for one of the fresh database.
-    if (!IsThere(path_) && IsThere(path_ + "-wal"))
+    std::error_code isMissing;
+    const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
+    if (!IsThere(path_) && !isMissing && walBytes > 0)
         std::rename((path_ + "-wal").c_str(), (path_ + ".corrupt-wal").c_str());
     store_.emplace(path_, kStoreOptions);
 }
 
 void LogWriter::Pause(const StoreError &error, int64_t now) {
     const bool isLocked = error.code == SQLITE_BUSY || error.code == SQLITE_LOCKED;
-    retryTime_ = now + (isLocked ? kRetryLockedMs : kRetryMs);
+    retryTime_ = now + (isLocked ? kRetrySoonMs : kRetryMs);
     if (reason_.empty())
         pauseTime_ = now;
     if (reason_ != error.what())
@@ -107,12 +109,12 @@ void LogWriter::Pause(const StoreError &error, int64_t now) {
 
 // Returns after how many milliseconds to try again.
 int64_t LogWriter::PutAside() {
-    const bool isOurs = store_ && !store_->HasMoved();
+    // Another program may have seen the damage first, and then what has the name now is sound.
+    const bool isAside = store_ && store_->HasMoved();
     store_.reset();
-    // It may be another program that saw the damage first, and then what has the name now is sound.
-    if (isOurs)
+    if (!isAside)
         DBErrorHandle_SQLITE_CORRUPT(nullptr, path_);
-    return isOurs && IsThere(path_) ? kRetryDamagedMs : 0;
+    return !isAside && IsThere(path_) ? kRetryDamagedMs : kRetrySoonMs;
 }
 
 } // namespace kelo::tool
