@@ -29,5 +29,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddParse(program);
     kelo::tool::AddReceive(program);
     kelo::tool::AddDb(program);
+    kelo::tool::AddArchive(program);
+    kelo::tool::AddStatus(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

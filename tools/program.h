@@ -64,5 +64,7 @@ void AddNotify(Program &program);
 void AddParse(Program &program);
 void AddReceive(Program &program);
 void AddDb(Program &program);
+void AddArchive(Program &program);
+void AddStatus(Program &program);
 
 } // namespace kelo::tool
