@@ -1,0 +1,47 @@
+// Conditions made by hand: comparisons, wildcards, alternatives, and an expression of one's own.
+
+#include <kelosyslog/dbhandler.h>
+#include <kelosyslog/dbutil.h>
+#include <syslog.h>
+
+#include <iostream>
+
+using Condition = _SYSLOG_SQL_COND_tag;
+
+int PrintMessage(_SYSLOG_LOG_DATA_tag &log, void *) {
+    std::cout << "  [" << log.msg << "]";
+    return 0;
+}
+
+void Show(const std::string &path, const char *what, const std::list<Condition> &conditions) {
+    std::cout << what << ":";
+    const int result = SyslogDBSelect(path, conditions, nullptr, nullptr, PrintMessage, nullptr, false);
+    std::cout << (result == 0 ? "" : "  failed") << "\n";
+}
+
+int main(int argc, char **argv) {
+    if (argc != 2)
+        return 2;
+    openlog("example", LOG_PERROR, LOG_USER);
+    const std::string root = argv[1], path = root + "/logs.db";
+    DBHandler db(path, root + "/usr/kelo/syslog/schema/logs.sql");
+    if (db.DBCon() != 0)
+        return 1;
+    db.DBExecute("INSERT INTO logs (host, utcsec, msg) VALUES"
+                 " ('nas', 10, '100% full'), ('nas', 20, '1000 files'), ('web1', 30, 'it''s up')");
+    db.DBDiscon();
+
+    Show(path, "since 20", {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_GE, "20", {}}});
+    // '*' and '?' are the wildcards; '%', '_' and quotes in a value stand for themselves.
+    Show(path, "100% and more", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "100%*", {}}});
+    Show(path, "with a quote", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*'*", {}}});
+
+    // A list is ANDed; alternatives are ORed: since 20, and of web1 or with "files".
+    Condition either{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "web1", {}};
+    either.alternatives.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*files*", {}});
+    Show(path, "either", {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_GE, "20", {}}, either});
+
+    // A raw value goes into the statement as it is: never let a user type it.
+    Show(path, "raw", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "length(msg) = 9", {}}});
+    Show(path, "bad raw", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "length(", {}}});
+}

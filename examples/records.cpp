@@ -1,0 +1,40 @@
+// The log entry, the words for its parts, and a row of a database turned into an entry.
+
+#include <keloplatform/kelodb.h>
+#include <kelosyslog/dbhandler.h>
+#include <kelosyslog/records.h>
+#include <syslog.h>
+
+#include <iostream>
+
+int PrintLogs(DBResult_tag *result, void *) {
+    _SYSLOG_LOG_DATA_tag log; // one for all rows: a conversion sets what its table has
+    for (unsigned int row = 0; KELODBFetchRow(result, &row) == 0;)
+        if (DBRecToLogInfo("logs", result, row, &log, true) == 0) // true: without the user's name
+            std::cout << log.id << " " << g_MappingSyslogPrior[log.prio] << " " << log.host << " [" << log.msg
+                      << "]\n";
+    return 0;
+}
+
+int main(int argc, char **argv) {
+    if (argc != 2)
+        return 2;
+    openlog("example", LOG_PERROR, LOG_USER);
+
+    std::cout << "err is severity " << PriorStrToType("err") << ", 'loud' is " << PriorStrToType("loud")
+              << ", 4 is " << PriorTypeToStr(SYSLOG_PRIO_WARNING) << "\n";
+    std::cout << "attribute 'ldate' is " << LogAttriType("ldate") << ", 10 is column '"
+              << LogAttriStrGet(SYSLOG_ATTRI_LTIME) << "', 'colour' is " << LogAttriType("colour") << "\n";
+    std::cout << "operator 7 is " << g_MappingSyslogOP[SYSLOG_OP_NOT_LIKE] << "\n";
+    std::cout << "[" << TrimUserName("alice:logged in") << "] [" << TrimUserName("no colon") << "]\n";
+    std::cout << "SMB transfers: " << XferlogDBPathGet("smbxfer") << "\n";
+
+    const std::string root = argv[1];
+    DBHandler db(root + "/logs.db", root + "/usr/kelo/syslog/schema/logs.sql");
+    if (db.DBCon() != 0)
+        return 1;
+    db.DBExecute("INSERT INTO logs (host, prio, msg) VALUES ('nas', 'notice', 'alice: logged in')");
+    db.DBExecute("INSERT INTO logs (host, msg) VALUES (NULL, 'no host and no severity')");
+    db.DBExecute("SELECT * FROM logs", PrintLogs, nullptr);
+    db.DBDiscon();
+}
