@@ -5,6 +5,7 @@
 
 #include <array>
 #include <cstdio>
+#include <filesystem>
 #include <memory>
 #include <set>
 #include <vector>
@@ -92,6 +93,9 @@ TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
     EXPECT_EQ(Complete("values -o s"), Words{});
     EXPECT_EQ(Complete("db info -o ''"), (Words{"text", "json"}));
     EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
+    const TempRoot root;
+    std::filesystem::create_directories(root.File("var/log/kelolog/archive/nas_2020.db"));
+    EXPECT_EQ(Complete("count --root " + root.Path() + " --log n"), (Words{"nas_2020"}));
 }
 
 } // namespace
