@@ -104,7 +104,8 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
     struct stat status {};
     if (!file || stat(like.c_str(), &status) != 0)
         Fail(path, errno);
-    // Only root can give files away; for others the archive stays theirs, and their group's where it is the same.
+    // Only root can give files away; for others the archive stays theirs, and their group's where it is the
+    // same.
     const bool hasGroup = fchown(file.Get(), status.st_uid, status.st_gid) == 0 ||
                           fchown(file.Get(), static_cast<uid_t>(-1), status.st_gid) == 0;
     const mode_t mode = status.st_mode & (hasGroup ? 0666 : 0600);
