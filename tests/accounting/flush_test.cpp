@@ -106,6 +106,14 @@ TEST_F(Flush, KeepsTheSamplesOfAFailedStep) {
     }
 }
 
+TEST_F(Flush, GivesUpTheOldestSamplesAboveABound) {
+    EXPECT_EQ(accounting_->SamplesDrop(2, 3), 0U);
+    EXPECT_EQ(accounting_->SamplesDrop(2, 2), 1U);
+    EXPECT_EQ(accounting_->AccoutingFlush2DB(), 0);
+    EXPECT_EQ("1000 a 1;" + Samples(), kRows);
+    EXPECT_EQ(Histogram(), kCounts);
+}
+
 TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     const auto fileOf = [](mode_t mode, off_t size) {
         struct stat status {};
