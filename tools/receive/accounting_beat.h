@@ -17,7 +17,8 @@ class AccountingBeat {
 public:
     AccountingBeat();
 
-    void Count(const std::string &host) { manager_->LogInc(host); }
+    // The accounting database keeps a name up to its first NUL.
+    void Count(const std::string &host) { manager_->LogInc(host.c_str()); }
 
     // To be called about once a second. Closes the sample, and flushes when its time has come.
     void Beat(int64_t now);
