@@ -38,17 +38,6 @@ TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
     }
 }
 
-TEST(CmdParse, ReportsTheReadersOwnWords) {
-    SyslogCapture log;
-    std::string text = R"({"a" 1})";
-    std::vector<Json::Value> commands;
-    EXPECT_FALSE(CmdParser().CmdParse(text, commands));
-    EXPECT_THAT(log.Messages(),
-                testing::ElementsAre(kelo::test::SyslogMessage{
-                    LOG_ERR, "Error: parsing error, reason = * Line 1, Column 6\n  Missing ':' after object "
-                             "member name\n\n"}));
-}
-
 TEST(CmdParse, FailsCleanlyOnDeepNesting) {
     for (const std::string opening : {"[", "{\"a\":", "[[]"}) {
         SyslogCapture log;

@@ -91,16 +91,6 @@ TEST(ParseSingleEntry, KeepsTheFieldsTakenWhenTheLineEndsEarly) {
         EXPECT_EQ(LogParser().ParseSingleEntry(line, log), -1) << line;
 }
 
-TEST(LogAdd, SkipsOnlyTheLinesThatDoNotParse) {
-    SyslogCapture log;
-    std::string text = kEleven + " one\r\nten fields are too few for an entry of log\n\n   \n" + kEleven;
-    LogParser parser;
-    parser.LogAdd(text);
-    EXPECT_THAT(Lines(parser.LogListGet()), ElementsAre(kEleven + " one\r", kEleven + " "));
-    EXPECT_THAT(log.Messages(), ElementsAre(kelo::test::SyslogMessage{3, "Fail to parse log"},
-                                            kelo::test::SyslogMessage{3, "Fail to parse log"}));
-}
-
 TEST(LogAdd, PutsTheFragmentInFrontOfEveryInputUntilItIsTaken) {
     LogParser parser;
     parser.PartialLogSet(kEleven);
