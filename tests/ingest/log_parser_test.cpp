@@ -2,14 +2,12 @@
 
 #include <gmock/gmock.h>
 
-#include <algorithm>
 #include <map>
 #include <vector>
 
 #include "support/syslog_capture.h"
 
 using kelo::test::SyslogCapture;
-using testing::ElementsAre;
 
 namespace {
 
@@ -21,12 +19,6 @@ std::string Line(const _SYSLOG_LOG_DATA_tag &log) {
     return log.fac + " " + PriorTypeToStr(log.prio) + " " + log.ldate + " " + log.ltime + " " + numbers +
            " " + log.tzoffset + " " + log.host + " " + log.ip + " " + log.prog + " " + log.tag + " " +
            log.msg;
-}
-
-std::vector<std::string> Lines(const std::list<_SYSLOG_LOG_DATA_tag> &logs) {
-    std::vector<std::string> lines;
-    std::transform(logs.begin(), logs.end(), std::back_inserter(lines), Line);
-    return lines;
 }
 
 } // namespace
@@ -89,19 +81,6 @@ TEST(ParseSingleEntry, KeepsTheFieldsTakenWhenTheLineEndsEarly) {
     EXPECT_EQ(Line(log), "user err day clock 7 200      before");
     for (const std::string &line : {std::string(), std::string("   "), kEleven.substr(0, kEleven.size() - 4)})
         EXPECT_EQ(LogParser().ParseSingleEntry(line, log), -1) << line;
-}
-
-TEST(LogAdd, PutsTheFragmentInFrontOfEveryInputUntilItIsTaken) {
-    LogParser parser;
-    parser.PartialLogSet(kEleven);
-    for (const char *input : {" first\n", ""}) {
-        std::string text = input;
-        parser.LogAdd(text);
-        EXPECT_EQ(text, kEleven + input);
-    }
-    EXPECT_EQ(parser.LogGetCount(), 2);
-    EXPECT_THAT(Lines(parser.LogListTake()), ElementsAre(kEleven + " first", kEleven + " "));
-    EXPECT_EQ(parser.LogGetCount(), 0);
 }
 
 TEST(isValidLog, NamesARecordIncompleteOnceWhicheverFieldIsEmpty) {
