@@ -58,21 +58,6 @@ TEST_F(DbInfo, ReadsThe32BitTimesAndThe64BitCount) {
     EXPECT_EQ(Messages().back(), Error("Fail to execute SQL command: SELECT * FROM db_info"));
 }
 
-TEST_F(DbInfo, WritesOneColumnOfRowOne) {
-    Connect();
-    EXPECT_EQ(db_.DBInfoStartSet(1600000000), 0);
-    EXPECT_EQ(db_.DBInfoEndSet(18446744073709551615ULL), 0);
-    EXPECT_EQ(db_.DBInfoDevSet("nas 1"), 0);
-    EXPECT_THAT(PlatformCalls::Statements(),
-                ElementsAre("UPDATE db_info SET start_time='1600000000' WHERE id=1",
-                            "UPDATE db_info SET end_time='18446744073709551615' WHERE id=1",
-                            "UPDATE db_info SET device='nas 1' WHERE id=1"));
-    EXPECT_EQ(QueryText(path_, "SELECT start_time || device FROM db_info"), "1600000000nas 1");
-    EXPECT_EQ(db_.DBInfoDevSet("it's"), -1);
-    EXPECT_EQ(Messages().back(),
-              Error("Fail to execute SQL command: UPDATE db_info SET device='it's' WHERE id=1"));
-}
-
 TEST_F(DbInfo, ComputesCountAndTimesFromTheLogs) {
     Connect(3); // the first at 2020/01/01 00:00:00 UTC
     EXPECT_EQ(db_.DBLogCountGet(), 3);
@@ -94,18 +79,6 @@ TEST_F(DbInfo, ComputesCountAndTimesFromTheLogs) {
     EXPECT_EQ(db_.DBInfoEndStrGet(), "1970-01-01");
     EXPECT_THAT(Messages(), ElementsAre(Error("Fail to get database start time"),
                                         Error("Fail to get database end time")));
-}
-
-TEST_F(DbInfo, SaysOfAFailedTimeOnlyWhatIsNotNormal) {
-    Connect(1);
-    const std::string sql = "SELECT * FROM logs ORDER BY utcsec ASC LIMIT 1";
-    PlatformCalls::FailFrom(1, 1);
-    EXPECT_EQ(db_.DBLogStartTimeGet(), 0);
-    EXPECT_EQ(Messages().back(), Error("Fail to execute SQL command: " + sql));
-    RunSql(path_, "DROP TABLE logs");
-    EXPECT_EQ(db_.DBLogStartTimeGet(), 0);
-    EXPECT_EQ(Messages().size(), 1u) << "the handler's own message";
-    EXPECT_EQ(db_.DBLogCountGet(), -1);
 }
 
 } // namespace
