@@ -56,9 +56,7 @@ std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : kFaultSources) {
-            const bool isMet = source.stop != AllocationFaults::Stop ||
-                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
-            if (isMet)
+            if (source.stop != AllocationFaults::Stop || AllocationFaults::IsSupported())
                 combinations.emplace_back(operation, source);
         }
     }
