@@ -3,7 +3,6 @@
 #include <dlfcn.h>
 #include <sqlite3.h>
 
-#include <cerrno>
 #include <filesystem>
 
 namespace kelo::test {
@@ -38,7 +37,6 @@ std::string AccountingTest::Histogram() const {
 } // namespace kelo::test
 
 using kelo::test::machine;
-using kelo::test::PlatformCalls;
 
 extern "C" {
 
@@ -46,20 +44,6 @@ time_t time(time_t *seconds) noexcept {
     if (seconds != nullptr)
         *seconds = machine.now;
     return machine.now;
-}
-
-int stat(const char *path, struct stat *status) noexcept {
-    static const auto real = reinterpret_cast<decltype(&stat)>(dlsym(RTLD_NEXT, "stat"));
-    const auto &calls = PlatformCalls::Recorded();
-    if (!machine.flushStat || calls.empty() || !calls.back().text.starts_with("INSERT OR REPLACE"))
-        return real(path, status);
-    const std::optional<struct stat> answer = machine.flushStat();
-    if (answer) {
-        *status = *answer;
-        return 0;
-    }
-    errno = EIO;
-    return -1;
 }
 
 int sqlite3_step(sqlite3_stmt *statement) {

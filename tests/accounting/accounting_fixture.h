@@ -1,10 +1,7 @@
 #pragma once
 
-#include <sys/stat.h>
-
 #include <ctime>
 #include <functional>
-#include <optional>
 
 #include "kelosyslog/accounting.h"
 #include "notify/notify_fixture.h"
@@ -30,9 +27,6 @@ protected:
 // What replaces the machine for the whole program.
 struct Machine {
     time_t now = 1000;
-    // The answer to a stat() that follows a written histogram, which is the flush's: the file's status, or
-    // std::nullopt for a failure. Empty: the file system's own.
-    std::function<std::optional<struct stat>()> flushStat;
     // Called before every step of an SQLite statement.
     std::function<void()> beforeStep;
 };

@@ -2,8 +2,6 @@
 
 #include <syslog.h>
 
-#include "kelosyslog/debuger.h"
-
 using namespace kelo::test;
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -129,20 +127,6 @@ TEST_F(Accounting, NotifiesWhenASampleReachesARule) {
     EXPECT_THAT(Messages(), IsEmpty());
     EXPECT_EQ(QueryText(events, "SELECT count(*) FROM log"), "2");
     EXPECT_EQ(accounting.CurrentEpsGet(), 1);
-}
-
-TEST_F(Accounting, DumpsItsFiguresAtTheTraceLevel) {
-    RunSql(path_, "INSERT INTO histogram VALUES(NULL, 'old', 18446744073709)");
-    AccountingManager accounting;
-    accounting.LogInc("new");
-    accounting.AccountingDump();
-    EXPECT_THAT(Messages(), IsEmpty());
-    Debuger::ThresholdSet(2);
-    accounting.AccountingDump();
-    Debuger::ThresholdSet(0);
-    EXPECT_THAT(Messages(), ElementsAre("======Accounting Status dump======", "Total: 1", "EPS: 1",
-                                        "Device: old, count: 18446744073709", "Device: new, count: 1",
-                                        "=================================="));
 }
 
 } // namespace
