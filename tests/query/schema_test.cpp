@@ -18,16 +18,6 @@ TEST_F(Schema, DefinesOneTableOfLogsForWorkingDatabasesAndArchives) {
     EXPECT_EQ(SyslogDBVersionGet(archive), 1);
 }
 
-TEST_F(Schema, KeepsWhatIsThereWhenItIsAppliedAgain) {
-    const std::string archive = root_.File("archive.db");
-    for (int time = 0; time < 2; ++time) {
-        CreateLogDatabase(archive, "archive.sql");
-        EXPECT_EQ(QueryText(archive, "SELECT count(*) || min(id) FROM db_info"), "11");
-        RunSql(archive, "UPDATE db_info SET device = 'nas'");
-    }
-    EXPECT_EQ(QueryText(archive, "SELECT device FROM db_info"), "nas");
-}
-
 TEST_F(Schema, NeverUsesAnIdAgain) {
     InsertSampleLogs(path_, 3);
     EXPECT_EQ(SyslogDBDelete(path_, {}), 0);
