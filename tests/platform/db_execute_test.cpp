@@ -48,20 +48,12 @@ TEST_F(Executing, TakesOneStatementWithWhateverBlanksAndCommentsAroundIt) {
     EXPECT_EQ(Execute(connection, "EXPLAIN QUERY PLAN SELECT * FROM logs", {"detail"}).rows.size(), 1U);
 }
 
-TEST_F(Executing, BoundsASelect) {
-    const auto ids = [&](unsigned int limit, unsigned int offset) {
-        std::string text;
-        for (const auto &row :
-             SelectLimit(connection, "SELECT * FROM logs ORDER BY id DESC", limit, offset, {"id"}).rows)
-            text += *row[0];
-        return text;
-    };
-    EXPECT_EQ(ids(2, 0), "32");
-    EXPECT_EQ(ids(0, 1), "21");
-    EXPECT_EQ(ids(4294967295U, 0), "321");
-    // Debian's SQLite knows DELETE ... LIMIT.
+TEST_F(Executing, BoundsOnlyASelect) { // Debian's SQLite knows DELETE ... LIMIT
     EXPECT_EQ(SelectLimit(connection, "DELETE FROM logs", 1, 0, {}).errorCode, SQLITE_ERROR);
     EXPECT_EQ(Count(), "3");
+    const std::string sql = "SELECT * FROM logs";
+    EXPECT_EQ(SelectLimit(connection, sql, 0, 1, {}).rows.size(), 2U);
+    EXPECT_EQ(SelectLimit(connection, sql, 4294967295U, 0, {}).rows.size(), 3U);
 }
 
 // Few rows are taken one by one, many of several columns by another way: nobody may notice.

@@ -53,17 +53,6 @@ std::vector<std::string> Names(const std::string &path, int expectedStatus = 0) 
 
 } // namespace
 
-TEST(SectionFile, GivesBackEveryValueThatALineCanHold) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
-    for (const std::string value : {"", "\"", "a\"b\"", "\"quoted\"", "ends in \\", "\\\"", "=", "# no",
-                                    "[R2]", "  blanks  ", "\tcr\r", "%s %n %%", "\xFF\xFE \x01\x1B[0m"}) {
-        ASSERT_EQ(Set(path, "R 1", "R 1", {{"before", "1"}, {"key", value}, {"after", "2"}}), 0) << value;
-        EXPECT_EQ(Get(path, "R 1", "key"), value);
-        EXPECT_EQ(Get(path, "R 1", "after"), "2");
-    }
-}
-
 TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     const TempRoot root;
     const std::string path = root.File("notify.conf");
