@@ -136,48 +136,31 @@ TEST_F(Reload, SparesEveryOtherProcess) {
     EXPECT_EQ(other.Stop(SIGTERM), SIGTERM);
 }
 
-// A bus on which nobody is but a systemd, whose jobs end as `result` says. It is there for one connection.
-class PrivateSystemd {
-public:
-    PrivateSystemd(const std::string &path, const char *state, const char *result)
-        : state_(state), result_(result), socket_(socket(AF_UNIX, SOCK_STREAM, 0)) {
-        sockaddr_un address{AF_UNIX, ""};
-        path.copy(address.sun_path, sizeof address.sun_path - 1);
-        EXPECT_EQ(bind(socket_, reinterpret_cast<const sockaddr *>(&address), sizeof address), 0);
-        EXPECT_EQ(listen(socket_, 1), 0);
-        setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + path).c_str(), 1);
-        server_ = std::jthread([this] { Serve(accept(socket_, nullptr, nullptr)); });
-    }
-    ~PrivateSystemd() {
-        shutdown(socket_, SHUT_RDWR); // ends the wait for a connection
-        server_.join();
-        close(socket_);
-        unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
-    }
-    PrivateSystemd(const PrivateSystemd &) = delete;
-    PrivateSystemd &operator=(const PrivateSystemd &) = delete;
+constexpr char kJob[] = "/org/freedesktop/systemd1/job/7";
 
-    int Reloads() const { return reloads_; }
+// A systemd alone on its bus, for one connection.
+struct PrivateSystemd {
+    std::string state;  // of the unit
+    std::string result; // of its jobs
+    int reloads = 0;
 
-private:
-    static constexpr char kJob[] = "/org/freedesktop/systemd1/job/7";
-
-    void Serve(int connection) {
+    void Serve(int listener) {
+        const int connection = accept(listener, nullptr, nullptr);
         sd_bus *bus = nullptr;
         sd_bus_new(&bus);
         sd_bus_set_fd(bus, connection, connection);
-        sd_bus_set_server(bus, 1, SD_ID128_MAKE(1, 2, 3, 4, 5, 6, 7, 8, 9, a, b, c, d, e, f, 0));
+        sd_bus_set_server(bus, 1, SD_ID128_NULL);
         sd_bus_add_filter(bus, nullptr, Answer, this);
         sd_bus_start(bus);
         while (sd_bus_process(bus, nullptr) >= 0 && sd_bus_wait(bus, UINT64_MAX) >= 0) {
         }
         sd_bus_unref(bus);
     }
-    static void EndJob(sd_bus *bus, const char *job, const char *result) {
+    static void EndJob(sd_bus *bus, const char *job, const std::string &result) {
         sd_bus_message *signal = nullptr;
         sd_bus_message_new_signal(bus, &signal, "/org/freedesktop/systemd1",
                                   "org.freedesktop.systemd1.Manager", "JobRemoved");
-        sd_bus_message_append(signal, "uoss", 7, job, "syslog-ng.service", result);
+        sd_bus_message_append(signal, "uoss", 7, job, "syslog-ng.service", result.c_str());
         sd_bus_message_set_sender(signal, "org.freedesktop.systemd1");
         sd_bus_send(bus, signal, nullptr);
         sd_bus_message_unref(signal);
@@ -185,36 +168,25 @@ private:
     // A job ends between the end of a foreign one and the answer, which is the hardest order.
     static int Answer(sd_bus_message *call, void *context, sd_bus_error *) {
         auto *self = static_cast<PrivateSystemd *>(context);
-        sd_bus *bus = sd_bus_message_get_bus(call);
         const std::string member = sd_bus_message_get_member(call);
-        const char *unit = "";
-        const char *property = "";
+        const char *words[] = {"", ""}; // unit and mode, or interface and property
+        sd_bus_message_read(call, "ss", &words[0], &words[1]);
         if (member == "Hello")
             return sd_bus_reply_method_return(call, "s", ":1.1");
-        if (member == "Get") {
-            sd_bus_message_read(call, "ss", nullptr, &property);
-            if (property == std::string("ActiveState"))
-                return sd_bus_reply_method_return(call, "v", "s", self->state_);
-            EndJob(bus, kJob, self->result_);
-            return sd_bus_reply_method_return(call, "v", "(uo)", 7, kJob);
-        }
-        if (member != "ReloadUnit")
+        if (words[1] == std::string("ActiveState"))
+            return sd_bus_reply_method_return(call, "v", "s", self->state.c_str());
+        if (member != "ReloadUnit" && member != "Get")
             return sd_bus_reply_method_return(call, "");
-        ++self->reloads_;
-        sd_bus_message_read(call, "ss", &unit, nullptr);
-        if (unit != std::string("syslog-ng.service") || self->state_ == std::string("inactive"))
+        if (member == "ReloadUnit" && ++self->reloads > 0)
+            EndJob(sd_bus_message_get_bus(call), "/org/freedesktop/systemd1/job/6", "failed");
+        EndJob(sd_bus_message_get_bus(call), kJob, self->result);
+        if (member == "Get")
+            return sd_bus_reply_method_return(call, "v", "(uo)", 7, kJob);
+        if (self->state == "inactive")
             return sd_bus_reply_method_errorf(call, "org.freedesktop.systemd1.Inactive", "%s is inactive.",
-                                              unit);
-        EndJob(bus, "/org/freedesktop/systemd1/job/6", "failed");
-        EndJob(bus, kJob, self->result_);
+                                              words[0]);
         return sd_bus_reply_method_return(call, "o", kJob);
     }
-
-    const char *state_;
-    const char *result_;
-    int socket_;
-    std::atomic<int> reloads_ = 0;
-    std::jthread server_;
 };
 
 TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
@@ -232,20 +204,25 @@ TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
         {"reloading", "done", "", 0}, // under way already
         {"reloading", "timeout", "the reload ended as timeout", 0},
     };
+    sockaddr_un address{AF_UNIX, ""};
+    root_.File("bus").copy(address.sun_path, sizeof address.sun_path - 1);
+    const int listener = socket(AF_UNIX, SOCK_STREAM, 0);
+    ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr *>(&address), sizeof address), 0);
+    ASSERT_EQ(listen(listener, 1), 0);
+    setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("bus")).c_str(), 1);
     for (const auto &c : cases) {
         SCOPED_TRACE(std::string(c.state) + " " + c.result);
-        log_.Clear();
-        const TempRoot folder;
-        const PrivateSystemd systemd(folder.File("bus"), c.state, c.result);
+        PrivateSystemd systemd{c.state, c.result};
+        std::thread server([&] { systemd.Serve(listener); });
         EXPECT_EQ(KELOSystemdReload("syslog-ng"), c.reason.empty());
-        EXPECT_EQ(systemd.Reloads(), c.reloads);
-        if (c.reason.empty()) {
-            EXPECT_THAT(log_.Texts(), IsEmpty());
-        } else {
-            EXPECT_THAT(log_.Texts(), ElementsAre("cannot reload service syslog-ng: " + c.reason));
-        }
+        server.join();
+        EXPECT_EQ(systemd.reloads, c.reloads);
+        EXPECT_EQ(log_.Texts(), c.reason.empty()
+                                    ? std::vector<std::string>()
+                                    : std::vector{"cannot reload service syslog-ng: " + c.reason});
+        log_.Clear();
     }
-    log_.Clear();
+    close(listener);
     setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("no bus")).c_str(), 1);
     EXPECT_FALSE(KELOSystemdReload("syslog-ng"));
     unsetenv("DBUS_SYSTEM_BUS_ADDRESS");

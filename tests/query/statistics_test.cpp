@@ -65,16 +65,6 @@ TEST_F(Lookup, ListsTheValuesOfAnAttribute) {
     EXPECT_THAT(log_.Texts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
 }
 
-TEST_F(Lookup, NumbersTheNamesOfADatabaseWithoutKeyTables) {
-    RunSql(path_, "INSERT INTO logs(fac) VALUES('user'), ('auth'), ('user'), (NULL)");
-    std::map<uint64_t, std::string> names = {{1, "kept"}};
-    EXPECT_EQ(SyslogDBExtkeyMapGet(path_, SYSLOG_EXTKEY_FAC, names), 0);
-    EXPECT_THAT(PlatformCalls::Statements(),
-                ElementsAre("SELECT * FROM db_info", "SELECT DISTINCT fac FROM logs"));
-    EXPECT_THAT(names, ElementsAre(Pair(0, "user"), Pair(1, "kept"), Pair(2, "")));
-    EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, SYSLOG_EXTKEY_FAC, "auth"), 1u);
-}
-
 TEST_F(Lookup, ReadsTheKeyTablesOfTheFirstGeneration) {
     const struct {
         _SYSLOG_EXTKEY_TB_TYPE_tag type;

@@ -129,23 +129,11 @@ void KELODBFreeResult(DBResult_tag *result) {
     KELO_CALL_REAL(KELODBFreeResult, result);
 }
 
-int KELODBEscapeStringEX(DBConnect_tag *connection, char *out, size_t outSize, const char *in, size_t inLen) {
-    if (PlatformCalls::MustFail("KELODBEscapeStringEX", in))
-        return -1;
-    return KELO_CALL_REAL(KELODBEscapeStringEX, connection, out, outSize, in, inLen);
-}
-
 int KELODBEscapeStringEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in,
                           size_t inLen) {
     if (PlatformCalls::MustFail("KELODBEscapeStringEX2", in))
         return -1;
     return KELO_CALL_REAL(KELODBEscapeStringEX2, connection, out, outSize, in, inLen);
-}
-
-int KELODBEscapeBackslashEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in) {
-    if (PlatformCalls::MustFail("KELODBEscapeBackslashEX2", in))
-        return -1;
-    return KELO_CALL_REAL(KELODBEscapeBackslashEX2, connection, out, outSize, in);
 }
 
 } // extern "C"
