@@ -1,9 +1,6 @@
 #include "accounting/accounting_fixture.h"
 
 #include <dlfcn.h>
-#include <sqlite3.h>
-
-#include <filesystem>
 
 namespace kelo::test {
 
@@ -16,12 +13,6 @@ AccountingTest::AccountingTest() {
     CreateLogDatabase(path_, "accinfo.sql");
     CreateLogDatabase(root_.File("usr/kelo/etc/kelosyslog.db"), "kelosyslog.sql");
     WriteRules("");
-}
-
-AccountingTest::~AccountingTest() {
-    machine = {};
-    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
-    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
 }
 
 std::string AccountingTest::Samples() const {

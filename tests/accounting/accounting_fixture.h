@@ -1,28 +1,9 @@
 #pragma once
 
-#include <ctime>
-#include <functional>
-
 #include "kelosyslog/accounting.h"
 #include "notify/notify_fixture.h"
-#include "support/log_database.h"
 
 namespace kelo::test {
-
-// An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
-// a clock that stands still until a test moves it.
-class AccountingTest : public NotifyTest {
-protected:
-    AccountingTest();
-    ~AccountingTest() override;
-
-    // The rows of table "eps" in the order of their insertion: "stamp device eps;..."
-    std::string Samples() const;
-    // The rows of table "histogram": "device count;..." in byte order.
-    std::string Histogram() const;
-
-    const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
-};
 
 // What replaces the machine for the whole program.
 struct Machine {
@@ -31,5 +12,20 @@ struct Machine {
     std::function<void()> beforeStep;
 };
 extern Machine machine;
+
+// An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
+// a clock that stands still until a test moves it.
+class AccountingTest : public NotifyTest {
+protected:
+    AccountingTest();
+    ~AccountingTest() override { machine = {}; }
+
+    // The rows of table "eps" in the order of their insertion: "stamp device eps;..."
+    std::string Samples() const;
+    // The rows of table "histogram": "device count;..." in byte order.
+    std::string Histogram() const;
+
+    const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
+};
 
 } // namespace kelo::test

@@ -1,16 +1,6 @@
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <csignal>
-#include <filesystem>
-#include <memory>
-
 #include "accounting/accounting_fixture.h"
 
 using namespace kelo::test;
-using testing::Contains;
-using testing::IsEmpty;
-using testing::StartsWith;
 
 namespace {
 
@@ -29,31 +19,7 @@ void CountLogs(AccountingManager &accounting) {
     accounting.LogInc("d");
 }
 
-class Flush : public AccountingTest {
-protected:
-    Flush() {
-        CountLogs(*accounting_);
-        PlatformCalls::Reset();
-    }
-    ~Flush() override { accounting_.reset(); }
-
-    void Restart() {
-        accounting_.reset();
-        RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
-        accounting_ = std::make_unique<AccountingManager>();
-        CountLogs(*accounting_);
-        Messages();
-    }
-
-    // Without the lines of the database handler.
-    Texts FlushMessages() {
-        Texts messages = Messages();
-        std::erase_if(messages, [](const std::string &text) { return text.starts_with("dbhandler:"); });
-        return messages;
-    }
-
-    std::unique_ptr<AccountingManager> accounting_ = std::make_unique<AccountingManager>();
-};
+using Flush = AccountingTest;
 
 TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     // Within a day, with room for a slow machine.
@@ -62,27 +28,28 @@ TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     const std::string all = "999 old 1;" + recent + ";" + kRows;
     const struct {
         int filler; // bytes
-        int fault;  // the call that fails; 0 for none
+        int fault;  // the call that fails; 1000 for none
         std::string samples;
         Texts messages;
     } cases[] = {
-        {5000000, 0, all, {}},
+        {5000000, 1000, all, {}},
         {5300000, 9, all, {kFailed + "DELETE FROM eps WHERE stamp < strftime('%s', 'now') - 24*60*60;"}},
-        {5300000, 0, recent, {}},
+        {5300000, 1000, recent, {}},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.filler + c.fault);
-        Restart();
+        RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
+        AccountingManager accounting;
+        CountLogs(accounting);
         RunSql(path_, "INSERT INTO eps VALUES(NULL, 999, 'old', 1), (NULL, " + stamp + ", 'new', 1);" +
                           "CREATE TABLE filler AS SELECT zeroblob(" + std::to_string(c.filler) + ")");
-        if (c.fault != 0)
-            PlatformCalls::FailFrom(c.fault, 1);
-        EXPECT_EQ(accounting_->AccoutingFlush2DB(), 0);
+        PlatformCalls::FailFrom(c.fault, 1);
+        EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
         RunSql(path_, "DROP TABLE filler; VACUUM");
         EXPECT_EQ(Samples(), c.samples);
-        EXPECT_EQ(FlushMessages(), c.messages);
+        EXPECT_EQ(Messages(), c.messages);
         PlatformCalls::Reset();
-        EXPECT_EQ(accounting_->AccoutingFlush2DB(), 0);
+        EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
         EXPECT_THAT(PlatformCalls::Recorded(), IsEmpty()) << "without samples there is nothing to do";
     }
 }

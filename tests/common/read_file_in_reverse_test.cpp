@@ -1,18 +1,9 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <syslog.h>
-#include <unistd.h>
-
-#include <algorithm>
-
 #include "kelosyslog/utils.h"
-#include "support/syslog_capture.h"
+#include "support/test.h"
 
 namespace {
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::MatchesRegex;
 using Texts = std::vector<std::string>;
 
 // Reads `stream`, closes it, and frees everything. Gives the lines from the entry count upward.

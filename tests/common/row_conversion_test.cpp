@@ -1,8 +1,5 @@
-#include <gtest/gtest.h>
-
 #include "kelosyslog/dbutil.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace {
 

@@ -1,7 +1,4 @@
 #include <dlfcn.h>
-#include <sqlite3.h>
-
-#include <filesystem>
 
 #include "db/db_fixture.h"
 #include "kelosyslog/notification.h"
@@ -20,11 +17,6 @@ extern "C" int sqlite3_errcode(sqlite3 *db) {
 
 namespace kelo::test {
 namespace {
-
-using testing::ElementsAre;
-using testing::IsEmpty;
-using testing::MatchesRegex;
-namespace fs = std::filesystem;
 
 class DBErrorHandle : public DbTest {
 protected:

@@ -1,13 +1,7 @@
-#include <filesystem>
-
 #include "db/db_fixture.h"
 
 namespace kelo::test {
 namespace {
-
-using testing::ElementsAre;
-using testing::IsEmpty;
-namespace fs = std::filesystem;
 
 using Syslogng = DbTest;
 

@@ -1,17 +1,9 @@
-#include <sqlite3.h>
-#include <unistd.h>
-
-#include <cstdlib>
 #include <cstring>
-#include <ctime>
 
 #include "eventlog/event_fixture.h"
 
 namespace kelo::test {
 namespace {
-
-using testing::ElementsAre;
-using testing::IsEmpty;
 
 class Enumeration : public EventTest {
 protected:

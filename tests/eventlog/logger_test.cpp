@@ -1,17 +1,7 @@
-#include <sys/wait.h>
-#include <syslog.h>
-#include <unistd.h>
-
-#include <csignal>
-#include <functional>
-
 #include "eventlog/event_fixture.h"
 
 namespace kelo::test {
 namespace {
-
-using testing::ElementsAre;
-using testing::IsEmpty;
 
 using LoggerTest = EventTest;
 
@@ -104,29 +94,21 @@ TEST_F(LoggerTest, AnswersZeroToAClearingWithoutItsEvent) {
     _exit(0);
 }
 
-struct Pipe {
-    Pipe() { EXPECT_EQ(pipe(ends), 0); }
-    ~Pipe() {
-        close(ends[0]);
-        close(ends[1]);
-    }
-    Pipe(const Pipe &) = delete;
-    Pipe &operator=(const Pipe &) = delete;
-    int ends[2];
-};
-
 TEST_F(LoggerTest, LosesNothingWhenTwoProcessesAddAtOnceAndRotate) {
     CreateEvents(19980);
-    const Pipe acknowledged;
+    int acknowledged[2];
+    ASSERT_EQ(pipe(acknowledged), 0);
     for (const char *user : {"ann", "bob"}) {
         if (fork() == 0)
-            AddAndAcknowledge(db_, user, 40, acknowledged.ends[1]);
+            AddAndAcknowledge(db_, user, 40, acknowledged[1]);
     }
     for (int child = 0; child < 2; ++child) {
         int status = -1;
         wait(&status);
         EXPECT_EQ(status, 0);
     }
+    close(acknowledged[0]);
+    close(acknowledged[1]);
     EXPECT_EQ(Rows(), "20060");
     EXPECT_EQ(Query("SELECT count(DISTINCT user || event) FROM log WHERE user != 'SYSTEM'"), "80");
 }
@@ -135,18 +117,20 @@ TEST_F(LoggerTest, KeepsEveryAcknowledgedEventWhenItIsKilled) {
     for (const int enough : {1, 17, 60}) {
         CreateEvents(0);
         RunSql(db_, "DELETE FROM log");
-        const Pipe acknowledged;
+        int acknowledged[2];
+        ASSERT_EQ(pipe(acknowledged), 0);
         const pid_t child = fork();
         if (child == 0)
-            AddAndAcknowledge(db_, "ann", 1 << 20, acknowledged.ends[1]);
+            AddAndAcknowledge(db_, "ann", 1 << 20, acknowledged[1]);
         int last = -1;
         while (last + 1 < enough)
-            ASSERT_EQ(read(acknowledged.ends[0], &last, sizeof last), static_cast<ssize_t>(sizeof last));
+            ASSERT_EQ(read(acknowledged[0], &last, sizeof last), static_cast<ssize_t>(sizeof last));
         kill(child, SIGKILL);
         waitpid(child, nullptr, 0);
-        close(acknowledged.ends[1]);
-        while (read(acknowledged.ends[0], &last, sizeof last) > 0) {
+        close(acknowledged[1]);
+        while (read(acknowledged[0], &last, sizeof last) > 0) {
         }
+        close(acknowledged[0]);
         EXPECT_GE(logger_.LogCount(db_), last + 1);
         EXPECT_EQ(Query("SELECT count(DISTINCT event) FROM log WHERE CAST(event AS INTEGER) <= " +
                         std::to_string(last)),

@@ -1,22 +1,15 @@
 // Files that are no good database: every operation says so with its stated result and message, opens nothing
 // for good and creates no file.
 
-#include <gtest/gtest.h>
-
 #include <dlfcn.h>
-#include <sqlite3.h>
 
 #include <chrono>
-#include <filesystem>
-#include <random>
 
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/dbutil.h"
-#include "support/log_database.h"
 #include "support/notify_calls.h"
-#include "support/platform_calls.h"
 #include "support/system_calls.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace {
 
@@ -34,8 +27,6 @@ extern "C" int sqlite3_busy_timeout(sqlite3 *db, int ms) {
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
 
 const std::list<_SYSLOG_SQL_COND_tag> kFromHost3 = {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host03", {}}};
 

@@ -1,27 +1,15 @@
 // The database handler in the fault loops.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <filesystem>
-
 #include "faults/operations.h"
 #include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/root.h"
 #include "support/fault_pause.h"
-#include "support/log_database.h"
 #include "support/notify_calls.h"
 #include "support/system_calls.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
-using testing::Contains;
-using testing::HasSubstr;
-using testing::IsEmpty;
-using testing::Not;
 
 const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
 

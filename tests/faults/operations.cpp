@@ -1,23 +1,12 @@
 #include "faults/operations.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <iterator>
-#include <map>
 
 #include "keloplatform/torvc.h"
 #include "support/fault_pause.h"
-#include "support/log_database.h"
 
 namespace kelo::test {
 namespace {
-
-using testing::AnyOf;
-using testing::ElementsAre;
-using testing::IsEmpty;
-using testing::StartsWith;
 
 using Lines = std::vector<std::string>;
 

@@ -1,13 +1,9 @@
 #pragma once
 
-#include <functional>
 #include <list>
-#include <string>
-#include <vector>
 
 #include "kelosyslog/dbutil.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 

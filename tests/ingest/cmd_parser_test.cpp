@@ -1,11 +1,7 @@
 #include "kelosyslog/cmdparser.h"
+#include "support/test.h"
 
-#include <gmock/gmock.h>
-#include <syslog.h>
-
-#include "support/syslog_capture.h"
-
-using kelo::test::SyslogCapture;
+using namespace kelo::test;
 
 TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
     const struct {

@@ -1,13 +1,7 @@
 #include "kelosyslog/logparser.h"
+#include "support/test.h"
 
-#include <gmock/gmock.h>
-
-#include <map>
-#include <vector>
-
-#include "support/syslog_capture.h"
-
-using kelo::test::SyslogCapture;
+using namespace kelo::test;
 
 namespace {
 
@@ -45,19 +39,16 @@ TEST(ParseSingleEntry, TakesElevenFieldsAndTheMessageVerbatim) {
 }
 
 TEST(ParseSingleEntry, ReadsNumbersAsStrtollAndUnknownPrioritiesAsDebug) {
-    const struct {
-        std::string text;
-        int64_t number;
-    } kNumbers[] = {{"12abc", 12},
-                    {"-5", -5},
-                    {"+5", 5},
-                    {"+-5", 0},
-                    {"-", 0},
-                    {"\t7", 7},
-                    {"0x10", 0},
-                    {"\xb2", 0},
-                    {"9223372036854775808", INT64_MAX},
-                    {"-9223372036854775809", INT64_MIN}};
+    const std::vector<std::pair<std::string, int64_t>> kNumbers = {{"12abc", 12},
+                                                                   {"-5", -5},
+                                                                   {"+5", 5},
+                                                                   {"+-5", 0},
+                                                                   {"-", 0},
+                                                                   {"\t7", 7},
+                                                                   {"0x10", 0},
+                                                                   {"\xb2", 0},
+                                                                   {"9223372036854775808", INT64_MAX},
+                                                                   {"-9223372036854775809", INT64_MIN}};
     for (const auto &[text, number] : kNumbers) {
         _SYSLOG_LOG_DATA_tag log;
         // The other number follows: what is read of one must not reach into it.

@@ -1,7 +1,5 @@
-#include <gtest/gtest.h>
-
 #include "kelosyslog/logparser.h"
-#include "support/syslog_capture.h"
+#include "support/test.h"
 
 TEST(LogStream, DropsOverlongLinesAsAWhole) {
     const std::string entry = "f info d t 1 2 z h i p t ";

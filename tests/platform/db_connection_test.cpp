@@ -1,14 +1,6 @@
-#include <gmock/gmock.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <filesystem>
-
 #include "platform/db_fixture.h"
 
 using namespace kelo::test;
-using testing::HasSubstr;
-namespace fs = std::filesystem;
 
 namespace {
 

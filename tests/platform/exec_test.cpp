@@ -1,15 +1,6 @@
-#include <fcntl.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <csignal>
-
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/torvc.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {

@@ -1,23 +1,15 @@
 // Asking for a reload: by pid file with real processes, and by D-Bus with a systemd of our own.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
-#include <sys/wait.h>
 #include <systemd/sd-bus.h>
-#include <unistd.h>
 
-#include <csignal>
-#include <cstdlib>
-#include <filesystem>
 #include <thread>
 
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/root.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace {
 
@@ -31,10 +23,6 @@ extern "C" int sd_booted() {
 
 namespace kelo::test {
 namespace {
-
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::IsEmpty;
 
 // A process of this name that ends when it gets a HUP signal, or otherwise with the object.
 class Daemon {

@@ -1,22 +1,7 @@
-#include <fcntl.h>
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <filesystem>
-
 #include "keloplatform/torvc.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 using namespace kelo::test;
-using testing::AllOf;
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::StartsWith;
 
 namespace {
 

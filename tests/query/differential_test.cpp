@@ -1,10 +1,5 @@
 // Random searches over hostile rows, compared with a filter that knows nothing of SQL.
 
-#include <algorithm>
-#include <map>
-#include <optional>
-#include <random>
-
 #include "query/query_fixture.h"
 
 using namespace kelo::test;

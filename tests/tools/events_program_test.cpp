@@ -1,18 +1,10 @@
 // Runs of "kelosyslog events" and "kelosyslog report". (The pages themselves are for the browser's test.)
 
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-
-#include <filesystem>
-
 #include "program_run.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
 
 class Events : public testing::Test {
 protected:

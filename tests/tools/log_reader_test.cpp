@@ -1,12 +1,5 @@
 #include "log_reader.h"
-
-#include <gtest/gtest.h>
-
-#include <algorithm>
-
-#include "support/log_database.h"
-#include "support/platform_calls.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::tool {
 namespace {

@@ -1,11 +1,7 @@
 #include "time_expression.h"
 
-#include <gtest/gtest.h>
-
-#include <cstdlib>
-#include <ctime>
-
 #include "errors.h"
+#include "support/test.h"
 
 namespace kelo::tool {
 namespace {
