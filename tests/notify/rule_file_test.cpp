@@ -82,14 +82,12 @@ TEST_F(NotificationSwitches, AreOnWhenAnyChannelIs) {
     } cases[] = {
         {mail + "\"no\"\n" + push, false, {}},
         {mail + "\"yes\"\n" + push, true, {}},
-        {mail + "\"yes, but only here\"\n" + push, false, {}},
         {"smtp_mail_enabled=\"yes\"\nsmtp_to=\"a@b.c\"\n" + push, false, {}},
         {"smtp_mail_enabled=\"yes\"\nsmtp_to=\" , ;\"\nsmtp_server=\"mx\"\n" + push, false, {}},
         {noMail + sms + push, true, {}},
         {noMail + "pushservice_skype_enabled=\"yes\"\n" + push, true, {}},
         {sms + push, false, {"utils:166 Fail to get smtp mail setting"}},
         {noMail + sms, false, {"utils:188 Fail to get mobile setting"}},
-        {noMail + sms + mobile, false, {"utils:196 Fail to get msn setting"}},
         {noMail + sms + mobile + msn, false, {"utils:204 Fail to get skype setting"}},
     };
     for (const auto &[settings, isOn, messages] : cases) {
