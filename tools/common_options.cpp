@@ -11,7 +11,7 @@ void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTab
     const std::string group = "Where to look";
     AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
     AddText(command, "--log", options.log, "NAME",
-            "One of the system's logs: " + KnownLogNames() + " (default: logs)")
+            "One of the system's logs: " + KnownLogNames() + " (default: logs), or an archive by its name")
         ->group(group);
     if (withTable)
         AddText(

@@ -50,7 +50,7 @@ int64_t EpsSeries::StartOf(int64_t stamp) const {
     return stamp - (into < 0 ? into + Seconds() : into);
 }
 
-void ReadEps(const std::string &path, int64_t since, int64_t until, EpsSeries &series) {
+void ReadEps(const std::string &path, int64_t since, int64_t until, const EpsHandler &handle) {
     constexpr int64_t kDay = 24 * 60 * 60;
     constexpr int64_t kLastStamp = std::numeric_limits<int32_t>::max();
     const StampRange asked = {std::max<int64_t>(since, 0), std::min(until, kLastStamp)};
@@ -64,7 +64,7 @@ void ReadEps(const std::string &path, int64_t since, int64_t until, EpsSeries &s
         if (samples.empty() && StoredStamps(path, {from, to}))
             throw DatabaseError(DescribeDatabaseProblem({path, "eps"}));
         for (const auto &[stamp, sample] : samples)
-            series.Add(sample);
+            handle(sample);
     }
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <optional>
 #include <string>
@@ -25,8 +26,7 @@ struct EpsBucket {
 // Sums samples up to intervals: what tables and plots of the events per second are drawn from.
 //
 //     EpsSeries series(EpsInterval::Minute);
-//     for (const auto &[stamp, sample] : SyslogDBEpsGet(path, since, until))
-//         series.Add(sample);
+//     ReadEps(path, since, until, [&](const SYSLOG_LOG_EPS &sample) { series.Add(sample); });
 //     for (const auto &[start, bucket] : series.Buckets())
 //         Draw(start, series.PerSecond(bucket.logs));
 //
@@ -58,9 +58,11 @@ private:
     std::map<int64_t, EpsBucket> buckets_;
 };
 
-// Adds the samples with stamps from `since` to `until` (seconds since the epoch) of an accounting database, a
-// day at a time, so that the memory in use does not grow with the samples. Stamps beyond 32 bits are not
-// read. Throws DatabaseError.
-void ReadEps(const std::string &path, int64_t since, int64_t until, EpsSeries &series);
+using EpsHandler = std::function<void(const SYSLOG_LOG_EPS &)>;
+
+// Hands the samples with stamps from `since` to `until` (seconds since the epoch) of an accounting database
+// to `handle`, oldest first. They are read a day at a time, so that the memory in use does not grow with the
+// samples. Stamps beyond 32 bits are not read. Throws DatabaseError.
+void ReadEps(const std::string &path, int64_t since, int64_t until, const EpsHandler &handle);
 
 } // namespace kelo::tool

@@ -3,12 +3,9 @@
 #include <algorithm>
 #include <cstdlib>
 #include <ctime>
-#include <functional>
-#include <memory>
 
-#include "errors.h"
-#include "keloplatform/kelodb.h"
 #include "kelosyslog/records.h"
+#include "plain_database.h"
 
 namespace kelo::tool {
 namespace {
@@ -16,41 +13,8 @@ namespace {
 constexpr int64_t kMostSpans = 100;
 constexpr int64_t kDaySec = 86400;
 
-using Connection = std::unique_ptr<DBConnect_tag, int (*)(DBConnect_tag *)>;
-using Result = std::unique_ptr<DBResult_tag, void (*)(DBResult_tag *)>;
-
-class Table {
-public:
-    explicit Table(const LogSource &source)
-        : source_(source),
-          connection_(KELODBConnect(nullptr, nullptr, nullptr, source.path.c_str()), KELODBClose) {
-        if (connection_ == nullptr)
-            throw DatabaseError(DescribeDatabaseProblem(source_));
-    }
-
-    // Calls `handle` with every row, of which `Text` reads a column.
-    using Row = std::function<const char *(const char *column)>;
-    void ForEach(const std::string &sql, const std::function<void(const Row &)> &handle) const {
-        DBResult_tag *raw = nullptr;
-        if (KELODBExecute(connection_.get(), sql.c_str(), &raw) < 0)
-            throw DatabaseError(DescribeDatabaseProblem(source_));
-        const Result result(raw, KELODBFreeResult);
-        unsigned int row = 0;
-        while (KELODBFetchRow(result.get(), &row) >= 0) {
-            handle([&](const char *column) {
-                const char *text = KELODBFetchField(result.get(), row, column);
-                return text != nullptr ? text : "";
-            });
-        }
-    }
-
-private:
-    const LogSource &source_;
-    Connection connection_;
-};
-
-int64_t Number(const char *text) {
-    return std::strtoll(text, nullptr, 10);
+int64_t Number(const std::string &text) {
+    return std::strtoll(text.c_str(), nullptr, 10);
 }
 
 int64_t FloorMod(int64_t value, int64_t divisor) {
@@ -110,14 +74,12 @@ TimeGrid MakeTimeGrid(int64_t from, int64_t to) {
 
 std::optional<Period> LogPeriod(const LogSource &source, std::optional<int64_t> since,
                                 std::optional<int64_t> until) {
-    std::optional<Period> period;
-    Table(source).ForEach(
+    const auto ends = PlainDatabase(source).FirstRow(
         "SELECT (SELECT min(utcsec) FROM logs) AS first, (SELECT max(utcsec) FROM logs) AS last",
-        [&](const Table::Row &row) {
-            if (*row("first") != '\0')
-                period = Period{since.value_or(Number(row("first"))), until.value_or(Number(row("last")))};
-        });
-    return period;
+        {"first", "last"});
+    if (!ends || ends->front().empty())
+        return std::nullopt;
+    return Period{since.value_or(Number(ends->front())), until.value_or(Number(ends->back()))};
 }
 
 LogFigures ReadLogFigures(const LogSource &source, const Period &period, bool isWhole, size_t topDevices) {
@@ -127,20 +89,19 @@ LogFigures ReadLogFigures(const LogSource &source, const Period &period, bool is
     const std::string which = isWhole ? ""
                                       : " WHERE utcsec BETWEEN " + std::to_string(period.from) + " AND " +
                                             std::to_string(period.to);
-    const Table table(source);
+    const PlainDatabase database(source);
     const std::string span =
         "(utcsec - (" + std::to_string(figures.grid.origin) + ")) / " + std::to_string(figures.grid.widthSec);
-    table.ForEach(
-        "SELECT " + span + " AS span, prio, count(*) AS number FROM logs" + which + " GROUP BY 1, 2",
-        [&](const Table::Row &row) {
-            AddSpan(figures, row("prio"), Number(row("span")), static_cast<uint64_t>(Number(row("number"))));
-        });
-    table.ForEach(
-        "SELECT host, count(*) AS number FROM logs" + which + " GROUP BY host ORDER BY number DESC, host",
-        [&](const Table::Row &row) {
-            if (figures.deviceCount++ < topDevices)
-                figures.devices.emplace_back(row("host"), static_cast<uint64_t>(Number(row("number"))));
-        });
+    for (const PlainDatabase::Row &row : database.Rows(
+             "SELECT " + span + " AS span, prio, count(*) AS number FROM logs" + which + " GROUP BY 1, 2",
+             {"prio", "span", "number"}))
+        AddSpan(figures, row[0], Number(row[1]), static_cast<uint64_t>(Number(row[2])));
+    for (const PlainDatabase::Row &row : database.Rows("SELECT host, count(*) AS number FROM logs" + which +
+                                                           " GROUP BY host ORDER BY number DESC, host",
+                                                       {"host", "number"})) {
+        if (figures.deviceCount++ < topDevices)
+            figures.devices.emplace_back(row[0], static_cast<uint64_t>(Number(row[1])));
+    }
     return figures;
 }
 

@@ -78,6 +78,20 @@ std::string ReasonFromOutside(const LogSource &source, bool forWriting) {
     return "no usable table '" + source.table + "' in it, or it is locked or damaged; see the system log";
 }
 
+// Throws UsageError when there is no archive of this name.
+std::string ArchivePath(const std::string &name, const std::string &root) {
+    const std::string folder = ArchiveFolderPath(root);
+    const bool isPlain = name.find('/') == std::string::npos && name.front() != '.';
+    for (const char *suffix : {"", ".db"}) {
+        std::error_code error;
+        const std::string path = folder + "/" + name + suffix;
+        if (isPlain && std::filesystem::is_regular_file(path, error))
+            return path;
+    }
+    throw UsageError("--log: unknown log '" + name + "'; logs are " + KnownLogNames() +
+                     ", and the archives that 'kelosyslog archive --list' lists");
+}
+
 } // namespace
 
 LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root) {
@@ -90,15 +104,18 @@ LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &r
         source.path = root + kWorkingLogPath;
     } else {
         const std::string path = XferlogDBPathGet(options.log.c_str());
-        if (path.empty())
-            throw UsageError("--log: unknown log '" + options.log + "'; logs are " + KnownLogNames());
-        source.path = root + path;
-        source.table = "transfer_log";
+        source.path = path.empty() ? ArchivePath(options.log, root) : root + path;
+        if (!path.empty())
+            source.table = "transfer_log";
     }
     if (!options.table.empty())
         source.table = options.table;
     source.kind = KindOf(source.table);
     return source;
+}
+
+std::string ArchiveFolderPath(const std::string &root) {
+    return root + "/var/log/kelolog/archive";
 }
 
 std::string KnownLogNames() {

@@ -27,10 +27,14 @@ struct LogSourceOptions {
 
 // The table to read: a file by its path (relative to the working folder), or a fixed log by its name, whose
 // path stands below `root`: "logs" for the working log, which is the default, and the names of the transfer
-// logs. Nothing is opened. Throws UsageError for an unknown log or table.
+// logs, or else an archive in the folder of the archives by its file name, with or without ".db". Nothing is
+// opened. Throws UsageError for an unknown log or table.
 LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root);
 
-// The names that --log knows, separated by commas.
+// The folder of the archives below `root`.
+std::string ArchiveFolderPath(const std::string &root);
+
+// The names that --log knows apart from archives, separated by commas.
 std::string KnownLogNames();
 
 // One line that names the path and what can be told from outside about why it cannot be read (or changed,

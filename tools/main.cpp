@@ -28,5 +28,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
     kelo::tool::AddDb(program);
+    kelo::tool::AddArchive(program);
+    kelo::tool::AddStatus(program);
     return kelo::tool::RunProgram(program, argc, argv);
 }

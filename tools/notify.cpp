@@ -17,6 +17,7 @@
 #include "output.h"
 #include "program.h"
 #include "rule_set.h"
+#include "spool/channel_health.h"
 #include "spool/json.h"
 #include "spool/settings.h"
 #include "spool/spool.h"
@@ -76,22 +77,17 @@ int Print(const Json::Value &items, bool isJson, const std::string &text) {
 }
 
 int ShowStatus(const Spool &spool, const Settings &settings, bool isJson) {
-    const Progress health = spool.ReadChannels();
     Json::Value status;
     std::string text;
-    for (const std::string_view view : kChannelNames) {
-        const std::string name(view);
-        const bool isOn = settings.IsOn(name);
-        std::string problem = isOn ? ChannelProblem(settings, name) : "";
-        if (const auto found = health.targets.find(name);
-            isOn && problem.empty() && found != health.targets.end())
-            problem =
-                found->second.reason + " (next attempt " + TimeFormat(false).Plain(found->second.next) + ")";
-        Json::Value &channel = status["channels"][name];
-        channel["enabled"] = isOn;
+    for (const ChannelHealth &health : ReadChannelHealth(spool, settings)) {
+        std::string problem = health.problem;
+        if (health.next != 0)
+            problem += " (next attempt " + TimeFormat(false).Plain(health.next) + ")";
+        Json::Value &channel = status["channels"][health.name];
+        channel["enabled"] = health.isOn;
         channel["problem"] = problem;
-        text += name + std::string(13 - name.size(), ' ') +
-                (!isOn             ? "off"
+        text += health.name + std::string(13 - health.name.size(), ' ') +
+                (!health.isOn      ? "off"
                  : problem.empty() ? "on"
                                    : "failing: ") +
                 VisibleText(problem) + "\n";

@@ -2,8 +2,8 @@
 
 #include <charconv>
 #include <cstdio>
-#include <filesystem>
 
+#include "command_line.h"
 #include "errors.h"
 #include "exit_status.h"
 #include "keloplatform/root.h"
@@ -33,9 +33,7 @@ std::vector<std::string> SplitEmptyValues(int argc, const char *const *argv) {
 void ApplyRoot(std::string &root) {
     if (root.empty())
         return;
-    root = std::filesystem::absolute(root).lexically_normal().string();
-    if (root.back() == '/')
-        root.pop_back();
+    root = NormalRoot(root);
     if (SyslogRootSet(root) != 0 || KELORootSet(root.c_str()) != 0)
         throw UsageError("--root: cannot use '" + root + "'");
 }
@@ -47,9 +45,20 @@ void RequireValues(const std::string &names, const CLI::results_t &values) {
     }
 }
 
-int ReportUsage(const std::string &text) {
-    PrintMessage(text);
-    return kExitUsage;
+int RunCommand(Program &program, int argc, const char *const *argv) {
+    std::vector<std::string> arguments = SplitEmptyValues(argc, argv);
+    program.app.parse(arguments);
+    if (!program.run)
+        throw UsageError("a command is missing (see --help)");
+    ApplyRoot(program.root);
+    try {
+        return program.run();
+    } catch (const OutputClosed &) {
+        return kExitFound;
+    } catch (const DatabaseError &error) {
+        PrintMessage(error.what());
+        return kExitDatabase;
+    }
 }
 
 } // namespace
@@ -107,34 +116,8 @@ void PrintMessage(const std::string &text) {
 
 int RunProgram(Program &program, int argc, const char *const *argv) {
     AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
-    try {
-        std::vector<std::string> arguments = SplitEmptyValues(argc, argv);
-        program.app.parse(arguments);
-        if (!program.run)
-            throw UsageError("a command is missing (see --help)");
-        ApplyRoot(program.root);
-        return program.run();
-    } catch (const CLI::Success &request) { // --help, --version
-        return program.app.exit(request);
-    } catch (const CLI::ParseError &error) {
-        return ReportUsage(std::string(error.what()) + " (see --help)");
-    } catch (const UsageError &error) {
-        return ReportUsage(error.what());
-    } catch (const OutputClosed &) {
-        return kExitFound;
-    } catch (const DatabaseError &error) {
-        PrintMessage(error.what());
-        return kExitDatabase;
-    } catch (const OutputError &error) {
-        PrintMessage(error.what());
-        return kExitSystem;
-    } catch (const std::bad_alloc &) {
-        PrintMessage("out of memory");
-        return kExitSystem;
-    } catch (const std::exception &error) { // for example a working folder that is gone
-        PrintMessage(error.what());
-        return kExitSystem;
-    }
+    return RunToAnEnd(program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
+                      [&] { return RunCommand(program, argc, argv); });
 }
 
 } // namespace kelo::tool

@@ -63,5 +63,7 @@ void AddRules(Program &program);
 void AddNotify(Program &program);
 void AddParse(Program &program);
 void AddDb(Program &program);
+void AddArchive(Program &program);
+void AddStatus(Program &program);
 
 } // namespace kelo::tool

@@ -4,7 +4,9 @@
 
 #include <ctime>
 
+#include "accounting_source.h"
 #include "common_options.h"
+#include "eps_series.h"
 #include "errors.h"
 #include "exit_status.h"
 #include "replacement_file.h"
@@ -35,14 +37,21 @@ struct Options {
     bool inUtc = false;
 };
 
-AccountingFigures ReadAccounting(const std::string &root, const Period &period) {
-    const std::string path = root + "/var/log/kelolog/.KELOACCOUNTDB";
+// The figures as far as they can be read: a report is worth having without them.
+AccountingFigures ReadAccounting(const std::string &path, const Period &period, const TimeGrid &grid) {
     AccountingFigures figures;
-    // Its stamps are 32 bits wide.
-    if (access(path.c_str(), R_OK) == 0 && period.from >= 0 &&
-        period.to <= std::numeric_limits<int32_t>::max()) {
-        figures.samples = SyslogDBEpsGet(path, static_cast<int>(period.from), static_cast<int>(period.to));
+    if (access(path.c_str(), F_OK) != 0)
+        return figures;
+    try {
+        ReadEps(path, period.from, period.to, [&](const SYSLOG_LOG_EPS &sample) {
+            figures.peaks.resize(grid.count);
+            if (const std::optional<size_t> span = grid.Find(sample.stamp))
+                figures.peaks[*span] = std::max(figures.peaks[*span], sample.eps);
+        });
+        RequireHistogram(path);
         figures.devices = SyslogDBHistGet(path, kTopDevices);
+    } catch (const DatabaseError &error) {
+        PrintMessage(std::string("no counts of the accounting: ") + error.what());
     }
     return figures;
 }
@@ -80,7 +89,7 @@ void ReadReport(const Options &options, const std::string &root, Report &report)
         report.logs = ReadLogFigures(source, report.period, isWhole, kTopDevices);
     report.eventDatabase = EventDatabasePath(options.eventsDb, root);
     report.events = ReadEventsOf(report.eventDatabase, !options.eventsDb.empty(), report.period);
-    report.accounting = ReadAccounting(root, report.period);
+    report.accounting = ReadAccounting(AccountingPath("", root), report.period, report.logs.grid);
 }
 
 int Run(const Options &options, const std::string &root) {

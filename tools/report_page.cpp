@@ -159,14 +159,8 @@ Data LogChart(const Report &report, const TimeFormat &time) {
 
 Data AccountingChart(const Report &report, const TimeFormat &time) {
     const TimeGrid &grid = report.logs.grid;
-    std::vector<int64_t> peaks(grid.count);
-    int64_t most = 0;
-    for (const auto &[stamp, sample] : report.accounting.samples) {
-        if (const std::optional<size_t> span = grid.Find(stamp)) {
-            peaks[*span] = std::max(peaks[*span], sample.eps);
-            most = std::max(most, sample.eps);
-        }
-    }
+    const std::vector<int64_t> &peaks = report.accounting.peaks;
+    const int64_t most = *std::max_element(peaks.begin(), peaks.end());
     TimeChart chart(grid, static_cast<double>(most));
     for (size_t i = 0; i < peaks.size(); ++i) {
         if (peaks[i] > 0)
@@ -286,7 +280,7 @@ List Tiles(const Report &report, const TimeFormat &time) {
 
 void SetAccounting(Data &page, const Report &report, const TimeFormat &time) {
     const AccountingFigures &figures = report.accounting;
-    const bool hasChart = !figures.samples.empty() && report.logs.grid.count > 0;
+    const bool hasChart = !figures.peaks.empty();
     page.set("hasAccounting", hasChart || !figures.devices.empty());
     page.set("hasAccountingChart", hasChart);
     if (hasChart)

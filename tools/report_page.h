@@ -4,16 +4,16 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "event_log.h"
-#include "kelosyslog/dbutil.h"
 #include "log_figures.h"
 
 namespace kelo::tool {
 
 // Counts of the accounting database, taken as the logs were received.
 struct AccountingFigures {
-    std::map<int, SYSLOG_LOG_EPS> samples;   // in the period
+    std::vector<int64_t> peaks; // most logs of a sample, by span of the grid of LogFigures; empty for none
     std::map<std::string, uint64_t> devices; // with the highest counts, over all time
 };
 

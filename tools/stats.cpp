@@ -108,7 +108,7 @@ EpsSeries ReadSeries(const std::string &path, const Options &options) {
         since = now - kDay;
     EpsSeries series(ParseEpsInterval(options.interval),
                      options.device.empty() ? std::nullopt : std::optional(options.device));
-    ReadEps(path, since, until, series);
+    ReadEps(path, since, until, [&](const SYSLOG_LOG_EPS &sample) { series.Add(sample); });
     return series;
 }
 

@@ -71,6 +71,11 @@ bool FileFaults::HasUnsynced() {
     return !state.unsynced.empty();
 }
 
+bool FileFaults::IsUnsynced(const std::string &path) {
+    struct stat file;
+    return stat(path.c_str(), &file) != 0 || state.unsynced.contains(file.st_ino);
+}
+
 } // namespace kelo::test
 
 using namespace kelo::test;

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <string>
+
 namespace kelo::test {
 
 // Makes chosen file operations of the whole process fail, those of SQLite too: the program replaces the
@@ -19,6 +21,8 @@ public:
     static bool Stop();
     // Whether files were written, or folders had files renamed, since Start and were not synced afterwards.
     static bool HasUnsynced();
+    // The same of one file.
+    static bool IsUnsynced(const std::string &path);
 };
 
 } // namespace kelo::test

@@ -80,6 +80,9 @@ TEST(Completion, OffersTheValuesOfAnOptionAndListsWithExclusions) {
     EXPECT_EQ(Complete("values -o s"), Words{});
     EXPECT_EQ(Complete("db info -o ''"), (Words{"text", "json"}));
     EXPECT_EQ(Complete("values ut"), (Words{"utcsec"}));
+    const TempRoot root;
+    std::filesystem::create_directories(root.File("var/log/kelolog/archive/nas_2020.db"));
+    EXPECT_EQ(Complete("count --root " + root.Path() + " --log n"), (Words{"nas_2020"}));
 }
 
 } // namespace

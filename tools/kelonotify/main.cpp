@@ -8,13 +8,13 @@
 
 #include <csignal>
 #include <cstdio>
-#include <filesystem>
 #include <memory>
 
+#include "command_line.h"
+#include "errors.h"
 #include "kelonotify/deliverer.h"
 #include "kelonotify/watcher.h"
 #include "keloplatform/root.h"
-#include "text_encoding.h"
 
 namespace kelo::tool {
 namespace {
@@ -78,11 +78,9 @@ void AddOptions(CLI::App &app, Options &options) {
 void ApplyRoot(std::string &root) {
     if (root.empty())
         return;
-    root = std::filesystem::absolute(root).lexically_normal().string();
-    if (root.back() == '/')
-        root.pop_back();
+    root = NormalRoot(root);
     if (KELORootSet(root.c_str()) != 0)
-        throw CLI::ValidationError("--root", "cannot use '" + root + "'");
+        throw UsageError("--root: cannot use '" + root + "'");
 }
 
 } // namespace
@@ -93,20 +91,16 @@ int Main(int argc, char **argv) {
     Options options;
     CLI::App app("Deliver the notifications that wait in the spool.", "kelonotify");
     AddOptions(app, options);
-    try {
+    const Endings endings = {
+        kExitUsage, kExitSpool,
+        [](const std::string &text) { std::fprintf(stderr, "kelonotify: %s\n", text.c_str()); },
+        [](const std::string &text) { syslog(LOG_ERR, "%s", text.c_str()); }};
+    return RunToAnEnd(app, endings, [&] {
         app.parse(argc, argv);
         ApplyRoot(options.root);
         curl_global_init(CURL_GLOBAL_DEFAULT);
         return Run(options);
-    } catch (const CLI::Success &request) { // --help, --version
-        return app.exit(request);
-    } catch (const CLI::ParseError &error) {
-        std::fprintf(stderr, "kelonotify: %s (see --help)\n", VisibleText(error.what()).c_str());
-        return kExitUsage;
-    } catch (const std::exception &error) {
-        syslog(LOG_ERR, "%s", VisibleText(error.what()).c_str());
-        return kExitSpool;
-    }
+    });
 }
 
 } // namespace kelo::tool

@@ -1,0 +1,146 @@
+#include "archive/archive_folder.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <utility>
+
+#include "archive/archive_name.h"
+#include "errors.h"
+
+namespace kelo::tool {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr const char *kTemporary = ".kelosyslog-archive-";
+constexpr const char *kRemoval = ".removing-";
+constexpr mode_t kFolderMode = 0750;
+
+} // namespace
+
+ArchiveFolder::ArchiveFolder(std::string path, bool mayCreate) : path_(std::move(path)) {
+    if (mayCreate && !fs::exists(path_)) {
+        std::error_code error;
+        fs::create_directories(fs::path(path_).parent_path(), error);
+        if (mkdir(path_.c_str(), kFolderMode) != 0 && errno != EEXIST)
+            Fail(path_, errno);
+    }
+    lock_ = FileHandle(open(path_.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!lock_)
+        Fail(path_, errno);
+    if (flock(lock_.Get(), LOCK_EX | LOCK_NB) != 0) {
+        if (errno == EWOULDBLOCK)
+            throw OutputError(path_ + ": another run of kelosyslog archive works in this folder");
+        Fail(path_, errno);
+    }
+    if (access(path_.c_str(), W_OK | X_OK) != 0)
+        Fail(path_, errno);
+    RemoveLeftovers();
+}
+
+ArchiveFolder::~ArchiveFolder() {
+    try {
+        RemoveLeftovers();
+    } catch (const std::exception &) { // the next run removes them
+    }
+}
+
+std::vector<std::string> ArchiveFolder::Names() const {
+    std::error_code error;
+    std::vector<std::string> names;
+    for (auto entry = fs::directory_iterator(path_, error); entry != fs::directory_iterator();
+         entry.increment(error))
+        names.push_back(entry->path().filename().string());
+    if (error)
+        Fail(path_, error.value());
+    return names;
+}
+
+// Temporary files, and notes whose archive never got its name or is gone.
+void ArchiveFolder::RemoveLeftovers() const {
+    for (const std::string &name : Names()) {
+        const bool isNote = name.starts_with(kRemoval);
+        if (name.starts_with(kTemporary) ||
+            (isNote && access((path_ + "/" + name.substr(std::strlen(kRemoval))).c_str(), F_OK) != 0))
+            unlink((path_ + "/" + name).c_str());
+    }
+}
+
+std::string ArchiveFolder::NewTemporary() {
+    const std::string path = path_ + "/" + kTemporary + std::to_string(++temporaries_);
+    if (!FileHandle(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600)))
+        Fail(path, errno);
+    return path;
+}
+
+void ArchiveFolder::RemoveTemporary(const std::string &path) const {
+    for (const char *suffix : {"", "-journal", "-wal", "-shm"})
+        unlink((path + suffix).c_str());
+}
+
+std::string ArchiveFolder::FreeName(const std::string &device, const std::string &firstDate,
+                                    const std::string &lastDate) const {
+    for (int number = 1;; ++number) {
+        std::string name = ArchiveName(device, firstDate, lastDate, number);
+        struct stat status {};
+        if (lstat((path_ + "/" + name).c_str(), &status) == 0)
+            continue;
+        if (errno != ENOENT)
+            Fail(path_ + "/" + name, errno);
+        return name;
+    }
+}
+
+std::string ArchiveFolder::Publish(const std::string &temporary, const std::string &name,
+                                   const std::string &like) const {
+    std::string path = path_ + "/" + name;
+    const FileHandle file(open(temporary.c_str(), O_RDWR | O_NOFOLLOW | O_CLOEXEC));
+    struct stat status {};
+    if (!file || stat(like.c_str(), &status) != 0)
+        Fail(path, errno);
+    // Only root can give files away; for others the archive stays theirs.
+    const bool isOwned = fchown(file.Get(), status.st_uid, status.st_gid) == 0;
+    const mode_t mode = status.st_mode & (isOwned ? 0666 : 0600);
+    if (fchmod(file.Get(), mode) != 0 || fsync(file.Get()) != 0 ||
+        renameat2(AT_FDCWD, temporary.c_str(), AT_FDCWD, path.c_str(), RENAME_NOREPLACE) != 0)
+        Fail(path, errno);
+    if (fsync(lock_.Get()) != 0) {
+        const int error = errno;
+        unlink(path.c_str());
+        Fail(path, error);
+    }
+    return path;
+}
+
+void ArchiveFolder::NoteRemoval(const std::string &name, const std::string &source) const {
+    const std::string note = path_ + "/" + kRemoval + name;
+    if (!WriteDurably(path_ + "/" + kTemporary + "note", note, source))
+        Fail(note, errno);
+}
+
+void ArchiveFolder::ForgetRemoval(const std::string &name) const {
+    const std::string note = path_ + "/" + kRemoval + name;
+    if (!RemoveDurably(note))
+        Fail(note, errno);
+}
+
+std::vector<std::string> ArchiveFolder::PendingRemovals(const std::string &source) const {
+    std::vector<std::string> archives;
+    for (const std::string &name : Names()) {
+        if (name.starts_with(kRemoval) && ReadWhole(path_ + "/" + name) == source)
+            archives.push_back(name.substr(std::strlen(kRemoval)));
+    }
+    return archives;
+}
+
+void ArchiveFolder::Fail(const std::string &path, int error) const {
+    throw OutputError(path + ": " + std::strerror(error));
+}
+
+} // namespace kelo::tool

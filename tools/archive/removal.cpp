@@ -1,0 +1,115 @@
+#include "archive/removal.h"
+
+#include <sqlite3.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <chrono>
+#include <thread>
+
+#include "archive/stop_signals.h"
+#include "errors.h"
+
+namespace kelo::tool {
+namespace {
+
+using std::chrono::milliseconds;
+using std::chrono::steady_clock;
+
+constexpr int kLockTimeoutMs = 30'000;
+constexpr int64_t kFirstRowLimit = 10'000;
+constexpr int64_t kLeastRowLimit = 100;
+constexpr int64_t kMostRowLimit = 100'000;
+// How long others wait for one transaction. SQLite's writers ask again every 50 ms at this age of a lock, so
+// the pause lets each of them in.
+constexpr milliseconds kTransactionTime{100};
+constexpr milliseconds kPause{60};
+constexpr int kRowsPerLook = 100;
+constexpr off_t kLargestWal = off_t{32} << 20;
+// A checkpoint that waits for readers keeps writers waiting with it.
+constexpr int kCheckpointTimeoutMs = 200;
+
+constexpr const char *kRows = "SELECT id, utcsec, host, prog, msg FROM logs WHERE id >= ?1 ORDER BY id";
+constexpr const char *kRemove =
+    "DELETE FROM logs WHERE id = ?1 AND utcsec IS ?2 AND host IS ?3 AND prog IS ?4 AND msg IS ?5";
+constexpr int kColumns = 5;
+
+off_t SizeOf(const std::string &path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0 ? status.st_size : 0;
+}
+
+} // namespace
+
+Removal::Removal(const std::string &source, const std::string &archive)
+    : source_(source, SqliteFile::Mode::kWrite), archive_(archive, SqliteFile::Mode::kRead),
+      rows_(archive_.Prepare(kRows)), remove_(source_.Prepare(kRemove)), rowLimit_(kFirstRowLimit) {
+    source_.SetBusyTimeout(kLockTimeoutMs);
+}
+
+void Removal::Run() {
+    try {
+        sqlite3_bind_int64(rows_.get(), 1, source_.Number("SELECT min(id) FROM logs"));
+        hasRow_ = archive_.Step(rows_.get());
+        while (hasRow_) {
+            StopSignals::Check();
+            const auto start = steady_clock::now();
+            if (RemoveSome())
+                std::this_thread::sleep_for(
+                    std::max<steady_clock::duration>(kPause, steady_clock::now() - start));
+            BoundWriteAheadLog();
+        }
+    } catch (const DatabaseError &error) {
+        throw DatabaseError(std::string(error.what()) + "; " + std::to_string(removed_) +
+                            " archived logs were removed before, the others are still there");
+    }
+}
+
+// One transaction. Returns whether it removed anything.
+bool Removal::RemoveSome() {
+    source_.Run("BEGIN IMMEDIATE");
+    const auto start = steady_clock::now();
+    uint64_t count = 0;
+    try {
+        count = RemoveRows();
+        source_.Run("COMMIT");
+    } catch (...) {
+        sqlite3_reset(remove_.get());
+        sqlite3_exec(source_.Get(), "ROLLBACK", nullptr, nullptr, nullptr);
+        throw;
+    }
+    removed_ += count;
+    const auto time = std::max<steady_clock::duration>(steady_clock::now() - start, milliseconds(1));
+    rowLimit_ =
+        std::clamp(static_cast<int64_t>(rowLimit_ * kTransactionTime / time), kLeastRowLimit, kMostRowLimit);
+    return count > 0;
+}
+
+uint64_t Removal::RemoveRows() {
+    const auto end = steady_clock::now() + kTransactionTime;
+    uint64_t count = 0;
+    for (int64_t row = 0; hasRow_ && row < rowLimit_; ++row) {
+        if (row % kRowsPerLook == 0 && steady_clock::now() >= end)
+            break;
+        for (int column = 0; column < kColumns; ++column)
+            sqlite3_bind_value(remove_.get(), column + 1, sqlite3_column_value(rows_.get(), column));
+        source_.Step(remove_.get());
+        sqlite3_reset(remove_.get());
+        count += static_cast<uint64_t>(sqlite3_changes(source_.Get()));
+        hasRow_ = archive_.Step(rows_.get());
+    }
+    return count;
+}
+
+// Every commit copies what it can of the log into the file, but only a log that nobody uses begins anew.
+void Removal::BoundWriteAheadLog() {
+    if (SizeOf(source_.Path() + "-wal") <= kLargestWal)
+        return;
+    // Most of it first, without keeping writers out.
+    sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_PASSIVE, nullptr, nullptr);
+    source_.SetBusyTimeout(kCheckpointTimeoutMs);
+    sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr);
+    source_.SetBusyTimeout(kLockTimeoutMs);
+}
+
+} // namespace kelo::tool

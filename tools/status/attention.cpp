@@ -1,0 +1,96 @@
+// What of a status an administrator should see to.
+
+#include "status/figures.h"
+#include "status/server_status.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr int64_t kLongestWaitSec = 3600; // the longest pause between two attempts
+
+using Lines = std::vector<std::string>;
+
+void LookAtSyslogNg(const SyslogNgStatus &status, Lines &lines) {
+    using State = SyslogNgStatus::State;
+    if (status.state == State::Stopped)
+        lines.push_back("syslog-ng is not running (" + status.control + ": " + status.problem + ")");
+    else if (status.state == State::Silent)
+        lines.push_back("syslog-ng runs and does not answer (" + status.control + ": " + status.problem +
+                        ")");
+    else if (status.state == State::Unknown)
+        lines.push_back("cannot tell whether syslog-ng runs (" + status.control + ": " + status.problem +
+                        ")");
+    for (const SyslogNgCounters &destination : status.destinations) {
+        if (destination.dropped > 0)
+            lines.push_back("syslog-ng dropped " + Counted(destination.dropped, "message") + " for " +
+                            destination.id + " (" + destination.instance + ")");
+    }
+}
+
+void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
+    using State = ReceiverStatus::State;
+    const std::string pid = std::to_string(status.told.pid);
+    if (status.state == State::Died)
+        lines.push_back("the receiver died: process " + pid + " is gone and did not end in order");
+    else if (status.state == State::Silent)
+        lines.push_back("the receiver (process " + pid + ") has told nothing of itself for " +
+                        Duration(now - status.told.updated));
+    else if (status.state == State::Unreadable)
+        lines.push_back("cannot tell whether the receiver runs: " + status.path + " cannot be read");
+    if ((status.state == State::Running || status.state == State::Silent) && !status.told.waiting.empty())
+        lines.push_back("the receiver waits: " + status.told.waiting);
+}
+
+void LookAtDatabases(const ServerStatus &status, Lines &lines) {
+    using State = DatabaseStatus::State;
+    const std::string &ofReceiver = status.receiver.told.database;
+    for (const DatabaseStatus &database : status.databases) {
+        // Accounting and events begin when there is something to write. The working log is missed unless the
+        // receiver stores elsewhere.
+        const bool isMissed = (database.name == "logs" && ofReceiver.empty()) || database.path == ofReceiver;
+        if (database.state == State::Damaged)
+            lines.push_back("database " + database.name + " is damaged: " + database.problem);
+        else if (database.state == State::Locked)
+            lines.push_back("database " + database.name + " is locked: " + database.problem);
+        else if (database.state == State::Unreadable || (database.state == State::Missing && isMissed))
+            lines.push_back("database " + database.name + ": " + database.problem);
+        if (database.quarantined)
+            lines.push_back("a damaged database was put aside: " + database.path + ".corrupt (" +
+                            Bytes(*database.quarantined) + ")");
+    }
+    if (!status.archives.problem.empty())
+        lines.push_back("archives: " + status.archives.problem);
+}
+
+void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &lines) {
+    if (!status.problem.empty())
+        lines.push_back("notifications: " + status.problem);
+    if (status.failed > 0)
+        lines.push_back("given up: " + Counted(status.failed, "notification") + " (kelosyslog notify list)");
+    if (status.oldest != 0 && now - status.oldest > kLongestWaitSec)
+        lines.push_back("a notification has waited for " + Duration(now - status.oldest) +
+                        "; does kelonotify run?");
+    for (const ChannelHealth &channel : status.channels) {
+        if (!channel.problem.empty())
+            lines.push_back("channel " + channel.name + " fails: " + channel.problem);
+    }
+}
+
+} // namespace
+
+std::vector<std::string> FindAttention(const ServerStatus &status) {
+    Lines lines;
+    LookAtSyslogNg(status.syslogNg, lines);
+    LookAtReceiver(status.receiver, status.time, lines);
+    LookAtDatabases(status, lines);
+    LookAtNotifications(status.notifications, status.time, lines);
+    for (const VolumeStatus &volume : status.volumes) {
+        if (volume.IsNearlyFull())
+            lines.push_back("the volume of " + volume.folders.front() +
+                            " is nearly full: " + Bytes(static_cast<int64_t>(volume.free)) + " free of " +
+                            Bytes(static_cast<int64_t>(volume.size)));
+    }
+    return lines;
+}
+
+} // namespace kelo::tool

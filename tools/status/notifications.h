@@ -1,0 +1,23 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "spool/channel_health.h"
+
+namespace kelo::tool {
+
+// How notifications go.
+struct NotificationStatus {
+    std::string path; // of the spool
+    size_t waiting = 0;
+    size_t failed = 0;  // given up
+    int64_t oldest = 0; // time of the oldest that waits, seconds since the epoch; 0 when unknown
+    std::vector<ChannelHealth> channels;
+    std::string problem; // why the spool cannot be read; "" when it can, or is not there
+};
+
+NotificationStatus GatherNotifications(const std::string &root);
+
+} // namespace kelo::tool

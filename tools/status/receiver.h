@@ -1,0 +1,23 @@
+#pragma once
+
+#include <optional>
+#include <string>
+
+#include "receiver_state.h"
+
+namespace kelo::tool {
+
+// What has become of `kelosyslog receive`.
+struct ReceiverStatus {
+    // None: it never ran here. Silent: it runs, and has not told of itself for a minute. Died: it is gone
+    // without having ended.
+    enum class State { None, Running, Silent, Stopped, Died, Unreadable };
+    State state = State::None;
+    std::string path; // of its state file
+    ReceiverState told;
+};
+
+// Reads the state file below `root` and looks for the process; `now` in seconds since the epoch.
+ReceiverStatus GatherReceiver(const std::string &root, int64_t now);
+
+} // namespace kelo::tool

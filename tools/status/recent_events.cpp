@@ -1,0 +1,25 @@
+#include "status/recent_events.h"
+
+#include <cstdlib>
+
+#include "plain_database.h"
+
+namespace kelo::tool {
+
+std::vector<Event> ReadRecentEvents(const std::string &path, int limit) {
+    const PlainDatabase database({path, "log"}, std::chrono::milliseconds(150));
+    std::vector<Event> events;
+    for (PlainDatabase::Row &row : database.Rows(
+             "SELECT id, level, time, user, event FROM log ORDER BY time DESC LIMIT " + std::to_string(limit),
+             {"id", "level", "time", "user", "event"})) {
+        Event &event = events.emplace_back();
+        event.id = std::atoi(row[0].c_str());
+        event.level = std::atoi(row[1].c_str());
+        event.time = std::strtoll(row[2].c_str(), nullptr, 10);
+        event.user = std::move(row[3]);
+        event.event = std::move(row[4]);
+    }
+    return events;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,14 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "event_log.h"
+
+namespace kelo::tool {
+
+// The newest events of the event database at `path`, newest first. Unlike ReadEvents it puts no damaged
+// database aside. Throws DatabaseError.
+std::vector<Event> ReadRecentEvents(const std::string &path, int limit);
+
+} // namespace kelo::tool

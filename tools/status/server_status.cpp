@@ -1,0 +1,57 @@
+#include "status/server_status.h"
+
+#include <algorithm>
+#include <ctime>
+
+#include "errors.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr int kDevices = 5;
+constexpr int kEvents = 5;
+
+DatabaseStatus *GoodDatabase(ServerStatus &status, const std::string &name) {
+    for (DatabaseStatus &database : status.databases) {
+        if (database.name == name && database.state == DatabaseStatus::State::Good)
+            return &database;
+    }
+    return nullptr;
+}
+
+// Runs `read` on the database of this name if it is good, and notes in its status what then went wrong.
+void WithDatabase(ServerStatus &status, const std::string &name, auto read) {
+    DatabaseStatus *database = GoodDatabase(status, name);
+    if (database == nullptr)
+        return;
+    try {
+        read(database->path);
+    } catch (const DatabaseError &error) {
+        database->state = DatabaseStatus::State::Unreadable;
+        database->problem = error.what();
+    }
+}
+
+} // namespace
+
+ServerStatus GatherStatus(const StatusOptions &options) {
+    ServerStatus status;
+    status.time = std::time(nullptr);
+    status.syslogNg = GatherSyslogNg(options.root, options.control, options.patience);
+    status.receiver = GatherReceiver(options.root, status.time);
+    std::vector<std::string> others;
+    if (!status.receiver.told.database.empty())
+        others.push_back(status.receiver.told.database);
+    status.databases = GatherDatabases(options.root, others);
+    status.archives = GatherArchives(options.root);
+    WithDatabase(status, "accounting",
+                 [&](const std::string &path) { status.accounting = GatherAccounting(path, kDevices); });
+    WithDatabase(status, "events",
+                 [&](const std::string &path) { status.events = ReadRecentEvents(path, kEvents); });
+    status.notifications = GatherNotifications(options.root);
+    status.volumes = GatherVolumes(options.root);
+    status.attention = FindAttention(status);
+    return status;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,46 @@
+#pragma once
+
+#include <chrono>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "status/accounting.h"
+#include "status/databases.h"
+#include "status/notifications.h"
+#include "status/receiver.h"
+#include "status/recent_events.h"
+#include "status/syslog_ng.h"
+#include "status/volumes.h"
+
+namespace kelo::tool {
+
+// All that `kelosyslog status` tells, of one moment.
+struct ServerStatus {
+    int64_t time = 0; // seconds since the epoch, as all times
+    SyslogNgStatus syslogNg;
+    ReceiverStatus receiver;
+    std::vector<DatabaseStatus> databases;
+    ArchiveStatus archives;
+    std::optional<AccountingStatus> accounting; // nothing without a database that can be read
+    NotificationStatus notifications;
+    std::vector<Event> events; // newest first
+    std::vector<VolumeStatus> volumes;
+
+    // What an administrator should see to, one line each, in the order of the screen; empty when all is well.
+    std::vector<std::string> attention;
+};
+
+struct StatusOptions {
+    std::string root;                         // absolute or empty
+    std::string control;                      // another control socket of syslog-ng
+    std::chrono::milliseconds patience{2000}; // with syslog-ng
+};
+
+// Asks everybody. Throws nothing but std::bad_alloc: what cannot be told is part of the status.
+ServerStatus GatherStatus(const StatusOptions &options);
+
+// What needs attention of a status whose other members are filled.
+std::vector<std::string> FindAttention(const ServerStatus &status);
+
+} // namespace kelo::tool

@@ -1,0 +1,15 @@
+#pragma once
+
+#include "status/databases.h"
+#include "status/receiver.h"
+#include "status/syslog_ng.h"
+
+namespace kelo::tool {
+
+// The words for states on the screen and in JSON: "running", "silent", "stopped", "unknown"; "none",
+// "running", "silent", "stopped", "died", "unreadable"; "good", "missing", "locked", "damaged", "unreadable".
+const char *StateName(SyslogNgStatus::State state);
+const char *StateName(ReceiverStatus::State state);
+const char *StateName(DatabaseStatus::State state);
+
+} // namespace kelo::tool

@@ -1,0 +1,127 @@
+#include "status/syslog_ng.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <charconv>
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <tuple>
+
+#include "status/control_socket.h"
+#include "status/process.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kControl = "/var/lib/syslog-ng/syslog-ng.ctl";
+// The first is the init script's, the second the daemon's own.
+constexpr const char *kPidFiles[] = {"/run/syslog-ng.pid", "/var/lib/syslog-ng/syslog-ng.pid"};
+constexpr const char *kProgram = "syslog-ng";
+
+// The fields of a line; one that holds a semicolon stands between double quotes, with backslashes in front of
+// those that belong to it.
+std::vector<std::string> SplitLine(const std::string &line) {
+    std::vector<std::string> fields(1);
+    bool isQuoted = false;
+    for (size_t i = 0; i < line.size(); ++i) {
+        if (line[i] == '"' && (isQuoted || fields.back().empty()))
+            isQuoted = !isQuoted;
+        else if (line[i] == ';' && !isQuoted)
+            fields.emplace_back();
+        else if (line[i] == '\\' && isQuoted && i + 1 < line.size())
+            fields.back() += line[++i];
+        else
+            fields.back() += line[i];
+    }
+    return fields;
+}
+
+uint64_t *CounterOf(SyslogNgCounters &counters, const std::string &type) {
+    const std::pair<const char *, uint64_t *> known[] = {{"processed", &counters.processed},
+                                                         {"written", &counters.written},
+                                                         {"dropped", &counters.dropped},
+                                                         {"queued", &counters.queued},
+                                                         {"memory_usage", &counters.memory}};
+    for (const auto &[name, counter] : known) {
+        if (type == name)
+            return counter;
+    }
+    return nullptr;
+}
+
+// The process that a pid file names, when it is syslog-ng.
+pid_t PidFromFile(const std::string &root) {
+    for (const char *path : kPidFiles) {
+        pid_t pid = 0;
+        std::ifstream(root + path) >> pid;
+        if (pid > 0 && ProcessName(pid) == kProgram)
+            return pid;
+    }
+    return 0;
+}
+
+SyslogNgStatus::State StateOf(const ControlAnswer &answer, pid_t pid) {
+    using State = SyslogNgStatus::State;
+    if (answer.connectError == 0)
+        return answer.problem.empty() ? State::Running : State::Silent;
+    if (answer.connectError == EAGAIN) // nobody takes the connections that wait
+        return State::Silent;
+    if (pid != 0)
+        return State::Running;
+    const bool isAbsent = answer.connectError == ENOENT || answer.connectError == ECONNREFUSED;
+    return isAbsent ? State::Stopped : State::Unknown;
+}
+
+} // namespace
+
+std::vector<SyslogNgCounters> ParseSyslogNgCounters(const std::string &text) {
+    std::map<std::tuple<std::string, std::string, std::string>, SyslogNgCounters> found;
+    std::istringstream lines(text);
+    for (std::string line; std::getline(lines, line);) {
+        const std::vector<std::string> fields = SplitLine(line);
+        if (fields.size() != 6 || fields[3] == "o" ||
+            (fields[0] != "source" && !fields[0].starts_with("dst.")))
+            continue;
+        SyslogNgCounters &counters = found[{fields[0], fields[1], fields[2]}];
+        std::tie(counters.driver, counters.id, counters.instance) = std::tie(fields[0], fields[1], fields[2]);
+        if (uint64_t *counter = CounterOf(counters, fields[4]))
+            std::from_chars(fields[5].data(), fields[5].data() + fields[5].size(), *counter);
+    }
+    std::vector<SyslogNgCounters> all;
+    for (auto &[key, counters] : found)
+        all.push_back(std::move(counters));
+    return all;
+}
+
+uint64_t SyslogNgStatus::Received() const {
+    uint64_t sum = 0;
+    for (const SyslogNgCounters &source : sources)
+        sum += source.processed;
+    return sum;
+}
+
+uint64_t SyslogNgStatus::Dropped() const {
+    uint64_t sum = 0;
+    for (const SyslogNgCounters &destination : destinations)
+        sum += destination.dropped;
+    return sum;
+}
+
+SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
+                              std::chrono::milliseconds patience) {
+    SyslogNgStatus status;
+    status.control = control.empty() ? root + kControl : control;
+    const ControlAnswer answer = AskControlSocket(status.control, "STATS", patience);
+    // Another control socket belongs to another syslog-ng than the pid files do.
+    const pid_t fromFile = control.empty() ? PidFromFile(root) : 0;
+    status.pid = answer.pid != 0 ? answer.pid : fromFile;
+    status.state = StateOf(answer, status.pid);
+    status.problem = answer.problem;
+    status.since = status.pid != 0 ? ProcessStart(status.pid) : 0;
+    for (SyslogNgCounters &counters : ParseSyslogNgCounters(answer.text))
+        (counters.driver == "source" ? status.sources : status.destinations).push_back(std::move(counters));
+    return status;
+}
+
+} // namespace kelo::tool

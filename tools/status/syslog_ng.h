@@ -1,0 +1,50 @@
+#pragma once
+
+#include <sys/types.h>
+
+#include <chrono>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace kelo::tool {
+
+// The counters of one of syslog-ng's sources or destinations since it was started. One that syslog-ng does
+// not keep is 0.
+struct SyslogNgCounters {
+    std::string driver;   // "dst.sql"; "source" for all drivers of a source
+    std::string id;       // "d_kelo_database#0"
+    std::string instance; // the file, the address
+    uint64_t processed = 0;
+    uint64_t written = 0;
+    uint64_t dropped = 0;
+    uint64_t queued = 0;
+    uint64_t memory = 0; // bytes of what is queued in memory
+};
+
+// Reads the answer to "STATS" (syslog-ng-ctl(1)): the sources as a whole and the drivers of destinations, in
+// the order of their ids. Counters of what was removed by a reload or a closed connection are left out.
+std::vector<SyslogNgCounters> ParseSyslogNgCounters(const std::string &text);
+
+struct SyslogNgStatus {
+    // Running: it answers. Silent: it listens and does not answer. Unknown: nobody may ask it.
+    enum class State { Running, Silent, Stopped, Unknown };
+    State state = State::Unknown;
+    std::string control; // the path of its control socket
+    pid_t pid = 0;       // 0 when unknown, as the next
+    int64_t since = 0;   // seconds since the epoch
+    std::string problem; // why there are no counters; "" when there are
+    std::vector<SyslogNgCounters> sources;
+    std::vector<SyslogNgCounters> destinations;
+
+    uint64_t Received() const;
+    uint64_t Dropped() const;
+};
+
+// Asks the syslog-ng whose files stand below `root`, as Debian lays them, or the one with this control socket
+// where `control` is not empty. Who may not use the socket learns from the pid file whether it runs.
+SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
+                              std::chrono::milliseconds patience);
+
+} // namespace kelo::tool

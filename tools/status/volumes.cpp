@@ -1,0 +1,53 @@
+#include "status/volumes.h"
+
+#include <sys/stat.h>
+#include <sys/statvfs.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <map>
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFolders[] = {"/var/log/kelolog", "/var/log/kelolog/archive", "/var/lib/syslog-ng",
+                                    "/var/spool/kelonotify", "/usr/kelo/etc"};
+
+// The folder, or the nearest one above it that is there.
+std::string ExistingFolder(const std::string &path, struct stat &status) {
+    std::filesystem::path folder(path);
+    while (stat(folder.c_str(), &status) != 0 && folder != folder.root_path())
+        folder = folder.parent_path();
+    return folder.string();
+}
+
+} // namespace
+
+double VolumeStatus::FreePercent() const {
+    return size > 0 ? 100 * static_cast<double>(free) / static_cast<double>(size) : 100;
+}
+
+std::vector<VolumeStatus> GatherVolumes(const std::string &root) {
+    std::vector<VolumeStatus> volumes;
+    std::map<dev_t, size_t> known;
+    for (const char *name : kFolders) {
+        struct stat status {};
+        struct statvfs space {};
+        const std::string folder = ExistingFolder(root + name, status);
+        if (statvfs(folder.c_str(), &space) != 0)
+            continue;
+        const auto [at, isNew] = known.emplace(status.st_dev, volumes.size());
+        if (isNew) {
+            // What is kept for root counts as taken, as df(1) has it.
+            const uint64_t used = space.f_blocks - space.f_bfree;
+            volumes.push_back(
+                {{}, (used + space.f_bavail) * space.f_frsize, space.f_bavail * space.f_frsize});
+        }
+        std::vector<std::string> &folders = volumes[at->second].folders;
+        if (std::find(folders.begin(), folders.end(), folder) == folders.end())
+            folders.push_back(folder);
+    }
+    return volumes;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,22 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace kelo::tool {
+
+// The volume that holds some of the system's folders.
+struct VolumeStatus {
+    std::vector<std::string> folders; // absolute; the one that is there, where the system's own is missing
+    uint64_t size = 0;                // bytes that users may fill
+    uint64_t free = 0;                // bytes of these
+
+    double FreePercent() const;
+    bool IsNearlyFull() const { return FreePercent() < 10; }
+};
+
+// The volumes of the databases, the archives, the disk-buffer of syslog-ng, the spool and the event log.
+std::vector<VolumeStatus> GatherVolumes(const std::string &root);
+
+} // namespace kelo::tool
