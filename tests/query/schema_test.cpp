@@ -9,6 +9,9 @@ using Schema = QueryTest;
 TEST_F(Schema, DefinesOneTableOfLogsForWorkingDatabasesAndArchives) {
     const std::string archive = root_.File("archive.db");
     CreateLogDatabase(archive, "archive.sql");
+    RunSql(archive, "UPDATE db_info SET device = 'nas'");
+    CreateLogDatabase(archive, "archive.sql"); // once more: keeps what is there
+    EXPECT_EQ(QueryText(archive, "SELECT group_concat(device) FROM db_info"), "nas");
     const std::string definitions = "SELECT group_concat(name || sql, ';') FROM (SELECT * FROM sqlite_master "
                                     "WHERE tbl_name = 'logs' ORDER BY name)";
     for (const char *index : {"logs_host_idx", "logs_prog_idx", "logs_ldate_idx", "logs_utcsec_idx"})
