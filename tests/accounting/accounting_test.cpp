@@ -101,7 +101,7 @@ TEST_F(Accounting, NotifiesWhenASampleReachesARule) {
     countSecond(4);
     ASSERT_EQ(NotifyCalls::Sent().size(), 1u);
     EXPECT_EQ(NotifyCalls::Sent()[0].values.at("%EPS%"), "3");
-    EXPECT_THAT(Messages(), testing::Contains("Fail to send syslog notification"));
+    EXPECT_THAT(Messages(), Contains("Fail to send syslog notification"));
     EXPECT_EQ(QueryText(events, "SELECT count(*) FROM log"), "1");
     NotifyCalls::AnswerWith(0);
     countSecond(1);

@@ -65,8 +65,8 @@ TEST_F(Enumeration, FindsItsRowsThroughTheIndexOnTime) {
           "SELECT COUNT(*) FROM log", "SELECT * FROM log ORDER BY time DESC LIMIT 50 OFFSET 100"}) {
         std::string plan;
         EXPECT_EQ(sqlite3_exec(db, ("EXPLAIN QUERY PLAN " + sql).c_str(), take, &plan, nullptr), SQLITE_OK);
-        EXPECT_THAT(plan, testing::HasSubstr("INDEX log_time")) << sql;
-        EXPECT_THAT(plan, testing::Not(testing::HasSubstr("TEMP B-TREE"))) << sql;
+        EXPECT_THAT(plan, HasSubstr("INDEX log_time")) << sql;
+        EXPECT_THAT(plan, Not(HasSubstr("TEMP B-TREE"))) << sql;
     }
     sqlite3_close(db);
 }

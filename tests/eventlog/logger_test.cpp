@@ -41,7 +41,7 @@ TEST_F(LoggerTest, ReportsEachFailingStepAndKeepsTheEventOnceItIsIn) {
         EXPECT_TRUE(PlatformCalls::HasFailed()) << step;
         std::vector<testing::Matcher<std::string>> expected;
         for (const std::string &message : messages)
-            expected.push_back(testing::StartsWith(message));
+            expected.push_back(StartsWith(message));
         EXPECT_THAT(Messages(), testing::ElementsAreArray(expected)) << step;
         rows += result == 0 && std::string(step) != "END";
         EXPECT_EQ(Rows(), std::to_string(rows)) << step;

@@ -15,7 +15,7 @@ TEST_F(Schema, DefinesOneTableOfLogsForWorkingDatabasesAndArchives) {
     const std::string definitions = "SELECT group_concat(name || sql, ';') FROM (SELECT * FROM sqlite_master "
                                     "WHERE tbl_name = 'logs' ORDER BY name)";
     for (const char *index : {"logs_host_idx", "logs_prog_idx", "logs_ldate_idx", "logs_utcsec_idx"})
-        EXPECT_THAT(QueryText(path_, definitions), testing::HasSubstr(index));
+        EXPECT_THAT(QueryText(path_, definitions), HasSubstr(index));
     EXPECT_EQ(QueryText(archive, definitions), QueryText(path_, definitions));
     EXPECT_EQ(SyslogDBVersionGet(path_), 2);
     EXPECT_EQ(SyslogDBVersionGet(archive), 1);

@@ -35,16 +35,9 @@
 namespace kelo::test {
 
 namespace fs = std::filesystem;
-using testing::AllOf;
-using testing::AnyOf;
-using testing::Contains;
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::IsEmpty;
-using testing::MatchesRegex;
-using testing::Not;
-using testing::Pair;
-using testing::StartsWith;
+using testing::AllOf, testing::AnyOf, testing::Not, testing::IsEmpty;
+using testing::Contains, testing::ElementsAre, testing::Pair;
+using testing::HasSubstr, testing::MatchesRegex, testing::StartsWith;
 
 // A root of its own for the library and the platform, and the system log. Checks at the end that nothing of
 // the platform is left open.
