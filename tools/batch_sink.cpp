@@ -5,18 +5,17 @@
 namespace kelo::tool {
 
 BatchSink::BatchSink(LogStore &store, const LineReader &reader, std::string source)
-    : store_(store), reader_(reader), batch_(kBatchRows) {
+    : store_(store), reader_(reader) {
     progress_.source = std::move(source);
     progress_.offset = reader.EndOffset();
 }
 
 void BatchSink::Take(_SYSLOG_LOG_DATA_tag &log) {
-    std::swap(batch_[rows_++], log);
+    batch_.Take(log);
 }
 
 void BatchSink::LineDone() {
-    hasLongLine_ = hasLongLine_ || reader_.Line().size() > kLongLineBytes;
-    if (rows_ == kBatchRows || reader_.EndOffset() - progress_.offset >= kBatchBytes)
+    if (batch_.IsFull())
         Flush();
 }
 
@@ -26,12 +25,8 @@ void BatchSink::Flush() {
     progress_.offset = reader_.EndOffset();
     progress_.lines = reader_.Number();
     progress_.head = reader_.Head().substr(0, std::min<uint64_t>(progress_.offset, LineReader::kHeadBytes));
-    store_.Store({batch_.data(), rows_}, progress_);
-    // The memory of the records serves the next batch, but that of long lines must not pile up in it.
-    if (hasLongLine_)
-        batch_ = std::vector<_SYSLOG_LOG_DATA_tag>(kBatchRows);
-    rows_ = 0;
-    hasLongLine_ = false;
+    store_.Store(batch_.Records(), progress_);
+    batch_.Clear();
 }
 
 } // namespace kelo::tool

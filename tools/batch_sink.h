@@ -1,9 +1,8 @@
 #pragma once
 
-#include <vector>
-
 #include "log_import.h"
 #include "log_store.h"
+#include "record_batch.h"
 
 namespace kelo::tool {
 
@@ -20,16 +19,10 @@ public:
     void Flush() override;
 
 private:
-    static constexpr size_t kBatchRows = 5000;
-    static constexpr uint64_t kBatchBytes = 4 * 1024 * 1024; // of the input
-    static constexpr size_t kLongLineBytes = 8 * 1024;
-
     LogStore &store_;
     const LineReader &reader_;
     StoreProgress progress_;
-    std::vector<_SYSLOG_LOG_DATA_tag> batch_;
-    size_t rows_ = 0; // of the batch; what lies behind waits for use
-    bool hasLongLine_ = false;
+    RecordBatch batch_;
 };
 
 } // namespace kelo::tool

@@ -33,12 +33,16 @@ void LineReader::MakeRoom() {
         buffer_.resize(2 * buffer_.size());
 }
 
+bool LineReader::HasInput() const {
+    pollfd input{fd_, POLLIN, 0};
+    return poll(&input, 1, 0) != 0;
+}
+
 // Reads at least a byte more behind what is there. Returns false at the end of the input.
 bool LineReader::Fill() {
     MakeRoom();
-    pollfd waiting{fd_, POLLIN, 0};
-    if (poll(&waiting, 1, 0) == 0)
-        onWait_();
+    if (!beforeRead_())
+        return false;
     ssize_t result = 0;
     do
         result = read(fd_, buffer_.data() + end_, buffer_.size() - end_);
@@ -115,6 +119,7 @@ bool LineReader::Next() {
 
 void LineReader::SkipOverlongLine() {
     uint64_t skipped = 0;
+    overlongHead_.assign(buffer_.data() + begin_, std::min(end_ - begin_, kOverlongHeadBytes));
     bool ended = false;
     while (!ended) {
         const char *start = buffer_.data() + begin_;
@@ -128,7 +133,7 @@ void LineReader::SkipOverlongLine() {
     }
     // Only now: who is told of a wait within the line must not see a part of it as read.
     isOverlong_ = true;
-    line_ = {};
+    line_ = overlongHead_;
     offset_ += skipped;
     ++number_;
 }

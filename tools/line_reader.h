@@ -16,8 +16,12 @@ public:
     // `maxLineBytes` does not include the line feed.
     LineReader(int fd, size_t maxLineBytes);
 
-    // Called before a read that would have to wait for its data. The current line is the last one then.
-    void OnWait(std::function<void()> onWait) { onWait_ = std::move(onWait); }
+    // Called before each read; the lines before the current one have been dealt with then. It may wait, and
+    // ends the input by returning false.
+    void BeforeRead(std::function<bool()> beforeRead) { beforeRead_ = std::move(beforeRead); }
+
+    // Whether a read would find data, or the end of the input, without waiting.
+    bool HasInput() const;
 
     // Called with the number of bytes whenever some were read or skipped.
     void OnProgress(std::function<void(uint64_t)> onProgress) { onProgress_ = std::move(onProgress); }
@@ -37,7 +41,9 @@ public:
     // Advances to the next line, the last of which needs no line feed. Returns false at the end.
     bool Next();
 
-    // The current line, without its line feed; empty when it is overlong. Valid until Next.
+    // The current line, without its line feed; of an overlong one the first kOverlongHeadBytes. Valid until
+    // Next.
+    static constexpr size_t kOverlongHeadBytes = 1024;
     std::string_view Line() const { return line_; }
     bool IsOverlong() const { return isOverlong_; }
     // Its number, from 1.
@@ -52,7 +58,7 @@ private:
 
     int fd_;
     size_t maxLineBytes_;
-    std::function<void()> onWait_ = [] {};
+    std::function<bool()> beforeRead_ = [] { return true; };
     std::function<void(uint64_t)> onProgress_ = [](uint64_t) {};
     std::string head_;
     std::vector<char> buffer_;
@@ -61,6 +67,7 @@ private:
     uint64_t offset_ = 0;
     uint64_t number_ = 0;
     std::string_view line_;
+    std::string overlongHead_;
     bool isOverlong_ = false;
 };
 

@@ -21,11 +21,11 @@ const char *FirstEmptyField(const _SYSLOG_LOG_DATA_tag &log) {
 } // namespace
 
 void LogImport::Run(LineReader &reader, RecordSink &sink) {
-    reader.OnWait([&sink] { sink.Flush(); });
+    reader.BeforeRead([&] { return sink.AwaitInput(reader); });
     while (reader.Next()) {
         if (reader.IsOverlong()) {
             ++counts_.overlong;
-            report_(reader.Number(), "rejected: too long");
+            report_(reader, "rejected: too long");
         } else if (!reader.Line().empty()) {
             ImportLine(reader, sink);
         }
@@ -37,22 +37,22 @@ void LogImport::Run(LineReader &reader, RecordSink &sink) {
 void LogImport::ImportLine(const LineReader &reader, RecordSink &sink) {
     line_.assign(reader.Line());
     if (parser_.ParseSingleEntry(line_, log_) != 0) {
-        Reject(reader.Number());
+        Reject(reader);
         return;
     }
     ++counts_.parsed;
     if (const char *field = FirstEmptyField(log_)) {
         ++counts_.incomplete[field];
-        report_(reader.Number(), std::string("incomplete: ") + field + " is empty");
+        report_(reader, std::string("incomplete: ") + field + " is empty");
         if (skipIncomplete_)
             return;
     }
     sink.Take(log_);
 }
 
-void LogImport::Reject(uint64_t line) {
+void LogImport::Reject(const LineReader &reader) {
     ++counts_.tooFewFields;
-    report_(line, "rejected: " + std::to_string(parser_.Tokenize(line_, " ").size()) + " of 11 fields");
+    report_(reader, "rejected: " + std::to_string(parser_.Tokenize(line_, " ").size()) + " of 11 fields");
 }
 
 } // namespace kelo::tool

@@ -23,6 +23,13 @@ public:
 
     // The input pauses or ends: nothing that was taken may wait any longer.
     virtual void Flush() = 0;
+
+    // Called before each read of the input, which it may delay; it ends the input by returning false.
+    virtual bool AwaitInput(const LineReader &reader) {
+        if (!reader.HasInput())
+            Flush();
+        return true;
+    }
 };
 
 // What became of the lines of an import. Empty lines are no lines.
@@ -36,8 +43,8 @@ struct ImportCounts {
 // Turns the lines of an input into records: as LogParser does, but with an account of every line.
 class LogImport {
 public:
-    // Told of a line that was rejected, or that is incomplete, and why.
-    using LineReport = std::function<void(uint64_t line, const std::string &reason)>;
+    // Told of the reader's current line when it was rejected or is incomplete, and why.
+    using LineReport = std::function<void(const LineReader &reader, const std::string &reason)>;
 
     // With `skipIncomplete`, records with an empty mandatory field do not reach the sink.
     LogImport(LineReport report, bool skipIncomplete)
@@ -50,7 +57,7 @@ public:
 
 private:
     void ImportLine(const LineReader &reader, RecordSink &sink);
-    void Reject(uint64_t line);
+    void Reject(const LineReader &reader);
 
     LineReport report_;
     bool skipIncomplete_;

@@ -14,8 +14,6 @@
 namespace kelo::tool {
 namespace {
 
-constexpr int kBusyTimeoutMs = 10'000;
-
 // Columns as in logs.sql; both severity columns get the word.
 constexpr char kInsertLog[] =
     "INSERT INTO logs(host,ip,fac,prio,llevel,tag,utcsec,tzoffset,ldate,ltime,prog,msg) "
@@ -71,17 +69,24 @@ void LogStore::FinalizeStatement::operator()(sqlite3_stmt *statement) const {
 }
 
 // An absolute path is never taken for a URI or for ":memory:".
-LogStore::LogStore(const std::string &path) : path_(std::filesystem::absolute(path)) {
+LogStore::LogStore(const std::string &path, const LogStoreOptions &options)
+    : options_(options), path_(std::filesystem::absolute(path)) {
     if (access(path_.c_str(), F_OK) != 0 && errno == ENOENT)
         Create();
     file_ = path_;
     Open(SQLITE_OPEN_READWRITE);
-    insertLog_ = Prepare(kInsertLog); // first: a database of another kind must not get our table
-    Run(kCreateProgress);
-    saveProgress_ = Prepare(kSaveProgress);
+    FillEmpty();
+    if (!options_.mustSyncCommits)
+        Run("PRAGMA synchronous=NORMAL");
+    insertLog_ = Prepare(kInsertLog);
 }
 
-LogStore::~LogStore() = default;
+LogStore::~LogStore() {
+    // SQLite leaves the write-ahead log of a moved file behind, where a fresh database would be taken for its
+    // owner.
+    if (db_ != nullptr && HasMoved())
+        sqlite3_wal_checkpoint_v2(db_.get(), nullptr, SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr);
+}
 
 void LogStore::Create() {
     file_ = path_ + ".new-" + std::to_string(getpid());
@@ -93,25 +98,63 @@ void LogStore::Create() {
     db_.reset();
     // Whoever was faster keeps the name: both files are alike.
     if (renameat2(AT_FDCWD, file_.c_str(), AT_FDCWD, path_.c_str(), RENAME_NOREPLACE) != 0 && errno != EEXIST)
-        throw DatabaseError(path_ + ": " + std::strerror(errno));
+        throw StoreError(path_ + ": " + std::strerror(errno), SQLITE_CANTOPEN, errno);
     SyncFolderOf(path_);
+}
+
+template <typename Work>
+void LogStore::InTransaction(Work work) {
+    errno = 0; // what an earlier operation left there is no reason for a failure of ours
+    Run("BEGIN IMMEDIATE");
+    try {
+        work();
+        Run("COMMIT");
+    } catch (const DatabaseError &) {
+        sqlite3_reset(insertLog_.get());
+        sqlite3_reset(saveProgress_.get());
+        sqlite3_exec(db_.get(), "ROLLBACK", nullptr, nullptr, nullptr);
+        throw;
+    }
+}
+
+// A file that somebody has opened before anybody stored something in it has no table yet.
+void LogStore::FillEmpty() {
+    const auto isEmpty = [this] {
+        const Statement anything = Prepare("SELECT 1 FROM sqlite_schema");
+        const int status = sqlite3_step(anything.get());
+        if (status != SQLITE_ROW && status != SQLITE_DONE)
+            Fail();
+        return status == SQLITE_DONE;
+    };
+    if (!isEmpty())
+        return;
+    Run("PRAGMA journal_mode=WAL");
+    InTransaction([&] {
+        if (isEmpty())
+            Run(kLogsSchema);
+    });
 }
 
 void LogStore::Open(int flags) {
     sqlite3 *db = nullptr;
-    const int status = sqlite3_open_v2(file_.c_str(), &db, flags, nullptr);
+    const int status = sqlite3_open_v2(file_.c_str(), &db, flags | SQLITE_OPEN_NOMUTEX, nullptr);
     db_.reset(db);
     if (status != SQLITE_OK)
         Fail();
-    sqlite3_busy_timeout(db, kBusyTimeoutMs);
+    sqlite3_busy_timeout(db, options_.busyTimeoutMs);
 }
 
 void LogStore::Fail() {
+    const int lastError = errno;
     std::string cause = db_ != nullptr ? sqlite3_errmsg(db_.get()) : "out of memory";
-    const int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
+    const int code = db_ != nullptr ? sqlite3_errcode(db_.get()) & 0xff : SQLITE_NOMEM;
+    // SQLite forgets the reason of a write that fails within a statement.
+    int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
+    if (systemError == 0 && code == SQLITE_IOERR)
+        systemError = lastError;
     if (systemError != 0)
         cause += std::string(" (") + std::strerror(systemError) + ")";
-    throw DatabaseError(path_ + ": " + cause);
+    throw StoreError(path_ + ": " + cause, code, systemError);
 }
 
 void LogStore::Run(const char *sql) {
@@ -134,6 +177,7 @@ void LogStore::StepToEnd(sqlite3_stmt *statement) {
 }
 
 std::optional<StoreProgress> LogStore::ProgressGet(const std::string &source) {
+    PrepareProgress();
     const Statement statement = Prepare(kLoadProgress);
     BindText(statement.get(), 1, source);
     const int status = sqlite3_step(statement.get());
@@ -151,19 +195,33 @@ std::optional<StoreProgress> LogStore::ProgressGet(const std::string &source) {
     return progress;
 }
 
+void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
+    InTransaction([&] {
+        for (const _SYSLOG_LOG_DATA_tag &log : logs)
+            InsertLog(log);
+    });
+}
+
 void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs, const StoreProgress &progress) {
-    Run("BEGIN IMMEDIATE");
-    try {
+    PrepareProgress();
+    InTransaction([&] {
         for (const _SYSLOG_LOG_DATA_tag &log : logs)
             InsertLog(log);
         SaveProgress(progress);
-        Run("COMMIT");
-    } catch (const DatabaseError &) {
-        sqlite3_reset(insertLog_.get());
-        sqlite3_reset(saveProgress_.get());
-        sqlite3_exec(db_.get(), "ROLLBACK", nullptr, nullptr, nullptr);
-        throw;
-    }
+    });
+}
+
+bool LogStore::HasMoved() {
+    int hasMoved = 0;
+    return sqlite3_file_control(db_.get(), "main", SQLITE_FCNTL_HAS_MOVED, &hasMoved) == SQLITE_OK &&
+           hasMoved != 0;
+}
+
+void LogStore::PrepareProgress() {
+    if (saveProgress_ != nullptr)
+        return;
+    Run(kCreateProgress);
+    saveProgress_ = Prepare(kSaveProgress);
 }
 
 void LogStore::InsertLog(const _SYSLOG_LOG_DATA_tag &log) {

@@ -27,6 +27,7 @@ int main(int argc, char **argv) {
     kelo::tool::AddRules(program);
     kelo::tool::AddNotify(program);
     kelo::tool::AddParse(program);
+    kelo::tool::AddReceive(program);
     kelo::tool::AddDb(program);
     kelo::tool::AddArchive(program);
     kelo::tool::AddStatus(program);

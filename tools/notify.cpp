@@ -98,7 +98,7 @@ int ShowStatus(const Spool &spool, const Settings &settings, bool isJson) {
     status["failed"] = static_cast<Json::UInt64>(failed);
     text += std::to_string(waiting) + " waiting, " + std::to_string(failed) + " given up\n";
     if (settings.IsOpenToOthers())
-        PrintMessage(settings.Path() + " holds passwords and may be read by everybody: give it mode 0600");
+        PrintMessage(settings.Path() + " holds passwords and may be read by everybody: give it mode 0640");
     return Print(status, isJson, text);
 }
 

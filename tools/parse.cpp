@@ -114,7 +114,8 @@ class ParseRun {
 public:
     explicit ParseRun(const Options &options)
         : options_(options), bar_(CheckInputs(options)),
-          import_([this](uint64_t line, const std::string &reason) { Report(line, reason); },
+          import_([this](const LineReader &reader,
+                         const std::string &reason) { Report(reader.Number(), reason); },
                   options.skipIncomplete) {}
 
     void Print() {

@@ -62,6 +62,7 @@ void AddStats(Program &program);
 void AddRules(Program &program);
 void AddNotify(Program &program);
 void AddParse(Program &program);
+void AddReceive(Program &program);
 void AddDb(Program &program);
 void AddArchive(Program &program);
 void AddStatus(Program &program);

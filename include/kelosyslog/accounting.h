@@ -68,6 +68,11 @@ public:
     // leaves those before it in the database, and the next flush writes them again.
     int AccoutingFlush2DB();
 
+    // Gives up the oldest closed samples until at most `samples` are left that hold at most `counts` counts
+    // of devices, which take some 16 bytes each. For callers that must bound what waits while the database
+    // cannot be written; the histogram is not touched. Returns the number of samples given up.
+    size_t SamplesDrop(size_t samples, size_t counts);
+
     // Writes the figures to the debug channel at level 2.
     void AccountingDump();
 

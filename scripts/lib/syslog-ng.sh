@@ -48,10 +48,14 @@ define() {
     sed -i "s|^@define $2 .*|@define $2 \"$3\"|" "$1"
 }
 
-# syslog_ng_configure ROOT SHIPPED: a private copy of the shipped configuration, with all of its paths below ROOT.
+# syslog_ng_configure ROOT SHIPPED PROGRAM: a private copy of the shipped configuration, with all of its paths below ROOT
+# and PROGRAM as kelosyslog.
 syslog_ng_configure() {
     local root=$1
     cp "$2" "$root/kelosyslog.conf"
+    mkdir -p "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelolog"
+    ln -sfn "$(readlink -f "$(dirname "$2")/../schema")" "$root/usr/kelo/syslog/schema"
+    define "$root/kelosyslog.conf" kelo_receive "exec $3 receive --root $root"
     define "$root/kelosyslog.conf" kelo_db "$root/logs.db"
     define "$root/kelosyslog.conf" kelo_buffer_dir "$root"
     define "$root/kelosyslog.conf" kelo_address 127.0.0.1
@@ -104,12 +108,17 @@ syslog_ng_start() {
     return 1
 }
 
-# syslog_ng_stop ROOT [SIGNAL]: ends the daemon and waits until it is gone; after 20 s it is killed.
+receiver_pid() { sed 's/.*"pid":\([0-9]*\).*/\1/' "$1/run/kelosyslog/receive.json"; }
+# The receiver ends a moment after the daemon whose child it is.
+receiver_gone() { [[ ! -e $1/run/kelosyslog/receive.json ]] || ! kill -0 "$(receiver_pid "$1")" 2>/dev/null; }
+
+# syslog_ng_stop ROOT [SIGNAL]: ends the daemon and waits until it and the receiver are gone; after 20 s it is killed.
 syslog_ng_stop() {
     if syslog_ng_alive "$1"; then
         kill -s "${2:-TERM}" "$(<"$1/pid")" || true
         wait_until 20 syslog_ng_gone "$1" || { kill -s KILL "$(<"$1/pid")" && wait_until 5 syslog_ng_gone "$1"; } || true
     fi
+    wait_until 60 receiver_gone "$1" || true
     rm -f "$1/pid"
 }
 

@@ -85,6 +85,18 @@ bool AccountingManager::isNeed2Flush() {
     return elapsed > kFlushBeatSec;
 }
 
+size_t AccountingManager::SamplesDrop(size_t samples, size_t counts) {
+    size_t left = 0;
+    for (const Sample &sample : samples_)
+        left += sample.devices.size();
+    const size_t before = samples_.size();
+    while (samples_.size() > samples || left > counts) {
+        left -= samples_.front().devices.size();
+        samples_.pop_front();
+    }
+    return before - samples_.size();
+}
+
 void AccountingManager::AccountingDump() {
     if (Debuger::ThresholdGet() < 2)
         return;

@@ -21,6 +21,14 @@ void CountLogs(AccountingManager &accounting) {
 
 using Flush = AccountingTest;
 
+TEST_F(Flush, GivesUpTheOldestSamplesAboveABound) {
+    EXPECT_EQ(accounting_->SamplesDrop(2, 3), 0U);
+    EXPECT_EQ(accounting_->SamplesDrop(2, 2), 1U);
+    EXPECT_EQ(accounting_->AccoutingFlush2DB(), 0);
+    EXPECT_EQ("1000 a 1;" + Samples(), kRows);
+    EXPECT_EQ(Histogram(), kCounts);
+}
+
 TEST_F(Flush, TrimsOldSamplesOfALargeFile) {
     // Within a day, with room for a slow machine.
     const std::string stamp = QueryText(path_, "SELECT strftime('%s', 'now') - 24*60*60 + 600");

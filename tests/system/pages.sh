@@ -3,8 +3,6 @@ source "$(dirname "$0")/support.sh"
 kelosyslog=("$KELO_BIN_DIR/kelosyslog" --root "$root")
 events=$root/usr/kelo/etc/kelosyslog.db
 
-mkdir -p "$root/usr/kelo/syslog/schema" "$root/usr/kelo/etc" "$root/var/log/kelolog"
-cp "$KELO_SOURCE_DIR/package/schema/kelosyslog.sql" "$root/usr/kelo/syslog/schema/"
 sqlite3 "$root/var/log/kelolog/logs.db" <"$KELO_SOURCE_DIR/package/schema/logs.sql"
 sqlite3 "$root/var/log/kelolog/.KELOACCOUNTDB" <"$KELO_SOURCE_DIR/package/schema/accinfo.sql"
 

@@ -16,7 +16,7 @@ wait_until 20 grep -q locked "$root/locked" || fail "no lock"
 make_messages 3000 new 11 >"$root/lines"
 send_lines "$root/lines" &
 sender=$!
-taken() { syslog_ng_control "$root" stats | grep -q '^destination;d_kelo_database;;a;processed;3010'; }
+taken() { syslog_ng_control "$root" stats | grep -q '^dst.sql;d_kelo_database#0;[^;]*;a;processed;3010'; }
 wait_until 60 taken || fail "not taken over while the database is locked: $(syslog_ng_control "$root" stats | grep d_kelo)"
 wait $sender
 syslog_ng_stop "$root" KILL

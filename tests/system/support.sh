@@ -23,4 +23,4 @@ expect() { [[ $2 == "$3" ]] || fail "$1: found \"$2\", expected \"$3\""; } # WHA
 query() { sql "$database" "$1"; }
 landed() { wait_until 60 has_rows "$database" "$1" || fail "only $(row_count "$database") of $1 messages arrived"; }
 
-syslog_ng_configure "$root" "$KELO_SOURCE_DIR/package/syslog-ng/kelosyslog.conf"
+syslog_ng_configure "$root" "$KELO_SOURCE_DIR/package/syslog-ng/kelosyslog.conf" "$KELO_BIN_DIR/kelosyslog"

@@ -104,9 +104,11 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
     struct stat status {};
     if (!file || stat(like.c_str(), &status) != 0)
         Fail(path, errno);
-    // Only root can give files away; for others the archive stays theirs.
-    const bool isOwned = fchown(file.Get(), status.st_uid, status.st_gid) == 0;
-    const mode_t mode = status.st_mode & (isOwned ? 0666 : 0600);
+    // Only root can give files away; for others the archive stays theirs, and their group's where it is the
+    // same.
+    const bool hasGroup = fchown(file.Get(), status.st_uid, status.st_gid) == 0 ||
+                          fchown(file.Get(), static_cast<uid_t>(-1), status.st_gid) == 0;
+    const mode_t mode = status.st_mode & (hasGroup ? 0666 : 0600);
     if (fchmod(file.Get(), mode) != 0 || fsync(file.Get()) != 0 ||
         renameat2(AT_FDCWD, temporary.c_str(), AT_FDCWD, path.c_str(), RENAME_NOREPLACE) != 0)
         Fail(path, errno);

@@ -35,7 +35,7 @@ struct Options {
 
 void WarnOfOpenSettings(const Settings &settings) {
     if (settings.IsOpenToOthers())
-        syslog(LOG_WARNING, "%s holds passwords and may be read by everybody: give it mode 0600",
+        syslog(LOG_WARNING, "%s holds passwords and may be read by everybody: give it mode 0640",
                settings.Path().c_str());
 }
 

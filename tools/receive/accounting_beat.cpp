@@ -1,0 +1,84 @@
+#include "receive/accounting_beat.h"
+
+#include <syslog.h>
+
+namespace kelo::tool {
+namespace {
+
+// The manager says no when it is asked within 6 seconds after the question before.
+constexpr int64_t kFlushSec = 6;
+// A flush may wait for a locked database, and nothing is received meanwhile.
+constexpr int64_t kFlushAfterFailureSec = 60;
+constexpr size_t kMostSamples = 24 * 60 * 60;
+constexpr size_t kMostCounts = 1'000'000;
+
+uint64_t Total(const AccountingManager &manager) {
+    uint64_t total = 0;
+    for (const KELOLOG_LOG_DEVICE_STATISTIC &entry : manager.HistogramGet())
+        total += entry.count;
+    return total;
+}
+
+} // namespace
+
+AccountingBeat::AccountingBeat() : manager_(std::make_unique<AccountingManager>()) {}
+
+void AccountingBeat::Beat(int64_t now) {
+    manager_->CurEpsUpdate();
+    if (now < nextFlush_)
+        return;
+    nextFlush_ = now + kFlushSec;
+    isReloadPutOff_ = false;
+    if (manager_->isNeed2Flush() && !Flush())
+        nextFlush_ = now + kFlushAfterFailureSec;
+}
+
+void AccountingBeat::RequestReload() {
+    mustReload_ = true;
+    isReloadPutOff_ = false;
+}
+
+bool AccountingBeat::MayCount() {
+    if (!mustReload_ || isReloadPutOff_)
+        return true;
+    if (!CloseSample())
+        return false;
+    if (Flush())
+        Replace();
+    isReloadPutOff_ = mustReload_;
+    return true;
+}
+
+bool AccountingBeat::Finish() {
+    return CloseSample() && Flush();
+}
+
+bool AccountingBeat::CloseSample() {
+    manager_->CurEpsUpdate();
+    return manager_->CurrentEpsGet() == 0;
+}
+
+bool AccountingBeat::Flush() {
+    const bool isFlushed = manager_->AccoutingFlush2DB() == 0;
+    if (!isFlushed) {
+        if (const size_t dropped = manager_->SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
+            syslog(LOG_ERR, "%zu samples of the accounting were given up, as it cannot be written", dropped);
+        if (!isFailing_)
+            syslog(LOG_ERR, "the accounting cannot be written and waits in memory");
+    } else if (isFailing_) {
+        syslog(LOG_NOTICE, "the accounting has been written");
+    }
+    isFailing_ = !isFlushed;
+    return isFlushed;
+}
+
+// A manager that could not read what the present one has written would later write too low totals.
+void AccountingBeat::Replace() {
+    auto fresh = std::make_unique<AccountingManager>();
+    if (Total(*fresh) != Total(*manager_))
+        return;
+    manager_ = std::move(fresh);
+    mustReload_ = false;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,49 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+
+#include "kelosyslog/accounting.h"
+
+namespace kelo::tool {
+
+// Counts logs, and asks for what the accounting wants done at times. While the accounting database cannot be
+// written, samples wait in memory: those of a day at most, then the oldest are given up. The totals of the
+// devices lose nothing by that.
+//
+// Times are seconds of any clock that does not go back.
+class AccountingBeat {
+public:
+    AccountingBeat();
+
+    void Count(const std::string &host) { manager_->LogInc(host); }
+
+    // To be called about once a second. Closes the sample, and flushes when its time has come.
+    void Beat(int64_t now);
+
+    // Asks for the rules to be loaded anew, which takes a new manager: the present one must have written all
+    // that it counted.
+    void RequestReload();
+
+    // Carries the request out, if there is one. Returns false while no log may be counted for it: until the
+    // second has changed, so that the open sample can be closed. A flush that fails puts it off to the next.
+    bool MayCount();
+
+    // Closes the last sample and flushes. Returns false when it is to be called again: the second has not
+    // changed yet, or the flush failed, which is reported once.
+    bool Finish();
+
+private:
+    bool CloseSample();
+    bool Flush();
+    void Replace();
+
+    std::unique_ptr<AccountingManager> manager_;
+    int64_t nextFlush_ = 0;
+    bool isFailing_ = false;
+    bool mustReload_ = false;
+    bool isReloadPutOff_ = false;
+};
+
+} // namespace kelo::tool

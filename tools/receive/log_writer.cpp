@@ -1,0 +1,120 @@
+#include "receive/log_writer.h"
+
+#include <sqlite3.h>
+#include <sys/stat.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <filesystem>
+
+#include "kelosyslog/dbhandler.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr int64_t kBatchMs = 500;
+// SQLite itself waits a second for a lock, at each try.
+constexpr LogStoreOptions kStoreOptions{.busyTimeoutMs = 1000, .mustSyncCommits = false};
+constexpr int64_t kRetrySoonMs = 100;
+constexpr int64_t kRetryMs = 1000;
+constexpr int64_t kRetryDamagedMs = 60'000; // each try notifies the administrator
+
+bool IsFull(const StoreError &error) {
+    return error.code == SQLITE_FULL || error.systemError == ENOSPC || error.systemError == EDQUOT ||
+           error.systemError == EFBIG;
+}
+
+bool IsThere(const std::string &path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0;
+}
+
+} // namespace
+
+LogWriter::LogWriter(const std::string &path, VolumeWatch &volume)
+    : path_(std::filesystem::absolute(path)), volume_(volume) {}
+
+void LogWriter::Take(_SYSLOG_LOG_DATA_tag &log, int64_t now) {
+    if (batch_.Size() == 0)
+        batchTime_ = now;
+    batch_.Take(log);
+}
+
+int64_t LogWriter::NextTime() const {
+    if (batch_.Size() == 0)
+        return INT64_MAX;
+    return reason_.empty() ? batchTime_ + kBatchMs : retryTime_;
+}
+
+bool LogWriter::Advance(int64_t now, bool isUrgent) {
+    if (batch_.Size() == 0)
+        return true;
+    if (!reason_.empty())
+        return now >= retryTime_ && Write(now);
+    return (now < NextTime() && !batch_.IsFull() && !isUrgent) || Write(now);
+}
+
+bool LogWriter::Write(int64_t now) {
+    try {
+        Open();
+        store_->Store(batch_.Records());
+    } catch (const StoreError &error) {
+        Pause(error, now);
+        return false;
+    }
+    stored_ += batch_.Size();
+    batch_.Clear();
+    if (!reason_.empty()) {
+        syslog(LOG_NOTICE, "storing into %s goes on after %lld s", path_.c_str(),
+               static_cast<long long>((now - pauseTime_) / 1000));
+        reason_.clear();
+        volume_.NoteWritten();
+    }
+    return true;
+}
+
+// What has the name of the database, and nothing that had it before.
+void LogWriter::Open() {
+    if (store_ && store_->HasMoved()) {
+        syslog(LOG_NOTICE, "%s was removed or renamed; storing goes on in what has its name", path_.c_str());
+        store_.reset();
+    }
+    if (store_)
+        return;
+    // A write-ahead log that was left alone would be taken for one of the fresh database.
+    std::error_code isMissing;
+    const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
+    if (!IsThere(path_) && !isMissing && walBytes > 0)
+        std::rename((path_ + "-wal").c_str(), (path_ + ".corrupt-wal").c_str());
+    store_.emplace(path_, kStoreOptions);
+}
+
+void LogWriter::Pause(const StoreError &error, int64_t now) {
+    const bool isLocked = error.code == SQLITE_BUSY || error.code == SQLITE_LOCKED;
+    retryTime_ = now + (isLocked ? kRetrySoonMs : kRetryMs);
+    if (reason_.empty())
+        pauseTime_ = now;
+    if (reason_ != error.what())
+        syslog(LOG_ERR, "receiving waits, as logs cannot be stored: %s", error.what());
+    reason_ = error.what();
+    if (IsFull(error))
+        volume_.NoteFull();
+    if (error.code == SQLITE_CORRUPT)
+        retryTime_ = now + PutAside();
+    else if (!isLocked)
+        store_.reset(); // whatever is wrong with it, the next try begins afresh
+}
+
+// Returns after how many milliseconds to try again.
+int64_t LogWriter::PutAside() {
+    // Another program may have seen the damage first, and then what has the name now is sound.
+    const bool isAside = store_ && store_->HasMoved();
+    store_.reset();
+    if (!isAside)
+        DBErrorHandle_SQLITE_CORRUPT(nullptr, path_);
+    return !isAside && IsThere(path_) ? kRetryDamagedMs : kRetrySoonMs;
+}
+
+} // namespace kelo::tool

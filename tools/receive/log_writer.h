@@ -1,0 +1,61 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "log_store.h"
+#include "receive/volume_watch.h"
+#include "record_batch.h"
+
+namespace kelo::tool {
+
+// Stores logs into a log database, in batches: one is written when it is large enough or half a second old.
+//
+// A database that cannot be written (locked, on a full disk, without permission) is waited for: the batch is
+// kept and tried again, and the system log told once. One that is damaged is put aside as DBHandler does it,
+// and one that was removed or renamed is left; a fresh one takes its place.
+//
+// Times are milliseconds of any clock that does not go back.
+class LogWriter {
+public:
+    // Opens nothing yet. `volume`, which is told of a full disk, must outlive the writer.
+    LogWriter(const std::string &path, VolumeWatch &volume);
+
+    // Takes the log, and may leave another's contents in it.
+    void Take(_SYSLOG_LOG_DATA_tag &log, int64_t now);
+
+    // Writes the batch when it is time, or at once where `isUrgent`. Returns false while the database cannot
+    // be written: no further logs should be taken then.
+    bool Advance(int64_t now, bool isUrgent = false);
+
+    // When Advance has something to do next.
+    int64_t NextTime() const;
+
+    // Closes the database, to open what has its name when the next batch is written.
+    void Reopen() { store_.reset(); }
+
+    size_t Waiting() const { return batch_.Size(); }
+    uint64_t Stored() const { return stored_; }
+    // Why the database cannot be written; empty when it can.
+    const std::string &Reason() const { return reason_; }
+    const std::string &Path() const { return path_; }
+
+private:
+    bool Write(int64_t now);
+    void Open();
+    void Pause(const StoreError &error, int64_t now);
+    int64_t PutAside();
+
+    std::string path_; // absolute
+    VolumeWatch &volume_;
+    std::optional<LogStore> store_;
+    RecordBatch batch_;
+    int64_t batchTime_ = 0; // of the batch's first log
+    uint64_t stored_ = 0;
+    std::string reason_;
+    int64_t retryTime_ = 0;
+    int64_t pauseTime_ = 0; // when it could be written last
+};
+
+} // namespace kelo::tool

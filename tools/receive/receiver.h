@@ -1,0 +1,79 @@
+#pragma once
+
+#include <chrono>
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "log_import.h"
+#include "receive/accounting_beat.h"
+#include "receive/log_writer.h"
+#include "receive/rule_watch.h"
+#include "receive/set_aside_file.h"
+#include "receive/signal_source.h"
+#include "receive/volume_watch.h"
+#include "receiver_state.h"
+
+namespace kelo::tool {
+
+struct ReceiverOptions {
+    std::string root;          // of the system's files, absolute or empty
+    std::string database;      // to store into; empty: logs are only counted and checked
+    std::string setAside;      // file for the lines that give no log; empty: the default below the root
+    uint64_t notifyLimit = 10; // notifications a minute and kind of rule
+};
+
+// Receives log text from a pipe: counts the logs, checks them against the rules and stores them.
+//
+// Everything happens on the caller's thread, and whatever takes time before a read: while the database cannot
+// be written nothing is read, so that the sender waits and memory stays bounded.
+class Receiver : private RecordSink {
+public:
+    // Opens nothing but the signals. Throws std::system_error.
+    explicit Receiver(ReceiverOptions options);
+
+    // Receives from the file descriptor until its end, or until SIGTERM or SIGINT has come and nothing more
+    // follows. What was read is stored and flushed then, as far as that succeeds within 20 seconds; the
+    // system log tells what is lost otherwise. SIGHUP reopens the files and loads the rules anew. Throws
+    // std::system_error when the input cannot be read, after doing the same.
+    void Run(int input);
+
+private:
+    using Clock = std::chrono::steady_clock;
+
+    void Take(_SYSLOG_LOG_DATA_tag &log) override;
+    void Flush() override {}
+    bool AwaitInput(const LineReader &reader) override;
+
+    void Wait(bool mayRead);
+    bool HasEnded() const;
+    void HandleSignals();
+    void Beat();
+    void WriteState();
+    void Finish();
+    uint64_t Received() const;
+    static int64_t NowMs();
+
+    ReceiverOptions options_;
+    SignalSource signals_;
+    VolumeWatch volume_;
+    SetAsideFile setAside_;
+    RuleWatch rules_;
+    AccountingBeat accounting_;
+    std::optional<LogWriter> writer_;
+    LogImport import_;
+    ReceiverState state_;
+    uint64_t receivedBefore_ = 0; // at the last update of the state
+    int64_t stateTime_ = 0;
+    bool isStateFailing_ = false;
+    int input_ = -1;
+    bool isInputReady_ = false;
+    // Of the steady clock, in milliseconds.
+    int64_t now_ = 0;
+    int64_t nextSecond_ = 0;
+    int64_t nextBeat_ = 0;
+    int64_t silentSince_ = 0;
+    std::optional<int64_t> stopTime_; // when the signal came
+};
+
+} // namespace kelo::tool

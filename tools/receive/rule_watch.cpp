@@ -1,0 +1,84 @@
+#include "receive/rule_watch.h"
+
+#include "kelosyslog/logger.h"
+
+namespace kelo::tool {
+namespace {
+
+// The text, cut where a notification could not carry it: it takes fewer than 2048 bytes with its quotes and
+// backslashes escaped. No character of UTF-8 is cut in two.
+std::string Content(const std::string &text) {
+    constexpr size_t kMostBytes = 2000;
+    size_t length = 0;
+    for (size_t bytes = 0; length < text.size(); ++length) {
+        bytes += text[length] == '"' || text[length] == '\\' ? 2 : 1;
+        if (bytes > kMostBytes)
+            break;
+    }
+    if (length == text.size())
+        return text;
+    while (length > 0 && (static_cast<unsigned char>(text[length]) & 0xc0U) == 0x80)
+        --length;
+    return text.substr(0, length) + "...";
+}
+
+std::string MoreLogs(uint64_t count) {
+    return std::to_string(count) + " more within a minute, without a notification of their own";
+}
+
+} // namespace
+
+RuleWatch::RuleWatch(uint64_t notifyLimit)
+    : rules_(std::in_place), severity_{NotifyLimit(notifyLimit), "", ""}, keyword_{NotifyLimit(notifyLimit),
+                                                                                   "", ""} {}
+
+void RuleWatch::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
+    if (rules_->CheckSev(log.prio)) {
+        const std::string severity = PriorTypeToStr(log.prio);
+        if (severity_.limit.Admit(now))
+            RaiseSeverity(log.host, severity, Content(log.msg));
+        else
+            Suppress(severity_, log.host, severity);
+    }
+    if (const std::string keyword = rules_->CheckKeyword(log.msg); !keyword.empty()) {
+        if (keyword_.limit.Admit(now))
+            RaiseKeyword(log.host, keyword, Content(log.msg));
+        else
+            Suppress(keyword_, log.host, keyword);
+    }
+}
+
+void RuleWatch::Beat(int64_t now) {
+    Tell(severity_.limit.TakeSuppressed(now), keyword_.limit.TakeSuppressed(now));
+}
+
+void RuleWatch::Finish() {
+    Tell(severity_.limit.TakeRest(), keyword_.limit.TakeRest());
+}
+
+void RuleWatch::Tell(uint64_t severities, uint64_t keywords) {
+    if (severities > 0)
+        RaiseSeverity(severity_.host, severity_.what, MoreLogs(severities));
+    if (keywords > 0)
+        RaiseKeyword(keyword_.host, keyword_.what, MoreLogs(keywords));
+}
+
+void RuleWatch::Suppress(Kind &kind, const std::string &host, const std::string &what) {
+    kind.host = host;
+    kind.what = what;
+    ++suppressed_;
+}
+
+void RuleWatch::RaiseSeverity(const std::string &host, const std::string &severity,
+                              const std::string &content) {
+    rules_->NotificationSendSev(host, severity, content);
+    Logger().LogAddNotifySev(severity, content);
+}
+
+void RuleWatch::RaiseKeyword(const std::string &host, const std::string &keyword,
+                             const std::string &content) {
+    rules_->NotificationSendKeyword(host, keyword, content);
+    Logger().LogAddNotifyKw(keyword, content);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,54 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "kelosyslog/notification.h"
+#include "receive/notify_limit.h"
+
+namespace kelo::tool {
+
+// Checks logs against the severity and keyword rules. A match raises a notification and an event, a flood of
+// them a bounded number a minute for either kind of rule. A notification or event that fails is only reported
+// in the system log, by the library.
+//
+// Times are seconds of any clock that does not go back.
+class RuleWatch {
+public:
+    // Loads the rules. `notifyLimit`: notifications a minute and kind of rule, at least 1.
+    explicit RuleWatch(uint64_t notifyLimit);
+
+    void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
+
+    // To be called about once a second: tells what was suppressed in a minute that is over.
+    void Beat(int64_t now);
+
+    // Tells what is left to tell.
+    void Finish();
+
+    // Loads the rules anew.
+    void Reload() { rules_.emplace(); }
+
+    // Matches that raised no notification of their own.
+    uint64_t Suppressed() const { return suppressed_; }
+
+private:
+    // One kind of rule. Of its last match that was suppressed: the sender, and the severity or keyword.
+    struct Kind {
+        NotifyLimit limit;
+        std::string host;
+        std::string what;
+    };
+    void RaiseSeverity(const std::string &host, const std::string &severity, const std::string &content);
+    void RaiseKeyword(const std::string &host, const std::string &keyword, const std::string &content);
+    void Suppress(Kind &kind, const std::string &host, const std::string &what);
+    void Tell(uint64_t severities, uint64_t keywords);
+
+    std::optional<NotificationManager> rules_;
+    Kind severity_;
+    Kind keyword_;
+    uint64_t suppressed_ = 0;
+};
+
+} // namespace kelo::tool

@@ -1,0 +1,69 @@
+#include "receive/volume_watch.h"
+
+#include <sys/statvfs.h>
+#include <syslog.h>
+
+#include <cstdint>
+
+#include "kelosyslog/logger.h"
+#include "kelosyslog/notification.h"
+
+namespace kelo::tool {
+namespace {
+
+// Below the first the volume counts as full, from the second on it does no longer: in between nothing
+// changes, so that a volume on the brink raises no series of events.
+constexpr uint64_t kFullBytes = 16 * 1024 * 1024;
+constexpr uint64_t kRoomBytes = 32 * 1024 * 1024;
+
+} // namespace
+
+void VolumeWatch::NoteFull() {
+    Enter(isWriteFailing_);
+}
+
+void VolumeWatch::NoteWritten() {
+    Leave(isWriteFailing_);
+}
+
+void VolumeWatch::Beat() {
+    struct statvfs status {};
+    if (statvfs(folder_.c_str(), &status) != 0)
+        return;
+    const uint64_t freeBytes = uint64_t{status.f_bavail} * status.f_frsize;
+    if (freeBytes < kFullBytes)
+        Enter(isSpaceLow_);
+    else if (freeBytes >= kRoomBytes)
+        Leave(isSpaceLow_);
+}
+
+void VolumeWatch::Enter(bool &cause) {
+    const bool wasFull = isWriteFailing_ || isSpaceLow_;
+    cause = true;
+    if (wasFull)
+        return;
+    syslog(LOG_ERR, "the volume of %s is full", folder_.c_str());
+    isEventDue_ = true;
+    isNotificationDue_ = true;
+    Tell();
+}
+
+void VolumeWatch::Leave(bool &cause) {
+    const bool wasFull = isWriteFailing_ || isSpaceLow_;
+    cause = false;
+    if (!wasFull || isWriteFailing_ || isSpaceLow_)
+        return;
+    syslog(LOG_NOTICE, "the volume of %s has room again", folder_.c_str());
+    Tell();
+    isEventDue_ = false;
+    isNotificationDue_ = false;
+}
+
+void VolumeWatch::Tell() {
+    if (isEventDue_)
+        isEventDue_ = Logger().LogAddVolFull() != 0;
+    if (isNotificationDue_)
+        isNotificationDue_ = NotificationManager().NotificationSendVolFull(folder_) != 0;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,37 @@
+#pragma once
+
+#include <cstddef>
+#include <span>
+#include <vector>
+
+#include "kelosyslog/records.h"
+
+namespace kelo::tool {
+
+// Records that are stored together. Their memory serves the next batch, except that of long texts, which
+// would pile up in it.
+class RecordBatch {
+public:
+    // From here on a batch is large enough to be stored.
+    static constexpr size_t kFullRows = 5000;
+    static constexpr size_t kFullBytes = 4 * 1024 * 1024;
+
+    // Takes the record, and may leave another's contents in `log`.
+    void Take(_SYSLOG_LOG_DATA_tag &log);
+
+    std::span<const _SYSLOG_LOG_DATA_tag> Records() const { return {records_.data(), rows_}; }
+    size_t Size() const { return rows_; }
+    bool IsFull() const { return rows_ >= kFullRows || bytes_ >= kFullBytes; }
+
+    void Clear();
+
+private:
+    static constexpr size_t kLongTextBytes = 8 * 1024;
+
+    std::vector<_SYSLOG_LOG_DATA_tag> records_;
+    size_t rows_ = 0; // of the batch; what lies behind waits for use
+    size_t bytes_ = 0;
+    bool hasLongText_ = false;
+};
+
+} // namespace kelo::tool
