@@ -9,6 +9,7 @@ using Texts = std::vector<std::string>;
 const std::string kFailed = "Fail to execute SQL command: ";
 const std::string kRows = "1000 a 1;1001 a 1;1001 b'c 1";
 const std::string kCounts = "a 2;b'c 1;d 1";
+
 // Three sample rows that wait for a flush, and a log in the open sample.
 void CountLogs(AccountingManager &accounting) {
     machine.now = 1000;
@@ -22,9 +23,11 @@ void CountLogs(AccountingManager &accounting) {
 using Flush = AccountingTest;
 
 TEST_F(Flush, GivesUpTheOldestSamplesAboveABound) {
-    EXPECT_EQ(accounting_->SamplesDrop(2, 3), 0U);
-    EXPECT_EQ(accounting_->SamplesDrop(2, 2), 1U);
-    EXPECT_EQ(accounting_->AccoutingFlush2DB(), 0);
+    AccountingManager accounting;
+    CountLogs(accounting);
+    EXPECT_EQ(accounting.SamplesDrop(2, 3), 0U);
+    EXPECT_EQ(accounting.SamplesDrop(2, 2), 1U);
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
     EXPECT_EQ("1000 a 1;" + Samples(), kRows);
     EXPECT_EQ(Histogram(), kCounts);
 }
