@@ -1,3 +1,6 @@
+#include <array>
+
+#include "keloplatform/gensqlregexp.h"
 #include "query/query_fixture.h"
 
 using namespace kelo::test;
@@ -15,9 +18,16 @@ TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
         std::string text;
     } cases[] = {
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "", {}}, "(host = '')"},
+        {{SYSLOG_ATTRI_HOST, SYSLOG_OP_NE, "O'Brien", {}}, "(host != 'O''Brien')"},
+        {{SYSLOG_ATTRI_ISDIR, SYSLOG_OP_GE, "1", {}}, "(isdir >= '1')"},
+        {{SYSLOG_ATTRI_XFERIP, SYSLOG_OP_LT, "1%_[\\", {}}, "(ip < '1%_[\\')"},
+        {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "a*b?c", {}}, "(msg LIKE 'a%b_c' escape '\\')"},
         {{SYSLOG_ATTRI_MSG, SYSLOG_OP_NOT_LIKE, "5%_\\'*", {}},
          "(msg NOT LIKE '5\\%\\_\\\\''%' escape '\\')"},
+        {{SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "x[1]*?'", {}}, "(msg GLOB 'x[[]1[]]*?''')"},
+        {{SYSLOG_ATTRI_MSG, SYSLOG_OP_NOT_GLOB, "%_\\", {}}, "(msg NOT GLOB '%_\\')"},
         {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "msg > 'it''s'", {}}, "(msg > 'it''s')"},
+        {{SYSLOG_ATTRI_ID, SYSLOG_OP_GT, "15", {}}, "(id > 15)"},
         {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_LIKE, "1?*", {}}, "(utcsec LIKE 1_%)"},
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, std::string("a\0b", 3), {}}, "(host = '')"},
         {{SYSLOG_ATTRI_MSG,
@@ -54,6 +64,30 @@ TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
     _SYSLOG_SQL_ORDER_tag order{1, noAttribute};
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, &order), -1);
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, nullptr), 3);
+}
+
+TEST_F(ConditionText, IsBuiltFromTheFilterForm) {
+    const std::string keyword = GenSQLRegexp("any", "msg");
+    const struct {
+        std::array<std::string, 7> form; // host, level, facility, program, keyword, from, to
+        std::string text;
+    } cases[] = {
+        {{"any", "any", "", "any", "", "0", ""}, ""},
+        {{"a, b", "err,warning", "auth", "x", "any", "2020/01/02", "2020/01/03"},
+         "((host = 'a') OR (host = ' b')) AND ((llevel = 'err') OR (llevel = 'warning')) AND (fac = 'auth') "
+         "AND "
+         "(prog = 'x') AND (" +
+             keyword + ") AND (ldate >= '2020/01/02') AND (ldate <= '2020/01/03')"},
+        {{",", "Any", "", "", "", "d", "d"},
+         "((host = '') OR (host = '')) AND (llevel = 'Any') AND (ldate = 'd')"},
+        {{"", "", "", "", "", "0", "d"}, "(ldate <= 'd')"},
+    };
+    for (const auto &[form, text] : cases) {
+        Conditions conditions = {{SYSLOG_ATTRI_ID, SYSLOG_OP_GT, "1", {}}};
+        LogSearchCondListGen(form[0], form[1], form[2], form[3], form[4], form[5], form[6], conditions);
+        SyslogDBSelectCount(path_, conditions, nullptr, nullptr);
+        EXPECT_EQ(TakeStatement(), kCount + std::string("(id > 1)") + (text.empty() ? "" : " AND " + text));
+    }
 }
 
 } // namespace

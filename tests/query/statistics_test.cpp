@@ -15,15 +15,21 @@ protected:
 
 TEST_F(Statistics, ReadTheHistogram) {
     EXPECT_EQ(SyslogDBHistTotalGet(path_), 0u);
+    EXPECT_EQ(TakeStatement(), "SELECT SUM(count) FROM histogram");
     RunSql(path_,
            "INSERT INTO histogram(device, count) VALUES('nas', 7), (NULL, 1), ('a''b', 5), ('nas', 90), "
            "('big', 9223372036854775000)");
     EXPECT_THAT(SyslogDBHistGet(path_, 0),
                 ElementsAre(Pair("", 1), Pair("a'b", 5), Pair("big", 9223372036854775000u), Pair("nas", 7)));
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram");
     EXPECT_THAT(SyslogDBHistGet(path_, 2), ElementsAre(Pair("big", 9223372036854775000u), Pair("nas", 90)));
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram ORDER BY count DESC LIMIT 2");
     EXPECT_THAT(SyslogDBHistGet(path_, -1), IsEmpty());
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram ORDER BY count DESC LIMIT 18446744073709551615");
     EXPECT_EQ(SyslogDBHistTotalGet(path_), 9223372036854775103u);
+    TakeStatement();
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "a'b"), 0u);
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram WHERE device = 'a'b'");
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "a''b"), 5u);
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "nothing"), 0u);
     EXPECT_THAT(log_.Messages(), IsEmpty());
@@ -35,6 +41,7 @@ TEST_F(Statistics, SumASampleButKeepTheFirstRowOfADevice) {
         "INSERT INTO eps(stamp, device, eps) VALUES(20, 'b', 3), (10, 'a', 1), (20, 'a', 4), (20, 'b', 9), "
         "(9999999999, NULL, 9999999999), (20, NULL, 2147483647)");
     const std::map<int, SYSLOG_LOG_EPS> samples = SyslogDBEpsGet(path_, 11, 20);
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM eps WHERE stamp >=11 and stamp <=20");
     ASSERT_EQ(samples.size(), 1u);
     EXPECT_EQ(samples.at(20).stamp, 20);
     EXPECT_EQ(samples.at(20).eps, 2147483663);
@@ -42,6 +49,7 @@ TEST_F(Statistics, SumASampleButKeepTheFirstRowOfADevice) {
     // A negative bound is a huge number; a stamp beyond 32 bits saturates.
     RunSql(path_, "UPDATE eps SET stamp = 9999999999 WHERE stamp = 10");
     const std::map<int, SYSLOG_LOG_EPS> beyond = SyslogDBEpsGet(path_, 21, -1);
+    EXPECT_EQ(TakeStatement(), "SELECT * FROM eps WHERE stamp >=21 and stamp <=18446744073709551615");
     ASSERT_THAT(beyond, ElementsAre(Pair(2147483647, testing::_)));
     EXPECT_EQ(beyond.at(2147483647).eps, 2147483648);
     EXPECT_THAT(SyslogDBEpsGet(path_, 20, 11), IsEmpty());
@@ -53,13 +61,25 @@ TEST_F(Lookup, ListsTheValuesOfAnAttribute) {
     RunSql(path_, "INSERT INTO logs(host) VALUES('b'), ('a'), (NULL), ('b'), ('c')");
     std::list<std::string> values = {"before"};
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "host", nullptr, values), 0);
+    EXPECT_EQ(TakeStatement(), "SELECT host FROM logs GROUP BY host ORDER BY host asc");
     _SYSLOG_SQL_LIMIT_tag page{1, 0x500000002};
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "host", &page, values), 0);
+    EXPECT_EQ(PlatformCalls::Recorded()[1].offset, 2u);
     EXPECT_THAT(values, ElementsAre("before", "", "a", "b", "c", "b"));
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "event", nullptr, values), -1);
     EXPECT_THAT(log_.Messages(), IsEmpty());
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "host, msg", nullptr, values), -1);
     EXPECT_THAT(log_.Texts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
+}
+
+TEST_F(Lookup, NumbersTheNamesOfADatabaseWithoutKeyTables) {
+    RunSql(path_, "INSERT INTO logs(fac) VALUES('user'), ('auth'), ('user'), (NULL)");
+    std::map<uint64_t, std::string> names = {{1, "kept"}};
+    EXPECT_EQ(SyslogDBExtkeyMapGet(path_, SYSLOG_EXTKEY_FAC, names), 0);
+    EXPECT_THAT(PlatformCalls::Statements(),
+                ElementsAre("SELECT * FROM db_info", "SELECT DISTINCT fac FROM logs"));
+    EXPECT_THAT(names, ElementsAre(Pair(0, "user"), Pair(1, "kept"), Pair(2, "")));
+    EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, SYSLOG_EXTKEY_FAC, "auth"), 1u);
 }
 
 TEST_F(Lookup, ReadsTheKeyTablesOfTheFirstGeneration) {

@@ -52,12 +52,13 @@ void PlatformCalls::FailFrom(int first, int times) {
     failedFunction_.clear();
 }
 
-bool PlatformCalls::MustFail(const char *function, const char *text) {
+bool PlatformCalls::MustFail(const char *function, const char *text, unsigned int limit,
+                             unsigned int offset) {
     if (PlatformVisit::IsActive())
         return false;
     const FaultPause pause;
     const std::lock_guard lock(callMutex);
-    recorded_.push_back({function, text != nullptr ? text : ""});
+    recorded_.push_back({function, text != nullptr ? text : "", limit, offset});
     const bool fails = failFirst_ > 0 && Count() >= failFirst_ && Count() - failFirst_ < failTimes_;
     if (fails && failedFunction_.empty())
         failedFunction_ = function;
@@ -112,7 +113,7 @@ int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **res
 
 int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit, unsigned int offset,
                       DBResult_tag **result) {
-    if (PlatformCalls::MustFail("KELODBSelectLimit", sql))
+    if (PlatformCalls::MustFail("KELODBSelectLimit", sql, limit, offset))
         return -1;
     return CountedResult(KELO_CALL_REAL(KELODBSelectLimit, connection, sql, limit, offset, result), result);
 }
@@ -128,11 +129,23 @@ void KELODBFreeResult(DBResult_tag *result) {
     KELO_CALL_REAL(KELODBFreeResult, result);
 }
 
+int KELODBEscapeStringEX(DBConnect_tag *connection, char *out, size_t outSize, const char *in, size_t inLen) {
+    if (PlatformCalls::MustFail("KELODBEscapeStringEX", in))
+        return -1;
+    return KELO_CALL_REAL(KELODBEscapeStringEX, connection, out, outSize, in, inLen);
+}
+
 int KELODBEscapeStringEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in,
                           size_t inLen) {
     if (PlatformCalls::MustFail("KELODBEscapeStringEX2", in))
         return -1;
     return KELO_CALL_REAL(KELODBEscapeStringEX2, connection, out, outSize, in, inLen);
+}
+
+int KELODBEscapeBackslashEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in) {
+    if (PlatformCalls::MustFail("KELODBEscapeBackslashEX2", in))
+        return -1;
+    return KELO_CALL_REAL(KELODBEscapeBackslashEX2, connection, out, outSize, in);
 }
 
 } // extern "C"

@@ -10,8 +10,10 @@ namespace kelo::test {
 
 // One recorded call of a platform function that can fail.
 struct PlatformCall {
-    std::string function; // "KELODBExecute"
-    std::string text;     // SQL text, path or other leading text argument
+    std::string function;   // "KELODBExecute"
+    std::string text;       // SQL text, path or other leading text argument
+    unsigned int limit = 0; // of KELODBSelectLimit
+    unsigned int offset = 0;
 };
 
 // Watches every call of a platform function in the process, also those out of libkelosyslog, and makes chosen
@@ -40,7 +42,8 @@ public:
     static int OpenResults() { return openResults_; }
 
     // For the doubles of platform functions: records a call and tells whether it has to fail.
-    static bool MustFail(const char *function, const char *text);
+    static bool MustFail(const char *function, const char *text, unsigned int limit = 0,
+                         unsigned int offset = 0);
     // Counts a connection or result that was opened (1) or closed (-1).
     static void CountConnection(int change);
     static void CountResult(int change);
