@@ -35,6 +35,9 @@ public:
     // changed yet, or the flush failed, which is reported once.
     bool Finish();
 
+    // Whether the last flush failed.
+    bool IsFailing() const { return isFailing_; }
+
 private:
     bool CloseSample();
     bool Flush();

@@ -30,6 +30,9 @@ public:
     // Loads the rules anew.
     void Reload() { rules_.emplace(); }
 
+    // Whether the last event failed.
+    bool IsFailing() const { return lostEvents_ > 0; }
+
     // Matches that raised no notification of their own.
     uint64_t Suppressed() const { return suppressed_; }
 
