@@ -216,6 +216,35 @@ TEST_F(ReceiveProgram, WaitsForRoomOnAFullDisk) {
     EXPECT_EQ(Counted(), "20000");
 }
 
+// A full disk leaves databases behind that have no table.
+TEST_F(ReceiveProgram, CompletesEmptyDatabases) {
+    for (const char *file : {"var/log/kelolog/.KELOACCOUNTDB", "usr/kelo/etc/kelosyslog.db"})
+        close(open(root_.File(file).c_str(), O_CREAT | O_WRONLY | O_CLOEXEC, 0640));
+    Start();
+    Send(Lines(0, 10));
+    EXPECT_EQ(End(), 0);
+    EXPECT_EQ(Counted(), "10");
+    EXPECT_EQ(Events("Server was started*"), "1");
+}
+
+// Each event that is tried would hold up what is received for seconds.
+TEST_F(ReceiveProgram, TriesALockedEventLogOnce) {
+    kelo::test::WriteFile(root_.File("etc/kelosyslog/notify.conf"),
+                          "[all]\nnotify_type=\"0\"\nnotify_pri=\"6\"\nnotify_enable=\"1\"\n");
+    Start();
+    ASSERT_TRUE(Await([&] { return State().pid == child_; }));
+    sqlite3 *locker = nullptr;
+    sqlite3_open(root_.File("usr/kelo/etc/kelosyslog.db").c_str(), &locker);
+    ASSERT_EQ(sqlite3_exec(locker, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
+    Send(Lines(0, 10));
+    EXPECT_TRUE(AwaitRows(10));
+    sqlite3_close(locker);
+    EXPECT_EQ(Notifications("KELOSYSLOG_SEV_EXCEED"), 3);
+    const std::string err = ReadFile(Err());
+    EXPECT_EQ(err.find("Fail to add log"), err.rfind("Fail to add log")) << err;
+    EXPECT_EQ(End(), 0);
+}
+
 TEST_F(ReceiveProgram, GoesOnInAFreshDatabase) {
     Start();
     Send(Lines(0, 10));

@@ -2,13 +2,17 @@
 
 #include <syslog.h>
 
+#include <algorithm>
+#include <chrono>
+
 namespace kelo::tool {
 namespace {
 
-// The manager says no when it is asked within 6 seconds after the question before.
 constexpr int64_t kFlushSec = 6;
 // A flush may wait for a locked database, and nothing is received meanwhile.
 constexpr int64_t kFlushAfterFailureSec = 60;
+// Nor while millions of devices are written: that takes up to a tenth of the time.
+constexpr int64_t kPausePerFlush = 9;
 constexpr size_t kMostSamples = 24 * 60 * 60;
 constexpr size_t kMostCounts = 1'000'000;
 
@@ -27,10 +31,12 @@ void AccountingBeat::Beat(int64_t now) {
     manager_->CurEpsUpdate();
     if (now < nextFlush_)
         return;
-    nextFlush_ = now + kFlushSec;
     isReloadPutOff_ = false;
-    if (manager_->isNeed2Flush() && !Flush())
-        nextFlush_ = now + kFlushAfterFailureSec;
+    using Clock = std::chrono::steady_clock;
+    const Clock::time_point begin = Clock::now();
+    const bool isFlushed = Flush();
+    const auto sec = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count();
+    nextFlush_ = now + (isFlushed ? std::max(kFlushSec, sec + sec * kPausePerFlush) : kFlushAfterFailureSec);
 }
 
 void AccountingBeat::RequestReload() {
@@ -75,7 +81,7 @@ bool AccountingBeat::Flush() {
 // A manager that could not read what the present one has written would later write too low totals.
 void AccountingBeat::Replace() {
     auto fresh = std::make_unique<AccountingManager>();
-    if (Total(*fresh) != Total(*manager_))
+    if (Total(*fresh) < Total(*manager_))
         return;
     manager_ = std::move(fresh);
     mustReload_ = false;

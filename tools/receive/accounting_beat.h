@@ -17,7 +17,8 @@ class AccountingBeat {
 public:
     AccountingBeat();
 
-    void Count(const std::string &host) { manager_->LogInc(host); }
+    // The accounting database keeps a name up to its first NUL.
+    void Count(const std::string &host) { manager_->LogInc(host.c_str()); }
 
     // To be called about once a second. Closes the sample, and flushes when its time has come.
     void Beat(int64_t now);
@@ -33,6 +34,9 @@ public:
     // Closes the last sample and flushes. Returns false when it is to be called again: the second has not
     // changed yet, or the flush failed, which is reported once.
     bool Finish();
+
+    // Whether the last flush failed.
+    bool IsFailing() const { return isFailing_; }
 
 private:
     bool CloseSample();

@@ -26,9 +26,10 @@ bool IsFull(const StoreError &error) {
            error.systemError == EFBIG;
 }
 
-bool IsThere(const std::string &path) {
+// The inode of what has the name; 0 for nothing.
+ino_t InodeOf(const std::string &path) {
     struct stat status {};
-    return stat(path.c_str(), &status) == 0;
+    return stat(path.c_str(), &status) == 0 ? status.st_ino : 0;
 }
 
 } // namespace
@@ -86,7 +87,7 @@ void LogWriter::Open() {
     // A write-ahead log that was left alone would be taken for one of the fresh database.
     std::error_code isMissing;
     const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
-    if (!IsThere(path_) && !isMissing && walBytes > 0)
+    if (InodeOf(path_) == 0 && !isMissing && walBytes > 0)
         std::rename((path_ + "-wal").c_str(), (path_ + ".corrupt-wal").c_str());
     store_.emplace(path_, kStoreOptions);
 }
@@ -111,10 +112,12 @@ void LogWriter::Pause(const StoreError &error, int64_t now) {
 int64_t LogWriter::PutAside() {
     // Another program may have seen the damage first, and then what has the name now is sound.
     const bool isAside = store_ && store_->HasMoved();
+    const ino_t damaged = InodeOf(path_);
     store_.reset();
     if (!isAside)
         DBErrorHandle_SQLITE_CORRUPT(nullptr, path_);
-    return !isAside && IsThere(path_) ? kRetryDamagedMs : kRetrySoonMs;
+    // A reader may have made an empty file of that name since.
+    return !isAside && damaged != 0 && InodeOf(path_) == damaged ? kRetryDamagedMs : kRetrySoonMs;
 }
 
 } // namespace kelo::tool

@@ -14,6 +14,7 @@
 #include <system_error>
 
 #include "kelosyslog/logger.h"
+#include "receive/complete_databases.h"
 
 namespace kelo::tool {
 namespace {
@@ -23,11 +24,13 @@ constexpr const char *kFolder = "/var/log/kelolog";
 
 constexpr int64_t kSecondMs = 1000;
 constexpr int64_t kBeatMs = 6000;
+constexpr int64_t kRepairMs = 60'000;
 constexpr int64_t kHoldMs = 20;          // between looks at the clock while no log may be counted
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
 constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
 constexpr int64_t kLeastFinishMs = 2000; // of it, where waiting for the database has taken the time before
 constexpr int64_t kFinishRetryMs = 200;
+constexpr int64_t kFinishFlushMs = 2000; // between flushes that fail, of which each is reported
 
 std::string FolderOf(const ReceiverOptions &options) {
     if (options.database.empty())
@@ -59,6 +62,7 @@ void Receiver::Run(int input) {
     input_ = input;
     now_ = NowMs();
     stateTime_ = now_;
+    CompleteDatabases(options_.root);
     Logger().LogAddServStart(kEventText);
     LineReader reader(input, LogStream::kMaxLineBytes);
     try {
@@ -137,6 +141,7 @@ void Receiver::Beat() {
         accounting_.Beat(now_ / kSecondMs);
         rules_.Beat(now_ / kSecondMs);
         setAside_.Beat(now_ / kSecondMs);
+        Repair();
     }
     const bool isChanged = writer_ && writer_->Reason() != state_.waiting;
     if (now_ < nextBeat_ && !isChanged)
@@ -144,6 +149,13 @@ void Receiver::Beat() {
     nextBeat_ = now_ + kBeatMs;
     volume_.Beat();
     WriteState();
+}
+
+void Receiver::Repair() {
+    if (now_ < nextRepair_ || (!accounting_.IsFailing() && !rules_.IsFailing()))
+        return;
+    nextRepair_ = now_ + kRepairMs;
+    CompleteDatabases(options_.root);
 }
 
 uint64_t Receiver::Received() const {
@@ -187,7 +199,9 @@ void Receiver::Finish() {
                writer_->Reason().c_str());
     bool isFlushed = accounting_.Finish();
     while (!isFlushed && !isOver()) {
-        poll(nullptr, 0, kFinishRetryMs);
+        if (accounting_.IsFailing())
+            CompleteDatabases(options_.root);
+        poll(nullptr, 0, accounting_.IsFailing() ? kFinishFlushMs : kFinishRetryMs);
         isFlushed = accounting_.Finish();
     }
     if (!isFlushed)

@@ -49,6 +49,7 @@ private:
     bool HasEnded() const;
     void HandleSignals();
     void Beat();
+    void Repair();
     void WriteState();
     void Finish();
     uint64_t Received() const;
@@ -72,6 +73,7 @@ private:
     int64_t now_ = 0;
     int64_t nextSecond_ = 0;
     int64_t nextBeat_ = 0;
+    int64_t nextRepair_ = 0;
     int64_t silentSince_ = 0;
     std::optional<int64_t> stopTime_; // when the signal came
 };

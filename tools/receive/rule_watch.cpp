@@ -1,9 +1,15 @@
 #include "receive/rule_watch.h"
 
+#include <syslog.h>
+
+#include <utility>
+
 #include "kelosyslog/logger.h"
 
 namespace kelo::tool {
 namespace {
+
+constexpr int64_t kEventPauseSec = 60;
 
 // The text, cut where a notification could not carry it: it takes fewer than 2048 bytes with its quotes and
 // backslashes escaped. No character of UTF-8 is cut in two.
@@ -33,6 +39,7 @@ RuleWatch::RuleWatch(uint64_t notifyLimit)
                                                                                    "", ""} {}
 
 void RuleWatch::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
+    now_ = now;
     if (rules_->CheckSev(log.prio)) {
         const std::string severity = PriorTypeToStr(log.prio);
         if (severity_.limit.Admit(now))
@@ -49,6 +56,7 @@ void RuleWatch::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
 }
 
 void RuleWatch::Beat(int64_t now) {
+    now_ = now;
     Tell(severity_.limit.TakeSuppressed(now), keyword_.limit.TakeSuppressed(now));
 }
 
@@ -72,13 +80,27 @@ void RuleWatch::Suppress(Kind &kind, const std::string &host, const std::string 
 void RuleWatch::RaiseSeverity(const std::string &host, const std::string &severity,
                               const std::string &content) {
     rules_->NotificationSendSev(host, severity, content);
-    Logger().LogAddNotifySev(severity, content);
+    AddEvent([&] { return Logger().LogAddNotifySev(severity, content); });
 }
 
 void RuleWatch::RaiseKeyword(const std::string &host, const std::string &keyword,
                              const std::string &content) {
     rules_->NotificationSendKeyword(host, keyword, content);
-    Logger().LogAddNotifyKw(keyword, content);
+    AddEvent([&] { return Logger().LogAddNotifyKw(keyword, content); });
+}
+
+// Each event that finds its database locked takes seconds, in which nothing is received.
+template <typename Write>
+void RuleWatch::AddEvent(Write write) {
+    if (now_ < nextEvent_) {
+        ++lostEvents_;
+    } else if (write() != 0) {
+        nextEvent_ = now_ + kEventPauseSec;
+        ++lostEvents_;
+    } else if (const uint64_t lost = std::exchange(lostEvents_, 0); lost > 0) {
+        syslog(LOG_WARNING, "%llu events of rules were lost, as they could not be written",
+               static_cast<unsigned long long>(lost));
+    }
 }
 
 } // namespace kelo::tool

@@ -11,7 +11,7 @@ namespace kelo::tool {
 
 // Checks logs against the severity and keyword rules. A match raises a notification and an event, a flood of
 // them a bounded number a minute for either kind of rule. A notification or event that fails is only reported
-// in the system log, by the library.
+// in the system log, by the library; after an event that failed a minute goes without events.
 //
 // Times are seconds of any clock that does not go back.
 class RuleWatch {
@@ -30,6 +30,9 @@ public:
     // Loads the rules anew.
     void Reload() { rules_.emplace(); }
 
+    // Whether the last event failed.
+    bool IsFailing() const { return lostEvents_ > 0; }
+
     // Matches that raised no notification of their own.
     uint64_t Suppressed() const { return suppressed_; }
 
@@ -44,11 +47,16 @@ private:
     void RaiseKeyword(const std::string &host, const std::string &keyword, const std::string &content);
     void Suppress(Kind &kind, const std::string &host, const std::string &what);
     void Tell(uint64_t severities, uint64_t keywords);
+    template <typename Write>
+    void AddEvent(Write write);
 
     std::optional<NotificationManager> rules_;
     Kind severity_;
     Kind keyword_;
     uint64_t suppressed_ = 0;
+    int64_t now_ = 0;
+    int64_t nextEvent_ = INT64_MIN; // after a failure, when the next event is tried
+    uint64_t lostEvents_ = 0;
 };
 
 } // namespace kelo::tool

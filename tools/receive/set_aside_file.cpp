@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <syslog.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstdio>
@@ -90,10 +91,12 @@ void SetAsideFile::Flush() {
         syslog(LOG_ERR, "cannot keep the lines that are set aside in %s: %s", path_.c_str(),
                std::strerror(errno));
     isFailing_ = !isWritten;
-    if (isWritten)
+    if (isWritten) {
         size_ += static_cast<int64_t>(buffer_.size());
-    else
+    } else if (file_) { // the next line must not go on where a part of one ends
+        [[maybe_unused]] const int isCut = ftruncate(file_.Get(), size_);
         file_ = FileHandle();
+    }
     buffer_.clear();
 }
 
