@@ -25,8 +25,8 @@ constexpr mode_t kFolderMode = 0750;
 } // namespace
 
 ArchiveFolder::ArchiveFolder(std::string path, bool mayCreate) : path_(std::move(path)) {
-    if (mayCreate && !fs::exists(path_)) {
-        std::error_code error;
+    std::error_code error;
+    if (mayCreate && !fs::exists(path_, error) && !error) {
         fs::create_directories(fs::path(path_).parent_path(), error);
         if (mkdir(path_.c_str(), kFolderMode) != 0 && errno != EEXIST)
             Fail(path_, errno);

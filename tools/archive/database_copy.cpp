@@ -19,7 +19,8 @@ namespace {
 constexpr int kPagesPerStep = 1024;
 
 SqliteFile OpenSource(const std::string &path) {
-    if (!std::filesystem::is_regular_file(path)) // a pipe would wait for its other end
+    std::error_code error;
+    if (!std::filesystem::is_regular_file(path, error)) // a pipe would wait for its other end
         throw DatabaseError(DescribeDatabaseProblem({path}));
     return {path, SqliteFile::Mode::kWrite}; // WAL mode needs to write its shared memory even for reading
 }
