@@ -12,7 +12,7 @@ struct Archive {
     std::string name;
     std::string device;
     int64_t first = 0; // time of the oldest log, seconds since the epoch
-    int64_t last = 0; // of the newest; 0 or less where no log has a time that is a number
+    int64_t last = 0;  // of the newest; 0 or less where that is unknown
     uint64_t logs = 0;
     uint64_t bytes = 0;
 };
