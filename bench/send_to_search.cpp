@@ -55,8 +55,8 @@ public:
 
     bool Finds(const std::string &message) {
         sqlite3_stmt *statement = nullptr;
-        if (sqlite3_prepare_v2(database_.get(), "SELECT id FROM logs WHERE id > ? AND msg = ?", -1, &statement,
-                               nullptr) != SQLITE_OK)
+        if (sqlite3_prepare_v2(database_.get(), "SELECT id FROM logs WHERE id > ? AND msg = ?", -1,
+                               &statement, nullptr) != SQLITE_OK)
             return false; // the table is not there yet
         sqlite3_bind_int64(statement, 1, last_);
         sqlite3_bind_text(statement, 2, message.c_str(), -1, SQLITE_TRANSIENT);

@@ -1,6 +1,7 @@
 // Counts received logs by device and second, and writes the counts on a beat.
 
 #include <kelosyslog/accounting.h>
+#include <kelosyslog/debuger.h>
 #include <kelosyslog/root.h>
 #include <syslog.h>
 
@@ -40,7 +41,10 @@ int main(int argc, char **argv) {
         std::cout << ", after 6 more: " << accounting.isNeed2Flush() << "\n";
         accounting.CurEpsUpdate(); // closes the sample of the second that has passed
         std::cout << "flushed: " << accounting.AccoutingFlush2DB() << "\n";
-        accounting.LogInc("tv"); // in a sample that is open at the end: it is not flushed
+        accounting.LogInc("tv");  // in a sample that is open at the end: it is not flushed
+        Debuger::ThresholdSet(2); // for the dump, which goes to the debug channel
+        accounting.AccountingDump();
+        Debuger::ThresholdSet(0);
     }
     for (const auto &[stamp, sample] : SyslogDBEpsGet(path, 0, 2000000000)) {
         std::cout << stamp << ":";

@@ -22,8 +22,13 @@ int main() {
             std::cout << "  " << log.utcsec << " " << log.host << " " << PriorTypeToStr(log.prio) << " ["
                       << log.msg << "]\n";
 
-    Debuger::ThresholdSet(2); // the dumps go to the debug channel
+    parser.PartialLogDump();  // goes to the debug channel, which is silent
+    Debuger::ThresholdSet(2); // until the program asks for it
     parser.PartialLogDump();
+    parser.PartialLogSet("local0 info 2020/01/02 10:11:15 1577931075 0 "); // in front of what is added next
+    std::string rest = "+08:00 nas ::1 cron 86 put together";
+    parser.LogAdd(rest);
+    parser.LogDump();
 
     // One line at a time, without the parser's list.
     _SYSLOG_LOG_DATA_tag log;

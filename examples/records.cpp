@@ -23,8 +23,9 @@ int main(int argc, char **argv) {
 
     std::cout << "err is severity " << PriorStrToType("err") << ", 'loud' is " << PriorStrToType("loud")
               << ", 4 is " << PriorTypeToStr(SYSLOG_PRIO_WARNING) << "\n";
-    std::cout << "attribute 'ldate' is " << LogAttriType("ldate") << ", 10 is column '"
-              << LogAttriStrGet(SYSLOG_ATTRI_LTIME) << "', 'colour' is " << LogAttriType("colour") << "\n";
+    std::cout << "column 'ip' is attribute " << LogAttriType("ip") << ", attribute " << SYSLOG_ATTRI_XFERIP
+              << " is column '" << LogAttriStrGet(SYSLOG_ATTRI_XFERIP) << "' too, 'colour' is "
+              << LogAttriType("colour") << "\n";
     std::cout << "operator 7 is " << g_MappingSyslogOP[SYSLOG_OP_NOT_LIKE] << "\n";
     std::cout << "[" << TrimUserName("alice:logged in") << "] [" << TrimUserName("no colon") << "]\n";
     std::cout << "SMB transfers: " << XferlogDBPathGet("smbxfer") << "\n";

@@ -21,17 +21,23 @@ int main(int argc, char **argv) {
     DBHandler db(path, root + "/usr/kelo/syslog/schema/logs.sql");
     if (db.DBCon() != 0)
         return 1;
-    db.DBExecute("INSERT INTO logs (host, prio, ldate, msg) VALUES"
-                 " ('nas',  'err',    '2020/01/01', 'disk 1 is full'), "
-                 " ('web1', 'notice', '2020/01/02', 'alice logged in'),"
-                 " ('nas',  'err',    '2020/01/03', 'disk 2 is full'), "
-                 " ('nas',  'crit',   '2020/01/04', 'disk 2 failed'),  "
-                 " ('web2', 'err',    '2020/01/05', 'disk full, again')");
+    db.DBExecute("INSERT INTO logs (host, prio, fac, prog, ldate, msg) VALUES"
+                 " ('nas',  'err',  'kern', 'smartd', '2019/12/31', 'disk 1 is full'),"
+                 " ('nas',  'err',  'kern', 'smartd', '2020/01/01', 'disk 2 is full'),"
+                 " ('web1', 'err',  'kern', 'smartd', '2020/01/02', 'disk 1 is full'),"
+                 " ('nas',  'crit', 'kern', 'smartd', '2020/01/02', 'disk 2 is full'),"
+                 " ('nas',  'err',  'user', 'smartd', '2020/01/02', 'disk 2 is full'),"
+                 " ('nas',  'err',  'kern', 'rsyncd', '2020/01/02', 'disk 2 is full'),"
+                 " ('nas',  'err',  'kern', 'smartd', '2020/01/03', 'disk 2 failed'), "
+                 " ('nas',  'err',  'kern', 'smartd', '2020/01/04', 'disk 3 is full'),"
+                 " ('web2', 'err',  'kern', 'smartd', '2020/01/05', 'full disk'),     "
+                 " ('web2', 'err',  'kern', 'smartd', '2020/01/06', 'disk is full')   ");
     db.DBExecute("UPDATE logs SET llevel = prio"); // both hold the word; the form compares llevel
     db.DBDiscon(); // searching needs no handler: every call opens and closes a connection of its own
 
     std::list<_SYSLOG_SQL_COND_tag> form; // host, severity, facility, program, keyword, first and last day
-    LogSearchCondListGen("nas,web2", "err", "any", "", "disk full", "2020/01/01", "2020/01/31", form);
+    LogSearchCondListGen("nas,web2", "err", "kern", "smartd", "disk full", "2020/01/01", "2020/01/05", form);
+    LogSearchCondListGen("any", "", "any", "", "", "", "0", form); // adds nothing: "any", "" and "0" mean all
     std::cout << SyslogDBSelectCount(path, form, nullptr, nullptr) << " logs match\n";
 
     _SYSLOG_SQL_LIMIT_tag page{2, 0}; // two rows, after skipping none

@@ -38,7 +38,7 @@ int main(int argc, char **argv) {
     std::free(lines);
     std::fclose(file);
 
-    Debuger::MSG(0, "a failure is always written");
+    Debuger::MSG(0, "a failure is always written, 100% of it");
     Debuger::MSG(2, "a trace is dropped");
     Debuger::ThresholdSet(2); // for the whole process
     Debuger::MSG(2, "until a program asks for it");

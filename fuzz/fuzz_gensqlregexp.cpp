@@ -4,23 +4,12 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
-#include <string>
 
 #include "keloplatform/gensqlregexp.h"
 #include "keloplatform/kelodb.h"
-
-// Broken regexes are reported, which a fuzzer must not do to the machine's log.
-extern "C" void syslog(int, const char *, ...) {}
-extern "C" void __syslog_chk(int, int, const char *, ...) {}
+#include "quiet.h"
 
 namespace {
-
-[[noreturn]] void Fail(const char *what, const std::string &sql) {
-    std::fprintf(stderr, "%s: %s\n", what, sql.c_str());
-    std::abort();
-}
 
 // A connection to a few rows in a file that has no name any more.
 DBConnect_tag *Rows() {

@@ -3,29 +3,20 @@
 #include <fuzzer/FuzzedDataProvider.h>
 #include <unistd.h>
 
-#include <cstdio>
-#include <cstdlib>
 #include <fstream>
 #include <map>
 #include <memory>
 #include <optional>
-#include <string>
 
 #include "keloplatform/torvc.h"
+#include "quiet.h"
 
-// A fuzzer must neither fill the machine's log nor wait for its disk.
-extern "C" void syslog(int, const char *, ...) {}
-extern "C" void __syslog_chk(int, int, const char *, ...) {}
+// A fuzzer must not wait for the machine's disk.
 extern "C" int fsync(int) {
     return 0;
 }
 
 namespace {
-
-[[noreturn]] void Fail(const char *what, const std::string &name) {
-    std::fprintf(stderr, "%s: %s\n", what, name.c_str());
-    std::abort();
-}
 
 // A folder of this process's own.
 std::string Folder() {

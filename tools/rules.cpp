@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <cstring>
+#include <ctime>
 
 #include "common_options.h"
 #include "errors.h"
@@ -11,6 +13,7 @@
 #include "level_selection.h"
 #include "rule_set.h"
 #include "rule_test.h"
+#include "status/receiver.h"
 #include "text_encoding.h"
 
 namespace kelo::tool {
@@ -24,6 +27,7 @@ constexpr const char *kFooter =
     "  remove NAME...          Remove rules\n"
     "  test                    Print the rules that fire for a --severity, --eps or --text, or else for the\n"
     "                          newest stored logs; --notify sends the notifications of those logs\n\n"
+    "A receiver that runs takes changed rules over at once.\n\n"
     "Examples:\n"
     "  kelosyslog rules add errors --severity err\n"
     "  kelosyslog rules add busy --eps 500 --disabled\n"
@@ -121,6 +125,16 @@ void Change(const std::string &path, const Options &options) {
     }
 }
 
+// A receiver that runs takes the changed rules over.
+void TellReceiver(const std::string &root) {
+    const ReceiverStatus receiver = GatherReceiver(root, std::time(nullptr));
+    if (receiver.state != ReceiverStatus::State::Running && receiver.state != ReceiverStatus::State::Silent)
+        return;
+    if (kill(static_cast<pid_t>(receiver.told.pid), SIGHUP) != 0 && errno != ESRCH)
+        PrintMessage("the receiver goes on with the rules from before: process " +
+                     std::to_string(receiver.told.pid) + " cannot be sent SIGHUP: " + std::strerror(errno));
+}
+
 int Run(const Options &options, const std::string &root) {
     const std::string path = root + "/etc/kelosyslog/notify.conf";
     const bool isDescription = options.action == "add" || options.action == "set";
@@ -150,6 +164,7 @@ int Run(const Options &options, const std::string &root) {
     if (options.names.empty() || (isDescription && options.names.size() > 1))
         throw UsageError("rules " + options.action + ": needs the name of a rule");
     Change(path, options);
+    TellReceiver(root);
     return kExitFound;
 }
 

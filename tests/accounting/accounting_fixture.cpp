@@ -1,10 +1,6 @@
 #include "accounting/accounting_fixture.h"
 
 #include <dlfcn.h>
-#include <sqlite3.h>
-
-#include <cerrno>
-#include <filesystem>
 
 namespace kelo::test {
 
@@ -17,12 +13,6 @@ AccountingTest::AccountingTest() {
     CreateLogDatabase(path_, "accinfo.sql");
     CreateLogDatabase(root_.File("usr/kelo/etc/kelosyslog.db"), "kelosyslog.sql");
     WriteRules("");
-}
-
-AccountingTest::~AccountingTest() {
-    machine = {};
-    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
-    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
 }
 
 std::string AccountingTest::Samples() const {
@@ -38,7 +28,6 @@ std::string AccountingTest::Histogram() const {
 } // namespace kelo::test
 
 using kelo::test::machine;
-using kelo::test::PlatformCalls;
 
 extern "C" {
 
@@ -46,20 +35,6 @@ time_t time(time_t *seconds) noexcept {
     if (seconds != nullptr)
         *seconds = machine.now;
     return machine.now;
-}
-
-int stat(const char *path, struct stat *status) noexcept {
-    static const auto real = reinterpret_cast<decltype(&stat)>(dlsym(RTLD_NEXT, "stat"));
-    const auto &calls = PlatformCalls::Recorded();
-    if (!machine.flushStat || calls.empty() || !calls.back().text.starts_with("INSERT OR REPLACE"))
-        return real(path, status);
-    const std::optional<struct stat> answer = machine.flushStat();
-    if (answer) {
-        *status = *answer;
-        return 0;
-    }
-    errno = EIO;
-    return -1;
 }
 
 int sqlite3_step(sqlite3_stmt *statement) {

@@ -1,23 +1,24 @@
 #pragma once
 
-#include <sys/stat.h>
-
-#include <ctime>
-#include <functional>
-#include <optional>
-
 #include "kelosyslog/accounting.h"
 #include "notify/notify_fixture.h"
-#include "support/log_database.h"
 
 namespace kelo::test {
+
+// What replaces the machine for the whole program.
+struct Machine {
+    time_t now = 1000;
+    // Called before every step of an SQLite statement.
+    std::function<void()> beforeStep;
+};
+extern Machine machine;
 
 // An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
 // a clock that stands still until a test moves it.
 class AccountingTest : public NotifyTest {
 protected:
     AccountingTest();
-    ~AccountingTest() override;
+    ~AccountingTest() override { machine = {}; }
 
     // The rows of table "eps" in the order of their insertion: "stamp device eps;..."
     std::string Samples() const;
@@ -26,16 +27,5 @@ protected:
 
     const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
 };
-
-// What replaces the machine for the whole program.
-struct Machine {
-    time_t now = 1000;
-    // The answer to a stat() that follows a written histogram, which is the flush's: the file's status, or
-    // std::nullopt for a failure. Empty: the file system's own.
-    std::function<std::optional<struct stat>()> flushStat;
-    // Called before every step of an SQLite statement.
-    std::function<void()> beforeStep;
-};
-extern Machine machine;
 
 } // namespace kelo::test

@@ -1,10 +1,5 @@
 // Books kept by hand against what the manager counts and the database holds, while its flushes fail.
 
-#include <sqlite3.h>
-
-#include <algorithm>
-#include <memory>
-
 #include "accounting/accounting_fixture.h"
 #include "faults/file_faults.h"
 

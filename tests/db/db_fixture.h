@@ -1,40 +1,55 @@
 #pragma once
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include "kelosyslog/dbhandler.h"
-#include "support/log_database.h"
 #include "support/notify_calls.h"
-#include "support/platform_calls.h"
-#include "support/syslog_capture.h"
 #include "support/system_calls.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 
 // A handler on a file below a root of its own. The file is there only where a test creates it.
-class DbTest : public testing::Test {
+class DbTest : public LibraryTest {
 protected:
-    DbTest();
-    ~DbTest() override;
+    DbTest() {
+        NotifyCalls::Reset();
+        SystemCalls::Reset();
+    }
+    ~DbTest() override { db_.DBDiscon(); }
 
     // An archive with `logs` sample logs, and the handler connected to it.
-    void Connect(int logs = 0);
+    void Connect(int logs = 0) {
+        CreateLogDatabase(path_, "archive.sql");
+        InsertSampleLogs(path_, logs);
+        ASSERT_EQ(db_.DBCon(), 0);
+        PlatformCalls::Reset();
+    }
 
     // The messages since the last call.
-    std::vector<SyslogMessage> Messages();
+    std::vector<SyslogMessage> Messages() {
+        const std::vector<SyslogMessage> messages = log_.Messages();
+        log_.Clear();
+        return messages;
+    }
     // "function argument" of the calls of these functions, in order.
-    static std::vector<std::string> Calls(const std::vector<std::string> &functions);
+    static std::vector<std::string> Calls(const std::set<std::string> &functions) {
+        std::vector<std::string> calls;
+        for (const PlatformCall &call : PlatformCalls::Recorded()) {
+            if (functions.contains(call.function))
+                calls.push_back(call.function + " " + call.text);
+        }
+        return calls;
+    }
 
-    TempRoot root_;
-    SyslogCapture log_;
     const std::string path_ = root_.File("logs.db");
     DBHandler db_{path_, KELO_SOURCE_DIR "/package/schema/archive.sql"};
 };
 
 // What a report and a message of other priority look like.
-SyslogMessage Error(const std::string &text);
-SyslogMessage Info(const std::string &text);
+inline SyslogMessage Error(const std::string &text) {
+    return {LOG_ERR, text};
+}
+inline SyslogMessage Info(const std::string &text) {
+    return {LOG_INFO, text};
+}
 
 } // namespace kelo::test

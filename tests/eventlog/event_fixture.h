@@ -1,38 +1,31 @@
 #pragma once
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include "kelosyslog/logger.h"
-#include "support/log_database.h"
-#include "support/platform_calls.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 
 using Lines = std::vector<std::string>;
 
-// A root of its own with the shipped schema in it. Checks at the end that nothing is left open.
-class EventTest : public testing::Test {
+// A root with the shipped schema in it.
+class EventTest : public LibraryTest {
 protected:
-    EventTest();
-    ~EventTest() override;
+    EventTest() { Write("/usr/kelo/syslog/schema/kelosyslog.sql", schema_); }
 
     // Creates the server's database with `rows` events at the times 1000, 1001, 1002, ...
-    void CreateEvents(int rows) const;
+    void CreateEvents(int rows) const {
+        fs::create_directories(fs::path(db_).parent_path());
+        RunSql(db_, "PRAGMA journal_mode=WAL; PRAGMA synchronous=OFF;" + schema_ +
+                        "WITH n(i) AS (SELECT 0 UNION ALL SELECT i + 1 FROM n WHERE i + 1 < " +
+                        std::to_string(rows) +
+                        ") INSERT INTO log SELECT NULL, 0, 1000 + i, 'SYSTEM', 'event ' || i FROM n");
+    }
     std::string Query(const std::string &sql) const { return QueryText(db_, sql); }
     std::string Rows() const { return Query("SELECT count(*) FROM log"); }
 
-    // The system log so far, without what the database handler adds about failed statements; then forgotten.
-    Lines Messages();
-
-    TempRoot root_;
+    const std::string schema_ = ReadFile(KELO_SOURCE_DIR "/package/schema/kelosyslog.sql");
     const std::string db_ = root_.File("usr/kelo/etc/kelosyslog.db");
     Logger logger_;
-
-private:
-    SyslogCapture log_;
 };
 
 } // namespace kelo::test

@@ -1,26 +1,16 @@
 // Every operation against every fault: the N-th platform call, allocation, write or read fails, for N = 1, 2,
 // 3, ... until none fails, once and from there on.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <filesystem>
 #include <limits>
-#include <map>
 #include <new>
-#include <set>
 
 #include "faults/allocation_faults.h"
 #include "faults/file_faults.h"
 #include "faults/operations.h"
 #include "support/fault_pause.h"
-#include "support/log_database.h"
-#include "support/platform_calls.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
 
 constexpr int kAlways = std::numeric_limits<int>::max();
 
@@ -56,9 +46,7 @@ std::vector<Parameters> Combinations() {
     std::vector<Parameters> combinations;
     for (const Operation &operation : Operations()) {
         for (const FaultSource &source : kFaultSources) {
-            const bool isMet = source.stop != AllocationFaults::Stop ||
-                               (AllocationFaults::IsSupported() && operation.meetsAllocationFaults);
-            if (isMet)
+            if (source.stop != AllocationFaults::Stop || AllocationFaults::IsSupported())
                 combinations.emplace_back(operation, source);
         }
     }

@@ -1,27 +1,15 @@
 // The database handler in the fault loops.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <filesystem>
-
 #include "faults/operations.h"
 #include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/root.h"
 #include "support/fault_pause.h"
-#include "support/log_database.h"
 #include "support/notify_calls.h"
 #include "support/system_calls.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
-using testing::Contains;
-using testing::HasSubstr;
-using testing::IsEmpty;
-using testing::Not;
 
 const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
 
@@ -51,24 +39,6 @@ std::string SoundDatabase(const Ground &ground, const Outcome &outcome) {
     EXPECT_TRUE(fs::exists(found));
     EXPECT_EQ(QueryText(found, "PRAGMA integrity_check"), "ok");
     return found;
-}
-
-int KeepId(DBResult_tag *result, void *context) {
-    uint32_t row = 0;
-    const FaultPause pause;
-    if (KELODBFetchRow(result, &row) >= 0)
-        static_cast<Ground *>(context)->seen.emplace_back(KELODBFetchField(result, row, "id"));
-    return 0;
-}
-
-int Read(Ground &ground) {
-    Connected connected(ground);
-    if (connected.status != 0 || connected.db.DBExecute("SELECT * FROM logs", KeepId, &ground) != 0)
-        return -1;
-    _ARCH_DB_INFO_tag info;
-    const bool isWhole = connected.db.DBcheckTableExist("logs") && connected.db.DBLogCountGet() == 10 &&
-                         connected.db.DBLogEndTimeGet() == 1577836809 && connected.db.DBInfoGet(info) == 0;
-    return isWhole ? 0 : -1;
 }
 
 int Change(Ground &ground) {
@@ -122,22 +92,29 @@ void CheckCreation(const Ground &ground, const Outcome &outcome) {
 void SetUpDamaged(Ground &ground) {
     SetUpNothing(ground);
     WriteFile(ground.root.File("logs.db"), "damaged");
+    WriteFile(ground.root.File("logs.db-wal"), "companion");
+    WriteFile(ground.root.File("logs.db.corrupt"), "an older one");
 }
 
 int Quarantine(Ground &ground) {
     {
         const FaultPause pause;
         NotifyCalls::Reset();
+        SystemCalls::OnReload([&] { EXPECT_FALSE(fs::exists(ground.root.File("logs.db"))); });
     }
     return DBErrorHandle_SQLITE_CORRUPT(nullptr, ground.root.File("logs.db"));
 }
 
 // The file is moved once and only after the administrator was told, and never lost.
 void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
-    const bool isMoved = fs::exists(ground.root.File("logs.db.corrupt"));
+    const bool isMoved = ReadFile(ground.root.File("logs.db.corrupt")) == "damaged";
+    EXPECT_TRUE(fs::exists(ground.root.File("logs.db-wal"))) << "the companions stay";
     EXPECT_NE(fs::exists(ground.root.File("logs.db")), isMoved);
     EXPECT_TRUE(isMoved || !outcome.IsDone());
     EXPECT_TRUE(!isMoved || NotifyCalls::Sent().size() == 1);
+    if (outcome.fault.empty()) {
+        EXPECT_EQ(NotifyCalls::Sent().at(0).values.at("%DBPATH%"), ground.root.File("logs.db"));
+    }
     const auto isTold = [&](const std::string &text) {
         return testing::Value(outcome.messages, Contains(HasSubstr(text)));
     };
@@ -152,17 +129,10 @@ void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
 } // namespace
 
 std::vector<Operation> HandlerOperations() {
-    const std::vector<std::string> ids = {"1"};
-    const auto checkRead = [=](const Ground &ground, const Outcome &outcome) {
-        SoundDatabase(ground, outcome);
-        EXPECT_TRUE(ground.seen == ids ||
-                    ((!outcome.IsDone() || outcome.fault == "KELODBFetchRow") && ground.seen.empty()));
-    };
     return {
-        {"HandlerReads", false, SetUpArchive, Read, checkRead, true, false},
-        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, true, false},
-        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, true, false},
-        {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, true, false},
+        {"HandlerChanges", true, SetUpArchive, Change, CheckChange, false},
+        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, false},
+        {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, false},
     };
 }
 

@@ -1,23 +1,12 @@
 #include "faults/operations.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <iterator>
-#include <map>
 
 #include "keloplatform/torvc.h"
 #include "support/fault_pause.h"
-#include "support/log_database.h"
 
 namespace kelo::test {
 namespace {
-
-using testing::AnyOf;
-using testing::ElementsAre;
-using testing::IsEmpty;
-using testing::StartsWith;
 
 using Lines = std::vector<std::string>;
 
@@ -86,11 +75,6 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
     return {name, false, std::move(setUp), std::move(run), check};
 }
 
-Operation WithoutAllocationFaults(Operation operation) {
-    operation.meetsAllocationFaults = false;
-    return operation;
-}
-
 // A deletion, after which `left` rows are left. A failed one has deleted either everything it should or
 // nothing, and nothing when the statement never ran.
 Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left) {
@@ -109,46 +93,20 @@ Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left
     return {name, true, std::move(setUp), run, check};
 }
 
-// Either map is whole or empty.
-void CheckStatistics(const Ground &ground, const Outcome &outcome) {
-    const Lines counts = {"a 5", "b 7"};
-    const Lines samples = {"100 3", "200 4"};
-    if (outcome.IsDone())
-        EXPECT_EQ(ground.seen, (Lines{"a 5", "b 7", "100 3", "200 4"}));
-    else
-        EXPECT_THAT(ground.seen, AnyOf(IsEmpty(), counts, samples));
-    EXPECT_THAT(outcome.messages, IsEmpty());
-}
-
-int SelectPage(Ground &ground, _SYSLOG_SQL_LIMIT_tag page, _SYSLOG_SQL_ORDER_tag *order) {
-    return SyslogDBSelect(ground.database, ground.conditions, &page, order, TakeId, &ground, true);
-}
-
 int SelectNewest(Ground &ground) {
-    return SelectPage(ground, {10, 5}, nullptr);
-}
-
-int SelectSorted(Ground &ground) {
-    _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
-    return SelectPage(ground, {3, 1}, &newestFirst);
+    _SYSLOG_SQL_LIMIT_tag page{10, 5};
+    return SyslogDBSelect(ground.database, ground.conditions, &page, nullptr, TakeId, &ground, true);
 }
 
 int Count(Ground &ground) {
     return TakeCount(ground, SyslogDBSelectCount(ground.database, ground.conditions, nullptr, nullptr));
 }
 
-int CountByKeyword(Ground &ground, const char *keyword) {
-    std::list<_SYSLOG_SQL_COND_tag> conditions;
-    LogSearchCondListGen("host03,host99", "any", "", "", keyword, "2020/01/01", "0", conditions);
-    return TakeCount(ground, SyslogDBSelectCount(ground.database, conditions, nullptr, nullptr));
-}
-
 int CountByForm(Ground &ground) {
-    return CountByKeyword(ground, "\"request 3\" FAILED OR clos?d -absent");
-}
-
-int CountByRegex(Ground &ground) {
-    return CountByKeyword(ground, "/request 3.*closed/ -/request \\d\\d/");
+    std::list<_SYSLOG_SQL_COND_tag> conditions;
+    LogSearchCondListGen("host03,host99", "any", "", "", "\"request 3\" FAILED OR clos?d -absent",
+                         "2020/01/01", "0", conditions);
+    return TakeCount(ground, SyslogDBSelectCount(ground.database, conditions, nullptr, nullptr));
 }
 
 int GetHosts(Ground &ground) {
@@ -158,33 +116,6 @@ int GetHosts(Ground &ground) {
     const FaultPause pause;
     ground.seen.assign(hosts.begin(), hosts.end());
     return result;
-}
-
-// The statistics, which answer with an empty map instead of a failure.
-int GetStatistics(Ground &ground) {
-    const std::map<std::string, uint64_t> counts = SyslogDBHistGet(ground.database, 2);
-    const std::map<int, SYSLOG_LOG_EPS> samples = SyslogDBEpsGet(ground.database, 100, 300);
-    const FaultPause pause;
-    for (const auto &[device, count] : counts)
-        ground.seen.push_back(device + " " + std::to_string(count));
-    for (const auto &[stamp, sample] : samples)
-        ground.seen.push_back(std::to_string(stamp) + " " + std::to_string(sample.eps));
-    return counts.empty() || samples.empty() ? -1 : 0;
-}
-
-void SetUpStatistics(Ground &ground) {
-    ground.database = ground.root.File("accinfo.db");
-    RunSql(ground.database,
-           "CREATE TABLE histogram (device TEXT PRIMARY KEY, count INTEGER);"
-           "CREATE TABLE eps (stamp INTEGER, eps INTEGER, device TEXT);"
-           "INSERT INTO histogram VALUES ('a', 5), ('b', 7), ('c', 1);"
-           "INSERT INTO eps VALUES (100, 1, 'a'), (100, 2, 'b'), (200, 4, 'a'), (400, 9, 'a')");
-}
-
-void SetUpLogsOfTwoPrograms(Ground &ground) {
-    SetUpLogs(ground);
-    ground.conditions = {{SYSLOG_ATTRI_PROG, SYSLOG_OP_LIKE, "prog?1", {}},
-                         {SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "*closed*", {}}};
 }
 
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
@@ -219,13 +150,9 @@ const std::vector<Operation> &Operations() {
         std::vector<Operation> all = {
             Ask("SelectPage", SetUpLogs, SelectNewest, Ids(26, 35), {},
                 "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
-            Ask("SelectFilteredPage", SetUpLogsOfTwoPrograms, SelectSorted, {"22", "12", "2"}, {},
-                "SELECT * FROM logs WHERE (prog LIKE "),
             Ask("CountAll", SetUpLogs, Count, {std::to_string(kRows)}, {}),
             Ask("CountByForm", SetUpLogs, CountByForm, {"1"}, {"0"}),
-            WithoutAllocationFaults(Ask("CountByRegex", SetUpLogs, CountByRegex, {"1"}, {"0"})),
             Ask("GetHosts", SetUpLogs, GetHosts, {"host00", "host01"}, {}),
-            {"GetStatistics", false, SetUpStatistics, GetStatistics, CheckStatistics},
             Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
             Delete("DeleteAll", SetUpLogs, 0),
             {"SetSection", true, SetUpSection, SetSection, CheckSection},

@@ -1,13 +1,9 @@
 #pragma once
 
-#include <functional>
 #include <list>
-#include <string>
-#include <vector>
 
 #include "kelosyslog/dbutil.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 
@@ -45,9 +41,6 @@ struct Operation {
     std::function<int(Ground &)> run;
     // Whether what was promised holds, whatever failed.
     std::function<void(const Ground &, const Outcome &)> check;
-    // RE2 does not meet them: it frees blocks twice when std::bad_alloc passes through it, and may end the
-    // process.
-    bool meetsAllocationFaults = true;
     // Whether the same files are there afterwards. One that creates or moves a file checks itself what is
     // there.
     bool keepsFiles = true;

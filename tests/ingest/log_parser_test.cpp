@@ -1,15 +1,7 @@
 #include "kelosyslog/logparser.h"
+#include "support/test.h"
 
-#include <gmock/gmock.h>
-
-#include <algorithm>
-#include <map>
-#include <vector>
-
-#include "support/syslog_capture.h"
-
-using kelo::test::SyslogCapture;
-using testing::ElementsAre;
+using namespace kelo::test;
 
 namespace {
 
@@ -21,12 +13,6 @@ std::string Line(const _SYSLOG_LOG_DATA_tag &log) {
     return log.fac + " " + PriorTypeToStr(log.prio) + " " + log.ldate + " " + log.ltime + " " + numbers +
            " " + log.tzoffset + " " + log.host + " " + log.ip + " " + log.prog + " " + log.tag + " " +
            log.msg;
-}
-
-std::vector<std::string> Lines(const std::list<_SYSLOG_LOG_DATA_tag> &logs) {
-    std::vector<std::string> lines;
-    std::transform(logs.begin(), logs.end(), std::back_inserter(lines), Line);
-    return lines;
 }
 
 } // namespace
@@ -53,19 +39,16 @@ TEST(ParseSingleEntry, TakesElevenFieldsAndTheMessageVerbatim) {
 }
 
 TEST(ParseSingleEntry, ReadsNumbersAsStrtollAndUnknownPrioritiesAsDebug) {
-    const struct {
-        std::string text;
-        int64_t number;
-    } kNumbers[] = {{"12abc", 12},
-                    {"-5", -5},
-                    {"+5", 5},
-                    {"+-5", 0},
-                    {"-", 0},
-                    {"\t7", 7},
-                    {"0x10", 0},
-                    {"\xb2", 0},
-                    {"9223372036854775808", INT64_MAX},
-                    {"-9223372036854775809", INT64_MIN}};
+    const std::vector<std::pair<std::string, int64_t>> kNumbers = {{"12abc", 12},
+                                                                   {"-5", -5},
+                                                                   {"+5", 5},
+                                                                   {"+-5", 0},
+                                                                   {"-", 0},
+                                                                   {"\t7", 7},
+                                                                   {"0x10", 0},
+                                                                   {"\xb2", 0},
+                                                                   {"9223372036854775808", INT64_MAX},
+                                                                   {"-9223372036854775809", INT64_MIN}};
     for (const auto &[text, number] : kNumbers) {
         _SYSLOG_LOG_DATA_tag log;
         // The other number follows: what is read of one must not reach into it.
@@ -89,29 +72,6 @@ TEST(ParseSingleEntry, KeepsTheFieldsTakenWhenTheLineEndsEarly) {
     EXPECT_EQ(Line(log), "user err day clock 7 200      before");
     for (const std::string &line : {std::string(), std::string("   "), kEleven.substr(0, kEleven.size() - 4)})
         EXPECT_EQ(LogParser().ParseSingleEntry(line, log), -1) << line;
-}
-
-TEST(LogAdd, SkipsOnlyTheLinesThatDoNotParse) {
-    SyslogCapture log;
-    std::string text = kEleven + " one\r\nten fields are too few for an entry of log\n\n   \n" + kEleven;
-    LogParser parser;
-    parser.LogAdd(text);
-    EXPECT_THAT(Lines(parser.LogListGet()), ElementsAre(kEleven + " one\r", kEleven + " "));
-    EXPECT_THAT(log.Messages(), ElementsAre(kelo::test::SyslogMessage{3, "Fail to parse log"},
-                                            kelo::test::SyslogMessage{3, "Fail to parse log"}));
-}
-
-TEST(LogAdd, PutsTheFragmentInFrontOfEveryInputUntilItIsTaken) {
-    LogParser parser;
-    parser.PartialLogSet(kEleven);
-    for (const char *input : {" first\n", ""}) {
-        std::string text = input;
-        parser.LogAdd(text);
-        EXPECT_EQ(text, kEleven + input);
-    }
-    EXPECT_EQ(parser.LogGetCount(), 2);
-    EXPECT_THAT(Lines(parser.LogListTake()), ElementsAre(kEleven + " first", kEleven + " "));
-    EXPECT_EQ(parser.LogGetCount(), 0);
 }
 
 TEST(isValidLog, NamesARecordIncompleteOnceWhicheverFieldIsEmpty) {

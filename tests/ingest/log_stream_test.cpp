@@ -1,36 +1,5 @@
-#include <gtest/gtest.h>
-
 #include "kelosyslog/logparser.h"
-#include "support/syslog_capture.h"
-
-namespace {
-
-std::string Messages(LogParser &parser) {
-    std::string messages;
-    for (const _SYSLOG_LOG_DATA_tag &log : parser.LogListGet())
-        messages += log.fac + "|" + log.msg + "\n";
-    return messages;
-}
-
-} // namespace
-
-TEST(LogStream, GivesTheSameRecordsHoweverTheTextIsCut) {
-    const std::string entry = "f info d t 1 2 z h i p t";
-    const std::string text = "\n\n" + entry + " a \r\n  " + entry + "\ntoo short\n \n" + entry +
-                             std::string(" \0\xff\n\n", 5) + entry + " end";
-    LogParser whole;
-    std::string copy = text;
-    whole.LogAdd(copy);
-    ASSERT_EQ(whole.LogGetCount(), 4);
-    for (size_t length = 1; length < text.size(); ++length) {
-        LogParser parser;
-        LogStream stream(parser);
-        for (size_t at = 0; at < text.size(); at += length)
-            stream.Add(std::string_view(text).substr(at, length));
-        stream.Finish();
-        ASSERT_EQ(Messages(parser), Messages(whole)) << length;
-    }
-}
+#include "support/test.h"
 
 TEST(LogStream, DropsOverlongLinesAsAWhole) {
     const std::string entry = "f info d t 1 2 z h i p t ";

@@ -1,21 +1,8 @@
-#include <fcntl.h>
-#include <gmock/gmock.h>
 #include <sched.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
-#include <algorithm>
-#include <cstdlib>
-#include <filesystem>
+#include "support/test.h"
 
-#include "support/log_database.h"
-#include "support/temp_root.h"
-
-using kelo::test::QueryText;
-using kelo::test::ReadFile;
-using kelo::test::WriteFile;
-using testing::HasSubstr;
-using testing::StartsWith;
+using namespace kelo::test;
 
 namespace {
 

@@ -1,9 +1,6 @@
 #include "notify/notify_fixture.h"
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::IsEmpty;
 
 using NotificationRules = NotifyTest;
 

@@ -3,8 +3,6 @@
 #include "notify/notify_fixture.h"
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::IsEmpty;
 
 namespace {
 

@@ -1,18 +1,12 @@
 #include <json/json.h>
-#include <sys/stat.h>
 
-#include <filesystem>
 #include <fstream>
-#include <set>
 
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/torvc.h"
 #include "notify/notify_fixture.h"
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::IsEmpty;
 
 namespace {
 

@@ -1,14 +1,6 @@
-#include <gmock/gmock.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <filesystem>
-
 #include "platform/db_fixture.h"
 
 using namespace kelo::test;
-using testing::HasSubstr;
-namespace fs = std::filesystem;
 
 namespace {
 
@@ -32,17 +24,9 @@ protected:
     TempRoot root;
 };
 
-// Goes back to the current folder at the end.
-struct InFolder {
-    explicit InFolder(const std::string &path) { fs::current_path(path); }
-    ~InFolder() { fs::current_path(before); }
-    fs::path before = fs::current_path();
-};
-
 } // namespace
 
 TEST_F(Connecting, GivesNullAndCreatesNothingForWhatIsNoFile) {
-    const InFolder folder(root.Path());
     fs::create_symlink("nowhere", root.File("dangling"));
     ASSERT_EQ(mkfifo(root.File("fifo").c_str(), 0666), 0);
     const std::string logs = MakeLogs("logs.db");

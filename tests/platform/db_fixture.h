@@ -1,16 +1,7 @@
 #pragma once
 
-#include <gtest/gtest.h>
-#include <sqlite3.h>
-
-#include <memory>
-#include <optional>
-#include <string>
-#include <vector>
-
 #include "keloplatform/kelodb.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 

@@ -1,6 +1,3 @@
-#include <algorithm>
-#include <random>
-
 #include "keloplatform/gensqlregexp.h"
 #include "platform/search_table.h"
 

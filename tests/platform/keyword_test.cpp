@@ -1,16 +1,9 @@
-#include <gmock/gmock.h>
-#include <syslog.h>
-
 #include "keloplatform/gensqlregexp.h"
 #include "platform/search_table.h"
-#include "support/syslog_capture.h"
 
 namespace kelo::test {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
 using Texts = std::vector<std::string>;
 
 TEST(Keyword, FindsWhatTheLanguageSays) {

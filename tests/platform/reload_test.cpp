@@ -1,23 +1,15 @@
-// Asking for a reload: by pid file with real processes, and by D-Bus with a private bus and a systemd of our
-// own.
+// Asking for a reload: by pid file with real processes, and by D-Bus with a systemd of our own.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <sys/prctl.h>
-#include <sys/wait.h>
+#include <sys/socket.h>
+#include <sys/un.h>
 #include <systemd/sd-bus.h>
-#include <unistd.h>
 
-#include <csignal>
-#include <cstdlib>
-#include <filesystem>
-#include <future>
 #include <thread>
 
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/root.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace {
 
@@ -32,30 +24,17 @@ extern "C" int sd_booted() {
 namespace kelo::test {
 namespace {
 
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::IsEmpty;
-
 // A process of this name that ends when it gets a HUP signal, or otherwise with the object.
 class Daemon {
 public:
     explicit Daemon(const char *name) {
-        int ready[2];
-        EXPECT_EQ(pipe(ready), 0);
+        char before[16];
+        prctl(PR_GET_NAME, before);
+        prctl(PR_SET_NAME, name); // is inherited
         pid_ = fork();
-        if (pid_ == 0) {
-            prctl(PR_SET_PDEATHSIG, SIGKILL);
-            prctl(PR_SET_NAME, name);
-            std::signal(SIGHUP, SIG_DFL);
-            close(ready[0]);
-            close(ready[1]);
-            for (;;)
-                pause();
-        }
-        close(ready[1]);
-        char byte;
-        EXPECT_EQ(read(ready[0], &byte, 1), 0); // it has closed its end
-        close(ready[0]);
+        while (pid_ == 0)
+            pause();
+        prctl(PR_SET_NAME, before);
     }
     ~Daemon() {
         if (pid_ > 0)
@@ -145,107 +124,57 @@ TEST_F(Reload, SparesEveryOtherProcess) {
     EXPECT_EQ(other.Stop(SIGTERM), SIGTERM);
 }
 
-// A bus of our own on which a systemd answers whose jobs end as `result` says.
-class PrivateSystemd {
-public:
-    PrivateSystemd(const TempRoot &root, std::string state, std::string result)
-        : address_("unix:path=" + root.File("bus")), state_(std::move(state)), result_(std::move(result)) {
-        WriteFile(
-            root.File("bus.conf"),
-            "<busconfig><listen>" + address_ +
-                "</listen><auth>EXTERNAL</auth><policy context=\"default\"><allow send_destination=\"*\"/>"
-                "<allow own=\"*\"/><allow eavesdrop=\"true\"/></policy></busconfig>");
-        int ready[2];
-        EXPECT_EQ(pipe(ready), 0);
-        daemon_ = fork();
-        if (daemon_ == 0) {
-            prctl(PR_SET_PDEATHSIG, SIGKILL);
-            const std::string config = "--config-file=" + root.File("bus.conf");
-            const std::string print = "--print-address=" + std::to_string(ready[1]);
-            execlp("dbus-daemon", "dbus-daemon", "--nofork", config.c_str(), print.c_str(), nullptr);
-            _exit(127);
+constexpr char kJob[] = "/org/freedesktop/systemd1/job/7";
+
+// A systemd alone on its bus, for one connection.
+struct PrivateSystemd {
+    std::string state;  // of the unit
+    std::string result; // of its jobs
+    int reloads = 0;
+
+    void Serve(int listener) {
+        const int connection = accept(listener, nullptr, nullptr);
+        sd_bus *bus = nullptr;
+        sd_bus_new(&bus);
+        sd_bus_set_fd(bus, connection, connection);
+        sd_bus_set_server(bus, 1, SD_ID128_NULL);
+        sd_bus_add_filter(bus, nullptr, Answer, this);
+        sd_bus_start(bus);
+        while (sd_bus_process(bus, nullptr) >= 0 && sd_bus_wait(bus, UINT64_MAX) >= 0) {
         }
-        close(ready[1]);
-        char byte;
-        isRunning_ = read(ready[0], &byte, 1) == 1;
-        close(ready[0]);
-        setenv("DBUS_SYSTEM_BUS_ADDRESS", address_.c_str(), 1);
-        isRunning_ = isRunning_ && Offer();
-        if (isRunning_)
-            server_ = std::jthread([this](std::stop_token stop) {
-                while (!stop.stop_requested() && sd_bus_process(bus_, nullptr) >= 0)
-                    sd_bus_wait(bus_, 20000);
-            });
+        sd_bus_unref(bus);
     }
-    ~PrivateSystemd() {
-        server_ = std::jthread();
-        sd_bus_flush_close_unref(bus_);
-        kill(daemon_, SIGTERM);
-        waitpid(daemon_, nullptr, 0);
-        unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+    static void EndJob(sd_bus *bus, const char *job, const std::string &result) {
+        sd_bus_message *signal = nullptr;
+        sd_bus_message_new_signal(bus, &signal, "/org/freedesktop/systemd1",
+                                  "org.freedesktop.systemd1.Manager", "JobRemoved");
+        sd_bus_message_append(signal, "uoss", 7, job, "syslog-ng.service", result.c_str());
+        sd_bus_message_set_sender(signal, "org.freedesktop.systemd1");
+        sd_bus_send(bus, signal, nullptr);
+        sd_bus_message_unref(signal);
     }
-    PrivateSystemd(const PrivateSystemd &) = delete;
-    PrivateSystemd &operator=(const PrivateSystemd &) = delete;
-
-    bool IsRunning() const { return isRunning_; }
-    int Reloads() const { return reloads_; }
-
-private:
-    static constexpr char kJob[] = "/org/freedesktop/systemd1/job/7";
-
-    bool Offer() {
-        static const sd_bus_vtable manager[] = {
-            SD_BUS_VTABLE_START(0), SD_BUS_METHOD("Subscribe", "", "", Subscribe, SD_BUS_VTABLE_UNPRIVILEGED),
-            SD_BUS_METHOD("ReloadUnit", "ss", "o", ReloadUnit, SD_BUS_VTABLE_UNPRIVILEGED),
-            SD_BUS_SIGNAL("JobRemoved", "uoss", 0), SD_BUS_VTABLE_END};
-        static const sd_bus_vtable unit[] = {SD_BUS_VTABLE_START(0),
-                                             SD_BUS_PROPERTY("ActiveState", "s", GetState, 0, 0),
-                                             SD_BUS_PROPERTY("Job", "(uo)", GetJob, 0, 0), SD_BUS_VTABLE_END};
-        return sd_bus_open_system(&bus_) >= 0 &&
-               sd_bus_add_object_vtable(bus_, nullptr, "/org/freedesktop/systemd1",
-                                        "org.freedesktop.systemd1.Manager", manager, this) >= 0 &&
-               sd_bus_add_object_vtable(bus_, nullptr, "/org/freedesktop/systemd1/unit/syslog_2dng_2eservice",
-                                        "org.freedesktop.systemd1.Unit", unit, this) >= 0 &&
-               sd_bus_request_name(bus_, "org.freedesktop.systemd1", 0) >= 0;
-    }
-    void EndJob(const char *path, const std::string &result) {
-        sd_bus_emit_signal(bus_, "/org/freedesktop/systemd1", "org.freedesktop.systemd1.Manager",
-                           "JobRemoved", "uoss", 7, path, "syslog-ng.service", result.c_str());
-    }
-    static int Subscribe(sd_bus_message *call, void *, sd_bus_error *) {
-        return sd_bus_reply_method_return(call, nullptr);
-    }
-    // Its own job ends between the end of a foreign one and the answer, which is the hardest order.
-    static int ReloadUnit(sd_bus_message *call, void *context, sd_bus_error *error) {
+    // A job ends between the end of a foreign one and the answer, which is the hardest order.
+    static int Answer(sd_bus_message *call, void *context, sd_bus_error *) {
         auto *self = static_cast<PrivateSystemd *>(context);
-        const char *unit = nullptr;
-        sd_bus_message_read(call, "ss", &unit, nullptr);
-        ++self->reloads_;
-        if (std::string(unit) != "syslog-ng.service" || self->state_ == "inactive")
-            return sd_bus_error_setf(error, "org.freedesktop.systemd1.Inactive", "%s is inactive.", unit);
-        self->EndJob("/org/freedesktop/systemd1/job/6", "failed");
-        self->EndJob(kJob, self->result_);
+        const std::string member = sd_bus_message_get_member(call);
+        const char *words[] = {"", ""}; // unit and mode, or interface and property
+        sd_bus_message_read(call, "ss", &words[0], &words[1]);
+        if (member == "Hello")
+            return sd_bus_reply_method_return(call, "s", ":1.1");
+        if (words[1] == std::string("ActiveState"))
+            return sd_bus_reply_method_return(call, "v", "s", self->state.c_str());
+        if (member != "ReloadUnit" && member != "Get")
+            return sd_bus_reply_method_return(call, "");
+        if (member == "ReloadUnit" && ++self->reloads > 0)
+            EndJob(sd_bus_message_get_bus(call), "/org/freedesktop/systemd1/job/6", "failed");
+        EndJob(sd_bus_message_get_bus(call), kJob, self->result);
+        if (member == "Get")
+            return sd_bus_reply_method_return(call, "v", "(uo)", 7, kJob);
+        if (self->state == "inactive")
+            return sd_bus_reply_method_errorf(call, "org.freedesktop.systemd1.Inactive", "%s is inactive.",
+                                              words[0]);
         return sd_bus_reply_method_return(call, "o", kJob);
     }
-    static int GetState(sd_bus *, const char *, const char *, const char *, sd_bus_message *reply,
-                        void *context, sd_bus_error *) {
-        return sd_bus_message_append(reply, "s", static_cast<PrivateSystemd *>(context)->state_.c_str());
-    }
-    static int GetJob(sd_bus *, const char *, const char *, const char *, sd_bus_message *reply,
-                      void *context, sd_bus_error *) {
-        auto *self = static_cast<PrivateSystemd *>(context);
-        self->EndJob(kJob, self->result_);
-        return sd_bus_message_append(reply, "(uo)", 7, kJob);
-    }
-
-    std::string address_;
-    std::string state_;
-    std::string result_;
-    pid_t daemon_ = -1;
-    bool isRunning_ = false;
-    sd_bus *bus_ = nullptr;
-    std::atomic<int> reloads_ = 0;
-    std::jthread server_;
 };
 
 TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
@@ -263,21 +192,25 @@ TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
         {"reloading", "done", "", 0}, // under way already
         {"reloading", "timeout", "the reload ended as timeout", 0},
     };
+    sockaddr_un address{AF_UNIX, ""};
+    root_.File("bus").copy(address.sun_path, sizeof address.sun_path - 1);
+    const int listener = socket(AF_UNIX, SOCK_STREAM, 0);
+    ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr *>(&address), sizeof address), 0);
+    ASSERT_EQ(listen(listener, 1), 0);
+    setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("bus")).c_str(), 1);
     for (const auto &c : cases) {
         SCOPED_TRACE(std::string(c.state) + " " + c.result);
-        log_.Clear();
-        const TempRoot folder;
-        const PrivateSystemd systemd(folder, c.state, c.result);
-        ASSERT_TRUE(systemd.IsRunning());
+        PrivateSystemd systemd{c.state, c.result};
+        std::thread server([&] { systemd.Serve(listener); });
         EXPECT_EQ(KELOSystemdReload("syslog-ng"), c.reason.empty());
-        EXPECT_EQ(systemd.Reloads(), c.reloads);
-        if (c.reason.empty()) {
-            EXPECT_THAT(log_.Texts(), IsEmpty());
-        } else {
-            EXPECT_THAT(log_.Texts(), ElementsAre("cannot reload service syslog-ng: " + c.reason));
-        }
+        server.join();
+        EXPECT_EQ(systemd.reloads, c.reloads);
+        EXPECT_EQ(log_.Texts(), c.reason.empty()
+                                    ? std::vector<std::string>()
+                                    : std::vector{"cannot reload service syslog-ng: " + c.reason});
+        log_.Clear();
     }
-    log_.Clear();
+    close(listener);
     setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("no bus")).c_str(), 1);
     EXPECT_FALSE(KELOSystemdReload("syslog-ng"));
     unsetenv("DBUS_SYSTEM_BUS_ADDRESS");

@@ -1,24 +1,17 @@
 #include "platform/search_table.h"
 
-#include <iomanip>
-#include <sstream>
-
 #include "keloplatform/gensqlregexp.h"
 
 namespace kelo::test {
 
 SearchTable::SearchTable(const std::vector<std::string> &texts) : texts_(texts) {
     const std::string path = root_.File("logs.db");
-    RunSql(path, "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT)");
-    // In hexadecimal, so that nothing needs to be quoted.
-    std::ostringstream rows;
-    for (const std::string &text : texts_) {
-        rows << ",(NULL, CAST(x'" << std::hex << std::setfill('0');
-        for (const unsigned char byte : text)
-            rows << std::setw(2) << int{byte};
-        rows << "' AS TEXT))";
-    }
-    RunSql(path, "INSERT INTO logs VALUES(0, NULL)" + rows.str());
+    CreateLogDatabase(path);
+    std::vector<_SYSLOG_LOG_DATA_tag> logs(texts_.size());
+    for (size_t i = 0; i < logs.size(); ++i)
+        logs[i].msg = texts_[i];
+    InsertLogs(path, logs);
+    RunSql(path, "INSERT INTO logs(id) VALUES(0)");
     connection_ = ConnectTo(path);
 }
 

@@ -1,22 +1,7 @@
-#include <fcntl.h>
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <filesystem>
-
 #include "keloplatform/torvc.h"
-#include "support/syslog_capture.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 using namespace kelo::test;
-using testing::AllOf;
-using testing::ElementsAre;
-using testing::HasSubstr;
-using testing::StartsWith;
 
 namespace {
 
@@ -52,17 +37,6 @@ std::vector<std::string> Names(const std::string &path, int expectedStatus = 0) 
 }
 
 } // namespace
-
-TEST(SectionFile, GivesBackEveryValueThatALineCanHold) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
-    for (const std::string value : {"", "\"", "a\"b\"", "\"quoted\"", "ends in \\", "\\\"", "=", "# no",
-                                    "[R2]", "  blanks  ", "\tcr\r", "%s %n %%", "\xFF\xFE \x01\x1B[0m"}) {
-        ASSERT_EQ(Set(path, "R 1", "R 1", {{"before", "1"}, {"key", value}, {"after", "2"}}), 0) << value;
-        EXPECT_EQ(Get(path, "R 1", "key"), value);
-        EXPECT_EQ(Get(path, "R 1", "after"), "2");
-    }
-}
 
 TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     const TempRoot root;

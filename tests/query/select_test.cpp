@@ -6,8 +6,6 @@
 #include "query/query_fixture.h"
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::IsEmpty;
 
 namespace {
 

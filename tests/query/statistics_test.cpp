@@ -1,9 +1,6 @@
 #include "query/query_fixture.h"
 
 using namespace kelo::test;
-using testing::ElementsAre;
-using testing::IsEmpty;
-using testing::Pair;
 
 namespace {
 

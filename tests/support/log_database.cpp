@@ -2,8 +2,6 @@
 
 #include <sqlite3.h>
 
-#include <cstdio>
-#include <ctime>
 #include <memory>
 #include <stdexcept>
 
@@ -41,15 +39,6 @@ Statement Prepare(sqlite3 *db, const std::string &sql) {
     return Statement(statement, sqlite3_finalize);
 }
 
-std::string FormatTime(int64_t utcsec, const char *format) {
-    const auto time = static_cast<time_t>(utcsec);
-    tm parts{};
-    gmtime_r(&time, &parts);
-    char text[32];
-    const size_t length = std::strftime(text, sizeof text, format, &parts);
-    return std::string(text, length);
-}
-
 } // namespace
 
 void RunSql(const std::string &path, const std::string &sql) {
@@ -76,23 +65,19 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
     const Database db = Open(path);
     Run(db.get(), "BEGIN IMMEDIATE");
     const Statement statement = Prepare(
-        db.get(), "INSERT INTO logs(id,host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec) "
-                  "VALUES(?1,?2,?3,?4,?5,?5,?6,?7,?8,?9,?10,?11,?12)");
+        db.get(), "INSERT INTO logs(host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec,id) "
+                  "VALUES(?1,?2,?3,?4,?4,?5,?6,?7,?8,?9,?10,?11,nullif(?12,0))");
     for (const _SYSLOG_LOG_DATA_tag &log : logs) {
-        if (log.id != 0)
-            sqlite3_bind_int64(statement.get(), 1, static_cast<sqlite3_int64>(log.id));
-        const std::string columns[] = {log.host, log.ip,       log.fac,   PriorTypeToStr(log.prio),
-                                       log.tag,  log.tzoffset, log.ldate, log.ltime,
-                                       log.prog, log.msg};
-        int index = 2;
-        for (const std::string &text : columns)
-            sqlite3_bind_text(statement.get(), index++, text.data(), static_cast<int>(text.size()),
-                              SQLITE_STATIC);
-        sqlite3_bind_int64(statement.get(), index, log.utcsec);
+        int index = 0;
+        for (const std::string &text : {log.host, log.ip, log.fac, PriorTypeToStr(log.prio), log.tag,
+                                        log.tzoffset, log.ldate, log.ltime, log.prog, log.msg})
+            sqlite3_bind_text(statement.get(), ++index, text.data(), static_cast<int>(text.size()),
+                              SQLITE_TRANSIENT);
+        sqlite3_bind_int64(statement.get(), ++index, log.utcsec);
+        sqlite3_bind_int64(statement.get(), ++index, static_cast<sqlite3_int64>(log.id));
         if (sqlite3_step(statement.get()) != SQLITE_DONE)
             Fail(db.get(), "insert");
         sqlite3_reset(statement.get());
-        sqlite3_clear_bindings(statement.get());
     }
     Run(db.get(), "COMMIT");
 }
@@ -107,22 +92,18 @@ void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DA
 
 _SYSLOG_LOG_DATA_tag SampleLog(int number) {
     static const char *const kFacilities[] = {"kern", "user", "daemon", "auth", "local0", "local7"};
-    const auto numbered = [](const char *prefix, int value) {
-        char text[32];
-        const int length = std::snprintf(text, sizeof text, "%s%02d", prefix, value);
-        return std::string(text, static_cast<size_t>(length));
-    };
+    const auto twoDigits = [](int value) { return (value < 10 ? "0" : "") + std::to_string(value); };
     _SYSLOG_LOG_DATA_tag log;
     log.utcsec = 1577836800 + number;
     log.prio = static_cast<_SYSLOG_DB_PRIORITY_tag>(number % 8);
     log.tag = "86";
-    log.host = numbered("host", number % 50);
+    log.host = "host" + twoDigits(number % 50);
     log.ip = "10.0.0." + std::to_string(number % 50);
     log.fac = kFacilities[number % 6];
     log.tzoffset = "+00:00";
-    log.ldate = FormatTime(log.utcsec, "%Y/%m/%d");
-    log.ltime = FormatTime(log.utcsec, "%H:%M:%S");
-    log.prog = numbered("prog", number % 30);
+    log.ldate = "2020/01/01";
+    log.ltime = twoDigits(number / 3600) + ":" + twoDigits(number / 60 % 60) + ":" + twoDigits(number % 60);
+    log.prog = "prog" + twoDigits(number % 30);
     log.msg = "user" + std::to_string(number % 97) + ": request " + std::to_string(number) +
               " from 192.168.1." + std::to_string(number % 254) + " took " + std::to_string(number % 1000) +
               " ms, status " + (number % 13 == 0 ? "FAILED" : "done") + ", session closed normally";
@@ -131,7 +112,6 @@ _SYSLOG_LOG_DATA_tag SampleLog(int number) {
 
 void InsertSampleLogs(const std::string &path, int count) {
     std::vector<_SYSLOG_LOG_DATA_tag> logs;
-    logs.reserve(static_cast<size_t>(count));
     for (int number = 0; number < count; ++number)
         logs.push_back(SampleLog(number));
     InsertLogs(path, logs);

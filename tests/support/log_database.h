@@ -1,12 +1,9 @@
 #pragma once
 
-#include <functional>
 #include <string>
 #include <vector>
 
 #include "kelosyslog/records.h"
-
-struct sqlite3;
 
 namespace kelo::test {
 
@@ -29,7 +26,7 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
 void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
 
 // A record that differs by `number` in a repeatable way: host "host00".."host49", program "prog00".."prog29",
-// every severity, one log a second from 2020/01/01 00:00:00 UTC on.
+// every severity, one log a second from 2020/01/01 00:00:00 UTC on, on which day it stays.
 _SYSLOG_LOG_DATA_tag SampleLog(int number);
 
 // The records SampleLog(0) to SampleLog(count - 1), appended.

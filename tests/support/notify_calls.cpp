@@ -13,8 +13,6 @@ struct State {
     std::map<const TORVSZHASH *, std::map<std::string, std::string>> hashes;
     std::vector<SentNotification> sent;
     std::optional<int> answer = 0;
-    int openLists = 0;
-    int openSmsConfs = 0;
 };
 State state;
 
@@ -31,7 +29,7 @@ const std::vector<SentNotification> &NotifyCalls::Sent() {
     return state.sent;
 }
 int NotifyCalls::OpenHandles() {
-    return static_cast<int>(state.hashes.size()) + state.openLists + state.openSmsConfs;
+    return static_cast<int>(state.hashes.size());
 }
 
 } // namespace kelo::test
@@ -70,60 +68,8 @@ void TORVCSzHashFree(TORVSZHASH *hash) {
     KELO_REAL(TORVCSzHashFree)(hash);
 }
 
-TORVSZLIST *TORVCSzListAlloc(size_t size) {
-    if (PlatformCalls::MustFail("TORVCSzListAlloc", ""))
-        return nullptr;
-    TORVSZLIST *list = KELO_REAL(TORVCSzListAlloc)(size);
-    state.openLists += list != nullptr;
-    return list;
-}
-
-void TORVCSzListFree(TORVSZLIST *list) {
-    if (list != nullptr)
-        --state.openLists;
-    KELO_REAL(TORVCSzListFree)(list);
-}
-
-int TORVCFileEnumSection(const char *path, TORVSZLIST **list) {
-    return PlatformCalls::MustFail("TORVCFileEnumSection", path)
-               ? -1
-               : KELO_REAL(TORVCFileEnumSection)(path, list);
-}
-
-int TORVCFileGetSection(const char *path, const char *section, TORVSZHASH **hash) {
-    if (PlatformCalls::MustFail("TORVCFileGetSection", section))
-        return -1;
-    return KELO_REAL(TORVCFileGetSection)(path, section, hash);
-}
-
-int TORVCFileSetSection(const char *path, const char *section, const char *newName, TORVSZHASH *hash,
-                        const char *lineFormat) {
-    if (PlatformCalls::MustFail("TORVCFileSetSection", section))
-        return -1;
-    return KELO_REAL(TORVCFileSetSection)(path, section, newName, hash, lineFormat);
-}
-
-int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t size, int zero) {
-    if (PlatformCalls::MustFail("TORVCFileGetKeyValue", key))
-        return -1;
-    return KELO_REAL(TORVCFileGetKeyValue)(path, key, buffer, size, zero);
-}
-
-int KELOMailGet(KELOMAIL *mail) {
-    return PlatformCalls::MustFail("KELOMailGet", "") ? -1 : KELO_REAL(KELOMailGet)(mail);
-}
-
 KELOSMSCONF *KELOSmsConfGet() {
-    if (PlatformCalls::MustFail("KELOSmsConfGet", ""))
-        return nullptr;
-    KELOSMSCONF *conf = KELO_REAL(KELOSmsConfGet)();
-    state.openSmsConfs += conf != nullptr;
-    return conf;
-}
-
-void KELOSmsConfFree(KELOSMSCONF *conf) {
-    state.openSmsConfs -= conf != nullptr;
-    KELO_REAL(KELOSmsConfFree)(conf);
+    return PlatformCalls::MustFail("KELOSmsConfGet", "") ? nullptr : KELO_REAL(KELOSmsConfGet)();
 }
 
 int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDir, const char *filterFile,

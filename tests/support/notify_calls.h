@@ -27,7 +27,7 @@ public:
     static void AnswerWith(std::optional<int> result);
     static const std::vector<SentNotification> &Sent();
 
-    // Maps, lists and SMS settings that are not freed yet.
+    // Maps that are not freed yet.
     static int OpenHandles();
 };
 

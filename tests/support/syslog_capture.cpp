@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
+#include <cstdlib>
 #include <mutex>
 
 #include "support/fault_pause.h"
@@ -19,16 +20,10 @@ std::mutex activeMutex; // messages may come from any thread
 void Capture(int priority, const char *format, va_list arguments) {
     const int savedErrno = errno;
     const FaultPause pause;
-    va_list copy;
-    va_copy(copy, arguments);
-    const int length = std::vsnprintf(nullptr, 0, format, copy);
-    va_end(copy);
-    if (length < 0)
-        return;
-    std::string text(static_cast<size_t>(length), '\0');
-    errno = savedErrno;
-    std::vsnprintf(text.data(), text.size() + 1, format, arguments);
-    SyslogCapture::Receive(priority, text);
+    char *text = nullptr;
+    if (vasprintf(&text, format, arguments) >= 0)
+        SyslogCapture::Receive(priority, text);
+    std::free(text);
     errno = savedErrno;
 }
 

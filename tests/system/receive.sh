@@ -64,6 +64,15 @@ receiver)
 esac
 send_lines <(make_messages 100 old 40001)
 landed $((total + 20100))
+# A rule that comes while everything runs.
+"$KELO_BIN_DIR/kelosyslog" --root "$root" rules add zebras --keyword zebra
+zebra_told() {
+    send_lines <(echo '<13>Jan  1 00:00:00 zoo keeper: a zebra')
+    total=$((total + 1))
+    grep -rqs KEYWORD_MATCH "$root/var/spool/kelonotify/new"
+}
+wait_until 30 zebra_told || fail "the new rule does not fire"
+landed $((total + 20100))
 syslog_ng_stop "$root"
 expect "rows" "$(row_count "$database")" $((total + 20100))
 [[ $1 == database ]] || counted $((total + 20100)) || fail "not all are counted at the end"

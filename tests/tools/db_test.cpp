@@ -1,17 +1,10 @@
 // kelosyslog db on real files.
 
-#include <gtest/gtest.h>
-
-#include <filesystem>
-
 #include "program_run.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
 
 const std::string kArchive = KELO_SOURCE_DIR "/package/schema/archive.sql";
 

@@ -1,17 +1,9 @@
 // The shell completion and the manual page know what the program knows.
 
-#include <gtest/gtest.h>
 #include <re2/re2.h>
 
-#include <array>
-#include <cstdio>
-#include <filesystem>
-#include <memory>
-#include <set>
-#include <vector>
-
 #include "program_run.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {
@@ -35,14 +27,9 @@ Words Complete(const std::string &words) {
     const std::string command = "bash -c \". " + kCompletion + "; COMP_WORDS=(kelosyslog " + words +
                                 "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
                                 "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"";
-    const std::unique_ptr<FILE, int (*)(FILE *)> pipe(popen(command.c_str(), "r"), pclose);
-    std::string text;
-    std::array<char, 4096> buffer;
-    for (size_t size = 1; size > 0;) {
-        size = fread(buffer.data(), 1, buffer.size(), pipe.get());
-        text.append(buffer.data(), size);
-    }
-    return Matches(text, "^(.+)$");
+    const TempRoot root;
+    EXPECT_EQ(std::system((command + " >" + root.File("offered")).c_str()), 0);
+    return Matches(ReadFile(root.File("offered")), "^(.+)$");
 }
 
 std::string InRoff(std::string text) {

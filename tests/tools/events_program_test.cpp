@@ -1,18 +1,10 @@
 // Runs of "kelosyslog events" and "kelosyslog report". (The pages themselves are for the browser's test.)
 
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-
-#include <filesystem>
-
 #include "program_run.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {
-
-namespace fs = std::filesystem;
 
 class Events : public testing::Test {
 protected:
@@ -48,12 +40,9 @@ TEST_F(Events, AreListedNewestFirstByPageTimeAndLevel) {
         const char *ids;
     } cases[] = {
         {{}, "54321"},
-        {{"-n", "2"}, "54"},
         {{"-n", "2", "--offset", "3"}, "21"},
-        {{"--offset", "4"}, "1"},
         {{"--offset", "5"}, ""},
         {{"-p", "warning"}, "32"},
-        {{"-p", "err,info"}, "431"},
         {{"-p", "!warning"}, "431"},
         {{"-p", "0", "-n", "1", "--offset", "1"}, "3"},
         {{"-S", "2020-01-01 00:00:01", "-U", "2020-01-01 00:00:02"}, "32"},
@@ -80,21 +69,28 @@ TEST_F(Events, AreListedNewestFirstByPageTimeAndLevel) {
 
 TEST_F(Events, OfEveryKindCanBeAdded) {
     const std::vector<std::vector<std::string>> kinds = {
-        {"server-start", "1"},    {"server-stop", "2"},    {"eps", "3"},
-        {"severity", "err", "4"}, {"keyword", "k", "5"},   {"archive-start", "6"},
-        {"archive-finish", "7"},  {"archive-failed", "8"}, {"log-cleared", "/9.db", "ann"},
-        {"volume-full"}};
+        {"server-start", "1.0"},           {"server-stop", "%s%n"},
+        {"eps", "18446744073709551615"},   {"severity", "err", "it's"},
+        {"keyword", "a\\", "b\nc"},        {"archive-start", "6"},
+        {"archive-finish", "7"},           {"archive-failed", "8"},
+        {"log-cleared", "/9%d.db", "ann"}, {"volume-full"}};
     for (const std::vector<std::string> &kind : kinds) {
         std::vector<std::string> arguments = {"events", "add"};
         arguments.insert(arguments.end(), kind.begin(), kind.end());
         const ProgramResult result = Run(arguments);
         EXPECT_EQ(result.status, 0) << kind[0] << result.err;
     }
-    EXPECT_EQ(
-        QueryText(db_, "SELECT group_concat(substr(event, 1, 20), '|') FROM log"),
-        "Server was started [|Server was stopped [|Event detection: EPS|Event detection: Rec|Event "
-        "detection: Rec|Log database [6] sta|Log database [7] has|Log database [8] is |/9.db was cleared "
-        "by|Volume space is not ");
+    EXPECT_EQ(QueryText(db_, "SELECT group_concat(level || user || event, char(10)) FROM log"),
+              "0SYSTEMServer was started [1.0].\n"
+              "0SYSTEMServer was stopped [%s%n].\n"
+              "0SYSTEMEvent detection: EPS is larger than [18446744073709551615].\n"
+              "0SYSTEMEvent detection: Received log which severity is [err]. Log content: [it's]\n"
+              "0SYSTEMEvent detection: Received log which contains [a\\]. Log content: [b\nc]\n"
+              "0SYSTEMLog database [6] starts to archive.\n"
+              "0SYSTEMLog database [7] has been archived.\n"
+              "0SYSTEMLog database [8] is failed to archived.\n"
+              "0SYSTEM/9%d.db was cleared by ann\n"
+              "1SYSTEMVolume space is not enough.");
     EXPECT_EQ(Run({"events", "count"}).out, "10\n");
 }
 
@@ -132,11 +128,8 @@ TEST_F(Events, AndLogsBecomeAReportThatReplacesAFileOnlyWhenItIsWhole) {
         Run({"report", page, "--db", logs, "--since", "2020-01-01 00:00:02", "--until", "2020-01-01 00:08"})
             .status,
         0);
-    const std::string text = ReadFile(page);
-    for (const char *part : {"<b>479</b>", "<td class=\"number\">10</td>", "40 further", "\\x1b[31m,&quot;",
-                             "Error</td><td>2020-01-01 00:00:02"})
-        EXPECT_NE(text.find(part), std::string::npos) << part;
-    EXPECT_EQ(text.find("00:00:01</td>"), std::string::npos);
+    EXPECT_NE(ReadFile(page).find("<b>479</b>"), std::string::npos);
+    EXPECT_EQ(ReadFile(page).find("00:00:01</td>"), std::string::npos);
     struct stat status {};
     stat(page.c_str(), &status);
     EXPECT_EQ(status.st_mode & 0777U, 0640U);

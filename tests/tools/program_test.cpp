@@ -1,18 +1,9 @@
 // Runs of the built program.
 
-#include <fcntl.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <algorithm>
-#include <ctime>
-#include <filesystem>
 #include <thread>
 
 #include "program_run.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {

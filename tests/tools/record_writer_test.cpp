@@ -1,13 +1,11 @@
 #include "record_writer.h"
 
-#include <gtest/gtest.h>
 #include <json/json.h>
 
-#include <algorithm>
-#include <memory>
 #include <sstream>
 
 #include "output.h"
+#include "support/test.h"
 #include "text_encoding.h"
 
 namespace kelo::tool {

@@ -1,14 +1,9 @@
 #include "selection.h"
 
-#include <gtest/gtest.h>
-
-#include <functional>
-
 #include "errors.h"
 #include "level_selection.h"
 #include "log_reader.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::tool {
 namespace {

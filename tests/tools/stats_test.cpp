@@ -1,13 +1,10 @@
 // The statistics of the program: figures by interval, and their tables and bars.
 
-#include <gtest/gtest.h>
-
 #include "eps_series.h"
 #include "errors.h"
 #include "program_run.h"
 #include "statistics_table.h"
-#include "support/log_database.h"
-#include "support/temp_root.h"
+#include "support/test.h"
 
 namespace kelo::test {
 namespace {
@@ -70,21 +67,17 @@ TEST_F(Stats, PrintsTheSameFiguresInEveryForm) {
 TEST_F(Stats, RefusesWhatItCannotDo) {
     const struct {
         std::vector<std::string> arguments;
-        int status;
         std::string named;
     } cases[] = {
-        {{"rate"}, 2, "'rate'"},
-        {{"device"}, 2, "name of a device"},
-        {{"total", "a"}, 2, "NAME"},
-        {{"eps", "--top", "3"}, 2, "--top"},
-        {{"devices", "--top", "0"}, 2, "--top: '0'"},
-        {{"eps", "--by", "day"}, 2, "--by: 'day'"},
-        {{"eps", "--plot", "-o", "json"}, 2, "--plot"},
-        {{"total", "-o", "short"}, 2, "--output"},
+        {{"rate"}, "'rate'"},
+        {{"eps", "--top", "3"}, "--top"},
+        {{"devices", "--top", "0"}, "--top: '0'"},
+        {{"eps", "--by", "day"}, "--by: 'day'"},
+        {{"eps", "--plot", "-o", "json"}, "--plot"},
     };
     for (const auto &c : cases) {
         const ProgramResult result = Run(c.arguments);
-        EXPECT_EQ(result.status, c.status) << result.err;
+        EXPECT_EQ(result.status, 2) << result.err;
         EXPECT_NE(result.err.find(c.named), std::string::npos) << result.err;
     }
     RunSql(db_, "DROP TABLE eps; DROP TABLE histogram");

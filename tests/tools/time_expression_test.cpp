@@ -1,29 +1,15 @@
 #include "time_expression.h"
 
-#include <gtest/gtest.h>
-
-#include <cstdlib>
-#include <ctime>
-
 #include "errors.h"
+#include "support/test.h"
 
 namespace kelo::tool {
 namespace {
 
-// Puts the process into a time zone while it lives.
-class TimeZone {
-public:
-    explicit TimeZone(const char *name) {
-        setenv("TZ", name, 1);
-        tzset();
-    }
-    ~TimeZone() {
-        unsetenv("TZ");
-        tzset();
-    }
-    TimeZone(const TimeZone &) = delete;
-    TimeZone &operator=(const TimeZone &) = delete;
-};
+void SetZone(const char *name) {
+    setenv("TZ", name, 1);
+    tzset();
+}
 
 // POSIX rules, so that no zone files are needed.
 constexpr const char *kUtc = "UTC0";
@@ -58,7 +44,7 @@ TEST(TimeExpression, GivesTheSecondThatTheUserMeans) {
     };
     for (const auto &test : kCases) {
         SCOPED_TRACE(std::string(test.zone) + " " + test.text);
-        const TimeZone zone(test.zone);
+        SetZone(test.zone);
         const Moment moment = ParseTimeExpression("--since", test.text, kNow);
         EXPECT_EQ(moment.seconds, test.seconds);
         EXPECT_EQ(moment.isDayOnly, test.isDayOnly);
@@ -67,7 +53,7 @@ TEST(TimeExpression, GivesTheSecondThatTheUserMeans) {
 
 // Midnight to midnight has 23 hours on the day that the clocks go forward.
 TEST(TimeExpression, CountsDaysByTheCalendarWhenClocksChange) {
-    const TimeZone zone(kBerlin);
+    SetZone(kBerlin);
     constexpr int64_t kMonday = 1585558800; // 2020-03-30 11:00 local time
     const int64_t today = ParseTimeExpression("--since", "today", kMonday).seconds;
     EXPECT_EQ(today - ParseTimeExpression("--since", "yesterday", kMonday).seconds, 23 * 3600);

@@ -73,7 +73,7 @@ void ArchiveFolder::RemoveLeftovers() const {
 }
 
 std::string ArchiveFolder::NewTemporary() {
-    const std::string path = path_ + "/" + kTemporary + std::to_string(++temporaries_);
+    std::string path = path_ + "/" + kTemporary + std::to_string(++temporaries_);
     if (!FileHandle(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600)))
         Fail(path, errno);
     return path;

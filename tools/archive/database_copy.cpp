@@ -94,7 +94,7 @@ std::string Refine(const CopyOrder &order, const std::string &path, ArchiveFolde
     AddSchema(copy, order.source);
     if (copy.Number("PRAGMA freelist_count") == 0)
         return path;
-    const std::string compact = folder.NewTemporary();
+    std::string compact = folder.NewTemporary();
     copy.Run("VACUUM INTO ?1", compact);
     return compact;
 }

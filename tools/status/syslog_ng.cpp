@@ -89,6 +89,7 @@ std::vector<SyslogNgCounters> ParseSyslogNgCounters(const std::string &text) {
             std::from_chars(fields[5].data(), fields[5].data() + fields[5].size(), *counter);
     }
     std::vector<SyslogNgCounters> all;
+    all.reserve(found.size());
     for (auto &[key, counters] : found)
         all.push_back(std::move(counters));
     return all;

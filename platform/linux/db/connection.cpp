@@ -1,7 +1,9 @@
 #include "db/connection.h"
 
+#include <chrono>
 #include <memory>
 #include <new>
+#include <thread>
 
 #include "search/regexp_function.h"
 
@@ -41,6 +43,15 @@ bool Harden(sqlite3 *db) {
            sqlite3_exec(db, "PRAGMA cell_size_check=ON", nullptr, nullptr, nullptr) == SQLITE_OK;
 }
 
+// Asks for a lock every millisecond: with growing pauses, as SQLite makes them by itself, it would hardly
+// ever meet the short moment between two transactions of a busy writer.
+int WaitForLock(void *, int calls) {
+    if (calls >= kBusyTimeoutMs)
+        return 0;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return 1;
+}
+
 } // namespace
 
 DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path) {
@@ -50,7 +61,7 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
         auto connection = std::make_unique<DBConnect_tag>(path);
         Database db = connection->file.Open();
         if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
-            sqlite3_busy_timeout(db.get(), kBusyTimeoutMs) != SQLITE_OK)
+            sqlite3_busy_handler(db.get(), WaitForLock, nullptr) != SQLITE_OK)
             return nullptr;
         connection->db = db.release();
         return connection.release();

@@ -1,0 +1,58 @@
+#pragma once
+
+// What every test stands on: GoogleTest, the test ground, and the system's headers that nearly all of them
+// need.
+
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <ctime>
+#include <filesystem>
+#include <functional>
+#include <map>
+#include <memory>
+#include <optional>
+#include <random>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "support/log_database.h"
+#include "support/platform_calls.h"
+#include "support/syslog_capture.h"
+#include "support/temp_root.h"
+
+namespace kelo::test {
+
+namespace fs = std::filesystem;
+using testing::AllOf, testing::AnyOf, testing::Not, testing::IsEmpty;
+using testing::Contains, testing::ElementsAre, testing::Pair;
+using testing::HasSubstr, testing::MatchesRegex, testing::StartsWith;
+
+// A root of its own for the library and the platform, and the system log. Checks at the end that nothing of
+// the platform is left open.
+class LibraryTest : public testing::Test {
+protected:
+    LibraryTest();
+    ~LibraryTest() override;
+
+    // Writes a file under the root, with its folders.
+    void Write(const std::string &path, const std::string &content) const;
+    // The system log so far, without what the database handler adds about failed statements; then forgotten.
+    std::vector<std::string> Messages();
+
+    TempRoot root_;
+    SyslogCapture log_;
+};
+
+} // namespace kelo::test
