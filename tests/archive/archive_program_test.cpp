@@ -85,6 +85,9 @@ TEST_F(ArchiveProgram, NamesWhatItCannotDo) {
     RunSql(root_.File("checked.db"),
            "PRAGMA ignore_check_constraints = ON; CREATE TABLE c (x CHECK (x > 0)); "
            "INSERT INTO c VALUES (0)");
+    RunSql(root_.File("narrow.db"),
+           "CREATE TABLE logs (id INTEGER PRIMARY KEY); INSERT INTO logs VALUES (1)");
+    fs::create_symlink("loop", root_.File("loop"));
     WriteFile(root_.File("text"), std::string(5000, 'x'));
     fs::create_directory(root_.File("busy"));
     const int busy = open(root_.File("busy").c_str(), O_RDONLY | O_CLOEXEC);
@@ -100,6 +103,8 @@ TEST_F(ArchiveProgram, NamesWhatItCannotDo) {
         {{"--db", damaged}, 3, damaged},
         {{"--db", root_.File("checked.db")}, 3, "checked.db is damaged"},
         {{"--db", damaged + "x"}, 3, damaged + "x"},
+        {{"--db", root_.File("loop/x.db")}, 3, "cannot read " + root_.File("loop/x.db")},
+        {{"--db", root_.File("narrow.db")}, 3, root_.File("narrow.db") + " cannot be archived"},
         {{"--db", root_.File("text")}, 3, root_.File("text")},
         {{"--log", "ftpxfer"}, 2, "ftpxfer"},
         {{"--keep", "+1d", "--yes"}, 2, "+1d"},

@@ -223,6 +223,8 @@ TEST(ArchiveName, IsSafeAndRecognised) {
 TEST(Retention, TakesTheOldestAndSparesTheNewOne) {
     const std::vector<Archive> archives = {
         {"a", "", 0, 100, 1, 10}, {"b", "", 0, 200, 1, 20}, {"c", "", 0, 300, 1, 40}};
+    const std::vector<Archive> withoutTimes = {{"a", "", 0, 0, 1, 10}};
+    EXPECT_TRUE(Expired(withoutTimes, {1000, {}, ""}).empty()) << "its age is not known";
     const struct {
         Retention retention;
         std::string expired;

@@ -52,13 +52,20 @@ struct Options {
     bool inUtc = false;
 };
 
+// The path without links; as it is where that cannot be told, for whoever opens it to say why.
+std::string Canonical(const std::string &path) {
+    std::error_code error;
+    const fs::path canonical = fs::weakly_canonical(path, error);
+    return error ? path : canonical.string();
+}
+
 // The command as the options say, with the folder that it works in.
 class ArchiveCommand {
 public:
     ArchiveCommand(const Options &options, const std::string &root)
         : options_(options),
           folder_(options.to.empty() ? ArchiveFolderPath(root) : fs::absolute(options.to).string()) {
-        folder_ = fs::weakly_canonical(folder_).string();
+        folder_ = Canonical(folder_);
         RequireSense();
         if (!options.keep.empty()) {
             const int64_t now = std::time(nullptr);
@@ -215,7 +222,7 @@ int Run(const Options &options, const std::string &root) {
     if (options.isPruning)
         return command.Prune();
     LogSource source = ResolveLogSource(options.source, root);
-    source.path = fs::weakly_canonical(source.path).string(); // one name for the note of a removal
+    source.path = Canonical(source.path); // one name for the note of a removal
     if (source.kind != TableKind::Logs)
         throw UsageError("--log: only logs in table logs can be archived, not '" + options.source.log + "'");
     command.RefuseArchive(source);

@@ -25,8 +25,8 @@ constexpr mode_t kFolderMode = 0750;
 } // namespace
 
 ArchiveFolder::ArchiveFolder(std::string path, bool mayCreate) : path_(std::move(path)) {
-    if (mayCreate && !fs::exists(path_)) {
-        std::error_code error;
+    std::error_code error;
+    if (mayCreate && !fs::exists(path_, error) && !error) {
         fs::create_directories(fs::path(path_).parent_path(), error);
         if (mkdir(path_.c_str(), kFolderMode) != 0 && errno != EEXIST)
             Fail(path_, errno);
@@ -135,7 +135,12 @@ void ArchiveFolder::ForgetRemoval(const std::string &name) const {
 std::vector<std::string> ArchiveFolder::PendingRemovals(const std::string &source) const {
     std::vector<std::string> archives;
     for (const std::string &name : Names()) {
-        if (name.starts_with(kRemoval) && ReadWhole(path_ + "/" + name) == source)
+        if (!name.starts_with(kRemoval))
+            continue;
+        const std::optional<std::string> content = ReadWhole(path_ + "/" + name);
+        if (!content && errno == EACCES) // whoever went on would archive these logs twice
+            Fail(path_ + "/" + name, errno);
+        if (content == source)
             archives.push_back(name.substr(std::strlen(kRemoval)));
     }
     return archives;

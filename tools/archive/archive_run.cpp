@@ -14,6 +14,7 @@
 #include "log_message_capture.h"
 #include "program.h"
 #include "progress_bar.h"
+#include "text_encoding.h"
 
 namespace kelo::tool {
 namespace {
@@ -42,7 +43,8 @@ void AddEvent(int (Logger::*add)(std::string), const std::string &source) {
 } // namespace
 
 std::string LogsOf(uint64_t count, const std::string &host) {
-    return std::to_string(count) + (count == 1 ? " log" : " logs") + (host.empty() ? "" : " of " + host);
+    return std::to_string(count) + (count == 1 ? " log" : " logs") +
+           (host.empty() ? "" : " of " + VisibleText(host));
 }
 
 ArchiveRun::ArchiveRun(Order order, ArchiveFolder &folder, std::function<void(const std::string &)> report)

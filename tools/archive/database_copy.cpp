@@ -19,7 +19,8 @@ namespace {
 constexpr int kPagesPerStep = 1024;
 
 SqliteFile OpenSource(const std::string &path) {
-    if (!std::filesystem::is_regular_file(path)) // a pipe would wait for its other end
+    std::error_code error;
+    if (!std::filesystem::is_regular_file(path, error)) // a pipe would wait for its other end
         throw DatabaseError(DescribeDatabaseProblem({path}));
     return {path, SqliteFile::Mode::kWrite}; // WAL mode needs to write its shared memory even for reading
 }
@@ -73,6 +74,14 @@ void RequireSound(SqliteFile &copy, const std::string &source) {
         throw DatabaseError(source + " is damaged, so it is not archived: " + finding);
 }
 
+void AddSchema(SqliteFile &copy, const std::string &source) {
+    try {
+        copy.Run(kArchiveSchema);
+    } catch (const DatabaseError &error) { // for example where a column lacks
+        throw DatabaseError(source + " cannot be archived: " + error.what());
+    }
+}
+
 // Drops what does not belong into the archive; returns the path of the temporary file that is the archive.
 std::string Refine(const CopyOrder &order, const std::string &path, ArchiveFolder &folder) {
     SqliteFile copy(path, SqliteFile::Mode::kWrite);
@@ -82,7 +91,7 @@ std::string Refine(const CopyOrder &order, const std::string &path, ArchiveFolde
     RequireSound(copy, order.source);
     if (!order.host.empty())
         copy.Run("DELETE FROM logs WHERE host IS NOT ?1", order.host);
-    copy.Run(kArchiveSchema);
+    AddSchema(copy, order.source);
     if (copy.Number("PRAGMA freelist_count") == 0)
         return path;
     std::string compact = folder.NewTemporary();

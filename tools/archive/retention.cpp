@@ -68,7 +68,7 @@ std::vector<Archive> Expired(const std::vector<Archive> &archives, const Retenti
         total += archive.bytes;
     std::vector<Archive> expired;
     for (const Archive &archive : archives) {
-        const bool isTooOld = retention.since && archive.last < *retention.since;
+        const bool isTooOld = retention.since && archive.last > 0 && archive.last < *retention.since;
         const bool isTooMuch = retention.bytes && total > *retention.bytes;
         if (archive.name == retention.spared || !(isTooOld || isTooMuch))
             continue;

@@ -12,7 +12,7 @@ struct Archive {
     std::string name;
     std::string device;
     int64_t first = 0; // time of the oldest log, seconds since the epoch
-    int64_t last = 0;
+    int64_t last = 0;  // of the newest; 0 or less where that is unknown
     uint64_t logs = 0;
     uint64_t bytes = 0;
 };
@@ -24,7 +24,7 @@ std::vector<Archive> ListArchives(const std::string &folder);
 
 // What is to be kept.
 struct Retention {
-    std::optional<int64_t> since;  // archives whose last log is of this second or later
+    std::optional<int64_t> since;  // archives whose last log is of this second or later, or of no known time
     std::optional<uint64_t> bytes; // and of these the newest that take no more in all
     std::string spared;            // name of an archive that is kept in any case
 };

@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <ctime>
 #include <filesystem>
+#include <limits>
 
 #include "accounting_source.h"
 #include "event_log.h"
@@ -53,9 +54,11 @@ void ReadRows(const PlainDatabase &database, DatabaseStatus &status) {
         status.rows = 0;
         return;
     }
-    const auto span = static_cast<int64_t>(static_cast<uint64_t>(*NumberOf(ends->back())) -
-                                           static_cast<uint64_t>(*NumberOf(ends->front())) + 1);
-    status.isEstimate = span < 1 || span > kMostCounted;
+    constexpr auto kMost = static_cast<uint64_t>(std::numeric_limits<int64_t>::max());
+    const uint64_t distance =
+        static_cast<uint64_t>(*NumberOf(ends->back())) - static_cast<uint64_t>(*NumberOf(ends->front()));
+    const auto span = static_cast<int64_t>(std::min(distance, kMost - 1)) + 1;
+    status.isEstimate = span > kMostCounted;
     status.rows = status.isEstimate ? span : database.Number("SELECT count(*) AS value FROM " + status.table);
 }
 
