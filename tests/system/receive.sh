@@ -40,20 +40,14 @@ database)
     ;;
 receiver)
     # What comes while the database is locked waits. A reload then makes syslog-ng send one message again at most.
-    mkfifo "$root/commands"
-    sqlite3 -batch "$database" <"$root/commands" >"$root/locked" &
-    locker=$!
-    exec {commands}>"$root/commands"
-    printf '%s\n' '.timeout 5000' 'BEGIN IMMEDIATE;' "SELECT 'locked';" >&$commands
-    wait_until 20 grep -q locked "$root/locked" || fail "no lock"
+    lock_database
     make_messages 20000 new 10001 >"$root/lines"
     sent=$((total + 20000))
     send_lines "$root/lines"
     wait_until 20 grep -q '"waiting":"[^"]' "$root/run/kelosyslog/receive.json" || fail "it does not wait"
     receiver=$(receiver_pid "$root")
     syslog_ng_control "$root" reload >/dev/null || fail "no reload"
-    exec {commands}>&-
-    wait $locker
+    unlock_database
     landed $((total + 20000))
     wait_until 20 grep -q '"waiting":""' "$root/run/kelosyslog/receive.json" || fail "it still waits"
     total=$(($(row_count "$database") - 20000))

@@ -5,13 +5,7 @@ make_messages 10 old >"$root/lines"
 send_lines "$root/lines"
 landed 10
 
-# A writer keeps the database locked until its input ends.
-mkfifo "$root/commands"
-sqlite3 -batch "$database" <"$root/commands" >"$root/locked" &
-locker=$!
-exec {commands}>"$root/commands"
-printf '%s\n' '.timeout 5000' 'BEGIN IMMEDIATE;' "SELECT 'locked';" >&$commands
-wait_until 20 grep -q locked "$root/locked" || fail "no lock"
+lock_database
 
 make_messages 3000 new 11 >"$root/lines"
 send_lines "$root/lines" &
@@ -21,8 +15,7 @@ wait_until 60 taken || fail "not taken over while the database is locked: $(sysl
 wait $sender
 syslog_ng_stop "$root" KILL
 expect "rows while locked" "$(row_count "$database")" 10
-exec {commands}>&-
-wait $locker
+unlock_database
 
 syslog_ng_start "$root"
 make_messages 500 old 3011 >"$root/lines"

@@ -21,6 +21,21 @@ fail() {
 }
 expect() { [[ $2 == "$3" ]] || fail "$1: found \"$2\", expected \"$3\""; } # WHAT FOUND WANTED
 query() { sql "$database" "$1"; }
+
+# A writer of its own keeps the database locked until it is unlocked.
+lock_database() {
+    mkfifo "$root/commands"
+    sqlite3 -batch "$database" <"$root/commands" >"$root/locked" &
+    locker=$!
+    exec {commands}>"$root/commands"
+    printf '%s\n' '.timeout 5000' 'BEGIN IMMEDIATE;' "SELECT 'locked';" >&"$commands"
+    wait_until 20 grep -q locked "$root/locked" || fail "no lock"
+}
+unlock_database() {
+    exec {commands}>&-
+    wait "$locker"
+}
+
 landed() { wait_until 60 has_rows "$database" "$1" || fail "only $(row_count "$database") of $1 messages arrived"; }
 
 syslog_ng_configure "$root" "$KELO_SOURCE_DIR/package/syslog-ng/kelosyslog.conf" "$KELO_BIN_DIR/kelosyslog"

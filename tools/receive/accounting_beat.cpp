@@ -10,10 +10,11 @@ namespace {
 
 // The manager wants six seconds between two questions, by its clock; seven of ours are that many at least.
 constexpr int64_t kFlushSec = 7;
-// A flush may wait for a locked database, and nothing is received meanwhile.
-constexpr int64_t kFlushAfterFailureSec = 60;
-// Nor while millions of devices are written: that takes up to a tenth of the time.
+// A flush that waits for a locked database takes seconds, and so does one of millions of devices. Nothing is
+// received meanwhile, so that it may take up to a tenth of the time.
 constexpr int64_t kPausePerFlush = 9;
+// One that keeps failing is reported every time.
+constexpr int64_t kFlushWhileFailingSec = 60;
 constexpr size_t kMostSamples = 24 * 60 * 60;
 constexpr size_t kMostCounts = 1'000'000;
 
@@ -38,9 +39,11 @@ void AccountingBeat::Beat(int64_t now) {
         return;
     using Clock = std::chrono::steady_clock;
     const Clock::time_point begin = Clock::now();
-    const bool isFlushed = Flush();
+    const bool wasFailing = isFailing_;
+    const bool isStillFailing = !Flush() && wasFailing;
     const auto sec = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count();
-    nextFlush_ = now + (isFlushed ? std::max(kFlushSec, sec + sec * kPausePerFlush) : kFlushAfterFailureSec);
+    nextFlush_ =
+        now + std::max(isStillFailing ? kFlushWhileFailingSec : kFlushSec, sec + sec * kPausePerFlush);
 }
 
 void AccountingBeat::RequestReload() {
