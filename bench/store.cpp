@@ -7,9 +7,9 @@
 #include <vector>
 
 #include "kelosyslog/logparser.h"
-#include "log_store.h"
 #include "log_text.h"
-#include "logs_schema.h"
+#include "store/log_store.h"
+#include "store/logs_schema.h"
 #include "support/measure.h"
 
 using namespace kelo::bench;

@@ -11,7 +11,7 @@
 #include <functional>
 #include <thread>
 
-#include "receiver_state.h"
+#include "receive/receiver_state.h"
 #include "support/log_database.h"
 #include "support/temp_root.h"
 

@@ -1,4 +1,4 @@
-#include "log_reader.h"
+#include "read/log_reader.h"
 #include "support/test.h"
 
 namespace kelo::tool {

@@ -1,12 +1,12 @@
-#include "record_writer.h"
+#include "print/record_writer.h"
 
 #include <json/json.h>
 
 #include <sstream>
 
-#include "output.h"
+#include "base/text_encoding.h"
+#include "print/output.h"
 #include "support/test.h"
-#include "text_encoding.h"
 
 namespace kelo::tool {
 namespace {

@@ -1,8 +1,8 @@
-#include "selection.h"
+#include "read/selection.h"
 
-#include "errors.h"
-#include "level_selection.h"
-#include "log_reader.h"
+#include "base/errors.h"
+#include "read/level_selection.h"
+#include "read/log_reader.h"
 #include "support/test.h"
 
 namespace kelo::tool {

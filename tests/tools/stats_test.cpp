@@ -1,9 +1,9 @@
 // The statistics of the program: figures by interval, and their tables and bars.
 
-#include "eps_series.h"
-#include "errors.h"
+#include "base/errors.h"
+#include "print/statistics_table.h"
 #include "program_run.h"
-#include "statistics_table.h"
+#include "read/eps_series.h"
 #include "support/test.h"
 
 namespace kelo::test {

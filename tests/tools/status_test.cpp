@@ -16,14 +16,14 @@
 #include <set>
 #include <thread>
 
+#include "base/json.h"
+#include "base/text_encoding.h"
 #include "program_run.h"
-#include "spool/json.h"
 #include "status/server_status.h"
 #include "status/status_json.h"
 #include "status/status_screen.h"
 #include "support/log_database.h"
 #include "support/temp_root.h"
-#include "text_encoding.h"
 
 namespace kelo::test {
 namespace {

@@ -1,6 +1,6 @@
-#include "time_expression.h"
+#include "read/time_expression.h"
 
-#include "errors.h"
+#include "base/errors.h"
 #include "support/test.h"
 
 namespace kelo::tool {

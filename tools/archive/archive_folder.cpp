@@ -11,7 +11,7 @@
 #include <utility>
 
 #include "archive/archive_name.h"
-#include "errors.h"
+#include "base/errors.h"
 
 namespace kelo::tool {
 namespace {

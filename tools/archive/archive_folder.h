@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "spool/files.h"
+#include "base/files.h"
 
 namespace kelo::tool {
 

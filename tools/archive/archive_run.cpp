@@ -9,12 +9,12 @@
 #include "archive/database_copy.h"
 #include "archive/removal.h"
 #include "archive/retention.h"
-#include "archive/stop_signals.h"
+#include "base/stop_signals.h"
+#include "base/text_encoding.h"
+#include "cli/program.h"
+#include "cli/progress_bar.h"
 #include "kelosyslog/logger.h"
-#include "log_message_capture.h"
-#include "program.h"
-#include "progress_bar.h"
-#include "text_encoding.h"
+#include "read/log_message_capture.h"
 
 namespace kelo::tool {
 namespace {

@@ -6,12 +6,12 @@
 #include <filesystem>
 
 #include "archive/archive_schema.h"
-#include "archive/sqlite_file.h"
-#include "archive/stop_signals.h"
-#include "errors.h"
+#include "base/errors.h"
+#include "base/sqlite_file.h"
+#include "base/stop_signals.h"
 #include "kelosyslog/dbhandler.h"
-#include "log_message_capture.h"
-#include "log_source.h"
+#include "read/log_message_capture.h"
+#include "read/log_source.h"
 
 namespace kelo::tool {
 namespace {

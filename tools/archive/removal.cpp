@@ -7,8 +7,8 @@
 #include <chrono>
 #include <thread>
 
-#include "archive/stop_signals.h"
-#include "errors.h"
+#include "base/errors.h"
+#include "base/stop_signals.h"
 
 namespace kelo::tool {
 namespace {

@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <string>
 
-#include "archive/sqlite_file.h"
+#include "base/sqlite_file.h"
 
 namespace kelo::tool {
 

@@ -10,8 +10,8 @@
 #include <tuple>
 
 #include "archive/archive_name.h"
-#include "archive/sqlite_file.h"
-#include "errors.h"
+#include "base/errors.h"
+#include "base/sqlite_file.h"
 
 namespace kelo::tool {
 namespace {

@@ -7,9 +7,9 @@
 #include <cerrno>
 #include <cstdio>
 
+#include "base/files.h"
+#include "base/json.h"
 #include "kelonotify/safe_text.h"
-#include "spool/files.h"
-#include "spool/json.h"
 
 namespace kelo::tool {
 namespace {

@@ -10,8 +10,8 @@
 #include <cstdio>
 #include <memory>
 
-#include "command_line.h"
-#include "errors.h"
+#include "base/errors.h"
+#include "cli/command_line.h"
 #include "kelonotify/deliverer.h"
 #include "kelonotify/watcher.h"
 #include "keloplatform/root.h"

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <cctype>
 
-#include "text_encoding.h"
+#include "base/text_encoding.h"
 
 namespace kelo::tool {
 namespace {

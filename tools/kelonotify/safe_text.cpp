@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "text_encoding.h"
+#include "base/text_encoding.h"
 
 namespace kelo::tool {
 namespace {

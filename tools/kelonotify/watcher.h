@@ -1,6 +1,6 @@
 #pragma once
 
-#include "spool/files.h"
+#include "base/files.h"
 
 namespace kelo::tool {
 

@@ -4,9 +4,9 @@
 #include <optional>
 #include <string>
 
-#include "log_store.h"
 #include "receive/volume_watch.h"
-#include "record_batch.h"
+#include "store/log_store.h"
+#include "store/record_batch.h"
 
 namespace kelo::tool {
 

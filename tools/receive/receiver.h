@@ -5,14 +5,14 @@
 #include <optional>
 #include <string>
 
-#include "log_import.h"
+#include "base/signal_source.h"
 #include "receive/accounting_beat.h"
 #include "receive/log_writer.h"
+#include "receive/receiver_state.h"
 #include "receive/rule_watch.h"
 #include "receive/set_aside_file.h"
-#include "receive/signal_source.h"
 #include "receive/volume_watch.h"
-#include "receiver_state.h"
+#include "store/log_import.h"
 
 namespace kelo::tool {
 

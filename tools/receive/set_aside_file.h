@@ -4,7 +4,7 @@
 #include <string>
 #include <string_view>
 
-#include "spool/files.h"
+#include "base/files.h"
 
 namespace kelo::tool {
 

@@ -4,7 +4,7 @@
 
 #include <stdexcept>
 
-#include "spool/json.h"
+#include "base/json.h"
 
 namespace kelo::tool {
 namespace {

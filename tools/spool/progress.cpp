@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <stdexcept>
 
-#include "spool/json.h"
+#include "base/json.h"
 
 namespace kelo::tool {
 namespace {

@@ -4,8 +4,8 @@
 #include <string>
 #include <vector>
 
+#include "base/files.h"
 #include "spool/entry.h"
-#include "spool/files.h"
 #include "spool/progress.h"
 
 namespace kelo::tool {

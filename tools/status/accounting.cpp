@@ -3,10 +3,10 @@
 #include <algorithm>
 #include <limits>
 
-#include "accounting_source.h"
-#include "eps_series.h"
 #include "kelosyslog/dbutil.h"
-#include "plain_database.h"
+#include "read/accounting_source.h"
+#include "read/eps_series.h"
+#include "read/plain_database.h"
 
 namespace kelo::tool {
 namespace {

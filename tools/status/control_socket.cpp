@@ -10,7 +10,7 @@
 #include <cstring>
 #include <filesystem>
 
-#include "spool/files.h"
+#include "base/files.h"
 
 namespace kelo::tool {
 namespace {

@@ -9,10 +9,10 @@
 #include <filesystem>
 #include <limits>
 
-#include "accounting_source.h"
-#include "event_log.h"
 #include "kelosyslog/records.h"
-#include "plain_database.h"
+#include "print/event_log.h"
+#include "read/accounting_source.h"
+#include "read/plain_database.h"
 
 namespace kelo::tool {
 namespace {

@@ -3,7 +3,7 @@
 #include <optional>
 #include <string>
 
-#include "receiver_state.h"
+#include "receive/receiver_state.h"
 
 namespace kelo::tool {
 

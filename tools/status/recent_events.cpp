@@ -2,7 +2,7 @@
 
 #include <cstdlib>
 
-#include "plain_database.h"
+#include "read/plain_database.h"
 
 namespace kelo::tool {
 

@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "event_log.h"
+#include "print/event_log.h"
 
 namespace kelo::tool {
 

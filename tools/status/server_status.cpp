@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <ctime>
 
-#include "errors.h"
+#include "base/errors.h"
 
 namespace kelo::tool {
 namespace {

@@ -4,11 +4,11 @@
 #include <cstdio>
 #include <sstream>
 
-#include "statistics_table.h"
+#include "base/text_encoding.h"
+#include "base/time_format.h"
+#include "print/statistics_table.h"
 #include "status/figures.h"
 #include "status/state_names.h"
-#include "text_encoding.h"
-#include "time_format.h"
 
 namespace kelo::tool {
 namespace {

@@ -10,9 +10,9 @@
 #include <cerrno>
 #include <csignal>
 
-#include "errors.h"
-#include "output.h"
-#include "spool/files.h"
+#include "base/errors.h"
+#include "base/files.h"
+#include "print/output.h"
 
 namespace kelo::tool {
 namespace {

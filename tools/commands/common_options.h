@@ -1,0 +1,40 @@
+#pragma once
+
+#include <string>
+
+#include "cli/program.h"
+#include "print/output.h"
+#include "print/record_writer.h"
+#include "read/log_source.h"
+#include "read/selection.h"
+
+namespace kelo::tool {
+
+// Options that several subcommands share. Each struct lives as long as the command line is used.
+
+// --db, --log and --table.
+void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTable = true);
+
+// --since, --until, --priority, --facility, --host, --program and --grep.
+void AddSelectionOptions(CLI::App &command, Selection &selection);
+
+// --utc. It sets the time zone of the process, so that times are also read as UTC.
+void AddUtcOption(CLI::App &command, bool &inUtc);
+void ApplyUtc(bool inUtc);
+
+struct OutputOptions {
+    std::string format = "text";
+    std::string fields;
+    std::string colour = "auto";
+    bool noHeader = false;
+    bool noPager = false;
+    bool inUtc = false;
+};
+
+// --output, --fields, --no-header, --utc, --color and --no-pager.
+void AddOutputOptions(CLI::App &command, OutputOptions &options);
+
+// What the options mean for a table of this kind. Throws UsageError.
+RecordLayout MakeLayout(const OutputOptions &options, TableKind kind);
+
+} // namespace kelo::tool

@@ -1,0 +1,54 @@
+// kelosyslog count: prints how many logs there are.
+
+#include <ctime>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "commands/common_options.h"
+#include "read/log_reader.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter = "Examples:\n"
+                                "  kelosyslog count -p err --since today\n"
+                                "  kelosyslog count -H nas1 -g '/refused|denied/'\n"
+                                "  kelosyslog count --estimate\n\n"
+                                "Exit status: 0 some, 1 none, 2 usage, 3 database, 4 output.";
+
+struct Options {
+    LogSourceOptions source;
+    Selection selection;
+    bool inUtc = false;
+    bool isEstimate = false;
+};
+
+int Run(const Options &options, const std::string &root) {
+    ApplyUtc(options.inUtc);
+    if (options.isEstimate && !IsEmpty(options.selection))
+        throw UsageError("--estimate: is about the whole table and goes with no option that selects logs");
+    const LogSource source = ResolveLogSource(options.source, root);
+    const LogReader reader(source, MakeConditions(options.selection, source, std::time(nullptr)));
+    const uint64_t count = options.isEstimate ? reader.IdFromNewest(0) : reader.Count();
+    Output output(false);
+    output.Write(std::to_string(count) + "\n");
+    output.Finish();
+    return count > 0 ? kExitFound : kExitNothing;
+}
+
+} // namespace
+
+void AddCount(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command = AddSubcommand(program, "count", "Print the number of logs",
+                                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddSelectionOptions(*command, options->selection);
+    command->add_flag(
+        "--estimate", options->isEstimate,
+        "The largest id instead: instant however large the table is, but deleted logs count too");
+    AddUtcOption(*command, options->inUtc);
+    AddSourceOptions(*command, options->source);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,35 @@
+// kelosyslog db: creates, inspects and maintains one log database.
+
+#include "commands/db_commands.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "'kelosyslog db COMMAND --help' tells about one of them.\n\n"
+    "Examples:\n"
+    "  kelosyslog db info\n"
+    "  kelosyslog db check --db /volume1/old.db -o json\n"
+    "  kelosyslog db limit 1048576\n\n"
+    "Exit status: 0 done, 1 nothing was to be done or not confirmed, 2 usage, 3 database, 4 output.";
+
+} // namespace
+
+CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
+                       const std::string &description, DbOptions &options, std::function<int()> run) {
+    CLI::App *command = AddSubcommand(program, db, name, description, std::move(run));
+    options.root = &program.root;
+    AddFactsFormat(*command, options.format);
+    return command;
+}
+
+void AddDb(Program &program) {
+    CLI::App *db = program.app.add_subcommand("db", "Create, inspect and maintain a log database");
+    db->fallthrough();
+    db->require_subcommand(1);
+    db->footer(kFooter);
+    AddDbInspection(program, *db);
+    AddDbMaintenance(program, *db);
+}
+
+} // namespace kelo::tool

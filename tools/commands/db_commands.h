@@ -1,0 +1,29 @@
+#pragma once
+
+#include <string>
+
+#include "commands/common_options.h"
+#include "commands/facts.h"
+
+namespace kelo::tool {
+
+// What every command of "kelosyslog db" can be told.
+struct DbOptions {
+    LogSourceOptions source;
+    std::string format = "text";
+    const std::string *root = nullptr; // --root, known once the command line was read
+
+    LogSource Source() const { return ResolveLogSource(source, *root); }
+    OutputFormat Format() const { return ParseFactsFormat(format); }
+};
+
+// Adds a command of "kelosyslog db" with these options.
+CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
+                       const std::string &description, DbOptions &options, std::function<int()> run);
+
+// Commands that only look: info, check.
+void AddDbInspection(Program &program, CLI::App &db);
+// Commands that change a database: create, wal, limit, set-device, quarantine, reopen.
+void AddDbMaintenance(Program &program, CLI::App &db);
+
+} // namespace kelo::tool

@@ -1,0 +1,153 @@
+// kelosyslog db info, check.
+
+#include <sys/stat.h>
+
+#include <condition_variable>
+#include <cstdlib>
+#include <fstream>
+#include <mutex>
+#include <thread>
+
+#include "base/errors.h"
+#include "base/time_format.h"
+#include "cli/exit_status.h"
+#include "cli/progress_bar.h"
+#include "commands/db_commands.h"
+#include "kelosyslog/dbutil.h"
+#include "read/plain_database.h"
+
+namespace kelo::tool {
+namespace {
+
+int64_t SizeOf(const std::string &path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0 ? status.st_size : 0;
+}
+
+void AddTime(Facts &facts, const std::string &name, const std::string &utcsec) {
+    if (utcsec.empty())
+        facts.AddUnknown(name);
+    else
+        facts.Add(name, TimeFormat(false).Iso(std::strtoll(utcsec.c_str(), nullptr, 10)));
+}
+
+// The time of the first log in one order of time; "" when there is none.
+std::string FirstTime(const PlainDatabase &database, const char *direction) {
+    const auto row = database.FirstRow(
+        std::string("SELECT utcsec FROM logs ORDER BY utcsec ") + direction + " LIMIT 1", {"utcsec"});
+    return row ? row->front() : "";
+}
+
+void AddDescription(Facts &facts, const PlainDatabase &database) {
+    if (!database.HasTable("db_info"))
+        return;
+    const auto row =
+        database.FirstRow("SELECT * FROM db_info", {"start_time", "end_time", "log_count", "device"});
+    if (!row)
+        return;
+    AddTime(facts, "db_info_start_time", row->at(0));
+    AddTime(facts, "db_info_end_time", row->at(1));
+    facts.Add("db_info_log_count", int64_t{std::strtoll(row->at(2).c_str(), nullptr, 10)});
+    facts.Add("db_info_device", row->at(3));
+}
+
+int Info(const DbOptions &options) {
+    const OutputFormat format = options.Format();
+    const LogSource source = options.Source();
+    const PlainDatabase database(source);
+    const auto mode = database.FirstRow("PRAGMA journal_mode", {"journal_mode"});
+    Facts facts;
+    facts.Add("path", source.path);
+    facts.Add("size_bytes", SizeOf(source.path));
+    facts.Add("wal_bytes", SizeOf(source.path + "-wal"));
+    facts.Add("generation", int64_t{SyslogDBVersionGet(source.path)});
+    facts.Add("journal_mode", mode ? mode->front() : "");
+    if (!database.HasTable(source.table))
+        throw DatabaseError(source.path + ": no table " + source.table);
+    facts.Add("rows", database.Number("SELECT count(*) AS value FROM " + source.table));
+    if (source.kind == TableKind::Logs) {
+        AddTime(facts, "first_log", FirstTime(database, "ASC"));
+        AddTime(facts, "last_log", FirstTime(database, "DESC"));
+    }
+    AddDescription(facts, database);
+    Print(facts, format);
+    return kExitFound;
+}
+
+// Bytes that the process has read from files so far.
+uint64_t BytesRead() {
+    std::ifstream io("/proc/self/io");
+    std::string name;
+    uint64_t bytes = 0;
+    io >> name >> bytes; // "rchar: 123"
+    return bytes;
+}
+
+// Shows how far a check has come, while the calling thread runs it. SQLite says nothing in the meantime, so
+// the bytes that were read are looked at: a check reads every page, and most of them a second time for the
+// rows.
+class CheckProgress {
+public:
+    explicit CheckProgress(int64_t databaseBytes)
+        : bar_(2 * static_cast<uint64_t>(databaseBytes)),
+          watcher_([this](std::stop_token stop) { Watch(stop); }) {}
+
+private:
+    void Watch(std::stop_token stop) {
+        std::unique_lock lock(mutex_);
+        for (uint64_t before = BytesRead();;) {
+            if (wake_.wait_for(lock, stop, std::chrono::seconds(1), [] { return false; }) ||
+                stop.stop_requested())
+                return;
+            const uint64_t now = BytesRead();
+            bar_.Add(now - before);
+            before = now;
+        }
+    }
+
+    ProgressBar bar_;
+    std::mutex mutex_;
+    std::condition_variable_any wake_;
+    std::jthread watcher_; // ends first
+};
+
+std::vector<std::string> Problems(const LogSource &source) {
+    const PlainDatabase database(source);
+    // Opening succeeds with any file: this reads its head.
+    database.FirstRow("PRAGMA schema_version", {});
+    const CheckProgress progress(SizeOf(source.path) + SizeOf(source.path + "-wal"));
+    std::vector<std::string> lines = database.Column("PRAGMA integrity_check", "integrity_check");
+    if (lines == std::vector<std::string>{"ok"})
+        lines.clear();
+    return lines;
+}
+
+int Check(const DbOptions &options) {
+    const OutputFormat format = options.Format();
+    const LogSource source = options.Source();
+    const std::vector<std::string> problems = Problems(source);
+    Facts facts;
+    facts.Add("path", source.path);
+    facts.AddBool("sound", problems.empty());
+    facts.AddList("problems", problems);
+    Print(facts, format);
+    return problems.empty() ? kExitFound : kExitDatabase;
+}
+
+} // namespace
+
+void AddDbInspection(Program &program, CLI::App &db) {
+    auto infoOptions = std::make_shared<DbOptions>();
+    CLI::App *info =
+        AddDbCommand(program, db, "info", "Tell size, journal mode, rows and times of a database",
+                     *infoOptions, [infoOptions] { return Info(*infoOptions); });
+    AddSourceOptions(*info, infoOptions->source, false);
+
+    auto checkOptions = std::make_shared<DbOptions>();
+    CLI::App *check =
+        AddDbCommand(program, db, "check", "Check every page and row of a database; changes nothing",
+                     *checkOptions, [checkOptions] { return Check(*checkOptions); });
+    AddSourceOptions(*check, checkOptions->source, false);
+}
+
+} // namespace kelo::tool

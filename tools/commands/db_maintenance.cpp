@@ -1,0 +1,254 @@
+// kelosyslog db create, wal, limit, set-device, quarantine, reopen.
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cctype>
+#include <filesystem>
+#include <fstream>
+#include <limits>
+
+#include "base/errors.h"
+#include "cli/confirm.h"
+#include "cli/exit_status.h"
+#include "commands/db_commands.h"
+#include "kelosyslog/dbhandler.h"
+#include "read/log_message_capture.h"
+#include "read/plain_database.h"
+#include "store/logs_schema.h"
+
+namespace kelo::tool {
+namespace {
+
+namespace fs = std::filesystem;
+
+struct CreateOptions : DbOptions {
+    std::string schema;
+};
+struct LimitOptions : DbOptions {
+    std::string kib;
+};
+struct DeviceOptions : DbOptions {
+    std::string device;
+};
+struct QuarantineOptions : DbOptions {
+    bool isConfirmed = false;
+};
+
+// The shipped schema in a file of its own, as the sqlite3 tool reads it.
+class SchemaFile {
+public:
+    SchemaFile() : path_((fs::temp_directory_path() / "kelosyslog-schema-XXXXXX").string()) {
+        const int file = mkstemp(path_.data());
+        if (file < 0)
+            throw DatabaseError("cannot create " + path_);
+        close(file);
+        std::ofstream(path_) << kLogsSchema;
+    }
+    ~SchemaFile() { unlink(path_.c_str()); }
+    SchemaFile(const SchemaFile &) = delete;
+    SchemaFile &operator=(const SchemaFile &) = delete;
+    const std::string &Path() const { return path_; }
+
+private:
+    std::string path_;
+};
+
+// Runs `work` and throws DatabaseError with its first message to the system log when it returns false.
+template <typename Work>
+void Attempt(const std::string &failure, Work work) {
+    std::string reason;
+    {
+        const LogMessageCapture messages;
+        if (work())
+            return;
+        reason = messages.FirstLine();
+    }
+    throw DatabaseError(failure + (reason.empty() ? "" : ": " + reason));
+}
+
+// The library hands its paths to a shell: the database's between double quotes, the schema's bare.
+void RequirePlainPaths(const std::string &path, const std::string &schema) {
+    if (path.find_first_of("\"$`\\\n") != std::string::npos)
+        throw UsageError("db create: '" + path +
+                         "' holds one of \" $ ` \\, which the sqlite3 tool cannot be given");
+    for (const char byte : schema) {
+        if (std::isalnum(static_cast<unsigned char>(byte)) == 0 &&
+            std::string_view("/._-+,:@%").find(byte) == std::string_view::npos &&
+            static_cast<unsigned char>(byte) < 0x80)
+            throw UsageError("--schema: '" + schema + "' holds '" + byte +
+                             "'; use a path of letters, digits and /._-+,:@%");
+    }
+}
+
+int Create(const CreateOptions &options) {
+    const OutputFormat format = options.Format();
+    const std::string path = options.Source().path;
+    if (fs::exists(fs::symlink_status(path))) {
+        PrintMessage(path + " is there already; nothing created");
+        return kExitNothing;
+    }
+    std::optional<SchemaFile> shipped;
+    std::string schema = options.schema;
+    if (schema.empty())
+        schema = shipped.emplace().Path();
+    RequirePlainPaths(path, schema);
+    if (access(schema.c_str(), R_OK) != 0)
+        throw UsageError("--schema: cannot read " + schema);
+    Attempt("cannot create " + path, [&] { return DBHandler(path, schema).DBCreate() == 0; });
+    const auto mode = PlainDatabase(options.Source()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
+    Facts facts;
+    facts.Add("created", path);
+    facts.Add("journal_mode", mode ? mode->front() : "");
+    Print(facts, format);
+    return kExitFound;
+}
+
+int SetWal(const DbOptions &options) {
+    const OutputFormat format = options.Format();
+    const LogSource source = options.Source();
+    const PlainDatabase database(source);
+    const auto mode = database.FirstRow("PRAGMA journal_mode=WAL", {"journal_mode"});
+    if (!mode || mode->front() != "wal")
+        throw DatabaseError(DescribeDatabaseProblem(source, true));
+    const auto checkpoint = database.FirstRow("PRAGMA wal_checkpoint(TRUNCATE)", {"busy"});
+    const bool isComplete = checkpoint && checkpoint->front() == "0";
+    Facts facts;
+    facts.Add("path", source.path);
+    facts.Add("journal_mode", mode->front());
+    facts.AddBool("checkpointed", isComplete);
+    Print(facts, format);
+    if (!isComplete)
+        PrintMessage(source.path + " is in use; its write-ahead log could not be emptied");
+    return isComplete ? kExitFound : kExitNothing;
+}
+
+int Limit(const LimitOptions &options) {
+    const OutputFormat format = options.Format();
+    const std::string path = options.Source().path;
+    constexpr uint64_t kMost = std::numeric_limits<int32_t>::max();
+    const auto limit = static_cast<int32_t>(ParseNumber("limit", options.kib, 0, kMost));
+    struct stat before {};
+    if (stat(path.c_str(), &before) != 0)
+        throw DatabaseError(DescribeDatabaseProblem(options.Source()));
+    Attempt("cannot examine " + path, [&] { return SyslogngWorkingDbCheck(path, limit) == 0; });
+    struct stat after {};
+    const bool isRemoved = stat(path.c_str(), &after) != 0 || after.st_ino != before.st_ino;
+    const bool isBeyond = before.st_size / 1024 > limit;
+    if (isBeyond && !isRemoved)
+        throw DatabaseError("cannot remove " + path);
+    Facts facts;
+    facts.Add("path", path);
+    facts.Add("size_kib", int64_t{before.st_size / 1024});
+    facts.Add("limit_kib", int64_t{limit});
+    facts.AddBool("removed", isRemoved);
+    Print(facts, format);
+    return isRemoved ? kExitFound : kExitNothing;
+}
+
+int SetDevice(const DeviceOptions &options) {
+    const OutputFormat format = options.Format();
+    const LogSource source = options.Source();
+    {
+        const PlainDatabase database(source);
+        if (!database.HasTable("db_info") ||
+            database.Number("SELECT count(*) AS value FROM db_info WHERE id = 1") == 0)
+            throw DatabaseError(source.path + " has no row in a table db_info to write the device to");
+    }
+    DBHandler db(source.path, "");
+    Attempt("cannot change " + source.path, [&] {
+        const bool isDone = db.DBCon() == 0 && db.DBInfoDevSet(db.DBCmdEscape(options.device)) == 0;
+        db.DBDiscon();
+        return isDone;
+    });
+    Facts facts;
+    facts.Add("path", source.path);
+    facts.Add("device", options.device);
+    Print(facts, format);
+    return kExitFound;
+}
+
+int Quarantine(const QuarantineOptions &options) {
+    const OutputFormat format = options.Format();
+    const std::string path = options.Source().path;
+    const std::string aside = path + ".corrupt";
+    if (!fs::is_regular_file(path))
+        throw DatabaseError(DescribeDatabaseProblem(options.Source()));
+    const std::string action =
+        "move " + path + " to " + aside + (fs::exists(aside) ? ", which replaces an older one" : "");
+    if (!options.isConfirmed && !Confirm("db quarantine", action)) {
+        PrintMessage("nothing moved");
+        return kExitNothing;
+    }
+    struct stat before {};
+    stat(path.c_str(), &before);
+    const auto isMoved = [&] {
+        struct stat after {};
+        return stat(aside.c_str(), &after) == 0 && after.st_ino == before.st_ino;
+    };
+    bool isReloaded = false;
+    Attempt("cannot move " + path, [&] {
+        isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
+        return isReloaded || isMoved();
+    });
+    Facts facts;
+    facts.Add("moved", path);
+    facts.Add("to", aside);
+    facts.AddBool("reloaded", isReloaded);
+    Print(facts, format);
+    if (isReloaded)
+        return kExitFound;
+    PrintMessage("syslog-ng was not reloaded and goes on writing into the moved file; reload it yourself");
+    return kExitDatabase;
+}
+
+int Reopen(const DbOptions &options) {
+    const OutputFormat format = options.Format();
+    Attempt("cannot make syslog-ng reopen its files", [] { return SyslogngHupSignalSend() == 0; });
+    Facts facts;
+    facts.AddBool("reloaded", true);
+    Print(facts, format);
+    return kExitFound;
+}
+
+// A command with options of type `Options` that works on the database of --db.
+template <typename Options>
+CLI::App *Add(Program &program, CLI::App &db, const char *name, const char *description,
+              std::shared_ptr<Options> options, int (*run)(const Options &)) {
+    CLI::App *command =
+        AddDbCommand(program, db, name, description, *options, [options, run] { return run(*options); });
+    AddText(*command, "--db", options->source.db, "PATH", "This log database (default: the working log)");
+    return command;
+}
+
+} // namespace
+
+void AddDbMaintenance(Program &program, CLI::App &db) {
+    auto create = std::make_shared<CreateOptions>();
+    AddText(*Add(program, db, "create", "Create a database, with its folder, that is not there yet", create,
+                 Create),
+            "--schema", create->schema, "FILE",
+            "SQL that creates the tables (default: that of the working log)");
+    Add(program, db, "wal", "Switch to write-ahead logging and empty the log into the database",
+        std::make_shared<DbOptions>(), SetWal);
+    auto limit = std::make_shared<LimitOptions>();
+    AddText(*Add(program, db, "limit",
+                 "Throw a working database away that is larger than KIB; syslog-ng begins a new one", limit,
+                 Limit),
+            "kib", limit->kib, "", "The largest size that is kept, in KiB")
+        ->required();
+    auto device = std::make_shared<DeviceOptions>();
+    AddText(*Add(program, db, "set-device", "Write the device that an archive's logs came from", device,
+                 SetDevice),
+            "device", device->device, "", "Name of the device")
+        ->required();
+    auto quarantine = std::make_shared<QuarantineOptions>();
+    Add(program, db, "quarantine", "Put a damaged database aside; syslog-ng begins a new one", quarantine,
+        Quarantine)
+        ->add_flag("-y,--yes", quarantine->isConfirmed, "Do not ask");
+    auto reopen = std::make_shared<DbOptions>();
+    AddDbCommand(program, db, "reopen", "Make syslog-ng reopen its files", *reopen,
+                 [reopen] { return Reopen(*reopen); });
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,201 @@
+// kelosyslog events: the server's own event log.
+
+#include "commands/events.h"
+
+#include <ctime>
+#include <limits>
+
+#include "base/errors.h"
+#include "base/replacement_file.h"
+#include "cli/exit_status.h"
+#include "kelosyslog/logger.h"
+#include "print/event_log.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "Without a command the events are listed, newest first; 'kelosyslog events COMMAND --help' tells "
+    "more.\n\n"
+    "Examples:\n"
+    "  kelosyslog events -n 20                          the newest 20 events\n"
+    "  kelosyslog events -n 20 --offset 20              the page after them\n"
+    "  kelosyslog events -p warning --since yesterday   warnings and errors since yesterday\n"
+    "  kelosyslog events add server-start 1.0\n"
+    "  kelosyslog events export events.html\n"
+    "  kelosyslog events clear-log /volume1/old.db\n\n"
+    "Exit status: 0 found or done, 1 nothing matched or not confirmed, 2 usage, 3 database, 4 output.";
+
+constexpr uint64_t kMaxLines = std::numeric_limits<int>::max();
+constexpr const char *kPageEnd = "</table></body></html>\n";
+
+struct EventPage {
+    int limit = 0; // 0 for all
+    int offset = 0;
+};
+
+EventPage ParsePage(const EventsOptions &options) {
+    EventPage page;
+    if (!options.lines.empty() && options.lines != "all")
+        page.limit = static_cast<int>(ParseNumber("--lines", options.lines, 1, kMaxLines));
+    if (!options.offset.empty())
+        page.offset = static_cast<int>(ParseNumber("--offset", options.offset, 0, kMaxLines));
+    return page;
+}
+
+// The library pages what is not filtered; of filtered events it takes all to find a page.
+std::list<Event> SelectedEvents(const std::string &path, const EventsOptions &options,
+                                const EventPage &page) {
+    if (IsEmpty(options.selection)) {
+        const bool isWhole = page.limit == 0 && page.offset == 0;
+        const int limit = page.limit == 0 ? std::numeric_limits<int>::max() : page.limit;
+        return ReadEvents(path, page.offset, isWhole ? 0 : limit);
+    }
+    const EventSelection selection = ParseEventSelection(options.selection, std::time(nullptr));
+    std::list<Event> events = ReadEvents(path);
+    events.remove_if([&](const Event &event) { return !selection.Matches(event); });
+    for (int skipped = 0; skipped < page.offset && !events.empty(); ++skipped)
+        events.pop_front();
+    if (page.limit > 0 && events.size() > static_cast<size_t>(page.limit))
+        events.resize(static_cast<size_t>(page.limit));
+    return events;
+}
+
+int List(const EventsOptions &options, const std::string &root) {
+    ApplyUtc(options.output.inUtc);
+    RecordLayout layout = MakeLayout(options.output, TableKind::Logs);
+    if (layout.format == OutputFormat::Short)
+        throw UsageError("--output: events have no form 'short'; forms are text, json, jsonl, csv");
+    layout.fields = EventFields();
+    const EventPage page = ParsePage(options);
+    const std::list<Event> events = SelectedEvents(EventDatabasePath(options.db, root), options, page);
+    Output output(!options.output.noPager);
+    const std::unique_ptr<RecordWriter> writer = MakeRecordWriter(layout);
+    std::string text;
+    writer->Begin(text);
+    for (const Event &event : events) {
+        writer->Add(RecordOfEvent(event), text);
+        output.Write(text);
+        text.clear();
+    }
+    writer->End(text);
+    output.Write(text);
+    output.Finish();
+    return events.empty() ? kExitNothing : kExitFound;
+}
+
+int Count(const EventsOptions &options, const std::string &root) {
+    if (!options.lines.empty() || !options.offset.empty())
+        throw UsageError("count: goes neither with --lines nor with --offset");
+    ApplyUtc(options.output.inUtc);
+    const std::string path = EventDatabasePath(options.db, root);
+    int64_t count = 0;
+    if (IsEmpty(options.selection))
+        count = Logger().LogCount(path);
+    else
+        count = static_cast<int64_t>(SelectedEvents(path, options, {}).size());
+    if (count < 0)
+        FailEventDatabase(path);
+    Output output(false);
+    output.Write(std::to_string(count) + "\n");
+    output.Finish();
+    return count > 0 ? kExitFound : kExitNothing;
+}
+
+// The library does not tell when the page could not be written in full, so its end is looked at.
+void RequireWholePage(const ReplacementFile &file) {
+    std::string end(std::char_traits<char>::length(kPageEnd), '\0');
+    const std::unique_ptr<FILE, int (*)(FILE *)> page(std::fopen(file.Path().c_str(), "r"), std::fclose);
+    const bool isWhole = page != nullptr &&
+                         std::fseek(page.get(), -static_cast<long>(end.size()), SEEK_END) == 0 &&
+                         std::fread(end.data(), 1, end.size(), page.get()) == end.size() && end == kPageEnd;
+    if (!isWhole)
+        file.Fail("the page did not fit; is the disk full?");
+}
+
+int Export(const EventsOptions &options, const std::string &target, const std::string &root) {
+    RefuseListOptions(options, "export", false);
+    ApplyUtc(options.output.inUtc);
+    const std::string path = EventDatabasePath(options.db, root);
+    if (ReadEvents(path, 0, 1).empty()) {
+        PrintMessage("no events to export");
+        return kExitNothing;
+    }
+    ReplacementFile file(target);
+    if (Logger().LogHtmlGen(path, "html", file.Path()) != 0)
+        FailEventDatabase(path);
+    RequireWholePage(file);
+    file.Commit();
+    return kExitFound;
+}
+
+void AddExport(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+    auto target = std::make_shared<std::string>();
+    CLI::App *command = AddEventsAction(
+        events, options, "export", "Write all events to an HTML page; FILE is replaced only by a whole one",
+        [state = options.get(), target, &program] { return Export(*state, *target, program.root); });
+    AddText(*command, "file", *target, "FILE", "")->required();
+}
+
+void AddListOptions(CLI::App &command, EventsOptions &options) {
+    AddText(command, "--db", options.db, "PATH", "This event database, not the server's own");
+    const std::string which = "Which events";
+    AddText(command, "-S,--since", options.selection.since, "TIME", "From this time on")->group(which);
+    AddText(command, "-U,--until", options.selection.until, "TIME",
+            "Up to this second; a day alone ends before it begins")
+        ->group(which);
+    AddTexts(command, "-p,--priority", options.selection.levels, "LEVEL",
+             "information, warning or error. A single one means it and all worse; '!level' excludes")
+        ->group(which);
+    const std::string howMany = "How many";
+    AddText(command, "-n,--lines", options.lines, "N", "The newest N events, or 'all' (default)")
+        ->group(howMany);
+    AddText(command, "--offset", options.offset, "N", "Skip the N newest events first")->group(howMany);
+    const std::string how = "How to print";
+    AddText(command, "-o,--output", options.output.format, "FORMAT",
+            "text (default), json (one array), jsonl (an object per line), csv")
+        ->group(how);
+    command.add_flag("--no-header", options.output.noHeader, "No heading in text and csv")->group(how);
+    command.add_flag("--utc", options.output.inUtc, "Read and print times in UTC, not in local time")
+        ->group(how);
+    AddText(command, "--color", options.output.colour, "WHEN",
+            "auto (default: on a terminal, unless NO_COLOR is set), always, never")
+        ->group(how);
+    command.add_flag("--no-pager", options.output.noPager, "Do not start PAGER on a terminal")->group(how);
+}
+
+} // namespace
+
+CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
+                          const std::string &description, std::function<int()> action) {
+    CLI::App *command = events.add_subcommand(name, description);
+    command->fallthrough();
+    // Runs before the callback of "events" itself.
+    command->callback([options, action = std::move(action)] { options->action = action; });
+    return command;
+}
+
+void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb) {
+    if (!IsEmpty(options.selection) || !options.lines.empty() || !options.offset.empty())
+        throw UsageError(action + ": goes with no option that selects events");
+    if (withDb && !options.db.empty())
+        throw UsageError("--db: " + action +
+                         " writes to the server's own event log; use --root to choose it");
+}
+
+void AddEvents(Program &program) {
+    auto options = std::make_shared<EventsOptions>();
+    CLI::App *command = AddSubcommand(
+        program, "events", "Show, add, export and count the server's own events",
+        [options, &program] { return options->action ? options->action() : List(*options, program.root); });
+    command->footer(kFooter);
+    command->require_subcommand(0, 1);
+    AddEventsAction(*command, options, "count", "Print the number of events",
+                    [state = options.get(), &program] { return Count(*state, program.root); });
+    AddEventsAdd(program, *command, options);
+    AddExport(program, *command, options);
+    AddEventsClearLog(program, *command, options);
+    AddListOptions(*command, *options);
+}
+
+} // namespace kelo::tool

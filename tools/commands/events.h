@@ -1,0 +1,34 @@
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "commands/common_options.h"
+
+namespace kelo::tool {
+
+// What the command line says about "kelosyslog events".
+struct EventsOptions {
+    std::string db;
+    Selection selection;
+    OutputOptions output;
+    std::string lines;
+    std::string offset;
+    std::function<int()> action; // of the subcommand below "events"; none to list
+};
+using SharedEventsOptions = std::shared_ptr<EventsOptions>;
+
+// Adds a subcommand below "events". Options that it does not have itself are those of "events". `action` goes
+// into `options` when the subcommand is chosen, so it must not own them.
+CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
+                          const std::string &description, std::function<int()> action);
+
+// Throws UsageError where an option was given that only the listing understands, or with `withDb` --db.
+void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb);
+
+// The subcommands that write: "add" and "clear-log".
+void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions &options);
+void AddEventsClearLog(Program &program, CLI::App &events, const SharedEventsOptions &options);
+
+} // namespace kelo::tool

@@ -1,0 +1,167 @@
+// kelosyslog events add, kelosyslog events clear-log.
+
+#include <fcntl.h>
+#include <pwd.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+
+#include "base/errors.h"
+#include "cli/confirm.h"
+#include "cli/exit_status.h"
+#include "commands/events.h"
+#include "kelosyslog/dbhandler.h"
+#include "kelosyslog/logger.h"
+#include "print/event_log.h"
+#include "read/log_message_capture.h"
+
+namespace kelo::tool {
+namespace {
+
+using Arguments = std::vector<std::string>;
+
+struct Kind {
+    const char *name;
+    const char *arguments;
+    size_t count;
+    int (*add)(Logger &logger, const Arguments &arguments);
+};
+
+_SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text) {
+    std::string names;
+    for (int32_t level = SYSLOG_PRIO_EMERG; level <= SYSLOG_PRIO_DEBUG; ++level) {
+        if (text == g_MappingSyslogPrior[level])
+            return static_cast<_SYSLOG_DB_PRIORITY_tag>(level);
+        names += std::string(level == 0 ? "" : ", ") + g_MappingSyslogPrior[level];
+    }
+    throw UsageError("severity: '" + text + "' is no severity; severities are " + names);
+}
+
+constexpr std::array<Kind, 10> kKinds = {{
+    {"server-start", "TEXT", 1, [](Logger &l, const Arguments &a) { return l.LogAddServStart(a[0]); }},
+    {"server-stop", "TEXT", 1, [](Logger &l, const Arguments &a) { return l.LogAddServStop(a[0]); }},
+    {"eps", "NUMBER", 1,
+     [](Logger &l, const Arguments &a) {
+         return l.LogAddNotifyEps(ParseNumber("eps", a[0], 0, std::numeric_limits<uint64_t>::max()));
+     }},
+    {"severity", "SEVERITY LOG", 2,
+     [](Logger &l, const Arguments &a) { return l.LogAddNotifySev(ParseSeverity(a[0]), a[1]); }},
+    {"keyword", "KEYWORD LOG", 2, [](Logger &l, const Arguments &a) { return l.LogAddNotifyKw(a[0], a[1]); }},
+    {"archive-start", "NAME", 1, [](Logger &l, const Arguments &a) { return l.LogAddArchStart(a[0]); }},
+    {"archive-finish", "NAME", 1, [](Logger &l, const Arguments &a) { return l.LogAddArchFinish(a[0]); }},
+    {"archive-failed", "NAME", 1, [](Logger &l, const Arguments &a) { return l.LogAddArchFailed(a[0]); }},
+    {"log-cleared", "DATABASE USER", 2,
+     [](Logger &l, const Arguments &a) { return l.LogAddLogClear(a[0], a[1]); }},
+    {"volume-full", "", 0, [](Logger &l, const Arguments &) { return l.LogAddVolFull(); }},
+}};
+
+const Kind &FindKind(const std::string &name, size_t arguments) {
+    std::string names;
+    for (const Kind &kind : kKinds) {
+        if (name == kind.name && arguments == kind.count)
+            return kind;
+        if (name == kind.name)
+            throw UsageError("add: " + name + " takes " +
+                             (kind.count == 0 ? "nothing more" : kind.arguments) + ", not " +
+                             std::to_string(arguments) + " values");
+        names += (names.empty() ? "" : ", ") + std::string(kind.name);
+    }
+    throw UsageError("add: '" + name + "' is no kind of event; kinds are " + names);
+}
+
+int Add(const EventsOptions &options, const std::string &name, const Arguments &arguments,
+        const std::string &root) {
+    RefuseListOptions(options, "add", true);
+    const Kind &kind = FindKind(name, arguments.size());
+    const LogMessageCapture messages;
+    Logger logger;
+    if (kind.add(logger, arguments) != 0)
+        throw DatabaseError("cannot add the event to " + EventDatabasePath("", root) + ": " +
+                            messages.FirstLine());
+    return kExitFound;
+}
+
+std::string CurrentUser() {
+    const passwd *entry = getpwuid(getuid());
+    return entry != nullptr ? entry->pw_name : std::to_string(getuid());
+}
+
+// A typing error must not remove a file that is no log database.
+void RequireDatabase(const std::string &path) {
+    struct stat status {};
+    if (stat(path.c_str(), &status) != 0)
+        throw DatabaseError("cannot clear " + path + ": " + std::strerror(errno));
+    constexpr std::string_view kMagic("SQLite format 3\0", 16);
+    std::array<char, kMagic.size()> start{};
+    const int file = S_ISREG(status.st_mode) ? open(path.c_str(), O_RDONLY | O_CLOEXEC) : -1;
+    const bool isRead =
+        file >= 0 && read(file, start.data(), start.size()) == static_cast<ssize_t>(start.size());
+    close(file);
+    if (!isRead || std::string_view(start.data(), start.size()) != kMagic)
+        throw DatabaseError("cannot clear " + path + ": it is not an SQLite database");
+}
+
+struct ClearOptions {
+    std::string database;
+    std::string user;
+    bool isConfirmed = false;
+};
+
+int ClearLog(const EventsOptions &options, const ClearOptions &clear, const std::string &root) {
+    RefuseListOptions(options, "clear-log", true);
+    const std::string path = std::filesystem::absolute(clear.database).lexically_normal().string();
+    RequireDatabase(path);
+    if (!clear.isConfirmed && !Confirm("clear-log", "delete all logs in " + path)) {
+        PrintMessage("nothing deleted");
+        return kExitNothing;
+    }
+    const std::string user = clear.user.empty() ? CurrentUser() : clear.user;
+    Logger().LogClear(path, user);
+    if (access(path.c_str(), F_OK) == 0)
+        throw DatabaseError("cannot delete " + path);
+    // The writer of the working log goes on into the deleted file until it is told.
+    if (path == root + "/var/log/kelolog/logs.db" && SyslogngHupSignalSend() != 0)
+        PrintMessage("syslog-ng was not told and may go on writing to the deleted file; see the system log");
+    const std::string events = EventDatabasePath("", root);
+    const std::list<Event> newest = ReadEvents(events, 0, 1);
+    if (newest.empty() || newest.front().event != path + " was cleared by " + user)
+        throw DatabaseError("deleted " + path + ", but " + events +
+                            " does not record it; see the system log");
+    return kExitFound;
+}
+
+} // namespace
+
+void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+    struct AddOptions {
+        std::string kind;
+        Arguments arguments;
+    };
+    auto add = std::make_shared<AddOptions>();
+    CLI::App *command = AddEventsAction(events, options, "add", "Add an event of the server's user SYSTEM",
+                                        [state = options.get(), add, &program] {
+                                            return Add(*state, add->kind, add->arguments, program.root);
+                                        });
+    std::string footer = "Kinds and their values:\n";
+    for (const Kind &kind : kKinds)
+        footer += std::string("  ") + kind.name + " " + kind.arguments + "\n";
+    command->footer(footer);
+    AddText(*command, "kind", add->kind, "KIND", "")->required();
+    AddTexts(*command, "value", add->arguments, "VALUE", "")->expected(0, -1)->allow_extra_args();
+}
+
+void AddEventsClearLog(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+    auto clear = std::make_shared<ClearOptions>();
+    CLI::App *command = AddEventsAction(
+        events, options, "clear-log", "Delete a log database and record who did it",
+        [state = options.get(), clear, &program] { return ClearLog(*state, *clear, program.root); });
+    AddText(*command, "database", clear->database, "DATABASE", "")->required();
+    AddText(*command, "--user", clear->user, "NAME", "Who clears it (default: the user of this process)");
+    command->add_flag("-y,--yes", clear->isConfirmed, "Do not ask");
+}
+
+} // namespace kelo::tool

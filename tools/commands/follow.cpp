@@ -1,0 +1,100 @@
+#include "commands/follow.h"
+
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <chrono>
+#include <ctime>
+
+#include "base/errors.h"
+
+namespace kelo::tool {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+constexpr int kPollMs = 250;
+
+// Which file stands at a path; nothing when there is none.
+struct FileIdentity {
+    dev_t device;
+    ino_t inode;
+    bool operator==(const FileIdentity &) const = default;
+};
+
+std::optional<FileIdentity> IdentifyFile(const std::string &path) {
+    struct stat status {};
+    if (stat(path.c_str(), &status) != 0)
+        return std::nullopt;
+    return FileIdentity{status.st_dev, status.st_ino};
+}
+
+class Follower {
+public:
+    Follower(const LogReader &reader, const LogHandler &print)
+        : reader_(reader), everything_(reader.Source(), {}), print_(print) {}
+
+    uint64_t PrintPresent(const FollowOptions &options) {
+        file_ = IdentifyFile(reader_.Source().path);
+        lastId_ = everything_.IdFromNewest(0);
+        if (!options.showAll && options.lines == 0)
+            return 0;
+        return reader_.WalkPage({options.showAll ? 0 : options.lines, 0}, true,
+                                [this](const _SYSLOG_LOG_DATA_tag &log) {
+                                    print_(log);
+                                    lastId_ = std::max(lastId_, log.id);
+                                });
+    }
+
+    uint64_t PrintNews() {
+        const std::optional<FileIdentity> current = IdentifyFile(reader_.Source().path);
+        if (!current)
+            return 0;
+        const bool isReplaced = current != file_;
+        const uint64_t first = isReplaced ? 1 : lastId_ + 1;
+        try {
+            // Logs that are not selected count as seen too, so that they are not read over and over.
+            const uint64_t newest = everything_.IdFromNewest(0);
+            file_ = current;
+            lastId_ = isReplaced ? newest : std::max(lastId_, newest);
+            return newest < first ? 0 : reader_.Walk({first, newest}, true, 0, print_);
+        } catch (const DatabaseError &) {
+            if (!isReplaced || file_ == current)
+                throw;
+            return 0; // a new file that does not have its table yet
+        }
+    }
+
+private:
+    const LogReader &reader_;
+    LogReader everything_;
+    const LogHandler &print_;
+    std::optional<FileIdentity> file_; // the one that was read last
+    uint64_t lastId_ = 0;
+};
+
+} // namespace
+
+uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &print,
+                Output &output) {
+    Follower follower(reader, print);
+    uint64_t count = follower.PrintPresent(options);
+    output.Flush();
+    Clock::time_point lastNews = Clock::now();
+    while (true) {
+        // Taken before the look, so that a log of the last second is not missed.
+        const bool isOver = options.until && std::time(nullptr) > *options.until;
+        const uint64_t news = follower.PrintNews();
+        output.Flush();
+        count += news;
+        if (news > 0)
+            lastNews = Clock::now();
+        const bool isIdle =
+            options.idleSec && Clock::now() - lastNews >= std::chrono::seconds(*options.idleSec);
+        if (isOver || (isIdle && news == 0))
+            return count;
+        output.Wait(kPollMs);
+    }
+}
+
+} // namespace kelo::tool

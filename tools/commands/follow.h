@@ -1,0 +1,26 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+
+#include "print/output.h"
+#include "read/log_reader.h"
+
+namespace kelo::tool {
+
+struct FollowOptions {
+    bool showAll = false;              // of the logs that are there at the start
+    uint64_t lines = 10;               // else this many of the newest
+    std::optional<uint64_t> idleSec;   // stop after so many seconds without a new log
+    std::optional<int64_t> until = {}; // stop when this second (of the epoch) has passed
+};
+
+// Hands the logs that are there and then every new one to `print`, and flushes `output` after each batch.
+// Returns their number when the bounds of `options` end it; OutputClosed ends it when nobody reads any more.
+//
+// When another file takes the place of the database (a quarantine, a rotation), it goes on with the first log
+// of the new one; while there is no file it waits.
+uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &print,
+                Output &output);
+
+} // namespace kelo::tool

@@ -1,0 +1,255 @@
+// kelosyslog parse: turns log text into records, printed or stored.
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <system_error>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "cli/progress_bar.h"
+#include "commands/common_options.h"
+#include "store/batch_sink.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "One log is one line: facility, severity, date, time, seconds since 1970, a number, time-zone offset, "
+    "host,\n"
+    "address, program and tag, separated by blanks, and the message.\n\n"
+    "Examples:\n"
+    "  kelosyslog parse messages.txt -o jsonl                 one JSON object per log\n"
+    "  zcat old/*.gz | kelosyslog parse --db /srv/old.db -    into a database, created if need be\n"
+    "  kelosyslog parse --db /srv/old.db --resume big.txt     go on where the last run ended\n\n"
+    "Exit status: 0 logs found, 1 none (or none new), 2 usage or unreadable input, 3 database, 4 output.";
+
+constexpr const char *kStandardInput = "-";
+
+struct Options {
+    std::vector<std::string> files;
+    std::string db;
+    OutputOptions output;
+    bool resume = false;
+    bool skipIncomplete = false;
+    bool verbose = false;
+};
+
+// An input that closes when it goes out of scope.
+class Input {
+public:
+    // Throws UsageError naming the file.
+    explicit Input(const std::string &file) : file_(file) {
+        fd_ = file == kStandardInput ? dup(STDIN_FILENO) : open(file.c_str(), O_RDONLY | O_CLOEXEC);
+        if (fd_ < 0)
+            throw UsageError(file + ": " + std::strerror(errno));
+        if (fstat(fd_, &status_) == 0 && S_ISDIR(status_.st_mode)) {
+            close(fd_);
+            throw UsageError(file + ": " + std::strerror(EISDIR));
+        }
+    }
+    ~Input() { close(fd_); }
+    Input(const Input &) = delete;
+    Input &operator=(const Input &) = delete;
+
+    int Fd() const { return fd_; }
+    // Bytes to be read; 0 when that is not known.
+    uint64_t Size() const { return S_ISREG(status_.st_mode) ? static_cast<uint64_t>(status_.st_size) : 0; }
+    // The name under which progress is kept: the same from every folder.
+    std::string Source() const {
+        return file_ == kStandardInput ? file_ : std::filesystem::canonical(file_).string();
+    }
+
+private:
+    std::string file_;
+    int fd_;
+    struct stat status_ {};
+};
+
+// Prints records as they come.
+class PrintSink : public RecordSink {
+public:
+    PrintSink(RecordLayout layout, bool mayPage)
+        : output_(mayPage), writer_(MakeRecordWriter(std::move(layout))) {
+        writer_->Begin(text_);
+    }
+    void Take(_SYSLOG_LOG_DATA_tag &log) override {
+        writer_->Add(log, text_);
+        output_.Write(text_);
+        text_.clear();
+    }
+    void Flush() override { output_.Flush(); }
+    void Finish() {
+        writer_->End(text_);
+        output_.Write(text_);
+        output_.Finish();
+    }
+
+private:
+    Output output_;
+    std::unique_ptr<RecordWriter> writer_;
+    std::string text_;
+};
+
+// What is printed unless --fields asks for something else: what the text holds, and no row id, which it has
+// not.
+RecordLayout MakeParseLayout(const OutputOptions &options) {
+    static constexpr RecordField kExtnum = {
+        "extnum", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.extnum); }};
+    RecordLayout layout = MakeLayout(options, TableKind::Logs);
+    if (layout.fields.empty() && layout.format != OutputFormat::Text) {
+        layout.fields = AllFields(TableKind::Logs);
+        layout.fields.front() = &kExtnum; // for "id"
+    }
+    return layout;
+}
+
+// Reads the inputs one after the other and keeps the account of all of them.
+class ParseRun {
+public:
+    explicit ParseRun(const Options &options)
+        : options_(options), bar_(CheckInputs(options)),
+          import_([this](const LineReader &reader,
+                         const std::string &reason) { Report(reader.Number(), reason); },
+                  options.skipIncomplete) {}
+
+    void Print() {
+        PrintSink sink(MakeParseLayout(options_.output), !options_.output.noPager);
+        ForEachInput([&](const Input &, LineReader &reader) { import_.Run(reader, sink); });
+        sink.Finish();
+    }
+
+    void Store() {
+        LogStore store(options_.db);
+        ForEachInput([&](const Input &input, LineReader &reader) {
+            if (options_.resume)
+                SkipStored(store, input, reader);
+            BatchSink sink(store, reader, input.Source());
+            import_.Run(reader, sink);
+        });
+    }
+
+    // The account on the standard error. Returns the ExitStatus.
+    int Finish() {
+        const ImportCounts &counts = import_.Counts();
+        std::string text = std::to_string(counts.parsed) + " parsed";
+        for (const auto &[field, count] : counts.incomplete)
+            text += ", " + std::to_string(count) + " of them incomplete (" + field + " is empty)";
+        if (counts.tooFewFields > 0)
+            text += ", " + std::to_string(counts.tooFewFields) + " rejected (fewer than 11 fields)";
+        if (counts.overlong > 0)
+            text += ", " + std::to_string(counts.overlong) + " rejected (too long)";
+        Say(text);
+        return counts.parsed > 0 ? kExitFound : kExitNothing;
+    }
+
+private:
+    // Finds unreadable files before anything is printed or stored. Returns the size of all inputs, 0 when it
+    // is not known or when a progress bar would stand among the logs on the terminal.
+    static uint64_t CheckInputs(const Options &options) {
+        uint64_t total = 0;
+        bool isKnown = !options.db.empty() || isatty(STDOUT_FILENO) == 0;
+        for (const std::string &file : options.files) {
+            const uint64_t size = Input(file).Size();
+            isKnown = isKnown && size > 0;
+            total += size;
+        }
+        return isKnown ? total : 0;
+    }
+
+    template <typename Work>
+    void ForEachInput(Work work) {
+        for (const std::string &file : options_.files) {
+            file_ = file;
+            const Input input(file);
+            LineReader reader(input.Fd(), LogStream::kMaxLineBytes);
+            reader.OnProgress([this](uint64_t bytes) { bar_.Add(bytes); });
+            try {
+                work(input, reader);
+            } catch (const std::system_error &error) {
+                throw UsageError(file + ": " + error.code().message());
+            }
+        }
+        bar_.Clear();
+    }
+
+    void SkipStored(LogStore &store, const Input &input, LineReader &reader) {
+        const std::optional<StoreProgress> stored = store.ProgressGet(input.Source());
+        if (!stored)
+            return;
+        reader.ReadHead(stored->head.size());
+        if (!reader.Head().starts_with(stored->head)) {
+            Say(file_ + ": begins differently than when it was stored, so it is read from its start");
+            return;
+        }
+        if (!reader.SkipTo(stored->offset, stored->lines))
+            throw UsageError(file_ + ": shorter than the " + std::to_string(stored->offset) +
+                             " bytes that were stored of it");
+    }
+
+    void Report(uint64_t line, const std::string &reason) {
+        if (options_.verbose)
+            Say(file_ + ":" + std::to_string(line) + ": " + reason);
+    }
+
+    void Say(const std::string &text) {
+        bar_.Clear();
+        PrintMessage(text);
+    }
+
+    const Options &options_;
+    ProgressBar bar_;
+    LogImport import_;
+    std::string file_;
+};
+
+int Run(Options options, bool hasDb) {
+    if (options.files.empty())
+        options.files = {kStandardInput};
+    if (std::count(options.files.begin(), options.files.end(), kStandardInput) > 1)
+        throw UsageError("FILE: '-' can be read only once");
+    if (hasDb && options.db.empty())
+        throw UsageError("--db: an empty path");
+    ApplyUtc(options.output.inUtc);
+    ParseRun run(options);
+    if (hasDb)
+        run.Store();
+    else
+        run.Print();
+    return run.Finish();
+}
+
+} // namespace
+
+void AddParse(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command =
+        AddSubcommand(program, "parse", "Turn log text into logs, printed or stored", nullptr);
+    command->footer(kFooter);
+    AddTexts(*command, "FILE", options->files, "FILE", "Files of log text; '-' or none: the standard input")
+        ->expected(-1);
+    AddOutputOptions(*command, options->output);
+    const std::string group = "How to store";
+    CLI::Option *db = AddText(*command, "--db", options->db, "PATH",
+                              "Store into table logs of this database, which is created when missing")
+                          ->group(group)
+                          ->excludes("--output");
+    command
+        ->add_flag("--resume", options->resume,
+                   "Go on behind what earlier runs stored of the same input, each log once")
+        ->group(group)
+        ->needs(db);
+    command->add_flag("--skip-incomplete", options->skipIncomplete,
+                      "Leave out logs without a message or another mandatory field");
+    command->add_flag("-v,--verbose", options->verbose,
+                      "Name every line that is rejected or incomplete, with the reason");
+    command->callback(
+        [options, db, &program] { program.run = [options, db] { return Run(*options, db->count() > 0); }; });
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,88 @@
+// kelosyslog receive: counts, checks and stores the logs that syslog-ng hands over.
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+#include <filesystem>
+#include <system_error>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "cli/program.h"
+#include "receive/receiver.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "The standard input is log text as in 'kelosyslog parse', from a program() destination of syslog-ng.\n"
+    "SIGHUP reopens the files and loads the rules anew; SIGTERM ends when the input pauses.\n\n"
+    "Examples:\n"
+    "  kelosyslog receive                                  count the logs and check them against the rules\n"
+    "  kelosyslog receive --db /var/log/kelolog/logs.db    store them too\n\n"
+    "Exit status: 0 the input ended, 2 usage, 4 the input cannot be read.";
+
+struct Options {
+    ReceiverOptions receiver;
+    std::string notifyLimit = "10";
+    bool verbose = false;
+};
+
+// Held as long as the program runs: two receivers would overwrite each other's counts. After a restart of
+// syslog-ng the old one may still be storing, and is waited for.
+FileHandle LockAgainstOthers(const std::string &root) {
+    const std::filesystem::path path = root + "/run/kelosyslog/receive.lock";
+    std::error_code ignored; // opening fails then, and says why
+    std::filesystem::create_directories(path.parent_path(), ignored);
+    FileHandle file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
+    if (file && flock(file.Get(), LOCK_EX | LOCK_NB) == 0)
+        return file;
+    if (file && errno == EWOULDBLOCK) {
+        syslog(LOG_NOTICE, "waiting for another receiver to end: %s", path.c_str());
+        while (flock(file.Get(), LOCK_EX) != 0 && errno == EINTR) {
+        }
+        return file;
+    }
+    syslog(LOG_WARNING, "cannot lock %s: %s", path.c_str(), std::strerror(errno));
+    return file;
+}
+
+int Run(Options options, const std::string &root) {
+    options.receiver.root = root;
+    options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
+    // A limit of the file size is a full disk like any other.
+    std::signal(SIGXFSZ, SIG_IGN);
+    openlog("kelosyslog", LOG_PID | (options.verbose ? LOG_PERROR : 0), LOG_DAEMON);
+    const FileHandle lock = LockAgainstOthers(root);
+    try {
+        Receiver(options.receiver).Run(STDIN_FILENO);
+    } catch (const std::system_error &error) {
+        syslog(LOG_ERR, "standard input: %s", error.code().message().c_str());
+        throw OutputError("standard input: " + error.code().message());
+    }
+    return kExitFound;
+}
+
+} // namespace
+
+void AddReceive(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command = AddSubcommand(program, "receive", "Receive log text from syslog-ng",
+                                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddText(*command, "--db", options->receiver.database, "PATH",
+            "Store into table logs of this database, which is created when missing");
+    AddText(*command, "--set-aside", options->receiver.setAside, "FILE",
+            "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
+    AddText(*command, "--notify-limit", options->notifyLimit, "N",
+            "Raise at most N notifications a minute for severity and as many for keyword rules (10)");
+    command->add_flag("-v,--verbose", options->verbose,
+                      "Write to the standard error, too, what goes to the system log");
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,129 @@
+// kelosyslog report: a page about the logs and events of a period.
+
+#include <unistd.h>
+
+#include <ctime>
+
+#include "base/errors.h"
+#include "base/replacement_file.h"
+#include "cli/exit_status.h"
+#include "commands/common_options.h"
+#include "read/accounting_source.h"
+#include "read/eps_series.h"
+#include "read/time_expression.h"
+#include "report/report_page.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "The page needs no network and no other file. Without --since and --until it covers all logs of the "
+    "database.\n\n"
+    "Examples:\n"
+    "  kelosyslog report today.html --since today\n"
+    "  kelosyslog report week.html --since 1w --events 500\n"
+    "  kelosyslog report old.html --db /volume1/archive.db\n\n"
+    "Exit status: 0 written, 2 usage, 3 database, 4 the file cannot be written.";
+
+constexpr size_t kTopDevices = 10;
+constexpr uint64_t kMaxEvents = 100000;
+
+struct Options {
+    LogSourceOptions source;
+    Selection selection;
+    std::string eventsDb;
+    std::string events = "100";
+    std::string target;
+    bool inUtc = false;
+};
+
+// The figures as far as they can be read: a report is worth having without them.
+AccountingFigures ReadAccounting(const std::string &path, const Period &period, const TimeGrid &grid) {
+    AccountingFigures figures;
+    if (access(path.c_str(), F_OK) != 0)
+        return figures;
+    try {
+        ReadEps(path, period.from, period.to, [&](const SYSLOG_LOG_EPS &sample) {
+            figures.peaks.resize(grid.count);
+            if (const std::optional<size_t> span = grid.Find(sample.stamp))
+                figures.peaks[*span] = std::max(figures.peaks[*span], sample.eps);
+        });
+        RequireHistogram(path);
+        figures.devices = SyslogDBHistGet(path, kTopDevices);
+    } catch (const DatabaseError &error) {
+        PrintMessage(std::string("no counts of the accounting: ") + error.what());
+    }
+    return figures;
+}
+
+// None where there is no event database, which a machine that only keeps archives does not have.
+std::optional<std::list<Event>> ReadEventsOf(const std::string &path, bool isNamed, const Period &period) {
+    if (!isNamed && access(path.c_str(), F_OK) != 0)
+        return std::nullopt;
+    std::list<Event> events = ReadEvents(path);
+    events.remove_if([&](const Event &event) { return event.time < period.from || event.time > period.to; });
+    return events;
+}
+
+void ReadReport(const Options &options, const std::string &root, Report &report) {
+    const LogSource source = ResolveLogSource(options.source, root);
+    if (source.kind != TableKind::Logs)
+        throw UsageError("--log: reports are about table logs only, not about '" + options.source.log + "'");
+    std::optional<int64_t> since;
+    if (!options.selection.since.empty())
+        since = ParseTimeExpression("--since", options.selection.since, report.now).seconds;
+    const std::optional<int64_t> until = LastSecond(options.selection, report.now);
+    if (since.value_or(0) > until.value_or(since.value_or(0)))
+        throw UsageError("--until: '" + options.selection.until + "' is before --since");
+
+    report.logDatabase = source.path;
+    const std::optional<Period> period = LogPeriod(source, since, until);
+    const bool isWhole = !since && !until;
+    report.period = period.value_or(Period{since.value_or(0), until.value_or(report.now)});
+    // Events go on after the last log.
+    if (!until)
+        report.period.to = std::max(report.period.to, std::min(report.now, report.period.to + 86400));
+    if (report.period.from > report.period.to)
+        report.period.to = report.now;
+    if (period && report.period.from <= report.period.to)
+        report.logs = ReadLogFigures(source, report.period, isWhole, kTopDevices);
+    report.eventDatabase = EventDatabasePath(options.eventsDb, root);
+    report.events = ReadEventsOf(report.eventDatabase, !options.eventsDb.empty(), report.period);
+    report.accounting = ReadAccounting(AccountingPath("", root), report.period, report.logs.grid);
+}
+
+int Run(const Options &options, const std::string &root) {
+    ApplyUtc(options.inUtc);
+    Report report;
+    report.mostEvents = ParseNumber("--events", options.events, 1, kMaxEvents);
+    report.now = std::time(nullptr);
+    report.program = "kelosyslog " KELOSYSLOG_VERSION;
+    ReadReport(options, root, report);
+    ReplacementFile file(options.target);
+    file.Write(RenderReport(report));
+    file.Commit();
+    return kExitFound;
+}
+
+} // namespace
+
+void AddReport(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command =
+        AddSubcommand(program, "report", "Write an HTML page about the logs and events of a period",
+                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddText(*command, "file", options->target, "FILE", "The page; replaced only by a whole one")->required();
+    const std::string group = "Which period";
+    AddText(*command, "-S,--since", options->selection.since, "TIME", "From this time on")->group(group);
+    AddText(*command, "-U,--until", options->selection.until, "TIME",
+            "Up to this second; a day alone ends before it begins")
+        ->group(group);
+    AddText(*command, "--events", options->events, "N", "List the newest N events (default: 100)");
+    AddUtcOption(*command, options->inUtc);
+    AddSourceOptions(*command, options->source, false);
+    AddText(*command, "--events-db", options->eventsDb, "PATH", "This event database, not the server's own")
+        ->group("Where to look");
+}
+
+} // namespace kelo::tool

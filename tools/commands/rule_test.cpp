@@ -1,0 +1,109 @@
+#include "commands/rule_test.h"
+
+#include "base/errors.h"
+#include "base/text_encoding.h"
+#include "cli/exit_status.h"
+#include "cli/program.h"
+#include "commands/rule_set.h"
+#include "print/output.h"
+#include "read/log_reader.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr uint64_t kDefaultLogs = 100;
+constexpr uint64_t kMaxLogs = 1'000'000;
+
+bool Fires(const _SYSLOG_NOTIFY_RULES_tag &rule, const RuleTestOptions &options) {
+    if (!rule.enable)
+        return false;
+    if (rule.type == kSeverityRule)
+        return options.hasSeverity && rule.pri >= options.severity;
+    if (rule.type == kEpsRule)
+        return options.hasEps && rule.eps <= options.eps;
+    return rule.type == kKeywordRule && !rule.pattern.empty() &&
+           options.text.find(rule.pattern) != std::string::npos;
+}
+
+// One line of the result: a rule, or what of a log it was, and what it fires for.
+void AppendLine(std::string &out, bool isJson, const std::string &name, const std::string &what) {
+    if (!isJson) {
+        out += VisibleText(name) + ": " + VisibleText(what) + "\n";
+        return;
+    }
+    out += out.empty() ? "[\n{\"name\":" : ",\n{\"name\":";
+    AppendJsonString(out, name);
+    out += ",\"fires_for\":";
+    AppendJsonString(out, what);
+    out += '}';
+}
+
+int Print(std::string text, bool isJson) {
+    const bool isEmpty = text.empty();
+    if (isJson)
+        text += isEmpty ? "[\n]\n" : "\n]\n";
+    Output output(true);
+    output.Write(text);
+    output.Finish();
+    return isEmpty ? kExitNothing : kExitFound;
+}
+
+// Checks a log and sends what is to be sent. Returns how many notifications could not be sent.
+int CheckLog(NotificationManager &manager, const _SYSLOG_LOG_DATA_tag &log, const RuleTestOptions &options,
+             bool isJson, std::string &out) {
+    int failures = 0;
+    if (manager.CheckSev(log.prio)) {
+        AppendLine(out, isJson, "severity " + PriorTypeToStr(log.prio), log.host + ": " + log.msg);
+        failures += options.mustNotify && manager.NotificationSendSev(log.host, log.prio, log) != 0 ? 1 : 0;
+    }
+    if (const std::string keyword = manager.CheckKeyword(log.msg); !keyword.empty()) {
+        AppendLine(out, isJson, "keyword " + keyword, log.host + ": " + log.msg);
+        failures +=
+            options.mustNotify && manager.NotificationSendKeyword(log.host, keyword, log) != 0 ? 1 : 0;
+    }
+    return failures;
+}
+
+int TestStoredLogs(const RuleTestOptions &options, bool isJson, const std::string &root) {
+    const LogSource source = ResolveLogSource(options.source, root);
+    if (source.kind != TableKind::Logs)
+        throw UsageError("--log: rules are tested on table logs only, not on '" + options.source.log + "'");
+    const uint64_t count =
+        options.lines.empty() ? kDefaultLogs : ParseNumber("--lines", options.lines, 1, kMaxLogs);
+    NotificationManager manager;
+    std::string out;
+    int failures = 0;
+    LogReader(source, {}).WalkPage({count, 0}, true, [&](const _SYSLOG_LOG_DATA_tag &log) {
+        failures += CheckLog(manager, log, options, isJson, out);
+    });
+    const int status = Print(std::move(out), isJson);
+    if (failures > 0)
+        throw DatabaseError(std::to_string(failures) +
+                            " notifications could not be sent; the system log tells why");
+    return status;
+}
+
+} // namespace
+
+int TestRules(const RuleTestOptions &options, const std::string &path, const std::string &root) {
+    const bool isJson = IsJson(options.format);
+    const RuleSet rules = LoadRules(path);
+    if (!rules.broken.empty())
+        PrintMessage(path + ": section [" + rules.broken +
+                     "] cannot be read; it and the rules after it are not in force");
+    const bool isGiven = options.hasSeverity || options.hasEps || !options.text.empty();
+    const bool namesLogs = options.mustNotify || !options.lines.empty() || !options.source.db.empty() ||
+                           !options.source.log.empty();
+    if (isGiven && namesLogs)
+        throw UsageError("rules test: --severity, --eps and --text go with no option about stored logs");
+    if (!isGiven)
+        return TestStoredLogs(options, isJson, root);
+    std::string out;
+    for (const _SYSLOG_NOTIFY_RULES_tag &rule : rules.rules) {
+        if (Fires(rule, options))
+            AppendLine(out, isJson, rule.name, DescribeRule(rule));
+    }
+    return Print(std::move(out), isJson);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,28 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "kelosyslog/records.h"
+#include "read/log_source.h"
+
+namespace kelo::tool {
+
+// What the rules are tested against; nothing for the newest stored logs.
+struct RuleTestOptions {
+    bool hasSeverity = false;
+    _SYSLOG_DB_PRIORITY_tag severity = SYSLOG_PRIO_EMERG;
+    bool hasEps = false;
+    uint64_t eps = 0;
+    std::string text;
+    LogSourceOptions source;
+    std::string lines;
+    bool mustNotify = false;
+    std::string format = "text";
+};
+
+// Prints the rules that fire, or the stored logs that a rule fires for, and sends their notifications where
+// that is wanted. Returns an ExitStatus: kExitNothing when no rule fires.
+int TestRules(const RuleTestOptions &options, const std::string &path, const std::string &root);
+
+} // namespace kelo::tool

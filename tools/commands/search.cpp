@@ -1,0 +1,116 @@
+// kelosyslog search: prints logs.
+
+#include <ctime>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "commands/common_options.h"
+#include "commands/follow.h"
+#include "read/log_reader.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "Logs are printed in the order in which they arrived, oldest first. Without -n all are printed;\n"
+    "-n takes the newest.\n\n"
+    "Examples:\n"
+    "  kelosyslog search -n 20                              the newest 20 logs\n"
+    "  kelosyslog search -p err --since yesterday           errors and worse since yesterday\n"
+    "  kelosyslog search -H 'nas*,!nas3' -g 'disk -smart'   all NAS but one, \"disk\" without \"smart\"\n"
+    "  kelosyslog search -p '!debug' -f                     follow, without debug logs\n"
+    "  kelosyslog search --log smbxfer -n 50 -r             the newest file transfers first\n"
+    "  kelosyslog search --since today -o csv > today.csv   everything of today, for a spreadsheet\n\n"
+    "Exit status: 0 found, 1 nothing matched, 2 usage, 3 database, 4 output.";
+
+// A page and its sum stay below what one statement can skip.
+constexpr uint64_t kMaxLines = 2000000000;
+
+struct Options {
+    LogSourceOptions source;
+    Selection selection;
+    OutputOptions output;
+    std::string lines;
+    std::string offset;
+    std::string idle;
+    bool newestFirst = false;
+    bool follow = false;
+};
+
+Page ParsePage(const Options &options) {
+    Page page;
+    if (!options.lines.empty() && options.lines != "all")
+        page.limit = ParseNumber("--lines", options.lines, 1, kMaxLines);
+    if (!options.offset.empty())
+        page.offset = ParseNumber("--offset", options.offset, 0, kMaxLines);
+    return page;
+}
+
+FollowOptions ParseFollow(const Options &options, int64_t now) {
+    if (options.newestFirst || !options.offset.empty())
+        throw UsageError("--follow: goes neither with --reverse nor with --offset");
+    FollowOptions follow;
+    follow.showAll = options.lines == "all" || (options.lines.empty() && !options.selection.since.empty());
+    if (!options.lines.empty() && options.lines != "all")
+        follow.lines = ParseNumber("--lines", options.lines, 0, kMaxLines);
+    if (!options.idle.empty())
+        follow.idleSec = ParseNumber("--idle", options.idle, 0, kMaxLines);
+    follow.until = LastSecond(options.selection, now);
+    return follow;
+}
+
+int Run(const Options &options, const std::string &root) {
+    ApplyUtc(options.output.inUtc);
+    const int64_t now = std::time(nullptr);
+    if (!options.follow && !options.idle.empty())
+        throw UsageError("--idle: only together with --follow");
+    const Page page = options.follow ? Page{} : ParsePage(options);
+    const FollowOptions follow = options.follow ? ParseFollow(options, now) : FollowOptions{};
+    const LogSource source = ResolveLogSource(options.source, root);
+    const RecordLayout layout = MakeLayout(options.output, source.kind);
+    const LogReader reader(source, MakeConditions(options.selection, source, now));
+
+    Output output(!options.follow && !options.output.noPager);
+    const std::unique_ptr<RecordWriter> writer = MakeRecordWriter(layout);
+    std::string text;
+    const auto send = [&] {
+        output.Write(text);
+        text.clear();
+    };
+    writer->Begin(text);
+    const auto print = [&](const _SYSLOG_LOG_DATA_tag &log) {
+        writer->Add(log, text);
+        send();
+    };
+    const uint64_t count = options.follow ? Follow(reader, follow, print, output)
+                                          : reader.WalkPage(page, !options.newestFirst, print);
+    writer->End(text);
+    send();
+    output.Finish();
+    return count > 0 ? kExitFound : kExitNothing;
+}
+
+} // namespace
+
+void AddSearch(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command = AddSubcommand(program, "search", "Print logs",
+                                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddSelectionOptions(*command, options->selection);
+    const std::string group = "How many";
+    AddText(*command, "-n,--lines", options->lines, "N", "The newest N logs, or 'all'")->group(group);
+    AddText(*command, "--offset", options->offset, "N", "Skip the N newest logs first")->group(group);
+    command->add_flag("-r,--reverse", options->newestFirst, "Newest first")->group(group);
+    command
+        ->add_flag("-f,--follow", options->follow,
+                   "Print the newest 10 logs (or -n; all with --since) and then what arrives, until --until "
+                   "has passed, --idle has, or nobody reads any more")
+        ->group(group);
+    AddText(*command, "--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")
+        ->group(group);
+    AddOutputOptions(*command, options->output);
+    AddSourceOptions(*command, options->source);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,230 @@
+// kelosyslog stats: what the accounting counted.
+
+#include <langinfo.h>
+
+#include <algorithm>
+#include <clocale>
+#include <cstring>
+#include <ctime>
+#include <limits>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "commands/common_options.h"
+#include "kelosyslog/dbutil.h"
+#include "print/statistics_table.h"
+#include "read/accounting_source.h"
+#include "read/eps_series.h"
+#include "read/time_expression.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "devices      logs per device since counting began, most first\n"
+    "device NAME  the same of one device\n"
+    "total        logs of all devices\n"
+    "eps          logs per second, minute or hour; the last day unless --since or --until is given\n\n"
+    "Examples:\n"
+    "  kelosyslog stats devices --top 10 --plot\n"
+    "  kelosyslog stats eps --by hour --since yesterday --plot\n"
+    "  kelosyslog stats eps --by second --since -10min --device nas1\n"
+    "  kelosyslog stats eps --by hour --per-device -o csv > hours.csv\n\n"
+    "Exit status: 0 found, 1 nothing was counted, 2 usage, 3 database, 4 output.";
+
+constexpr int64_t kDay = 24 * 60 * 60;
+
+struct Options {
+    std::string what;
+    std::string name; // of "device NAME"
+    std::string db;
+    std::string top;
+    Selection period; // only its bounds are used
+    std::string interval = "minute";
+    std::string device;
+    std::string format = "text";
+    bool perDevice = false;
+    bool plot = false;
+    bool noHeader = false;
+    bool inUtc = false;
+};
+
+// What is printed, and the column that a plot draws.
+struct Answer {
+    StatisticsTable table;
+    size_t bar;
+};
+
+std::string Rounded(double number) {
+    char text[64];
+    std::snprintf(text, sizeof text, "%.2f", number);
+    return text;
+}
+
+Answer Devices(const std::string &path, const Options &options) {
+    const uint64_t top =
+        options.top.empty() ? 0 : ParseNumber("--top", options.top, 1, std::numeric_limits<int32_t>::max());
+    RequireHistogram(path);
+    const std::map<std::string, uint64_t> counts = SyslogDBHistGet(path, static_cast<int>(top));
+    std::vector<std::pair<std::string, uint64_t>> devices(counts.begin(), counts.end());
+    std::stable_sort(devices.begin(), devices.end(),
+                     [](const auto &one, const auto &other) { return one.second > other.second; });
+    const auto total = static_cast<double>(SyslogDBHistTotalGet(path));
+    StatisticsTable table({{"device", false}, {"count", true}, {"percent", true}});
+    for (const auto &[device, count] : devices) {
+        const double part = total > 0 ? 100 * static_cast<double>(count) / total : 0;
+        table.Add({device, std::to_string(count), Rounded(part)});
+    }
+    return {table, 1};
+}
+
+Answer Device(const std::string &path, const Options &options) {
+    RequireHistogram(path);
+    std::string quoted;
+    for (const char byte : options.name)
+        quoted.append(byte == '\'' ? 2 : 1, byte);
+    StatisticsTable table({{"device", false}, {"count", true}});
+    if (const uint64_t count = SyslogDBHistGetSingle(path, quoted); count > 0)
+        table.Add({options.name, std::to_string(count)});
+    return {table, 1};
+}
+
+Answer Total(const std::string &path, const Options &) {
+    RequireHistogram(path);
+    StatisticsTable table({{"count", true}, {"devices", true}});
+    if (const uint64_t total = SyslogDBHistTotalGet(path); total > 0)
+        table.Add({std::to_string(total), std::to_string(SyslogDBHistGet(path, 0).size())});
+    return {table, 0};
+}
+
+EpsSeries ReadSeries(const std::string &path, const Options &options) {
+    const int64_t now = std::time(nullptr);
+    const Selection &period = options.period;
+    const int64_t until = LastSecond(period, now).value_or(std::numeric_limits<int64_t>::max());
+    int64_t since = 0;
+    if (!period.since.empty())
+        since = ParseTimeExpression("--since", period.since, now).seconds;
+    else if (period.until.empty())
+        since = now - kDay;
+    EpsSeries series(ParseEpsInterval(options.interval),
+                     options.device.empty() ? std::nullopt : std::optional(options.device));
+    ReadEps(path, since, until, [&](const SYSLOG_LOG_EPS &sample) { series.Add(sample); });
+    return series;
+}
+
+// In a plot the intervals without logs show as well: each one of a short gap, and a long one as one line.
+void AddGap(StatisticsTable &table, int64_t from, int64_t to, const EpsSeries &series,
+            const TimeFormat &time) {
+    constexpr int64_t kLongest = 5;
+    const int64_t missing = (to - from) / series.Seconds();
+    if (missing > kLongest)
+        table.Add({"...", "0", "0.00", "0"});
+    else
+        for (int64_t start = from; start < to; start += series.Seconds())
+            table.Add({time.Plain(start), "0", "0.00", "0"});
+}
+
+Answer EpsByDevice(const EpsSeries &series, const Options &options, const TimeFormat &time) {
+    const bool isText = options.format == "text";
+    StatisticsTable table({{"time", false}, {"device", false}, {"count", true}, {"eps", true}});
+    for (const auto &[start, bucket] : series.Buckets()) {
+        for (const auto &[device, logs] : bucket.devices)
+            table.Add({isText ? time.Plain(start) : time.Iso(start), device, std::to_string(logs),
+                       Rounded(series.PerSecond(logs))});
+    }
+    return {table, 2};
+}
+
+Answer Eps(const std::string &path, const Options &options) {
+    const EpsSeries series = ReadSeries(path, options);
+    const TimeFormat time(options.inUtc);
+    if (options.perDevice)
+        return EpsByDevice(series, options, time);
+    const bool isText = options.format == "text";
+    StatisticsTable table({{"time", false}, {"count", true}, {"eps", true}, {"peak", true}});
+    int64_t expected = series.Buckets().empty() ? 0 : series.Buckets().begin()->first;
+    for (const auto &[start, bucket] : series.Buckets()) {
+        if (options.plot && start > expected)
+            AddGap(table, expected, start, series, time);
+        expected = start + series.Seconds();
+        table.Add({isText ? time.Plain(start) : time.Iso(start), std::to_string(bucket.logs),
+                   Rounded(series.PerSecond(bucket.logs)), std::to_string(bucket.peak)});
+    }
+    return {table, 1};
+}
+
+struct Question {
+    const char *what;
+    Answer (*ask)(const std::string &path, const Options &options);
+};
+constexpr Question kQuestions[] = {{"devices", Devices}, {"device", Device}, {"total", Total}, {"eps", Eps}};
+
+const Question &QuestionOf(const Options &options) {
+    for (const Question &question : kQuestions) {
+        if (options.what == question.what)
+            return question;
+    }
+    throw UsageError("stats: '" + options.what + "' is none of devices, device, total, eps");
+}
+
+// Refuses an option that would silently do nothing.
+void RequireSense(const Options &options, OutputFormat format) {
+    const bool isEps = options.what == "eps";
+    const auto belongsTo = [](const char *option, bool isGiven, bool fits, const char *what) {
+        if (isGiven && !fits)
+            throw UsageError(std::string(option) + ": goes with 'stats " + what + "' only");
+    };
+    belongsTo("--top", !options.top.empty(), options.what == "devices", "devices");
+    belongsTo("--since", !options.period.since.empty(), isEps, "eps");
+    belongsTo("--until", !options.period.until.empty(), isEps, "eps");
+    belongsTo("--device", !options.device.empty(), isEps, "eps");
+    belongsTo("--per-device", options.perDevice, isEps, "eps");
+    belongsTo("NAME", !options.name.empty(), options.what == "device", "device");
+    if (options.what == "device" && options.name.empty())
+        throw UsageError("stats device: the name of a device is missing");
+    if (format == OutputFormat::Short)
+        throw UsageError("--output: statistics have no form 'short'; forms are text, json, jsonl, csv");
+    if (options.plot && format != OutputFormat::Text)
+        throw UsageError("--plot: is text and goes with no other --output");
+}
+
+int Run(const Options &options, const std::string &root) {
+    const Question &question = QuestionOf(options);
+    const OutputFormat format = ParseOutputFormat(options.format);
+    RequireSense(options, format);
+    ApplyUtc(options.inUtc);
+    std::setlocale(LC_CTYPE, "");
+    const bool inUnicode = std::strcmp(nl_langinfo(CODESET), "UTF-8") == 0;
+    std::setlocale(LC_CTYPE, "C");
+    const auto [table, bar] = question.ask(AccountingPath(options.db, root), options);
+    Output output(true);
+    output.Write(options.plot ? table.Plot(bar, OutputWidth(), !options.noHeader, inUnicode)
+                              : table.Write(format, !options.noHeader));
+    output.Finish();
+    return table.IsEmpty() ? kExitNothing : kExitFound;
+}
+
+} // namespace
+
+void AddStats(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command = AddSubcommand(program, "stats", "Print how many logs were received",
+                                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddText(*command, "what", options->what, "", "devices, device, total or eps")->required();
+    AddText(*command, "name", options->name, "", "The device of 'stats device'");
+    AddText(*command, "--top", options->top, "N", "devices: the N that sent most");
+    AddText(*command, "-S,--since", options->period.since, "TIME", "eps: from this time on");
+    AddText(*command, "-U,--until", options->period.until, "TIME",
+            "eps: up to this second; a day alone ends before it begins");
+    AddText(*command, "--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour");
+    AddText(*command, "--device", options->device, "NAME", "eps: only of this device");
+    command->add_flag("--per-device", options->perDevice, "eps: a row for each device");
+    command->add_flag("--plot", options->plot, "Draw the counts as bars");
+    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv");
+    command->add_flag("--no-header", options->noHeader, "No heading in text and csv");
+    AddUtcOption(*command, options->inUtc);
+    AddText(*command, "--db", options->db, "PATH", "This accounting database");
+}
+
+} // namespace kelo::tool

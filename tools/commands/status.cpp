@@ -1,0 +1,100 @@
+// kelosyslog status: tells whether the log server is well.
+
+#include <unistd.h>
+
+#include "base/errors.h"
+#include "cli/exit_status.h"
+#include "cli/program.h"
+#include "print/output.h"
+#include "print/record_writer.h"
+#include "print/statistics_table.h"
+#include "status/server_status.h"
+#include "status/status_json.h"
+#include "status/status_screen.h"
+#include "status/watch.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter =
+    "What needs attention stands first: syslog-ng that does not run or dropped messages, a receiver that "
+    "died or waits, a database that is damaged, locked or was put aside, notifications that were given up "
+    "or wait for long, a channel that fails, a volume with less than a tenth free.\n\n"
+    "Examples:\n"
+    "  kelosyslog status\n"
+    "  kelosyslog status --watch 5        every 5 seconds, until q is typed\n"
+    "  kelosyslog status -o json | jq .attention\n\n"
+    "Exit status: 0 all is well, 1 something needs attention, 2 usage, 4 output.";
+
+constexpr uint64_t kLongestPauseSec = 86400;
+constexpr const char *kUsualPause = "2";
+
+struct Options {
+    std::string control;
+    std::string format = "text";
+    std::string colour = "auto";
+    std::string pause;
+    bool mustWatch = false;
+};
+
+bool IsJson(const std::string &format) {
+    const OutputFormat parsed = ParseOutputFormat(format);
+    if (parsed != OutputFormat::Text && parsed != OutputFormat::Json)
+        throw UsageError("--output: there is no form '" + format + "' of this; forms are text, json");
+    return parsed == OutputFormat::Json;
+}
+
+int Run(const Options &options, const std::string &root) {
+    const bool isJson = IsJson(options.format);
+    const bool hasColour = WantsColour(ParseColourMode(options.colour));
+    const uint64_t pause = options.mustWatch ? ParseNumber("--watch", options.pause, 1, kLongestPauseSec) : 0;
+    StatusOptions question;
+    question.root = root;
+    question.control = options.control;
+    int result = kExitFound;
+    const auto draw = [&](size_t height) {
+        const ServerStatus status = GatherStatus(question);
+        result = status.attention.empty() ? kExitFound : kExitNothing;
+        const size_t width = isatty(STDOUT_FILENO) == 1 ? OutputWidth() : 0;
+        return isJson ? StatusJson(status) : RenderStatus(status, {width, height, hasColour});
+    };
+    if (options.mustWatch) {
+        Watch({std::chrono::seconds(pause), !isJson, isJson ? "" : "\n"}, draw);
+        return result;
+    }
+    Output output(false);
+    output.Write(draw(0));
+    output.Finish();
+    return result;
+}
+
+// "--watch" goes with and without a number.
+void AddWatch(CLI::App &command, Options &options) {
+    const auto take = [&options](const CLI::results_t &results) {
+        options.mustWatch = true;
+        options.pause = results.empty() || results.back().empty() ? kUsualPause : results.back();
+        return true;
+    };
+    command
+        .add_option("--watch", take,
+                    std::string("Show it anew every so many seconds (default ") + kUsualPause + ")")
+        ->type_name("[SECONDS]")
+        ->expected(0, 1);
+}
+
+} // namespace
+
+void AddStatus(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command = AddSubcommand(program, "status", "Tell whether the log server is well",
+                                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddWatch(*command, *options);
+    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default) or json (one object)");
+    AddText(*command, "--color", options->colour, "WHEN",
+            "auto (default: on a terminal, unless NO_COLOR is set), always, never");
+    AddText(*command, "--control", options->control, "PATH",
+            "This control socket of syslog-ng, not /var/lib/syslog-ng/syslog-ng.ctl");
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,112 @@
+// kelosyslog values: prints the distinct values of a column.
+
+#include <algorithm>
+
+#include "base/errors.h"
+#include "base/text_encoding.h"
+#include "cli/exit_status.h"
+#include "commands/common_options.h"
+#include "kelosyslog/dbutil.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kFooter = "Examples:\n"
+                                "  kelosyslog values host\n"
+                                "  kelosyslog values prog -o json\n"
+                                "  kelosyslog values ldate -n 10 --offset 20\n\n"
+                                "Exit status: 0 found, 1 the table is empty, 2 usage, 3 database, 4 output.";
+
+constexpr uint64_t kMaxRows = 4294967295; // what the library passes on
+
+struct Options {
+    LogSourceOptions source;
+    std::string attribute;
+    std::string format = "text";
+    std::string lines;
+    std::string offset;
+    bool noHeader = false;
+};
+
+// The columns of table "logs", which is the only one that is asked.
+void RequireAttribute(const std::string &name) {
+    std::string names;
+    for (int32_t i = SYSLOG_ATTRI_ID; i <= SYSLOG_ATTRI_MSG; ++i) {
+        const char *column = LogAttriStrGet(static_cast<_SYSLOG_DB_ATTRI_tag>(i));
+        if (name == column)
+            return;
+        names += (i == 0 ? "" : ", ") + std::string(column);
+    }
+    throw UsageError("values: '" + name + "' is no attribute; attributes are " + names);
+}
+
+std::list<std::string> ReadValues(const Options &options, const LogSource &source) {
+    _SYSLOG_SQL_LIMIT_tag limit;
+    if (!options.lines.empty())
+        limit.limit = ParseNumber("--lines", options.lines, 1, kMaxRows);
+    if (!options.offset.empty())
+        limit.offset = ParseNumber("--offset", options.offset, 0, kMaxRows);
+    const bool isLimited = !options.lines.empty() || !options.offset.empty();
+    std::list<std::string> values;
+    if (SyslogDBAttriValueGet(source.path, options.attribute, isLimited ? &limit : nullptr, values) != 0)
+        throw DatabaseError(DescribeDatabaseProblem(source));
+    return values;
+}
+
+void Print(const std::list<std::string> &values, const Options &options, OutputFormat format,
+           Output &output) {
+    const bool isArray = format == OutputFormat::Json;
+    if (format == OutputFormat::Csv && !options.noHeader)
+        output.Write(options.attribute + "\r\n");
+    const char *separator = isArray ? "[\n" : "";
+    for (const std::string &value : values) {
+        std::string text = separator;
+        separator = isArray ? ",\n" : "";
+        if (format == OutputFormat::Csv)
+            AppendCsvLine(text, {value});
+        else if (format == OutputFormat::Text)
+            text += VisibleText(value) + "\n";
+        else
+            AppendJsonString(text, value);
+        if (format == OutputFormat::Jsonl)
+            text += '\n';
+        output.Write(text);
+    }
+    if (isArray)
+        output.Write(values.empty() ? "[\n]\n" : "\n]\n");
+    output.Finish();
+}
+
+int Run(const Options &options, const std::string &root) {
+    RequireAttribute(options.attribute);
+    const OutputFormat format = ParseOutputFormat(options.format);
+    if (format == OutputFormat::Short)
+        throw UsageError("--output: values have no form 'short'; forms are text, json, jsonl, csv");
+    const LogSource source = ResolveLogSource(options.source, root);
+    if (source.kind != TableKind::Logs)
+        throw UsageError("--log: values are known of table logs only, not of '" + options.source.log + "'");
+    const std::list<std::string> values = ReadValues(options, source);
+    Output output(true);
+    Print(values, options, format, output);
+    return values.empty() ? kExitNothing : kExitFound;
+}
+
+} // namespace
+
+void AddValues(Program &program) {
+    auto options = std::make_shared<Options>();
+    CLI::App *command =
+        AddSubcommand(program, "values", "Print the distinct values of a column of table logs",
+                      [options, &program] { return Run(*options, program.root); });
+    command->footer(kFooter);
+    AddText(*command, "attribute", options->attribute, "",
+            "host, ip, fac, prio, llevel, tag, utcsec, tzoffset, ldate, ltime, prog, msg or id")
+        ->required();
+    AddText(*command, "-n,--lines", options->lines, "N", "The first N values");
+    AddText(*command, "--offset", options->offset, "N", "Skip N values first");
+    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv");
+    command->add_flag("--no-header", options->noHeader, "No heading in csv");
+    AddSourceOptions(*command, options->source, false);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,128 @@
+#include "print/event_log.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <filesystem>
+
+#include "base/errors.h"
+#include "read/level_selection.h"
+#include "read/log_message_capture.h"
+#include "read/log_source.h"
+#include "read/time_expression.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr int kWorstLevel = 2;
+
+struct LevelWord {
+    const char *word;
+    int level;
+};
+constexpr std::array<LevelWord, 9> kLevelWords = {{{"information", 0},
+                                                   {"info", 0},
+                                                   {"0", 0},
+                                                   {"warning", 1},
+                                                   {"warn", 1},
+                                                   {"1", 1},
+                                                   {"error", 2},
+                                                   {"err", 2},
+                                                   {"2", 2}}};
+
+int ParseEventLevel(const std::string &text) {
+    for (const LevelWord &known : kLevelWords) {
+        if (text == known.word)
+            return known.level;
+    }
+    throw UsageError("--priority: '" + text +
+                     "' is no level of an event; levels are information, warning, error");
+}
+
+std::vector<int> ParseEventLevels(const std::vector<std::string> &values) {
+    const ValueSelection split = SplitValues("--priority", values);
+    std::vector<int> levels;
+    for (const std::string &value : split.included)
+        levels.push_back(ParseEventLevel(value));
+    if (levels.size() == 1) {
+        for (int level = levels.front() + 1; level <= kWorstLevel; ++level)
+            levels.push_back(level);
+    }
+    if (levels.empty() && !split.excluded.empty())
+        levels = {0, 1, kWorstLevel};
+    for (const std::string &value : split.excluded)
+        std::erase(levels, ParseEventLevel(value));
+    if (levels.empty() && !values.empty())
+        throw UsageError("--priority: every level is excluded");
+    return levels;
+}
+
+// An event travels as a log: its level's name as `tag`, its user and text under their own names.
+constexpr std::array<RecordField, 4> kEventFields = {{
+    {"id", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.id); }},
+    {"level", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.tag; }},
+    {"user", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.luser; }},
+    {"event", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.event; }},
+}};
+
+} // namespace
+
+std::string EventDatabasePath(const std::string &db, const std::string &root) {
+    return db.empty() ? root + "/usr/kelo/etc/kelosyslog.db" : std::filesystem::absolute(db).string();
+}
+
+void FailEventDatabase(const std::string &path, bool forWriting) {
+    throw DatabaseError(DescribeDatabaseProblem({path, "log"}, forWriting));
+}
+
+std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
+    if (access(path.c_str(), R_OK) != 0) // the library would create a missing one
+        FailEventDatabase(path);
+    const LogMessageCapture messages;
+    std::list<Event> events = Logger().LogEnum(path, offset, limit);
+    if (events.empty() && !messages.FirstLine().empty())
+        FailEventDatabase(path);
+    return events;
+}
+
+bool EventSelection::Matches(const Event &event) const {
+    return event.time >= since && event.time <= until &&
+           (levels.empty() || std::find(levels.begin(), levels.end(), event.level) != levels.end());
+}
+
+EventSelection ParseEventSelection(const Selection &selection, int64_t now) {
+    EventSelection events;
+    if (!selection.since.empty())
+        events.since = ParseTimeExpression("--since", selection.since, now).seconds;
+    events.until = LastSecond(selection, now).value_or(events.until);
+    events.levels = ParseEventLevels(selection.levels);
+    return events;
+}
+
+std::string EventLevelName(int level) {
+    const std::string name = strLevelGet(level);
+    return name.empty() ? std::to_string(level) : name;
+}
+
+_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event) {
+    constexpr _SYSLOG_DB_PRIORITY_tag kColours[] = {SYSLOG_PRIO_INFO, SYSLOG_PRIO_WARNING, SYSLOG_PRIO_ERR};
+    _SYSLOG_LOG_DATA_tag log;
+    log.id = static_cast<uint64_t>(event.id);
+    log.utcsec = event.time;
+    log.prio = kColours[event.level >= 0 && event.level <= kWorstLevel ? event.level : 0];
+    log.tag = EventLevelName(event.level);
+    log.luser = event.user;
+    log.event = event.event;
+    return log;
+}
+
+RecordFields EventFields() {
+    RecordFields fields;
+    for (const RecordField &field : kEventFields)
+        fields.push_back(&field);
+    fields.insert(fields.begin() + 1, ParseFields("time", TableKind::Logs).front());
+    return fields;
+}
+
+} // namespace kelo::tool

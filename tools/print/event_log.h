@@ -1,0 +1,48 @@
+#pragma once
+
+#include <cstdint>
+#include <limits>
+#include <list>
+#include <string>
+#include <vector>
+
+#include "kelosyslog/logger.h"
+#include "print/record_fields.h"
+#include "read/selection.h"
+
+namespace kelo::tool {
+
+using Event = _SSYSLOG_LOG_LOG_tag;
+
+// The server's own event database below `root`, or `db` where that is not empty, as an absolute path.
+std::string EventDatabasePath(const std::string &db, const std::string &root);
+
+// The events of a database, newest first: `limit` of them after `offset`, or all from the first for a limit
+// of 0. Throws DatabaseError when it cannot be read; a missing one is not created.
+std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit = 0);
+
+// Throws DatabaseError that tells why the event database at `path` cannot be read, or changed.
+[[noreturn]] void FailEventDatabase(const std::string &path, bool forWriting = false);
+
+// Which events a command is about; both ends included.
+struct EventSelection {
+    int64_t since = std::numeric_limits<int64_t>::min(); // seconds since the epoch
+    int64_t until = std::numeric_limits<int64_t>::max();
+    std::vector<int> levels; // none for all
+
+    bool Matches(const Event &event) const;
+};
+
+// Reads --since, --until and --priority of `selection`, the only ones that events know. Levels are
+// "information" (or info), "warning" (warn), "error" (err) or 0 to 2: a single one means it and all worse,
+// several mean each. Throws UsageError.
+EventSelection ParseEventSelection(const Selection &selection, int64_t now);
+
+// The name of an event's level, or its number where it has no name.
+std::string EventLevelName(int level);
+
+// An event in the shape that a RecordWriter prints with EventFields: id, time, level, user and event.
+_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event);
+RecordFields EventFields();
+
+} // namespace kelo::tool

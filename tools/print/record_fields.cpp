@@ -1,0 +1,109 @@
+#include "print/record_fields.h"
+
+#include <algorithm>
+#include <array>
+
+#include "base/errors.h"
+
+namespace kelo::tool {
+namespace {
+
+using Log = _SYSLOG_LOG_DATA_tag;
+
+constexpr unsigned Bit(TableKind kind) {
+    return 1U << static_cast<unsigned>(kind);
+}
+constexpr unsigned kLogs = Bit(TableKind::Logs);
+constexpr unsigned kSystem = Bit(TableKind::System);
+constexpr unsigned kTransfer = Bit(TableKind::Transfer);
+constexpr unsigned kAll = kLogs | kSystem | kTransfer;
+
+std::string LevelOf(const Log &log) {
+    return g_MappingSyslogPrior[log.prio];
+}
+
+// "llevel" of table "logs" says the same as "prio", which stands for both.
+constexpr std::array<RecordField, 21> kFields = {{
+    {"id", true, kAll, 0, [](const Log &log) { return std::to_string(log.id); }},
+    {"time", false, kAll, kAll, [](const Log &) { return std::string(); }},
+    {"utcsec", true, kLogs, 0, [](const Log &log) { return std::to_string(log.utcsec); }},
+    {"tzoffset", false, kLogs, 0, [](const Log &log) { return log.tzoffset; }},
+    {"ldate", false, kAll, 0, [](const Log &log) { return log.ldate; }},
+    {"ltime", false, kAll, 0, [](const Log &log) { return log.ltime; }},
+    {"prio", false, kLogs, kLogs, LevelOf},
+    {"llevel", false, kSystem, kSystem, LevelOf},
+    {"fac", false, kLogs, 0, [](const Log &log) { return log.fac; }},
+    {"tag", false, kLogs, 0, [](const Log &log) { return log.tag; }},
+    {"host", false, kAll, kAll, [](const Log &log) { return log.host; }},
+    {"ip", false, kLogs, 0, [](const Log &log) { return log.ip; }},
+    {"ip", false, kTransfer, kTransfer, [](const Log &log) { return log.xferip; }},
+    {"prog", false, kAll, kLogs | kSystem, [](const Log &log) { return log.prog; }},
+    {"luser", false, kSystem | kTransfer, kSystem | kTransfer, [](const Log &log) { return log.luser; }},
+    {"event", false, kTransfer, kTransfer, [](const Log &log) { return log.event; }},
+    {"isdir", true, kTransfer, 0, [](const Log &log) { return std::to_string(log.isdir); }},
+    {"fsize", false, kTransfer, kTransfer, [](const Log &log) { return log.fsize; }},
+    {"fname", false, kTransfer, kTransfer, [](const Log &log) { return log.fname; }},
+    {"msg", false, kLogs, kLogs, [](const Log &log) { return log.msg; }},
+    {"msg", false, kSystem, kSystem, [](const Log &log) { return log.event; }},
+}};
+
+RecordFields Choose(unsigned RecordField::*tables, TableKind kind) {
+    RecordFields fields;
+    for (const RecordField &field : kFields) {
+        if ((field.*tables & Bit(kind)) != 0)
+            fields.push_back(&field);
+    }
+    return fields;
+}
+
+const RecordField &FindField(const std::string &name, TableKind kind) {
+    const std::string known = name == "llevel" && kind == TableKind::Logs ? "prio" : name;
+    std::string names;
+    for (const RecordField *field : AllFields(kind)) {
+        if (field->name == known)
+            return *field;
+        names += (names.empty() ? "" : ", ") + std::string(field->name);
+    }
+    throw UsageError("--fields: unknown field '" + name + "'; fields are " + names);
+}
+
+} // namespace
+
+RecordFields AllFields(TableKind kind) {
+    return Choose(&RecordField::tables, kind);
+}
+
+RecordFields SummaryFields(TableKind kind) {
+    return Choose(&RecordField::summary, kind);
+}
+
+RecordFields ParseFields(const std::string &names, TableKind kind) {
+    RecordFields fields;
+    for (size_t begin = 0; begin <= names.size();) {
+        const size_t end = std::min(names.find(',', begin), names.size());
+        fields.push_back(&FindField(names.substr(begin, end - begin), kind));
+        begin = end + 1;
+    }
+    return fields;
+}
+
+bool IsTime(const RecordField &field) {
+    return &field == &kFields[1];
+}
+
+std::string RecordTime(const Log &log, TableKind kind, const TimeFormat &format,
+                       std::string (TimeFormat::*form)(int64_t) const) {
+    if (kind == TableKind::Logs)
+        return (format.*form)(log.utcsec);
+    std::string time = log.ldate + " " + log.ltime;
+    std::replace(time.begin(), time.end(), '/', '-');
+    return time;
+}
+
+std::string RecordMessage(const Log &log, TableKind kind) {
+    if (kind == TableKind::Transfer)
+        return log.luser + " (" + log.xferip + ") " + log.event + " " + log.fname + " " + log.fsize;
+    return kind == TableKind::System ? log.event : log.msg;
+}
+
+} // namespace kelo::tool

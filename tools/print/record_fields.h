@@ -1,0 +1,42 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "base/time_format.h"
+#include "kelosyslog/records.h"
+#include "read/log_source.h"
+
+namespace kelo::tool {
+
+// One thing that can be told about a log, under the name of its column. "time" is no column: it is `utcsec`
+// written out or, in tables without it, `ldate` and `ltime`.
+struct RecordField {
+    const char *name;
+    bool isNumber;
+    unsigned tables;  // bit per TableKind: the tables that have it
+    unsigned summary; // bit per TableKind: the tables for whose readable form it is chosen
+    std::string (*value)(const _SYSLOG_LOG_DATA_tag &log);
+};
+
+using RecordFields = std::vector<const RecordField *>;
+
+// All fields of a table, each thing once, or the few that people read.
+RecordFields AllFields(TableKind kind);
+RecordFields SummaryFields(TableKind kind);
+
+// The fields of a comma-separated list of names. Throws UsageError naming a name that the table does not
+// have.
+RecordFields ParseFields(const std::string &names, TableKind kind);
+
+// Whether the field is "time", whose text depends on the time zone and on the form (RecordTime).
+bool IsTime(const RecordField &field);
+
+// The time of a log: `local` of its `utcsec`, or its own `ldate` and `ltime` in a table without `utcsec`.
+std::string RecordTime(const _SYSLOG_LOG_DATA_tag &log, TableKind kind, const TimeFormat &format,
+                       std::string (TimeFormat::*form)(int64_t) const);
+
+// What people call the message: the text, or for a transfer what was done with which file.
+std::string RecordMessage(const _SYSLOG_LOG_DATA_tag &log, TableKind kind);
+
+} // namespace kelo::tool

@@ -1,0 +1,48 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "kelosyslog/records.h"
+#include "print/record_fields.h"
+
+namespace kelo::tool {
+
+enum class OutputFormat { Text, Short, Json, Jsonl, Csv };
+
+// The format of this name ("text", "short", "json", "jsonl", "csv"). Throws UsageError naming --output.
+OutputFormat ParseOutputFormat(const std::string &name);
+
+struct RecordLayout {
+    OutputFormat format = OutputFormat::Text;
+    TableKind kind = TableKind::Logs;
+    RecordFields fields; // empty for the format's own choice
+    bool hasHeader = true;
+    bool hasColour = false;
+    bool inUtc = false;
+};
+
+// Turns logs into text, one by one as they come:
+//
+//     text    columns under a heading, each as wide as its widest value so far; one line for a log
+//     short   "Jan 02 10:11:12 host program: message"
+//     json    one array of objects
+//     jsonl   one object on each line
+//     csv     RFC 4180 with a heading
+//
+// Text and short make control characters visible (VisibleText); JSON is valid whatever bytes a log holds; CSV
+// carries them unchanged.
+class RecordWriter {
+public:
+    virtual ~RecordWriter() = default;
+
+    // Each appends to `out`. Begin comes first and End last, also when there is no log.
+    virtual void Begin(std::string &) {}
+    virtual void Add(const _SYSLOG_LOG_DATA_tag &log, std::string &out) = 0;
+    virtual void End(std::string &) {}
+};
+
+std::unique_ptr<RecordWriter> MakeRecordWriter(RecordLayout layout);
+
+} // namespace kelo::tool

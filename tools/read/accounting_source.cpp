@@ -1,0 +1,36 @@
+#include "read/accounting_source.h"
+
+#include <cstdlib>
+#include <filesystem>
+
+#include "read/plain_database.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kPath = "/var/log/kelolog/.KELOACCOUNTDB";
+
+} // namespace
+
+std::string AccountingPath(const std::string &db, const std::string &root) {
+    return db.empty() ? root + kPath : std::filesystem::absolute(db).string();
+}
+
+void RequireHistogram(const std::string &path) {
+    PlainDatabase({path, "histogram"}).FirstRow("SELECT device, count FROM histogram LIMIT 1", {});
+}
+
+std::optional<StampRange> StoredStamps(const std::string &path, const StampRange &range) {
+    const std::string where =
+        " FROM eps WHERE stamp BETWEEN " + std::to_string(range.first) + " AND " + std::to_string(range.last);
+    // Each of the two has an end of the index to itself.
+    const std::string sql = "SELECT (SELECT min(stamp)" + where + ") AS first, (SELECT max(stamp)" + where +
+                            ") AS last, (SELECT device || eps FROM eps LIMIT 1) AS probe";
+    const auto ends = PlainDatabase({path, "eps"}).FirstRow(sql, {"first", "last"});
+    if (!ends || ends->front().empty())
+        return std::nullopt;
+    return StampRange{std::strtoll(ends->front().c_str(), nullptr, 10),
+                      std::strtoll(ends->back().c_str(), nullptr, 10)};
+}
+
+} // namespace kelo::tool

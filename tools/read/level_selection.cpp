@@ -1,0 +1,99 @@
+#include "read/level_selection.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <optional>
+
+#include "base/errors.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kOption = "--priority";
+// SQLite limits how deep an expression may be; every alternative adds a level.
+constexpr size_t kMaxValues = 500;
+
+constexpr std::array<const char *, 24> kFacilities = {
+    "kern",   "user",   "mail",     "daemon", "auth",   "syslog",   "lpr",     "news",
+    "uucp",   "cron",   "authpriv", "ftp",    "ntp",    "security", "console", "solaris-cron",
+    "local0", "local1", "local2",   "local3", "local4", "local5",   "local6",  "local7"};
+
+_SYSLOG_DB_PRIORITY_tag ParseLevel(const std::string &text, const std::string &whole) {
+    if (text.size() == 1 && text[0] >= '0' && text[0] <= '7')
+        return static_cast<_SYSLOG_DB_PRIORITY_tag>(text[0] - '0');
+    if (text == "error")
+        return SYSLOG_PRIO_ERR;
+    if (text == "warn")
+        return SYSLOG_PRIO_WARNING;
+    if (text == "panic")
+        return SYSLOG_PRIO_EMERG;
+    for (int32_t prio = SYSLOG_PRIO_EMERG; prio <= SYSLOG_PRIO_DEBUG; ++prio) {
+        if (text == g_MappingSyslogPrior[prio])
+            return static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+    }
+    throw UsageError(
+        std::string(kOption) + ": '" + whole +
+        "' is no level; levels are emerg, alert, crit, err, warning, notice, info, debug, 0 to 7, "
+        "or a range such as warning..emerg");
+}
+
+void AddRange(std::vector<_SYSLOG_DB_PRIORITY_tag> &levels, int32_t from, int32_t to) {
+    for (int32_t prio = std::min(from, to); prio <= std::max(from, to); ++prio) {
+        const auto level = static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+        if (std::find(levels.begin(), levels.end(), level) == levels.end())
+            levels.push_back(level);
+    }
+}
+
+void AddLevels(std::vector<_SYSLOG_DB_PRIORITY_tag> &levels, const std::string &value, bool withMoreSevere) {
+    const size_t dots = value.find("..");
+    if (dots != std::string::npos)
+        AddRange(levels, ParseLevel(value.substr(0, dots), value), ParseLevel(value.substr(dots + 2), value));
+    else if (const int32_t level = ParseLevel(value, value); withMoreSevere)
+        AddRange(levels, SYSLOG_PRIO_EMERG, level);
+    else
+        AddRange(levels, level, level);
+}
+
+} // namespace
+
+ValueSelection SplitValues(const std::string &option, const std::vector<std::string> &values) {
+    ValueSelection selection;
+    for (const std::string &value : values) {
+        size_t begin = 0;
+        while (begin <= value.size()) {
+            const size_t end = std::min(value.find(',', begin), value.size());
+            std::string piece = value.substr(begin, end - begin);
+            const bool isExcluded = piece.starts_with('!');
+            if (isExcluded)
+                piece.erase(0, 1);
+            if (piece.empty())
+                throw UsageError(option + ": '" + value + "' holds an empty value");
+            (isExcluded ? selection.excluded : selection.included).push_back(piece);
+            begin = end + 1;
+        }
+    }
+    if (selection.included.size() + selection.excluded.size() > kMaxValues)
+        throw UsageError(option + ": more than " + std::to_string(kMaxValues) + " values");
+    return selection;
+}
+
+LevelSelection ParseLevels(const std::vector<std::string> &values) {
+    const ValueSelection split = SplitValues(kOption, values);
+    LevelSelection levels;
+    for (const std::string &value : split.included)
+        AddLevels(levels.included, value, split.included.size() == 1);
+    for (const std::string &value : split.excluded)
+        AddLevels(levels.excluded, value, false);
+    return levels;
+}
+
+std::string FacilityName(const std::string &value) {
+    size_t number = 0;
+    const char *end = value.data() + value.size();
+    const auto [stop, error] = std::from_chars(value.data(), end, number);
+    return error == std::errc() && stop == end && number < kFacilities.size() ? kFacilities[number] : value;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,157 @@
+#include "read/log_reader.h"
+
+#include <algorithm>
+#include <exception>
+#include <limits>
+#include <vector>
+
+#include "base/errors.h"
+
+namespace kelo::tool {
+namespace {
+
+using Log = _SYSLOG_LOG_DATA_tag;
+
+constexpr uint64_t kChunkIds = 50000;
+// The largest page that is kept in memory.
+constexpr uint64_t kPageRows = 50000;
+// A count comes as an int; no range of this many ids can exceed it.
+constexpr uint64_t kCountableIds = std::numeric_limits<int32_t>::max();
+
+// Carries the handler's exception over the library, and remembers where the walk stands.
+struct Walker {
+    const LogHandler &handle;
+    uint64_t maxRows;
+    uint64_t rows = 0;
+    uint64_t lastId = 0;
+    std::exception_ptr exception = nullptr;
+
+    static int Take(Log &log, void *context) {
+        auto &walker = *static_cast<Walker *>(context);
+        try {
+            walker.handle(log);
+        } catch (...) {
+            walker.exception = std::current_exception();
+            return 1;
+        }
+        ++walker.rows;
+        walker.lastId = log.id;
+        return walker.rows == walker.maxRows ? 1 : 0;
+    }
+};
+
+} // namespace
+
+void AddRange(Conditions &conditions, const IdRange &range) {
+    conditions.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_GE, std::to_string(range.first), {}});
+    conditions.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_LE, std::to_string(range.last), {}});
+}
+
+LogReader::LogReader(LogSource source, Conditions conditions)
+    : source_(std::move(source)), conditions_(std::move(conditions)) {}
+
+// One statement.
+LogReader::Walked LogReader::Select(const IdRange &range, bool oldestFirst, const Page &page,
+                                    const LogHandler &handle) const {
+    Conditions conditions = conditions_;
+    AddRange(conditions, range);
+    _SYSLOG_SQL_LIMIT_tag limit{page.limit, page.offset};
+    _SYSLOG_SQL_ORDER_tag order{oldestFirst ? 1 : 0, SYSLOG_ATTRI_ID};
+    Walker walker{handle, page.limit};
+    const int status = SyslogDBSelectByTable(source_.path, source_.table, conditions, &limit, &order,
+                                             Walker::Take, &walker, false);
+    if (walker.exception != nullptr)
+        std::rethrow_exception(walker.exception);
+    if (status != 0)
+        throw DatabaseError(DescribeDatabaseProblem(source_));
+    return {walker.rows, walker.lastId};
+}
+
+uint64_t LogReader::IdFromNewest(uint64_t index) const {
+    return Select({}, false, {1, index}, [](const Log &) {}).lastId;
+}
+
+uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
+    if (range.first > range.last)
+        return 0;
+    const uint64_t id = Select(range, isFirst, {1, 0}, [](const Log &) {}).lastId;
+    if (id != 0 && (id < range.first || id > range.last)) // a walk from one to the next would never end
+        throw DatabaseError("cannot read " + source_.path + ": the ids of table " + source_.table +
+                            " are no row numbers");
+    return id;
+}
+
+uint64_t LogReader::Walk(const IdRange &range, bool oldestFirst, uint64_t limit,
+                         const LogHandler &handle) const {
+    IdRange rest = range;
+    uint64_t total = 0;
+    while (rest.first <= rest.last) {
+        const uint64_t span = std::min(kChunkIds - 1, rest.last - rest.first);
+        const IdRange chunk =
+            oldestFirst ? IdRange{rest.first, rest.first + span} : IdRange{rest.last - span, rest.last};
+        const uint64_t rows = Select(chunk, oldestFirst,
+                                     {limit == 0 ? kChunkIds : std::min(kChunkIds, limit - total), 0}, handle)
+                                  .rows;
+        total += rows;
+        if (limit != 0 && total == limit)
+            break;
+        (oldestFirst ? rest.first : rest.last) = oldestFirst ? chunk.last + 1 : chunk.first - 1;
+        if (rows > 0)
+            continue;
+        const uint64_t next = EndId(rest, oldestFirst); // over a gap, or to the next of rare matches
+        if (next == 0)
+            break;
+        (oldestFirst ? rest.first : rest.last) = next;
+    }
+    return total;
+}
+
+uint64_t LogReader::WalkPage(const Page &page, bool oldestFirst, const LogHandler &handle) const {
+    if (page.limit != 0 && page.limit <= kPageRows) {
+        std::vector<Log> logs;
+        Select({}, false, page, [&](const Log &log) { logs.push_back(log); });
+        if (oldestFirst)
+            std::reverse(logs.begin(), logs.end());
+        std::for_each(logs.begin(), logs.end(), handle);
+        return logs.size();
+    }
+    const uint64_t last = IdFromNewest(page.offset);
+    if (last == 0)
+        return 0;
+    if (!oldestFirst)
+        return Walk({1, last}, false, page.limit, handle);
+    // Too many to turn round in memory: find where the page begins and walk forward.
+    const uint64_t first = page.limit == 0 ? 1 : IdFromNewest(page.offset + page.limit - 1);
+    return Walk({std::max<uint64_t>(first, 1), last}, true, 0, handle);
+}
+
+uint64_t LogReader::CountWith(Conditions conditions) const {
+    // Always true, and not the text for which the library would answer with the largest id.
+    conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}});
+    const int count = SyslogDBSelectCountByTable(source_.path, source_.table, conditions, nullptr, nullptr);
+    if (count < 0)
+        throw DatabaseError(DescribeDatabaseProblem(source_));
+    return static_cast<uint64_t>(count);
+}
+
+uint64_t LogReader::CountIn(const IdRange &range) const {
+    Conditions conditions = conditions_;
+    AddRange(conditions, range);
+    return CountWith(conditions);
+}
+
+uint64_t LogReader::Count() const {
+    const LogReader everything(source_, {});
+    const uint64_t newest = everything.IdFromNewest(0);
+    if (newest <= kCountableIds)
+        return CountWith(conditions_);
+    uint64_t total = 0;
+    for (uint64_t next = everything.FirstId({}); next != 0 && next <= newest;) {
+        const IdRange range{next, next + kCountableIds - 1};
+        total += CountIn(range);
+        next = everything.FirstId({range.last + 1, newest});
+    }
+    return total;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,133 @@
+#include "read/log_source.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdint>
+#include <cstring>
+#include <filesystem>
+#include <string_view>
+
+#include "base/errors.h"
+#include "kelosyslog/records.h"
+
+namespace kelo::tool {
+namespace {
+
+constexpr const char *kWorkingLog = "logs";
+constexpr const char *kWorkingLogPath = "/var/log/kelolog/logs.db";
+constexpr size_t kHeaderSize = 100;
+using Header = std::array<uint8_t, kHeaderSize>;
+
+TableKind KindOf(const std::string &table) {
+    if (table == "logs")
+        return TableKind::Logs;
+    if (table == "general_log" || table == "connection_log")
+        return TableKind::System;
+    if (table == "transfer_log")
+        return TableKind::Transfer;
+    throw UsageError("--table: '" + table +
+                     "' is no log table; tables are logs, general_log, connection_log, transfer_log");
+}
+
+// The header at the front of a file; the number of bytes that were there, or -1 with errno set.
+ssize_t ReadHeader(const std::string &path, Header &header) {
+    // Not blocking: the path may name a pipe.
+    const int file = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    if (file < 0)
+        return -1;
+    const ssize_t size = read(file, header.data(), header.size());
+    const int error = errno;
+    close(file);
+    errno = error;
+    return size;
+}
+
+bool IsShorterThanItSays(const Header &header, int64_t fileSize) {
+    const auto byte = [&](size_t i) { return static_cast<int64_t>(header[i]); };
+    const int64_t pageSize = (byte(16) << 8 | byte(17)) == 1 ? 65536 : byte(16) << 8 | byte(17);
+    const int64_t pages = byte(28) << 24 | byte(29) << 16 | byte(30) << 8 | byte(31);
+    return pages * pageSize > fileSize;
+}
+
+std::string ReasonFromOutside(const LogSource &source, bool forWriting) {
+    struct stat status {};
+    if (stat(source.path.c_str(), &status) != 0)
+        return errno == ENOENT ? "no such file" : std::strerror(errno);
+    if (S_ISDIR(status.st_mode))
+        return "it is a folder";
+    if (!S_ISREG(status.st_mode))
+        return "it is no regular file";
+    Header header{};
+    const ssize_t size = ReadHeader(source.path, header);
+    if (size < 0)
+        return std::strerror(errno);
+    if (size == 0)
+        return "the file is empty";
+    constexpr std::string_view kMagic("SQLite format 3\0", 16);
+    if (std::memcmp(header.data(), kMagic.data(), kMagic.size()) != 0)
+        return "it is not an SQLite database (or an encrypted one)";
+    if (size < static_cast<ssize_t>(kHeaderSize) || IsShorterThanItSays(header, status.st_size))
+        return "the file is cut short";
+    const std::string folder = std::filesystem::path(source.path).parent_path().string();
+    if (forWriting && (access(source.path.c_str(), W_OK) != 0 || access(folder.c_str(), W_OK) != 0))
+        return "no permission to write to it and its folder";
+    return "no usable table '" + source.table + "' in it, or it is locked or damaged; see the system log";
+}
+
+// Throws UsageError when there is no archive of this name.
+std::string ArchivePath(const std::string &name, const std::string &root) {
+    const std::string folder = ArchiveFolderPath(root);
+    const bool isPlain = name.find('/') == std::string::npos && name.front() != '.';
+    for (const char *suffix : {"", ".db"}) {
+        std::error_code error;
+        const std::string path = folder + "/" + name + suffix;
+        if (isPlain && std::filesystem::is_regular_file(path, error))
+            return path;
+    }
+    throw UsageError("--log: unknown log '" + name + "'; logs are " + KnownLogNames() +
+                     ", and the archives that 'kelosyslog archive --list' lists");
+}
+
+} // namespace
+
+LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root) {
+    if (!options.db.empty() && !options.log.empty())
+        throw UsageError("--log: goes not together with --db");
+    LogSource source;
+    if (!options.db.empty()) {
+        source.path = std::filesystem::absolute(options.db).string();
+    } else if (options.log.empty() || options.log == kWorkingLog) {
+        source.path = root + kWorkingLogPath;
+    } else {
+        const std::string path = XferlogDBPathGet(options.log.c_str());
+        source.path = path.empty() ? ArchivePath(options.log, root) : root + path;
+        if (!path.empty())
+            source.table = "transfer_log";
+    }
+    if (!options.table.empty())
+        source.table = options.table;
+    source.kind = KindOf(source.table);
+    return source;
+}
+
+std::string ArchiveFolderPath(const std::string &root) {
+    return root + "/var/log/kelolog/archive";
+}
+
+std::string KnownLogNames() {
+    std::string names = kWorkingLog;
+    for (int32_t i = 0; i < g_xferlog_info_count - 1; ++i)
+        names += std::string(", ") + g_xferlog_info[i].name;
+    return names;
+}
+
+std::string DescribeDatabaseProblem(const LogSource &source, bool forWriting) {
+    return std::string(forWriting ? "cannot change " : "cannot read ") + source.path + ": " +
+           ReasonFromOutside(source, forWriting);
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,56 @@
+#pragma once
+
+#include <chrono>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "base/errors.h"
+#include "read/log_source.h"
+
+struct DBConnect_tag;
+
+namespace kelo::tool {
+
+// A statement failed. The text has the path and SQLite's words.
+struct StatementError : DatabaseError {
+    StatementError(const std::string &text, int resultCode) : DatabaseError(text), code(resultCode) {}
+    int code; // SQLite's primary result code
+};
+
+// A connection that only tells what is wrong: unlike a DBHandler it creates no file and puts none aside.
+class PlainDatabase {
+public:
+    // Throws DatabaseError when the file cannot be opened.
+    explicit PlainDatabase(LogSource source);
+    // For who is in a hurry: a statement fails that waits for a lock, or works, for longer than `patience`
+    // (SQLITE_BUSY, SQLITE_INTERRUPT), and closing leaves the rows of a write-ahead log to others.
+    PlainDatabase(LogSource source, std::chrono::milliseconds patience);
+    PlainDatabase(const PlainDatabase &) = delete;
+    PlainDatabase &operator=(const PlainDatabase &) = delete;
+
+    // The values of these columns, of all rows or of the first; none without a row. NULL is "". These and the
+    // others throw StatementError.
+    using Row = std::vector<std::string>;
+    std::vector<Row> Rows(const std::string &sql, const std::vector<std::string> &columns) const;
+    std::optional<Row> FirstRow(const std::string &sql, const std::vector<std::string> &columns) const;
+    std::vector<std::string> Column(const std::string &sql, const std::string &column) const;
+    // The first row's column "value" as a number; 0 without one.
+    int64_t Number(const std::string &sql) const;
+    bool HasTable(const std::string &table) const;
+
+private:
+    struct Closer {
+        void operator()(DBConnect_tag *connection) const;
+    };
+    static int IsOverdue(void *database);
+
+    LogSource source_;
+    std::chrono::milliseconds patience_{0};
+    mutable std::chrono::steady_clock::time_point deadline_; // of the statement that runs
+    std::unique_ptr<DBConnect_tag, Closer> connection_;
+};
+
+} // namespace kelo::tool

@@ -1,0 +1,42 @@
+#pragma once
+
+#include <cstdint>
+#include <list>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "kelosyslog/dbutil.h"
+#include "read/log_source.h"
+
+namespace kelo::tool {
+
+// Which logs a command is about, as the user wrote it. Values of one option are alternatives, the options
+// together narrow the selection.
+struct Selection {
+    std::string since = {}; // "" for no bound
+    std::string until = {};
+    std::vector<std::string> levels = {};
+    std::vector<std::string> facilities = {};
+    std::vector<std::string> hosts = {};
+    std::vector<std::string> programs = {};
+    std::vector<std::string> keywords = {};
+};
+
+bool IsEmpty(const Selection &selection);
+
+// The last second that --until includes, if it was given: a day alone ends before it begins.
+std::optional<int64_t> LastSecond(const Selection &selection, int64_t now);
+
+// The conditions that select these logs in a table of this kind, to be ANDed; none for an empty selection.
+//
+// A host, program or facility that holds '*' or '?' is a pattern. What is excluded leaves rows without a
+// value in. Table "logs" is bounded by its `utcsec`; the others, which have none, by their `ldate` and
+// `ltime`, which are taken as local time.
+//
+// Throws UsageError for a value that cannot be read, a broken regular expression, and an option whose column
+// the table does not have.
+std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const Selection &selection, const LogSource &source,
+                                               int64_t now);
+
+} // namespace kelo::tool

@@ -1,0 +1,79 @@
+#include "receive/receiver_state.h"
+
+#include <filesystem>
+#include <system_error>
+
+#include "base/files.h"
+#include "base/json.h"
+
+namespace kelo::tool {
+namespace {
+
+Json::Value ToJson(const ReceiverState &state) {
+    Json::Value root;
+    root["version"] = 1;
+    root["pid"] = Json::Int64{state.pid};
+    root["started"] = Json::Int64{state.started};
+    root["updated"] = Json::Int64{state.updated};
+    root["ended"] = Json::Int64{state.ended};
+    root["received"] = Json::UInt64{state.received};
+    root["incomplete"] = Json::objectValue;
+    for (const auto &[field, count] : state.incomplete)
+        root["incomplete"][field] = Json::UInt64{count};
+    root["rejected"] = Json::UInt64{state.rejected};
+    root["overlong"] = Json::UInt64{state.overlong};
+    root["stored"] = Json::UInt64{state.stored};
+    root["database"] = state.database;
+    root["suppressed"] = Json::UInt64{state.suppressed};
+    root["waiting"] = state.waiting;
+    root["eps"] = state.eps;
+    return root;
+}
+
+// Throws Json::Exception for values of other types.
+ReceiverState FromJson(const Json::Value &root) {
+    ReceiverState state;
+    state.pid = root["pid"].asInt64();
+    state.started = root["started"].asInt64();
+    state.updated = root["updated"].asInt64();
+    state.ended = root["ended"].asInt64();
+    state.received = root["received"].asUInt64();
+    const Json::Value &incomplete = root["incomplete"];
+    for (const std::string &field : incomplete.getMemberNames())
+        state.incomplete[field] = incomplete[field].asUInt64();
+    state.rejected = root["rejected"].asUInt64();
+    state.overlong = root["overlong"].asUInt64();
+    state.stored = root["stored"].asUInt64();
+    state.database = root["database"].asString();
+    state.suppressed = root["suppressed"].asUInt64();
+    state.waiting = root["waiting"].asString();
+    state.eps = root["eps"].asDouble();
+    return state;
+}
+
+} // namespace
+
+std::string ReceiverStatePath(const std::string &root) {
+    return root + "/run/kelosyslog/receive.json";
+}
+
+bool WriteReceiverState(const std::string &root, const ReceiverState &state) {
+    const std::string path = ReceiverStatePath(root);
+    std::error_code ignored; // the write fails then, and says why
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path(), ignored);
+    return WriteDurably(path + ".new", path, WriteJsonLine(ToJson(state)));
+}
+
+std::optional<ReceiverState> ReadReceiverState(const std::string &root) {
+    const std::optional<std::string> content = ReadWhole(ReceiverStatePath(root));
+    if (!content)
+        return std::nullopt;
+    try {
+        const ReceiverState state = FromJson(ParseJson(*content));
+        return state.pid > 0 ? std::optional(state) : std::nullopt;
+    } catch (const std::exception &) {
+        return std::nullopt;
+    }
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,71 @@
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <string>
+
+#include "kelosyslog/logparser.h"
+#include "store/line_reader.h"
+
+namespace kelo::tool {
+
+// Where the records of an import go.
+class RecordSink {
+public:
+    virtual ~RecordSink() = default;
+
+    // Takes a record, and may leave another's contents in `log`.
+    virtual void Take(_SYSLOG_LOG_DATA_tag &log) = 0;
+
+    // A line has been dealt with, whether or not it gave a record.
+    virtual void LineDone() {}
+
+    // The input pauses or ends: nothing that was taken may wait any longer.
+    virtual void Flush() = 0;
+
+    // Called before each read of the input, which it may delay; it ends the input by returning false.
+    virtual bool AwaitInput(const LineReader &reader) {
+        if (!reader.HasInput())
+            Flush();
+        return true;
+    }
+};
+
+// What became of the lines of an import. Empty lines are no lines.
+struct ImportCounts {
+    uint64_t parsed = 0;
+    uint64_t tooFewFields = 0;
+    uint64_t overlong = 0;
+    std::map<std::string, uint64_t> incomplete; // parsed, by the first mandatory field that is empty
+};
+
+// Turns the lines of an input into records: as LogParser does, but with an account of every line.
+class LogImport {
+public:
+    // Told of the reader's current line when it was rejected or is incomplete, and why.
+    using LineReport = std::function<void(const LineReader &reader, const std::string &reason)>;
+
+    // With `skipIncomplete`, records with an empty mandatory field do not reach the sink.
+    LogImport(LineReport report, bool skipIncomplete)
+        : report_(std::move(report)), skipIncomplete_(skipIncomplete) {}
+
+    // Imports all lines of one input. Throws what the reader and the sink throw.
+    void Run(LineReader &reader, RecordSink &sink);
+
+    const ImportCounts &Counts() const { return counts_; }
+
+private:
+    void ImportLine(const LineReader &reader, RecordSink &sink);
+    void Reject(const LineReader &reader);
+
+    LineReport report_;
+    bool skipIncomplete_;
+    ImportCounts counts_;
+    LogParser parser_;
+    // Used again for every line, so that their memory is.
+    std::string line_;
+    _SYSLOG_LOG_DATA_tag log_;
+};
+
+} // namespace kelo::tool
