@@ -47,7 +47,7 @@ std::string SpooledEntry(const std::string &root) {
 }
 
 // Writes `content` to a temporary file, syncs it, renames it into another folder and syncs that.
-void WriteDurably(const std::string &folder, const std::string &content) {
+void WriteFileAtomically(const std::string &folder, const std::string &content) {
     static int number = 0;
     const std::string name = "/" + std::to_string(number++);
     const int file = open((folder + "/tmp" + name).c_str(), O_WRONLY | O_CREAT | O_EXCL, 0640);
@@ -98,7 +98,7 @@ int main() {
     };
     const std::vector<double> times =
         MedianTimes({{"send", repeat([&] { CheckAndSend(manager, log); })},
-                     {"bare", repeat([&] { WriteDurably(folder.Path() + "/bare", entry); })}},
+                     {"bare", repeat([&] { WriteFileAtomically(folder.Path() + "/bare", entry); })}},
                     kRounds);
     PrintHeading("A log checked against " + std::to_string(kRules) + " rules and sent", "ms each");
     return PrintRatio("check and send", times[0] / kSends, "bare durable write", times[1] / kSends, 1.5) ? 0

@@ -1,7 +1,7 @@
 #include <cstdio>
 
 #include "common/report.h"
-#include "common/sz_handles.h"
+#include "common/string_map.h"
 #include "keloplatform/kelosystem.h"
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/notification.h"

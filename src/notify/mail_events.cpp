@@ -1,5 +1,5 @@
 #include "common/report.h"
-#include "common/sz_handles.h"
+#include "common/string_map.h"
 #include "kelosyslog/notification.h"
 #include "notify/service.h"
 

@@ -1,4 +1,4 @@
-#include "common/sz_handles.h"
+#include "common/string_map.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/notification.h"
 #include "kelosyslog/utils.h"

@@ -1,5 +1,5 @@
 #include "common/root.h"
-#include "common/sz_handles.h"
+#include "common/string_map.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/notification.h"
 

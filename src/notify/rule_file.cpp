@@ -2,7 +2,7 @@
 #include <cstring>
 
 #include "common/report.h"
-#include "common/sz_handles.h"
+#include "common/string_map.h"
 #include "kelosyslog/notification.h"
 #include "kelosyslog/utils.h"
 

@@ -135,7 +135,7 @@ protected:
 
     const Operation operation_ = std::get<0>(GetParam());
     const FaultSource source_ = std::get<1>(GetParam());
-    Ground ground_;
+    Fixture ground_;
 
 private:
     std::map<std::string, std::string> pristine_; // content by name
@@ -170,7 +170,7 @@ TEST(WritingOperation, IsOnDiskWhenItReturns) {
     for (const Operation &operation : Operations()) {
         if (!operation.writes)
             continue;
-        Ground ground;
+        Fixture ground;
         operation.setUp(ground);
         FileFaults::Start(FileFaults::Kind::kWrite, kAlways, 1);
         EXPECT_GE(operation.run(ground), 0);

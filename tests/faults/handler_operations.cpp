@@ -15,7 +15,8 @@ const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
 
 // A handler whose owner disconnects on every way out, as the handler asks for.
 struct Connected {
-    explicit Connected(const Ground &ground) : db(ground.root.File("logs.db"), kSchema), status(db.DBCon()) {}
+    explicit Connected(const Fixture &ground)
+        : db(ground.root.File("logs.db"), kSchema), status(db.DBCon()) {}
     ~Connected() { db.DBDiscon(); }
     Connected(const Connected &) = delete;
     Connected &operator=(const Connected &) = delete;
@@ -24,7 +25,7 @@ struct Connected {
     int status;
 };
 
-void SetUpArchive(Ground &ground) {
+void SetUpArchive(Fixture &ground) {
     NotifyCalls::Reset();
     SystemCalls::Reset();
     SyslogRootSet(ground.root.Path());
@@ -33,7 +34,7 @@ void SetUpArchive(Ground &ground) {
 }
 
 // Where the database is. SQLite takes some failing reads for damage, which puts it aside.
-std::string SoundDatabase(const Ground &ground, const Outcome &outcome) {
+std::string SoundDatabase(const Fixture &ground, const Outcome &outcome) {
     const std::string path = ground.root.File("logs.db");
     const std::string found = outcome.fault == "read" && !fs::exists(path) ? path + ".corrupt" : path;
     EXPECT_TRUE(fs::exists(found));
@@ -41,7 +42,7 @@ std::string SoundDatabase(const Ground &ground, const Outcome &outcome) {
     return found;
 }
 
-int Change(Ground &ground) {
+int Change(Fixture &ground) {
     Connected connected(ground);
     DBHandler &db = connected.db;
     if (connected.status != 0 || db.DBTranStart() != 0)
@@ -55,7 +56,7 @@ int Change(Ground &ground) {
     return db.DBWalCheckpoint(false);
 }
 
-void CheckChange(const Ground &ground, const Outcome &outcome) {
+void CheckChange(const Fixture &ground, const Outcome &outcome) {
     const std::string row =
         QueryText(SoundDatabase(ground, outcome), "SELECT device || start_time FROM db_info");
     if (outcome.IsDone())
@@ -65,18 +66,18 @@ void CheckChange(const Ground &ground, const Outcome &outcome) {
     EXPECT_TRUE(outcome.IsDone() || outcome.outOfMemory || !outcome.messages.empty());
 }
 
-void SetUpNothing(Ground &ground) {
+void SetUpNothing(Fixture &ground) {
     NotifyCalls::Reset();
     SystemCalls::Reset();
     SyslogRootSet(ground.root.Path());
 }
 
-int Create(Ground &ground) {
+int Create(Fixture &ground) {
     return DBHandler(ground.root.File("logs.db"), kSchema).DBCreate();
 }
 
 // Without write-ahead logging it is done too, and says so.
-void CheckCreation(const Ground &ground, const Outcome &outcome) {
+void CheckCreation(const Fixture &ground, const Outcome &outcome) {
     const std::string path = ground.root.File("logs.db");
     const auto hasLine = [&](const std::string &text) {
         return testing::Value(outcome.messages, Contains(HasSubstr(text)));
@@ -89,14 +90,14 @@ void CheckCreation(const Ground &ground, const Outcome &outcome) {
     EXPECT_EQ(QueryText(path, "PRAGMA journal_mode"), hasLine("Fail to set jounal mode") ? "delete" : "wal");
 }
 
-void SetUpDamaged(Ground &ground) {
+void SetUpDamaged(Fixture &ground) {
     SetUpNothing(ground);
     WriteFile(ground.root.File("logs.db"), "damaged");
     WriteFile(ground.root.File("logs.db-wal"), "companion");
     WriteFile(ground.root.File("logs.db.corrupt"), "an older one");
 }
 
-int Quarantine(Ground &ground) {
+int Quarantine(Fixture &ground) {
     {
         const FaultPause pause;
         NotifyCalls::Reset();
@@ -106,7 +107,7 @@ int Quarantine(Ground &ground) {
 }
 
 // The file is moved once and only after the administrator was told, and never lost.
-void CheckQuarantine(const Ground &ground, const Outcome &outcome) {
+void CheckQuarantine(const Fixture &ground, const Outcome &outcome) {
     const bool isMoved = ReadFile(ground.root.File("logs.db.corrupt")) == "damaged";
     EXPECT_TRUE(fs::exists(ground.root.File("logs.db-wal"))) << "the companions stay";
     EXPECT_NE(fs::exists(ground.root.File("logs.db")), isMoved);

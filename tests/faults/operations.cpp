@@ -22,25 +22,25 @@ Lines Ids(int first, int last) {
 
 // A database of kRows sample logs, the last two of them still in the write-ahead log, as a busy writer leaves
 // it.
-void SetUpLogs(Ground &ground) {
+void SetUpLogs(Fixture &ground) {
     ground.database = ground.root.File("logs.db");
     CreateLogDatabase(ground.database);
     InsertSampleLogs(ground.database, kRows - 2);
     InsertLogsIntoWal(ground.database, {SampleLog(kRows - 2), SampleLog(kRows - 1)});
 }
 
-void SetUpLogsOfHost3(Ground &ground) {
+void SetUpLogsOfHost3(Fixture &ground) {
     SetUpLogs(ground);
     ground.conditions = {kFromHost3};
 }
 
 int TakeId(_SYSLOG_LOG_DATA_tag &log, void *context) {
     const FaultPause pause;
-    static_cast<Ground *>(context)->seen.push_back(std::to_string(log.id));
+    static_cast<Fixture *>(context)->seen.push_back(std::to_string(log.id));
     return 0;
 }
 
-int TakeCount(Ground &ground, int count) {
+int TakeCount(Fixture &ground, int count) {
     const FaultPause pause;
     if (count >= 0)
         ground.seen.push_back(std::to_string(count));
@@ -48,7 +48,8 @@ int TakeCount(Ground &ground, int count) {
 }
 
 // A search that reports itself done has delivered exactly its rows, a failed one no other rows.
-void CheckSeen(const Ground &ground, const Outcome &outcome, const Lines &whole, const Lines &withoutValues) {
+void CheckSeen(const Fixture &ground, const Outcome &outcome, const Lines &whole,
+               const Lines &withoutValues) {
     if (outcome.MayHaveLostValues() && ground.seen == withoutValues)
         return;
     if (outcome.IsDone())
@@ -61,9 +62,9 @@ void CheckSeen(const Ground &ground, const Outcome &outcome, const Lines &whole,
 
 // An operation that delivers values, `withoutValues` when those of its conditions were lost. Its failures are
 // silent but for a last message "`failure` (...)" where that is not empty.
-Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::function<int(Ground &)> run,
+Operation Ask(const char *name, std::function<void(Fixture &)> setUp, std::function<int(Fixture &)> run,
               Lines whole, Lines withoutValues, std::string failure = "") {
-    const auto check = [=](const Ground &ground, const Outcome &outcome) {
+    const auto check = [=](const Fixture &ground, const Outcome &outcome) {
         CheckSeen(ground, outcome, whole, withoutValues);
         if (failure.empty() || outcome.IsDone() || outcome.outOfMemory || outcome.fault == "KELODBFetchRow")
             EXPECT_THAT(outcome.messages, IsEmpty());
@@ -77,9 +78,9 @@ Operation Ask(const char *name, std::function<void(Ground &)> setUp, std::functi
 
 // A deletion, after which `left` rows are left. A failed one has deleted either everything it should or
 // nothing, and nothing when the statement never ran.
-Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left) {
-    const auto run = [](Ground &ground) { return SyslogDBDelete(ground.database, ground.conditions); };
-    const auto check = [=](const Ground &ground, const Outcome &outcome) {
+Operation Delete(const char *name, std::function<void(Fixture &)> setUp, int left) {
+    const auto run = [](Fixture &ground) { return SyslogDBDelete(ground.database, ground.conditions); };
+    const auto check = [=](const Fixture &ground, const Outcome &outcome) {
         const int rows = std::stoi(QueryText(ground.database, "SELECT count(*) FROM logs"));
         const bool nothingDeleted = rows == kRows;
         if (outcome.IsDone())
@@ -93,23 +94,23 @@ Operation Delete(const char *name, std::function<void(Ground &)> setUp, int left
     return {name, true, std::move(setUp), run, check};
 }
 
-int SelectNewest(Ground &ground) {
+int SelectNewest(Fixture &ground) {
     _SYSLOG_SQL_LIMIT_tag page{10, 5};
     return SyslogDBSelect(ground.database, ground.conditions, &page, nullptr, TakeId, &ground, true);
 }
 
-int Count(Ground &ground) {
+int Count(Fixture &ground) {
     return TakeCount(ground, SyslogDBSelectCount(ground.database, ground.conditions, nullptr, nullptr));
 }
 
-int CountByForm(Ground &ground) {
+int CountByForm(Fixture &ground) {
     std::list<_SYSLOG_SQL_COND_tag> conditions;
     LogSearchCondListGen("host03,host99", "any", "", "", "\"request 3\" FAILED OR clos?d -absent",
                          "2020/01/01", "0", conditions);
     return TakeCount(ground, SyslogDBSelectCount(ground.database, conditions, nullptr, nullptr));
 }
 
-int GetHosts(Ground &ground) {
+int GetHosts(Fixture &ground) {
     std::list<std::string> hosts;
     _SYSLOG_SQL_LIMIT_tag first{2, 0};
     const int result = SyslogDBAttriValueGet(ground.database, "host", &first, hosts);
@@ -121,11 +122,11 @@ int GetHosts(Ground &ground) {
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
 const std::string kNewSection = "[R]\nkey=\"new\"\n";
 
-void SetUpSection(Ground &ground) {
+void SetUpSection(Fixture &ground) {
     WriteFile(ground.root.File("notify.conf"), kOldSection);
 }
 
-int SetSection(Ground &ground) {
+int SetSection(Fixture &ground) {
     const std::string path = ground.root.File("notify.conf");
     TORVSZHASH *hash = TORVCSzHashAlloc(1);
     int status = TORVCSzHashSetValue(&hash, "key", "new");
@@ -136,7 +137,7 @@ int SetSection(Ground &ground) {
 }
 
 // Only bringing the new name to the disk can fail when the new file is in place.
-void CheckSection(const Ground &ground, const Outcome &outcome) {
+void CheckSection(const Fixture &ground, const Outcome &outcome) {
     const std::string content = ReadFile(ground.root.File("notify.conf"));
     const bool mayBeNew = outcome.IsDone() || outcome.fault == "write" || outcome.fault == "full disk";
     EXPECT_TRUE((mayBeNew && content == kNewSection) || (!outcome.IsDone() && content == kOldSection))

@@ -8,7 +8,7 @@
 namespace kelo::test {
 
 // What an operation works on. The files under `root` are put back before every run.
-struct Ground {
+struct Fixture {
     TempRoot root;
     std::string database; // checked for integrity after every run; "" when the operation has none
     std::list<_SYSLOG_SQL_COND_tag> conditions;
@@ -35,12 +35,12 @@ struct Outcome {
 struct Operation {
     const char *name;
     bool writes; // whether it writes to files, so that writes can fail
-    std::function<void(Ground &)> setUp;
+    std::function<void(Fixture &)> setUp;
     // Runs the operation; a result below 0 is a failure. What it does for the test is done under a
     // FaultPause.
-    std::function<int(Ground &)> run;
+    std::function<int(Fixture &)> run;
     // Whether what was promised holds, whatever failed.
-    std::function<void(const Ground &, const Outcome &)> check;
+    std::function<void(const Fixture &, const Outcome &)> check;
     // Whether the same files are there afterwards. One that creates or moves a file checks itself what is
     // there.
     bool keepsFiles = true;

@@ -10,25 +10,25 @@ using test::PlatformCalls;
 class LogReaderTest : public testing::Test {
 protected:
     LogReaderTest() {
-        source_.path = root_.File("logs.db");
-        test::CreateLogDatabase(source_.path);
+        table_.path = root_.File("logs.db");
+        test::CreateLogDatabase(table_.path);
     }
 
     static Ids Collect(const LogReader &reader, const Page &page, bool oldestFirst) {
         Ids ids;
-        const uint64_t count = reader.WalkPage(
+        const uint64_t count = reader.ReadPage(
             page, oldestFirst, [&](const _SYSLOG_LOG_DATA_tag &log) { ids.push_back(log.id); });
         EXPECT_EQ(count, ids.size());
         return ids;
     }
 
     test::TempRoot root_;
-    LogSource source_;
+    LogTable table_;
 };
 
 // More rows than one statement reads, ids far apart, and more of them than an int counts.
 TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
-    test::RunSql(source_.path,
+    test::RunSql(table_.path,
                  "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 60000) "
                  "INSERT INTO logs(id, host) SELECT i + 99000, 'a' FROM n WHERE i < 59800 OR i % 3;"
                  "INSERT INTO logs(id, host) VALUES (5000000000, 'b'), (9000000000000, 'a')");
@@ -37,7 +37,7 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
         if (id < 59800 || id % 3 != 0)
             newestFirst.push_back(id + 99000);
     }
-    const LogReader reader(source_, {});
+    const LogReader reader(table_, {});
     for (const uint64_t limit : {0U, 1U, 50U, 55000U, 99999U}) {
         for (const uint64_t offset : {0U, 1U, 7U, 186U, 59934U, 59935U, 99999U}) {
             SCOPED_TRACE(std::to_string(limit) + " after " + std::to_string(offset));
@@ -53,7 +53,7 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
     PlatformCalls::Reset();
     EXPECT_EQ(reader.Count(), newestFirst.size());
     EXPECT_LT(PlatformCalls::Statements().size(), 20U); // gaps are not searched bit by bit
-    const LogReader onHost(source_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "a", {}}});
+    const LogReader onHost(table_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "a", {}}});
     EXPECT_EQ(onHost.Count(), newestFirst.size() - 1);
     EXPECT_EQ(onHost.IdFromNewest(1), newestFirst[2]);
 }

@@ -122,7 +122,7 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
 
 void ArchiveFolder::NoteRemoval(const std::string &name, const std::string &source) const {
     const std::string note = path_ + "/" + kRemoval + name;
-    if (!WriteDurably(path_ + "/" + kTemporary + "note", note, source))
+    if (!WriteFileAtomically(path_ + "/" + kTemporary + "note", note, source))
         Fail(note, errno);
 }
 

@@ -44,7 +44,7 @@ void AddEvent(int (Logger::*add)(std::string), const std::string &source) {
 
 std::string LogsOf(uint64_t count, const std::string &host) {
     return std::to_string(count) + (count == 1 ? " log" : " logs") +
-           (host.empty() ? "" : " of " + VisibleText(host));
+           (host.empty() ? "" : " of " + EscapeForTerminal(host));
 }
 
 ArchiveRun::ArchiveRun(Order order, ArchiveFolder &folder, std::function<void(const std::string &)> report)

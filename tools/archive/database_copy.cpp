@@ -11,7 +11,7 @@
 #include "base/stop_signals.h"
 #include "kelosyslog/dbhandler.h"
 #include "read/log_message_capture.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 namespace {

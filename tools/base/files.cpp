@@ -61,7 +61,7 @@ bool WriteAll(int fd, std::string_view content) {
     return true;
 }
 
-bool WriteDurably(const std::string &temporary, const std::string &path, std::string_view content) {
+bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content) {
     const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW;
     const FileHandle file(open(temporary.c_str(), flags, 0640));
     if (file && WriteAll(file.Get(), content) && fsync(file.Get()) == 0 &&

@@ -35,7 +35,7 @@ bool WriteAll(int fd, std::string_view content);
 
 // Writes a file that is there whole or not at all, also after a crash: as `temporary`, synced, renamed to
 // `path`, whose folder is synced. Both paths are on one file system.
-bool WriteDurably(const std::string &temporary, const std::string &path, std::string_view content);
+bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content);
 
 // Renames, and syncs the folders of both paths.
 bool RenameDurably(const std::string &from, const std::string &to);

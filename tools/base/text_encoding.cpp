@@ -78,7 +78,7 @@ void AppendCsvField(std::string &out, std::string_view text) {
 
 } // namespace
 
-std::string VisibleText(std::string_view text) {
+std::string EscapeForTerminal(std::string_view text) {
     std::string out;
     out.reserve(text.size());
     while (!text.empty()) {

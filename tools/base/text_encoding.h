@@ -11,7 +11,7 @@ namespace kelo::tool {
 // The text on one line of a terminal: control characters, characters that turn the writing direction and
 // bytes that are no UTF-8 are written as "\n", "\t", "\x1b" or "\u202e". Everything else, backslashes
 // included, stays.
-std::string VisibleText(std::string_view text);
+std::string EscapeForTerminal(std::string_view text);
 
 // Number of characters of a text that is UTF-8, which is the number of its columns for most scripts.
 size_t CharacterCount(std::string_view text);

@@ -10,23 +10,23 @@
 
 namespace kelo::tool {
 
-int RunToAnEnd(CLI::App &app, const Endings &endings, const std::function<int()> &body) {
+int RunApp(CLI::App &app, const ExitHandling &exits, const std::function<int()> &body) {
     try {
         return body();
     } catch (const CLI::Success &request) { // --help, --version
         return app.exit(request);
     } catch (const CLI::ParseError &error) {
-        endings.reportUsage(VisibleText(std::string(error.what()) + " (see --help)"));
-        return endings.usage;
+        exits.reportUsage(EscapeForTerminal(std::string(error.what()) + " (see --help)"));
+        return exits.usage;
     } catch (const UsageError &error) {
-        endings.reportUsage(VisibleText(error.what()));
-        return endings.usage;
+        exits.reportUsage(EscapeForTerminal(error.what()));
+        return exits.usage;
     } catch (const std::bad_alloc &) {
-        endings.reportFailure("out of memory");
+        exits.reportFailure("out of memory");
     } catch (const std::exception &error) { // for example a working folder that is gone
-        endings.reportFailure(VisibleText(error.what()));
+        exits.reportFailure(EscapeForTerminal(error.what()));
     }
-    return endings.failure;
+    return exits.failure;
 }
 
 std::string NormalRoot(const std::string &root) {

@@ -10,7 +10,7 @@ class App;
 namespace kelo::tool {
 
 // What a program does when its command line, or the work that it asked for, fails.
-struct Endings {
+struct ExitHandling {
     int usage;                                              // exit status after a wrong command line
     int failure;                                            // and after any other exception
     std::function<void(const std::string &)> reportUsage;   // tells what was wrong, ...
@@ -19,7 +19,7 @@ struct Endings {
 
 // Runs `body`, which reads the command line with `app` and works, and returns its exit status. Whatever it
 // throws is mapped to an exit status: a request for help or the version is answered, all else is reported.
-int RunToAnEnd(CLI::App &app, const Endings &endings, const std::function<int()> &body);
+int RunApp(CLI::App &app, const ExitHandling &exits, const std::function<int()> &body);
 
 // What --root says, absolute and without a slash at its end; "" stays.
 std::string NormalRoot(const std::string &root);

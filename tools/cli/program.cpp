@@ -111,13 +111,13 @@ uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_
 }
 
 void PrintMessage(const std::string &text) {
-    std::fprintf(stderr, "kelosyslog: %s\n", VisibleText(text).c_str());
+    std::fprintf(stderr, "kelosyslog: %s\n", EscapeForTerminal(text).c_str());
 }
 
 int RunProgram(Program &program, int argc, const char *const *argv) {
     AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
-    return RunToAnEnd(program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
-                      [&] { return RunCommand(program, argc, argv); });
+    return RunApp(program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
+                  [&] { return RunCommand(program, argc, argv); });
 }
 
 } // namespace kelo::tool

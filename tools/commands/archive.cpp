@@ -37,7 +37,7 @@ constexpr const char *kFooter =
     "Exit status: 0 done, 1 nothing to do or not confirmed, 2 usage, 3 database, 4 folder or output.";
 
 struct Options {
-    LogSourceOptions source;
+    LogTableOptions table;
     std::string to;
     std::string device;
     std::string keep;
@@ -113,11 +113,11 @@ public:
         return Finish(kExitFound);
     }
 
-    int Make(const LogSource &source) {
+    int Make(const LogTable &table) {
         if (options_.isDryRun)
-            return Preview(source.path);
+            return Preview(table.path);
         ArchiveFolder folder(folder_, options_.to.empty());
-        ArchiveRun run({source.path, options_.device, options_.isRemoving}, folder,
+        ArchiveRun run({table.path, options_.device, options_.isRemoving}, folder,
                        [this](const std::string &text) { Print(text); });
         const bool hasDone = run.Run();
         retention_.spared = run.Made();
@@ -125,13 +125,13 @@ public:
         return Finish(hasDone ? kExitFound : kExitNothing);
     }
 
-    void RefuseArchive(const LogSource &source) const {
-        if (fs::path(source.path).parent_path() == folder_)
-            throw UsageError(source.path + " is in the folder of the archives already");
+    void RefuseArchive(const LogTable &table) const {
+        if (fs::path(table.path).parent_path() == folder_)
+            throw UsageError(table.path + " is in the folder of the archives already");
     }
 
     // Asks, where something is to be removed.
-    bool MayMake(const LogSource &source) const { return MayRemove(PlannedRemovals(source.path)); }
+    bool MayMake(const LogTable &table) const { return MayRemove(PlannedRemovals(table.path)); }
 
 private:
     // Refuses an option that would silently do nothing.
@@ -143,8 +143,8 @@ private:
         const char *mode = options_.isListing ? "--list" : options_.isPruning ? "--prune" : nullptr;
         if (mode != nullptr) {
             refuse("--prune", options_.isListing && options_.isPruning, mode);
-            refuse("--db", !options_.source.db.empty(), mode);
-            refuse("--log", !options_.source.log.empty(), mode);
+            refuse("--db", !options_.table.db.empty(), mode);
+            refuse("--log", !options_.table.log.empty(), mode);
             refuse("--device", !options_.device.empty(), mode);
             refuse("--remove-archived", options_.isRemoving, mode);
         }
@@ -221,16 +221,16 @@ int Run(const Options &options, const std::string &root) {
         return command.List();
     if (options.isPruning)
         return command.Prune();
-    LogSource source = ResolveLogSource(options.source, root);
-    source.path = Canonical(source.path); // one name for the note of a removal
-    if (source.kind != TableKind::Logs)
-        throw UsageError("--log: only logs in table logs can be archived, not '" + options.source.log + "'");
-    command.RefuseArchive(source);
-    if (!command.MayMake(source))
+    LogTable table = ResolveLogTable(options.table, root);
+    table.path = Canonical(table.path); // one name for the note of a removal
+    if (table.kind != TableKind::Logs)
+        throw UsageError("--log: only logs in table logs can be archived, not '" + options.table.log + "'");
+    command.RefuseArchive(table);
+    if (!command.MayMake(table))
         return kExitNothing;
     try {
         const StopSignals signals;
-        return command.Make(source);
+        return command.Make(table);
     } catch (const Interrupted &interruption) {
         // Ends as the signal would have ended it.
         std::raise(interruption.signal);
@@ -262,7 +262,7 @@ void AddArchive(Program &program) {
             "--list: text (default), json (one array), jsonl (an object per line), csv");
     command->add_flag("--no-header", options->noHeader, "--list: no heading in text and csv");
     AddUtcOption(*command, options->inUtc);
-    AddSourceOptions(*command, options->source, false);
+    AddTableOptions(*command, options->table, false);
 }
 
 } // namespace kelo::tool

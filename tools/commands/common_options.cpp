@@ -7,7 +7,7 @@
 
 namespace kelo::tool {
 
-void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTable) {
+void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable) {
     const std::string group = "Where to look";
     AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
     AddText(command, "--log", options.log, "NAME",
@@ -21,25 +21,24 @@ void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTab
             ->group(group);
 }
 
-void AddSelectionOptions(CLI::App &command, Selection &selection) {
+void AddFilterOptions(CLI::App &command, LogFilter &filter) {
     const std::string group = "Which logs (values separated by commas are alternatives; '!value' excludes)";
-    AddText(command, "-S,--since", selection.since, "TIME", "From this time on")->group(group);
+    AddText(command, "-S,--since", filter.since, "TIME", "From this time on")->group(group);
     AddText(
-        command, "-U,--until", selection.until, "TIME",
+        command, "-U,--until", filter.until, "TIME",
         "Up to this second; a day alone ends before it begins. TIME: 2020-01-02, '2020/01/02 10:11[:12]', "
         "10:11, today, 'yesterday 18:00', now, 1h or -1h, '2 days ago', @1577836800")
         ->group(group);
     AddTexts(
-        command, "-p,--priority", selection.levels, "LEVEL",
+        command, "-p,--priority", filter.severities, "LEVEL",
         "Severity by name or number. A single one means it and all more severe; warning..emerg is a range; "
         "err..err is err alone, and so is each of several")
         ->group(group);
-    AddTexts(command, "--facility", selection.facilities, "NAME", "Facility by name or number")->group(group);
-    AddTexts(command, "-H,--host", selection.hosts, "HOST", "Sending host; * and ? are wildcards")
+    AddTexts(command, "--facility", filter.facilities, "NAME", "Facility by name or number")->group(group);
+    AddTexts(command, "-H,--host", filter.hosts, "HOST", "Sending host; * and ? are wildcards")->group(group);
+    AddTexts(command, "-t,--program", filter.programs, "PROGRAM", "Program; * and ? are wildcards")
         ->group(group);
-    AddTexts(command, "-t,--program", selection.programs, "PROGRAM", "Program; * and ? are wildcards")
-        ->group(group);
-    AddTexts(command, "-g,--grep", selection.keywords, "KEYWORDS",
+    AddTexts(command, "-g,--grep", filter.keywords, "KEYWORDS",
              "Message: words that all occur, \"a phrase\", one OR other, -without, wild*card, /regex/; exact "
              "in case when it has capitals. Given twice, both must match")
         ->group(group);

@@ -4,19 +4,19 @@
 
 #include "cli/program.h"
 #include "print/output.h"
-#include "print/record_writer.h"
-#include "read/log_source.h"
-#include "read/selection.h"
+#include "print/record_formatter.h"
+#include "read/log_filter.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 
 // Options that several subcommands share. Each struct lives as long as the command line is used.
 
 // --db, --log and --table.
-void AddSourceOptions(CLI::App &command, LogSourceOptions &options, bool withTable = true);
+void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable = true);
 
 // --since, --until, --priority, --facility, --host, --program and --grep.
-void AddSelectionOptions(CLI::App &command, Selection &selection);
+void AddFilterOptions(CLI::App &command, LogFilter &filter);
 
 // --utc. It sets the time zone of the process, so that times are also read as UTC.
 void AddUtcOption(CLI::App &command, bool &inUtc);

@@ -17,18 +17,18 @@ constexpr const char *kFooter = "Examples:\n"
                                 "Exit status: 0 some, 1 none, 2 usage, 3 database, 4 output.";
 
 struct Options {
-    LogSourceOptions source;
-    Selection selection;
+    LogTableOptions table;
+    LogFilter filter;
     bool inUtc = false;
     bool isEstimate = false;
 };
 
 int Run(const Options &options, const std::string &root) {
     ApplyUtc(options.inUtc);
-    if (options.isEstimate && !IsEmpty(options.selection))
+    if (options.isEstimate && !IsEmpty(options.filter))
         throw UsageError("--estimate: is about the whole table and goes with no option that selects logs");
-    const LogSource source = ResolveLogSource(options.source, root);
-    const LogReader reader(source, MakeConditions(options.selection, source, std::time(nullptr)));
+    const LogTable table = ResolveLogTable(options.table, root);
+    const LogReader reader(table, MakeConditions(options.filter, table, std::time(nullptr)));
     const uint64_t count = options.isEstimate ? reader.IdFromNewest(0) : reader.Count();
     Output output(false);
     output.Write(std::to_string(count) + "\n");
@@ -43,12 +43,12 @@ void AddCount(Program &program) {
     CLI::App *command = AddSubcommand(program, "count", "Print the number of logs",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddSelectionOptions(*command, options->selection);
+    AddFilterOptions(*command, options->filter);
     command->add_flag(
         "--estimate", options->isEstimate,
         "The largest id instead: instant however large the table is, but deleted logs count too");
     AddUtcOption(*command, options->inUtc);
-    AddSourceOptions(*command, options->source);
+    AddTableOptions(*command, options->table);
 }
 
 } // namespace kelo::tool

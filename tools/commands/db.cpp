@@ -19,7 +19,7 @@ CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
                        const std::string &description, DbOptions &options, std::function<int()> run) {
     CLI::App *command = AddSubcommand(program, db, name, description, std::move(run));
     options.root = &program.root;
-    AddFactsFormat(*command, options.format);
+    AddKeyValuesFormat(*command, options.format);
     return command;
 }
 

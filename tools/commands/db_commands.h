@@ -3,18 +3,18 @@
 #include <string>
 
 #include "commands/common_options.h"
-#include "commands/facts.h"
+#include "commands/key_values.h"
 
 namespace kelo::tool {
 
 // What every command of "kelosyslog db" can be told.
 struct DbOptions {
-    LogSourceOptions source;
+    LogTableOptions table;
     std::string format = "text";
     const std::string *root = nullptr; // --root, known once the command line was read
 
-    LogSource Source() const { return ResolveLogSource(source, *root); }
-    OutputFormat Format() const { return ParseFactsFormat(format); }
+    LogTable Table() const { return ResolveLogTable(table, *root); }
+    OutputFormat Format() const { return ParseKeyValuesFormat(format); }
 };
 
 // Adds a command of "kelosyslog db" with these options.

@@ -14,7 +14,7 @@
 #include "cli/progress_bar.h"
 #include "commands/db_commands.h"
 #include "kelosyslog/dbutil.h"
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -24,7 +24,7 @@ int64_t SizeOf(const std::string &path) {
     return stat(path.c_str(), &status) == 0 ? status.st_size : 0;
 }
 
-void AddTime(Facts &facts, const std::string &name, const std::string &utcsec) {
+void AddTime(KeyValues &facts, const std::string &name, const std::string &utcsec) {
     if (utcsec.empty())
         facts.AddUnknown(name);
     else
@@ -32,13 +32,13 @@ void AddTime(Facts &facts, const std::string &name, const std::string &utcsec) {
 }
 
 // The time of the first log in one order of time; "" when there is none.
-std::string FirstTime(const PlainDatabase &database, const char *direction) {
+std::string FirstTime(const ReadOnlyQuery &database, const char *direction) {
     const auto row = database.FirstRow(
         std::string("SELECT utcsec FROM logs ORDER BY utcsec ") + direction + " LIMIT 1", {"utcsec"});
     return row ? row->front() : "";
 }
 
-void AddDescription(Facts &facts, const PlainDatabase &database) {
+void AddDescription(KeyValues &facts, const ReadOnlyQuery &database) {
     if (!database.HasTable("db_info"))
         return;
     const auto row =
@@ -53,19 +53,19 @@ void AddDescription(Facts &facts, const PlainDatabase &database) {
 
 int Info(const DbOptions &options) {
     const OutputFormat format = options.Format();
-    const LogSource source = options.Source();
-    const PlainDatabase database(source);
+    const LogTable table = options.Table();
+    const ReadOnlyQuery database(table);
     const auto mode = database.FirstRow("PRAGMA journal_mode", {"journal_mode"});
-    Facts facts;
-    facts.Add("path", source.path);
-    facts.Add("size_bytes", SizeOf(source.path));
-    facts.Add("wal_bytes", SizeOf(source.path + "-wal"));
-    facts.Add("generation", int64_t{SyslogDBVersionGet(source.path)});
+    KeyValues facts;
+    facts.Add("path", table.path);
+    facts.Add("size_bytes", SizeOf(table.path));
+    facts.Add("wal_bytes", SizeOf(table.path + "-wal"));
+    facts.Add("generation", int64_t{SyslogDBVersionGet(table.path)});
     facts.Add("journal_mode", mode ? mode->front() : "");
-    if (!database.HasTable(source.table))
-        throw DatabaseError(source.path + ": no table " + source.table);
-    facts.Add("rows", database.Number("SELECT count(*) AS value FROM " + source.table));
-    if (source.kind == TableKind::Logs) {
+    if (!database.HasTable(table.name))
+        throw DatabaseError(table.path + ": no table " + table.name);
+    facts.Add("rows", database.Number("SELECT count(*) AS value FROM " + table.name));
+    if (table.kind == TableKind::Logs) {
         AddTime(facts, "first_log", FirstTime(database, "ASC"));
         AddTime(facts, "last_log", FirstTime(database, "DESC"));
     }
@@ -111,11 +111,11 @@ private:
     std::jthread watcher_; // ends first
 };
 
-std::vector<std::string> Problems(const LogSource &source) {
-    const PlainDatabase database(source);
+std::vector<std::string> Problems(const LogTable &table) {
+    const ReadOnlyQuery database(table);
     // Opening succeeds with any file: this reads its head.
     database.FirstRow("PRAGMA schema_version", {});
-    const CheckProgress progress(SizeOf(source.path) + SizeOf(source.path + "-wal"));
+    const CheckProgress progress(SizeOf(table.path) + SizeOf(table.path + "-wal"));
     std::vector<std::string> lines = database.Column("PRAGMA integrity_check", "integrity_check");
     if (lines == std::vector<std::string>{"ok"})
         lines.clear();
@@ -124,10 +124,10 @@ std::vector<std::string> Problems(const LogSource &source) {
 
 int Check(const DbOptions &options) {
     const OutputFormat format = options.Format();
-    const LogSource source = options.Source();
-    const std::vector<std::string> problems = Problems(source);
-    Facts facts;
-    facts.Add("path", source.path);
+    const LogTable table = options.Table();
+    const std::vector<std::string> problems = Problems(table);
+    KeyValues facts;
+    facts.Add("path", table.path);
     facts.AddBool("sound", problems.empty());
     facts.AddList("problems", problems);
     Print(facts, format);
@@ -141,13 +141,13 @@ void AddDbInspection(Program &program, CLI::App &db) {
     CLI::App *info =
         AddDbCommand(program, db, "info", "Tell size, journal mode, rows and times of a database",
                      *infoOptions, [infoOptions] { return Info(*infoOptions); });
-    AddSourceOptions(*info, infoOptions->source, false);
+    AddTableOptions(*info, infoOptions->table, false);
 
     auto checkOptions = std::make_shared<DbOptions>();
     CLI::App *check =
         AddDbCommand(program, db, "check", "Check every page and row of a database; changes nothing",
                      *checkOptions, [checkOptions] { return Check(*checkOptions); });
-    AddSourceOptions(*check, checkOptions->source, false);
+    AddTableOptions(*check, checkOptions->table, false);
 }
 
 } // namespace kelo::tool

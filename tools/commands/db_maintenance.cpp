@@ -14,7 +14,7 @@
 #include "commands/db_commands.h"
 #include "kelosyslog/dbhandler.h"
 #include "read/log_message_capture.h"
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 #include "store/logs_schema.h"
 
 namespace kelo::tool {
@@ -83,7 +83,7 @@ void RequirePlainPaths(const std::string &path, const std::string &schema) {
 
 int Create(const CreateOptions &options) {
     const OutputFormat format = options.Format();
-    const std::string path = options.Source().path;
+    const std::string path = options.Table().path;
     if (fs::exists(fs::symlink_status(path))) {
         PrintMessage(path + " is there already; nothing created");
         return kExitNothing;
@@ -96,8 +96,8 @@ int Create(const CreateOptions &options) {
     if (access(schema.c_str(), R_OK) != 0)
         throw UsageError("--schema: cannot read " + schema);
     Attempt("cannot create " + path, [&] { return DBHandler(path, schema).DBCreate() == 0; });
-    const auto mode = PlainDatabase(options.Source()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
-    Facts facts;
+    const auto mode = ReadOnlyQuery(options.Table()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
+    KeyValues facts;
     facts.Add("created", path);
     facts.Add("journal_mode", mode ? mode->front() : "");
     Print(facts, format);
@@ -106,38 +106,38 @@ int Create(const CreateOptions &options) {
 
 int SetWal(const DbOptions &options) {
     const OutputFormat format = options.Format();
-    const LogSource source = options.Source();
-    const PlainDatabase database(source);
+    const LogTable table = options.Table();
+    const ReadOnlyQuery database(table);
     const auto mode = database.FirstRow("PRAGMA journal_mode=WAL", {"journal_mode"});
     if (!mode || mode->front() != "wal")
-        throw DatabaseError(DescribeDatabaseProblem(source, true));
+        throw DatabaseError(DescribeDatabaseProblem(table, true));
     const auto checkpoint = database.FirstRow("PRAGMA wal_checkpoint(TRUNCATE)", {"busy"});
     const bool isComplete = checkpoint && checkpoint->front() == "0";
-    Facts facts;
-    facts.Add("path", source.path);
+    KeyValues facts;
+    facts.Add("path", table.path);
     facts.Add("journal_mode", mode->front());
     facts.AddBool("checkpointed", isComplete);
     Print(facts, format);
     if (!isComplete)
-        PrintMessage(source.path + " is in use; its write-ahead log could not be emptied");
+        PrintMessage(table.path + " is in use; its write-ahead log could not be emptied");
     return isComplete ? kExitFound : kExitNothing;
 }
 
 int Limit(const LimitOptions &options) {
     const OutputFormat format = options.Format();
-    const std::string path = options.Source().path;
+    const std::string path = options.Table().path;
     constexpr uint64_t kMost = std::numeric_limits<int32_t>::max();
     const auto limit = static_cast<int32_t>(ParseNumber("limit", options.kib, 0, kMost));
     struct stat before {};
     if (stat(path.c_str(), &before) != 0)
-        throw DatabaseError(DescribeDatabaseProblem(options.Source()));
+        throw DatabaseError(DescribeDatabaseProblem(options.Table()));
     Attempt("cannot examine " + path, [&] { return SyslogngWorkingDbCheck(path, limit) == 0; });
     struct stat after {};
     const bool isRemoved = stat(path.c_str(), &after) != 0 || after.st_ino != before.st_ino;
     const bool isBeyond = before.st_size / 1024 > limit;
     if (isBeyond && !isRemoved)
         throw DatabaseError("cannot remove " + path);
-    Facts facts;
+    KeyValues facts;
     facts.Add("path", path);
     facts.Add("size_kib", int64_t{before.st_size / 1024});
     facts.Add("limit_kib", int64_t{limit});
@@ -148,21 +148,21 @@ int Limit(const LimitOptions &options) {
 
 int SetDevice(const DeviceOptions &options) {
     const OutputFormat format = options.Format();
-    const LogSource source = options.Source();
+    const LogTable table = options.Table();
     {
-        const PlainDatabase database(source);
+        const ReadOnlyQuery database(table);
         if (!database.HasTable("db_info") ||
             database.Number("SELECT count(*) AS value FROM db_info WHERE id = 1") == 0)
-            throw DatabaseError(source.path + " has no row in a table db_info to write the device to");
+            throw DatabaseError(table.path + " has no row in a table db_info to write the device to");
     }
-    DBHandler db(source.path, "");
-    Attempt("cannot change " + source.path, [&] {
+    DBHandler db(table.path, "");
+    Attempt("cannot change " + table.path, [&] {
         const bool isDone = db.DBCon() == 0 && db.DBInfoDevSet(db.DBCmdEscape(options.device)) == 0;
         db.DBDiscon();
         return isDone;
     });
-    Facts facts;
-    facts.Add("path", source.path);
+    KeyValues facts;
+    facts.Add("path", table.path);
     facts.Add("device", options.device);
     Print(facts, format);
     return kExitFound;
@@ -170,10 +170,10 @@ int SetDevice(const DeviceOptions &options) {
 
 int Quarantine(const QuarantineOptions &options) {
     const OutputFormat format = options.Format();
-    const std::string path = options.Source().path;
+    const std::string path = options.Table().path;
     const std::string aside = path + ".corrupt";
     if (!fs::is_regular_file(path))
-        throw DatabaseError(DescribeDatabaseProblem(options.Source()));
+        throw DatabaseError(DescribeDatabaseProblem(options.Table()));
     const std::string action =
         "move " + path + " to " + aside + (fs::exists(aside) ? ", which replaces an older one" : "");
     if (!options.isConfirmed && !Confirm("db quarantine", action)) {
@@ -191,7 +191,7 @@ int Quarantine(const QuarantineOptions &options) {
         isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
         return isReloaded || isMoved();
     });
-    Facts facts;
+    KeyValues facts;
     facts.Add("moved", path);
     facts.Add("to", aside);
     facts.AddBool("reloaded", isReloaded);
@@ -205,7 +205,7 @@ int Quarantine(const QuarantineOptions &options) {
 int Reopen(const DbOptions &options) {
     const OutputFormat format = options.Format();
     Attempt("cannot make syslog-ng reopen its files", [] { return SyslogngHupSignalSend() == 0; });
-    Facts facts;
+    KeyValues facts;
     facts.AddBool("reloaded", true);
     Print(facts, format);
     return kExitFound;
@@ -217,7 +217,7 @@ CLI::App *Add(Program &program, CLI::App &db, const char *name, const char *desc
               std::shared_ptr<Options> options, int (*run)(const Options &)) {
     CLI::App *command =
         AddDbCommand(program, db, name, description, *options, [options, run] { return run(*options); });
-    AddText(*command, "--db", options->source.db, "PATH", "This log database (default: the working log)");
+    AddText(*command, "--db", options->table.db, "PATH", "This log database (default: the working log)");
     return command;
 }
 

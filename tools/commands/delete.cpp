@@ -26,8 +26,8 @@ constexpr const char *kFooter =
 constexpr uint64_t kStepIds = 10000;
 
 struct Options {
-    LogSourceOptions source;
-    Selection selection;
+    LogTableOptions table;
+    LogFilter filter;
     bool inUtc = false;
     bool all = false;
     bool isConfirmed = false;
@@ -41,7 +41,7 @@ std::string Logs(uint64_t count) {
 // Deletes what is selected up to `lastId`, range by range, hopping over ranges without a match. Returns how
 // many logs matched right before each step.
 uint64_t DeleteUpTo(const LogReader &reader, uint64_t lastId) {
-    const std::string &path = reader.Source().path;
+    const std::string &path = reader.Table().path;
     uint64_t deleted = 0;
     uint64_t next = reader.FirstId({1, lastId});
     while (next != 0 && next <= lastId) {
@@ -50,7 +50,7 @@ uint64_t DeleteUpTo(const LogReader &reader, uint64_t lastId) {
         Conditions conditions = reader.Selected();
         AddRange(conditions, step);
         if (count > 0 && SyslogDBDelete(path, conditions) != 0)
-            throw DatabaseError(DescribeDatabaseProblem(reader.Source(), true) +
+            throw DatabaseError(DescribeDatabaseProblem(reader.Table(), true) +
                                 (deleted > 0 ? "; " + Logs(deleted) + " were deleted before" : ""));
         deleted += count;
         next = count > 0 ? step.last + 1 : reader.FirstId({step.last + 1, lastId});
@@ -60,19 +60,19 @@ uint64_t DeleteUpTo(const LogReader &reader, uint64_t lastId) {
 
 int Run(const Options &options, const std::string &root) {
     ApplyUtc(options.inUtc);
-    if (IsEmpty(options.selection) && !options.all)
+    if (IsEmpty(options.filter) && !options.all)
         throw UsageError("delete: nothing selects the logs to delete; use --all for all of them");
-    if (!IsEmpty(options.selection) && options.all)
+    if (!IsEmpty(options.filter) && options.all)
         throw UsageError("--all: goes with no option that selects logs");
-    const LogSource source = ResolveLogSource(options.source, root);
-    if (source.kind != TableKind::Logs)
-        throw UsageError("--log: logs can be deleted from table logs only, not from '" + options.source.log +
+    const LogTable table = ResolveLogTable(options.table, root);
+    if (table.kind != TableKind::Logs)
+        throw UsageError("--log: logs can be deleted from table logs only, not from '" + options.table.log +
                          "'");
-    const LogReader reader(source, MakeConditions(options.selection, source, std::time(nullptr)));
+    const LogReader reader(table, MakeConditions(options.filter, table, std::time(nullptr)));
 
     const uint64_t newest = reader.IdFromNewest(0);
     const uint64_t count = newest == 0 ? 0 : reader.Count();
-    const std::string what = Logs(count) + " from " + source.path;
+    const std::string what = Logs(count) + " from " + table.path;
     Output output(false);
     if (options.isDryRun || count == 0) {
         output.Write((options.isDryRun ? "would delete " : "deleted ") + what + "\n");
@@ -84,7 +84,7 @@ int Run(const Options &options, const std::string &root) {
         return kExitNothing;
     }
     const uint64_t deleted = DeleteUpTo(reader, newest);
-    output.Write("deleted " + Logs(deleted) + " from " + source.path + "\n");
+    output.Write("deleted " + Logs(deleted) + " from " + table.path + "\n");
     output.Finish();
     return kExitFound;
 }
@@ -96,12 +96,12 @@ void AddDelete(Program &program) {
     CLI::App *command = AddSubcommand(program, "delete", "Delete logs from table logs",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddSelectionOptions(*command, options->selection);
+    AddFilterOptions(*command, options->filter);
     command->add_flag("--all", options->all, "Delete all logs");
     command->add_flag("-y,--yes", options->isConfirmed, "Do not ask");
     command->add_flag("--dry-run", options->isDryRun, "Only tell how many logs match");
     AddUtcOption(*command, options->inUtc);
-    AddSourceOptions(*command, options->source, false);
+    AddTableOptions(*command, options->table, false);
 }
 
 } // namespace kelo::tool

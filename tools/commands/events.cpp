@@ -5,8 +5,8 @@
 #include <ctime>
 #include <limits>
 
+#include "base/atomic_file.h"
 #include "base/errors.h"
-#include "base/replacement_file.h"
 #include "cli/exit_status.h"
 #include "kelosyslog/logger.h"
 #include "print/event_log.h"
@@ -46,14 +46,14 @@ EventPage ParsePage(const EventsOptions &options) {
 // The library pages what is not filtered; of filtered events it takes all to find a page.
 std::list<Event> SelectedEvents(const std::string &path, const EventsOptions &options,
                                 const EventPage &page) {
-    if (IsEmpty(options.selection)) {
+    if (IsEmpty(options.filter)) {
         const bool isWhole = page.limit == 0 && page.offset == 0;
         const int limit = page.limit == 0 ? std::numeric_limits<int>::max() : page.limit;
         return ReadEvents(path, page.offset, isWhole ? 0 : limit);
     }
-    const EventSelection selection = ParseEventSelection(options.selection, std::time(nullptr));
+    const EventFilter filter = ParseEventFilter(options.filter, std::time(nullptr));
     std::list<Event> events = ReadEvents(path);
-    events.remove_if([&](const Event &event) { return !selection.Matches(event); });
+    events.remove_if([&](const Event &event) { return !filter.Matches(event); });
     for (int skipped = 0; skipped < page.offset && !events.empty(); ++skipped)
         events.pop_front();
     if (page.limit > 0 && events.size() > static_cast<size_t>(page.limit))
@@ -70,7 +70,7 @@ int List(const EventsOptions &options, const std::string &root) {
     const EventPage page = ParsePage(options);
     const std::list<Event> events = SelectedEvents(EventDatabasePath(options.db, root), options, page);
     Output output(!options.output.noPager);
-    const std::unique_ptr<RecordWriter> writer = MakeRecordWriter(layout);
+    const std::unique_ptr<RecordFormatter> writer = MakeRecordWriter(layout);
     std::string text;
     writer->Begin(text);
     for (const Event &event : events) {
@@ -90,7 +90,7 @@ int Count(const EventsOptions &options, const std::string &root) {
     ApplyUtc(options.output.inUtc);
     const std::string path = EventDatabasePath(options.db, root);
     int64_t count = 0;
-    if (IsEmpty(options.selection))
+    if (IsEmpty(options.filter))
         count = Logger().LogCount(path);
     else
         count = static_cast<int64_t>(SelectedEvents(path, options, {}).size());
@@ -103,7 +103,7 @@ int Count(const EventsOptions &options, const std::string &root) {
 }
 
 // The library does not tell when the page could not be written in full, so its end is looked at.
-void RequireWholePage(const ReplacementFile &file) {
+void RequireWholePage(const AtomicFile &file) {
     std::string end(std::char_traits<char>::length(kPageEnd), '\0');
     const std::unique_ptr<FILE, int (*)(FILE *)> page(std::fopen(file.Path().c_str(), "r"), std::fclose);
     const bool isWhole = page != nullptr &&
@@ -121,7 +121,7 @@ int Export(const EventsOptions &options, const std::string &target, const std::s
         PrintMessage("no events to export");
         return kExitNothing;
     }
-    ReplacementFile file(target);
+    AtomicFile file(target);
     if (Logger().LogHtmlGen(path, "html", file.Path()) != 0)
         FailEventDatabase(path);
     RequireWholePage(file);
@@ -140,11 +140,11 @@ void AddExport(Program &program, CLI::App &events, const SharedEventsOptions &op
 void AddListOptions(CLI::App &command, EventsOptions &options) {
     AddText(command, "--db", options.db, "PATH", "This event database, not the server's own");
     const std::string which = "Which events";
-    AddText(command, "-S,--since", options.selection.since, "TIME", "From this time on")->group(which);
-    AddText(command, "-U,--until", options.selection.until, "TIME",
+    AddText(command, "-S,--since", options.filter.since, "TIME", "From this time on")->group(which);
+    AddText(command, "-U,--until", options.filter.until, "TIME",
             "Up to this second; a day alone ends before it begins")
         ->group(which);
-    AddTexts(command, "-p,--priority", options.selection.levels, "LEVEL",
+    AddTexts(command, "-p,--priority", options.filter.severities, "LEVEL",
              "information, warning or error. A single one means it and all worse; '!level' excludes")
         ->group(which);
     const std::string howMany = "How many";
@@ -176,7 +176,7 @@ CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, 
 }
 
 void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb) {
-    if (!IsEmpty(options.selection) || !options.lines.empty() || !options.offset.empty())
+    if (!IsEmpty(options.filter) || !options.lines.empty() || !options.offset.empty())
         throw UsageError(action + ": goes with no option that selects events");
     if (withDb && !options.db.empty())
         throw UsageError("--db: " + action +

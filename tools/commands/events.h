@@ -11,7 +11,7 @@ namespace kelo::tool {
 // What the command line says about "kelosyslog events".
 struct EventsOptions {
     std::string db;
-    Selection selection;
+    LogFilter filter;
     OutputOptions output;
     std::string lines;
     std::string offset;

@@ -32,14 +32,14 @@ std::optional<FileIdentity> IdentifyFile(const std::string &path) {
 class Follower {
 public:
     Follower(const LogReader &reader, const LogHandler &print)
-        : reader_(reader), everything_(reader.Source(), {}), print_(print) {}
+        : reader_(reader), everything_(reader.Table(), {}), print_(print) {}
 
     uint64_t PrintPresent(const FollowOptions &options) {
-        file_ = IdentifyFile(reader_.Source().path);
+        file_ = IdentifyFile(reader_.Table().path);
         lastId_ = everything_.IdFromNewest(0);
         if (!options.showAll && options.lines == 0)
             return 0;
-        return reader_.WalkPage({options.showAll ? 0 : options.lines, 0}, true,
+        return reader_.ReadPage({options.showAll ? 0 : options.lines, 0}, true,
                                 [this](const _SYSLOG_LOG_DATA_tag &log) {
                                     print_(log);
                                     lastId_ = std::max(lastId_, log.id);
@@ -47,7 +47,7 @@ public:
     }
 
     uint64_t PrintNews() {
-        const std::optional<FileIdentity> current = IdentifyFile(reader_.Source().path);
+        const std::optional<FileIdentity> current = IdentifyFile(reader_.Table().path);
         if (!current)
             return 0;
         const bool isReplaced = current != file_;
@@ -57,7 +57,7 @@ public:
             const uint64_t newest = everything_.IdFromNewest(0);
             file_ = current;
             lastId_ = isReplaced ? newest : std::max(lastId_, newest);
-            return newest < first ? 0 : reader_.Walk({first, newest}, true, 0, print_);
+            return newest < first ? 0 : reader_.Scan({first, newest}, true, 0, print_);
         } catch (const DatabaseError &) {
             if (!isReplaced || file_ == current)
                 throw;

@@ -90,7 +90,7 @@ int ShowStatus(const Spool &spool, const Settings &settings, bool isJson) {
                 (!health.isOn      ? "off"
                  : problem.empty() ? "on"
                                    : "failing: ") +
-                VisibleText(problem) + "\n";
+                EscapeForTerminal(problem) + "\n";
     }
     const size_t waiting = spool.NewIds().size();
     const size_t failed = spool.FailedIds().size();
@@ -122,14 +122,14 @@ Json::Value Describe(const Spool &spool, const std::string &id, bool isFailed, s
         item["time"] = static_cast<Json::Int64>(entry.time);
         item["tag"] = entry.tag;
         item["title"] = entry.title;
-        text += TimeFormat(false).Plain(entry.time) + "  " + VisibleText(entry.title);
+        text += TimeFormat(false).Plain(entry.time) + "  " + EscapeForTerminal(entry.title);
     } catch (const SpoolError &) {
         throw;
     } catch (const std::runtime_error &error) { // delivered meanwhile, or damaged
         item["problem"] = error.what();
-        text += VisibleText(error.what());
+        text += EscapeForTerminal(error.what());
     }
-    text += (reason.empty() ? "" : "\n    " + VisibleText(reason)) + "\n";
+    text += (reason.empty() ? "" : "\n    " + EscapeForTerminal(reason)) + "\n";
     return item;
 }
 

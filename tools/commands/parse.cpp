@@ -92,7 +92,7 @@ public:
 
 private:
     Output output_;
-    std::unique_ptr<RecordWriter> writer_;
+    std::unique_ptr<RecordFormatter> writer_;
     std::string text_;
 };
 

@@ -4,11 +4,11 @@
 
 #include <ctime>
 
+#include "base/atomic_file.h"
 #include "base/errors.h"
-#include "base/replacement_file.h"
 #include "cli/exit_status.h"
 #include "commands/common_options.h"
-#include "read/accounting_source.h"
+#include "read/accounting_samples.h"
 #include "read/eps_series.h"
 #include "read/time_expression.h"
 #include "report/report_page.h"
@@ -29,8 +29,8 @@ constexpr size_t kTopDevices = 10;
 constexpr uint64_t kMaxEvents = 100000;
 
 struct Options {
-    LogSourceOptions source;
-    Selection selection;
+    LogTableOptions table;
+    LogFilter filter;
     std::string eventsDb;
     std::string events = "100";
     std::string target;
@@ -66,18 +66,18 @@ std::optional<std::list<Event>> ReadEventsOf(const std::string &path, bool isNam
 }
 
 void ReadReport(const Options &options, const std::string &root, Report &report) {
-    const LogSource source = ResolveLogSource(options.source, root);
-    if (source.kind != TableKind::Logs)
-        throw UsageError("--log: reports are about table logs only, not about '" + options.source.log + "'");
+    const LogTable table = ResolveLogTable(options.table, root);
+    if (table.kind != TableKind::Logs)
+        throw UsageError("--log: reports are about table logs only, not about '" + options.table.log + "'");
     std::optional<int64_t> since;
-    if (!options.selection.since.empty())
-        since = ParseTimeExpression("--since", options.selection.since, report.now).seconds;
-    const std::optional<int64_t> until = LastSecond(options.selection, report.now);
+    if (!options.filter.since.empty())
+        since = ParseTimeExpression("--since", options.filter.since, report.now).seconds;
+    const std::optional<int64_t> until = LastSecond(options.filter, report.now);
     if (since.value_or(0) > until.value_or(since.value_or(0)))
-        throw UsageError("--until: '" + options.selection.until + "' is before --since");
+        throw UsageError("--until: '" + options.filter.until + "' is before --since");
 
-    report.logDatabase = source.path;
-    const std::optional<Period> period = LogPeriod(source, since, until);
+    report.logDatabase = table.path;
+    const std::optional<Period> period = LogPeriod(table, since, until);
     const bool isWhole = !since && !until;
     report.period = period.value_or(Period{since.value_or(0), until.value_or(report.now)});
     // Events go on after the last log.
@@ -86,7 +86,7 @@ void ReadReport(const Options &options, const std::string &root, Report &report)
     if (report.period.from > report.period.to)
         report.period.to = report.now;
     if (period && report.period.from <= report.period.to)
-        report.logs = ReadLogFigures(source, report.period, isWhole, kTopDevices);
+        report.logs = ReadLogFigures(table, report.period, isWhole, kTopDevices);
     report.eventDatabase = EventDatabasePath(options.eventsDb, root);
     report.events = ReadEventsOf(report.eventDatabase, !options.eventsDb.empty(), report.period);
     report.accounting = ReadAccounting(AccountingPath("", root), report.period, report.logs.grid);
@@ -99,7 +99,7 @@ int Run(const Options &options, const std::string &root) {
     report.now = std::time(nullptr);
     report.program = "kelosyslog " KELOSYSLOG_VERSION;
     ReadReport(options, root, report);
-    ReplacementFile file(options.target);
+    AtomicFile file(options.target);
     file.Write(RenderReport(report));
     file.Commit();
     return kExitFound;
@@ -115,13 +115,13 @@ void AddReport(Program &program) {
     command->footer(kFooter);
     AddText(*command, "file", options->target, "FILE", "The page; replaced only by a whole one")->required();
     const std::string group = "Which period";
-    AddText(*command, "-S,--since", options->selection.since, "TIME", "From this time on")->group(group);
-    AddText(*command, "-U,--until", options->selection.until, "TIME",
+    AddText(*command, "-S,--since", options->filter.since, "TIME", "From this time on")->group(group);
+    AddText(*command, "-U,--until", options->filter.until, "TIME",
             "Up to this second; a day alone ends before it begins")
         ->group(group);
     AddText(*command, "--events", options->events, "N", "List the newest N events (default: 100)");
     AddUtcOption(*command, options->inUtc);
-    AddSourceOptions(*command, options->source, false);
+    AddTableOptions(*command, options->table, false);
     AddText(*command, "--events-db", options->eventsDb, "PATH", "This event database, not the server's own")
         ->group("Where to look");
 }

@@ -104,8 +104,8 @@ int PrintRules(const RuleSet &set, const std::string &path, const std::string &f
         if (isJson)
             text += (text.size() > 1 ? ",\n" : "\n") + ToJson(rule);
         else
-            text += std::string(rule.enable ? "on   " : "off  ") + VisibleText(rule.name) + ": " +
-                    VisibleText(DescribeRule(rule)) + "\n";
+            text += std::string(rule.enable ? "on   " : "off  ") + EscapeForTerminal(rule.name) + ": " +
+                    EscapeForTerminal(DescribeRule(rule)) + "\n";
     }
     Output output(true);
     output.Write(isJson ? text + "\n]\n" : text);

@@ -28,7 +28,7 @@ bool Fires(const _SYSLOG_NOTIFY_RULES_tag &rule, const RuleTestOptions &options)
 // One line of the result: a rule, or what of a log it was, and what it fires for.
 void AppendLine(std::string &out, bool isJson, const std::string &name, const std::string &what) {
     if (!isJson) {
-        out += VisibleText(name) + ": " + VisibleText(what) + "\n";
+        out += EscapeForTerminal(name) + ": " + EscapeForTerminal(what) + "\n";
         return;
     }
     out += out.empty() ? "[\n{\"name\":" : ",\n{\"name\":";
@@ -65,15 +65,15 @@ int CheckLog(NotificationManager &manager, const _SYSLOG_LOG_DATA_tag &log, cons
 }
 
 int TestStoredLogs(const RuleTestOptions &options, bool isJson, const std::string &root) {
-    const LogSource source = ResolveLogSource(options.source, root);
-    if (source.kind != TableKind::Logs)
-        throw UsageError("--log: rules are tested on table logs only, not on '" + options.source.log + "'");
+    const LogTable table = ResolveLogTable(options.table, root);
+    if (table.kind != TableKind::Logs)
+        throw UsageError("--log: rules are tested on table logs only, not on '" + options.table.log + "'");
     const uint64_t count =
         options.lines.empty() ? kDefaultLogs : ParseNumber("--lines", options.lines, 1, kMaxLogs);
     NotificationManager manager;
     std::string out;
     int failures = 0;
-    LogReader(source, {}).WalkPage({count, 0}, true, [&](const _SYSLOG_LOG_DATA_tag &log) {
+    LogReader(table, {}).ReadPage({count, 0}, true, [&](const _SYSLOG_LOG_DATA_tag &log) {
         failures += CheckLog(manager, log, options, isJson, out);
     });
     const int status = Print(std::move(out), isJson);
@@ -92,8 +92,8 @@ int TestRules(const RuleTestOptions &options, const std::string &path, const std
         PrintMessage(path + ": section [" + rules.broken +
                      "] cannot be read; it and the rules after it are not in force");
     const bool isGiven = options.hasSeverity || options.hasEps || !options.text.empty();
-    const bool namesLogs = options.mustNotify || !options.lines.empty() || !options.source.db.empty() ||
-                           !options.source.log.empty();
+    const bool namesLogs = options.mustNotify || !options.lines.empty() || !options.table.db.empty() ||
+                           !options.table.log.empty();
     if (isGiven && namesLogs)
         throw UsageError("rules test: --severity, --eps and --text go with no option about stored logs");
     if (!isGiven)

@@ -4,7 +4,7 @@
 #include <string>
 
 #include "kelosyslog/records.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 
@@ -15,7 +15,7 @@ struct RuleTestOptions {
     bool hasEps = false;
     uint64_t eps = 0;
     std::string text;
-    LogSourceOptions source;
+    LogTableOptions table;
     std::string lines;
     bool mustNotify = false;
     std::string format = "text";

@@ -13,7 +13,7 @@
 #include "commands/rule_set.h"
 #include "commands/rule_test.h"
 #include "keloplatform/torvc.h"
-#include "read/level_selection.h"
+#include "read/severity_filter.h"
 #include "status/receiver.h"
 
 namespace kelo::tool {
@@ -52,7 +52,7 @@ bool IsGiven(const std::string &value) {
 
 _SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text) {
     try {
-        return ParseLevels({text + ".." + text}).included.front();
+        return ParseSeverities({text + ".." + text}).included.front();
     } catch (const UsageError &) {
         throw UsageError("--severity: '" + text +
                          "' is no level; levels are emerg, alert, crit, err, warning, "
@@ -187,7 +187,7 @@ void AddRules(Program &program) {
     command->add_flag("--notify", options->test.mustNotify,
                       "Send the notifications of the logs that are tested");
     AddText(*command, "-o,--output", options->test.format, "FORMAT", "text (default) or json");
-    AddSourceOptions(*command, options->test.source, false);
+    AddTableOptions(*command, options->test.table, false);
 }
 
 } // namespace kelo::tool

@@ -27,8 +27,8 @@ constexpr const char *kFooter =
 constexpr uint64_t kMaxLines = 2000000000;
 
 struct Options {
-    LogSourceOptions source;
-    Selection selection;
+    LogTableOptions table;
+    LogFilter filter;
     OutputOptions output;
     std::string lines;
     std::string offset;
@@ -50,12 +50,12 @@ FollowOptions ParseFollow(const Options &options, int64_t now) {
     if (options.newestFirst || !options.offset.empty())
         throw UsageError("--follow: goes neither with --reverse nor with --offset");
     FollowOptions follow;
-    follow.showAll = options.lines == "all" || (options.lines.empty() && !options.selection.since.empty());
+    follow.showAll = options.lines == "all" || (options.lines.empty() && !options.filter.since.empty());
     if (!options.lines.empty() && options.lines != "all")
         follow.lines = ParseNumber("--lines", options.lines, 0, kMaxLines);
     if (!options.idle.empty())
         follow.idleSec = ParseNumber("--idle", options.idle, 0, kMaxLines);
-    follow.until = LastSecond(options.selection, now);
+    follow.until = LastSecond(options.filter, now);
     return follow;
 }
 
@@ -66,12 +66,12 @@ int Run(const Options &options, const std::string &root) {
         throw UsageError("--idle: only together with --follow");
     const Page page = options.follow ? Page{} : ParsePage(options);
     const FollowOptions follow = options.follow ? ParseFollow(options, now) : FollowOptions{};
-    const LogSource source = ResolveLogSource(options.source, root);
-    const RecordLayout layout = MakeLayout(options.output, source.kind);
-    const LogReader reader(source, MakeConditions(options.selection, source, now));
+    const LogTable table = ResolveLogTable(options.table, root);
+    const RecordLayout layout = MakeLayout(options.output, table.kind);
+    const LogReader reader(table, MakeConditions(options.filter, table, now));
 
     Output output(!options.follow && !options.output.noPager);
-    const std::unique_ptr<RecordWriter> writer = MakeRecordWriter(layout);
+    const std::unique_ptr<RecordFormatter> writer = MakeRecordWriter(layout);
     std::string text;
     const auto send = [&] {
         output.Write(text);
@@ -83,7 +83,7 @@ int Run(const Options &options, const std::string &root) {
         send();
     };
     const uint64_t count = options.follow ? Follow(reader, follow, print, output)
-                                          : reader.WalkPage(page, !options.newestFirst, print);
+                                          : reader.ReadPage(page, !options.newestFirst, print);
     writer->End(text);
     send();
     output.Finish();
@@ -97,7 +97,7 @@ void AddSearch(Program &program) {
     CLI::App *command = AddSubcommand(program, "search", "Print logs",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddSelectionOptions(*command, options->selection);
+    AddFilterOptions(*command, options->filter);
     const std::string group = "How many";
     AddText(*command, "-n,--lines", options->lines, "N", "The newest N logs, or 'all'")->group(group);
     AddText(*command, "--offset", options->offset, "N", "Skip the N newest logs first")->group(group);
@@ -110,7 +110,7 @@ void AddSearch(Program &program) {
     AddText(*command, "--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")
         ->group(group);
     AddOutputOptions(*command, options->output);
-    AddSourceOptions(*command, options->source);
+    AddTableOptions(*command, options->table);
 }
 
 } // namespace kelo::tool

@@ -13,7 +13,7 @@
 #include "commands/common_options.h"
 #include "kelosyslog/dbutil.h"
 #include "print/statistics_table.h"
-#include "read/accounting_source.h"
+#include "read/accounting_samples.h"
 #include "read/eps_series.h"
 #include "read/time_expression.h"
 
@@ -39,7 +39,7 @@ struct Options {
     std::string name; // of "device NAME"
     std::string db;
     std::string top;
-    Selection period; // only its bounds are used
+    LogFilter period; // only its bounds are used
     std::string interval = "minute";
     std::string device;
     std::string format = "text";
@@ -99,7 +99,7 @@ Answer Total(const std::string &path, const Options &) {
 
 EpsSeries ReadSeries(const std::string &path, const Options &options) {
     const int64_t now = std::time(nullptr);
-    const Selection &period = options.period;
+    const LogFilter &period = options.period;
     const int64_t until = LastSecond(period, now).value_or(std::numeric_limits<int64_t>::max());
     int64_t since = 0;
     if (!period.since.empty())

@@ -6,7 +6,7 @@
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "print/output.h"
-#include "print/record_writer.h"
+#include "print/record_formatter.h"
 #include "print/statistics_table.h"
 #include "status/server_status.h"
 #include "status/status_json.h"

@@ -20,7 +20,7 @@ constexpr const char *kFooter = "Examples:\n"
 constexpr uint64_t kMaxRows = 4294967295; // what the library passes on
 
 struct Options {
-    LogSourceOptions source;
+    LogTableOptions table;
     std::string attribute;
     std::string format = "text";
     std::string lines;
@@ -40,7 +40,7 @@ void RequireAttribute(const std::string &name) {
     throw UsageError("values: '" + name + "' is no attribute; attributes are " + names);
 }
 
-std::list<std::string> ReadValues(const Options &options, const LogSource &source) {
+std::list<std::string> ReadValues(const Options &options, const LogTable &table) {
     _SYSLOG_SQL_LIMIT_tag limit;
     if (!options.lines.empty())
         limit.limit = ParseNumber("--lines", options.lines, 1, kMaxRows);
@@ -48,8 +48,8 @@ std::list<std::string> ReadValues(const Options &options, const LogSource &sourc
         limit.offset = ParseNumber("--offset", options.offset, 0, kMaxRows);
     const bool isLimited = !options.lines.empty() || !options.offset.empty();
     std::list<std::string> values;
-    if (SyslogDBAttriValueGet(source.path, options.attribute, isLimited ? &limit : nullptr, values) != 0)
-        throw DatabaseError(DescribeDatabaseProblem(source));
+    if (SyslogDBAttriValueGet(table.path, options.attribute, isLimited ? &limit : nullptr, values) != 0)
+        throw DatabaseError(DescribeDatabaseProblem(table));
     return values;
 }
 
@@ -65,7 +65,7 @@ void Print(const std::list<std::string> &values, const Options &options, OutputF
         if (format == OutputFormat::Csv)
             AppendCsvLine(text, {value});
         else if (format == OutputFormat::Text)
-            text += VisibleText(value) + "\n";
+            text += EscapeForTerminal(value) + "\n";
         else
             AppendJsonString(text, value);
         if (format == OutputFormat::Jsonl)
@@ -82,10 +82,10 @@ int Run(const Options &options, const std::string &root) {
     const OutputFormat format = ParseOutputFormat(options.format);
     if (format == OutputFormat::Short)
         throw UsageError("--output: values have no form 'short'; forms are text, json, jsonl, csv");
-    const LogSource source = ResolveLogSource(options.source, root);
-    if (source.kind != TableKind::Logs)
-        throw UsageError("--log: values are known of table logs only, not of '" + options.source.log + "'");
-    const std::list<std::string> values = ReadValues(options, source);
+    const LogTable table = ResolveLogTable(options.table, root);
+    if (table.kind != TableKind::Logs)
+        throw UsageError("--log: values are known of table logs only, not of '" + options.table.log + "'");
+    const std::list<std::string> values = ReadValues(options, table);
     Output output(true);
     Print(values, options, format, output);
     return values.empty() ? kExitNothing : kExitFound;
@@ -106,7 +106,7 @@ void AddValues(Program &program) {
     AddText(*command, "--offset", options->offset, "N", "Skip N values first");
     AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv");
     command->add_flag("--no-header", options->noHeader, "No heading in csv");
-    AddSourceOptions(*command, options->source, false);
+    AddTableOptions(*command, options->table, false);
 }
 
 } // namespace kelo::tool

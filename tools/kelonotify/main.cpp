@@ -91,11 +91,11 @@ int Main(int argc, char **argv) {
     Options options;
     CLI::App app("Deliver the notifications that wait in the spool.", "kelonotify");
     AddOptions(app, options);
-    const Endings endings = {
+    const ExitHandling exits = {
         kExitUsage, kExitSpool,
         [](const std::string &text) { std::fprintf(stderr, "kelonotify: %s\n", text.c_str()); },
         [](const std::string &text) { syslog(LOG_ERR, "%s", text.c_str()); }};
-    return RunToAnEnd(app, endings, [&] {
+    return RunApp(app, exits, [&] {
         app.parse(argc, argv);
         ApplyRoot(options.root);
         curl_global_init(CURL_GLOBAL_DEFAULT);

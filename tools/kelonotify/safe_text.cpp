@@ -25,14 +25,14 @@ std::string SafeLine(std::string_view text, size_t maxBytes) {
         if (byte == '\r' || byte == '\n' || byte == '\t')
             byte = ' ';
     }
-    return Cut(VisibleText(folded), maxBytes);
+    return Cut(EscapeForTerminal(folded), maxBytes);
 }
 
 std::string SafeLines(std::string_view text, size_t maxBytes) {
     std::string safe;
     for (size_t at = 0; at < text.size();) {
         const size_t end = std::min(text.find_first_of("\n\t", at), text.size());
-        safe += VisibleText(text.substr(at, end - at));
+        safe += EscapeForTerminal(text.substr(at, end - at));
         if (end < text.size())
             safe += text[end];
         at = end + 1;

@@ -7,9 +7,9 @@
 #include <filesystem>
 
 #include "base/errors.h"
-#include "read/level_selection.h"
 #include "read/log_message_capture.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
+#include "read/severity_filter.h"
 #include "read/time_expression.h"
 
 namespace kelo::tool {
@@ -41,7 +41,7 @@ int ParseEventLevel(const std::string &text) {
 }
 
 std::vector<int> ParseEventLevels(const std::vector<std::string> &values) {
-    const ValueSelection split = SplitValues("--priority", values);
+    const IncludeExclude split = SplitValues("--priority", values);
     std::vector<int> levels;
     for (const std::string &value : split.included)
         levels.push_back(ParseEventLevel(value));
@@ -86,17 +86,17 @@ std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
     return events;
 }
 
-bool EventSelection::Matches(const Event &event) const {
+bool EventFilter::Matches(const Event &event) const {
     return event.time >= since && event.time <= until &&
            (levels.empty() || std::find(levels.begin(), levels.end(), event.level) != levels.end());
 }
 
-EventSelection ParseEventSelection(const Selection &selection, int64_t now) {
-    EventSelection events;
-    if (!selection.since.empty())
-        events.since = ParseTimeExpression("--since", selection.since, now).seconds;
-    events.until = LastSecond(selection, now).value_or(events.until);
-    events.levels = ParseEventLevels(selection.levels);
+EventFilter ParseEventFilter(const LogFilter &filter, int64_t now) {
+    EventFilter events;
+    if (!filter.since.empty())
+        events.since = ParseTimeExpression("--since", filter.since, now).seconds;
+    events.until = LastSecond(filter, now).value_or(events.until);
+    events.levels = ParseEventLevels(filter.severities);
     return events;
 }
 

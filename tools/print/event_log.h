@@ -8,7 +8,7 @@
 
 #include "kelosyslog/logger.h"
 #include "print/record_fields.h"
-#include "read/selection.h"
+#include "read/log_filter.h"
 
 namespace kelo::tool {
 
@@ -25,7 +25,7 @@ std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit =
 [[noreturn]] void FailEventDatabase(const std::string &path, bool forWriting = false);
 
 // Which events a command is about; both ends included.
-struct EventSelection {
+struct EventFilter {
     int64_t since = std::numeric_limits<int64_t>::min(); // seconds since the epoch
     int64_t until = std::numeric_limits<int64_t>::max();
     std::vector<int> levels; // none for all
@@ -33,15 +33,15 @@ struct EventSelection {
     bool Matches(const Event &event) const;
 };
 
-// Reads --since, --until and --priority of `selection`, the only ones that events know. Levels are
+// Reads --since, --until and --priority of `filter`, the only ones that events know. Levels are
 // "information" (or info), "warning" (warn), "error" (err) or 0 to 2: a single one means it and all worse,
 // several mean each. Throws UsageError.
-EventSelection ParseEventSelection(const Selection &selection, int64_t now);
+EventFilter ParseEventFilter(const LogFilter &filter, int64_t now);
 
 // The name of an event's level, or its number where it has no name.
 std::string EventLevelName(int level);
 
-// An event in the shape that a RecordWriter prints with EventFields: id, time, level, user and event.
+// An event in the shape that a RecordFormatter prints with EventFields: id, time, level, user and event.
 _SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event);
 RecordFields EventFields();
 

@@ -5,7 +5,7 @@
 
 #include "base/time_format.h"
 #include "kelosyslog/records.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 

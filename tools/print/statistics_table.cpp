@@ -96,7 +96,7 @@ std::vector<std::string> StatisticsTable::TextLines(bool hasHeader) const {
     for (const std::vector<std::string> &cells : rows_) {
         std::vector<std::string> &line = table.emplace_back();
         for (const std::string &cell : cells)
-            line.push_back(VisibleText(cell));
+            line.push_back(EscapeForTerminal(cell));
     }
     std::vector<size_t> widths(columns_.size());
     for (const std::vector<std::string> &cells : table) {

@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "print/record_writer.h"
+#include "print/record_formatter.h"
 
 namespace kelo::tool {
 

@@ -5,8 +5,8 @@
 #include <limits>
 
 #include "base/errors.h"
-#include "read/accounting_source.h"
-#include "read/log_source.h"
+#include "read/accounting_samples.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 

@@ -19,7 +19,7 @@ constexpr uint64_t kPageRows = 50000;
 constexpr uint64_t kCountableIds = std::numeric_limits<int32_t>::max();
 
 // Carries the handler's exception over the library, and remembers where the walk stands.
-struct Walker {
+struct RowVisitor {
     const LogHandler &handle;
     uint64_t maxRows;
     uint64_t rows = 0;
@@ -27,7 +27,7 @@ struct Walker {
     std::exception_ptr exception = nullptr;
 
     static int Take(Log &log, void *context) {
-        auto &walker = *static_cast<Walker *>(context);
+        auto &walker = *static_cast<RowVisitor *>(context);
         try {
             walker.handle(log);
         } catch (...) {
@@ -47,23 +47,23 @@ void AddRange(Conditions &conditions, const IdRange &range) {
     conditions.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_LE, std::to_string(range.last), {}});
 }
 
-LogReader::LogReader(LogSource source, Conditions conditions)
-    : source_(std::move(source)), conditions_(std::move(conditions)) {}
+LogReader::LogReader(LogTable table, Conditions conditions)
+    : table_(std::move(table)), conditions_(std::move(conditions)) {}
 
 // One statement.
-LogReader::Walked LogReader::Select(const IdRange &range, bool oldestFirst, const Page &page,
-                                    const LogHandler &handle) const {
+LogReader::Scanned LogReader::Select(const IdRange &range, bool oldestFirst, const Page &page,
+                                     const LogHandler &handle) const {
     Conditions conditions = conditions_;
     AddRange(conditions, range);
     _SYSLOG_SQL_LIMIT_tag limit{page.limit, page.offset};
     _SYSLOG_SQL_ORDER_tag order{oldestFirst ? 1 : 0, SYSLOG_ATTRI_ID};
-    Walker walker{handle, page.limit};
-    const int status = SyslogDBSelectByTable(source_.path, source_.table, conditions, &limit, &order,
-                                             Walker::Take, &walker, false);
+    RowVisitor walker{handle, page.limit};
+    const int status = SyslogDBSelectByTable(table_.path, table_.name, conditions, &limit, &order,
+                                             RowVisitor::Take, &walker, false);
     if (walker.exception != nullptr)
         std::rethrow_exception(walker.exception);
     if (status != 0)
-        throw DatabaseError(DescribeDatabaseProblem(source_));
+        throw DatabaseError(DescribeDatabaseProblem(table_));
     return {walker.rows, walker.lastId};
 }
 
@@ -76,12 +76,12 @@ uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
         return 0;
     const uint64_t id = Select(range, isFirst, {1, 0}, [](const Log &) {}).lastId;
     if (id != 0 && (id < range.first || id > range.last)) // a walk from one to the next would never end
-        throw DatabaseError("cannot read " + source_.path + ": the ids of table " + source_.table +
+        throw DatabaseError("cannot read " + table_.path + ": the ids of table " + table_.name +
                             " are no row numbers");
     return id;
 }
 
-uint64_t LogReader::Walk(const IdRange &range, bool oldestFirst, uint64_t limit,
+uint64_t LogReader::Scan(const IdRange &range, bool oldestFirst, uint64_t limit,
                          const LogHandler &handle) const {
     IdRange rest = range;
     uint64_t total = 0;
@@ -106,7 +106,7 @@ uint64_t LogReader::Walk(const IdRange &range, bool oldestFirst, uint64_t limit,
     return total;
 }
 
-uint64_t LogReader::WalkPage(const Page &page, bool oldestFirst, const LogHandler &handle) const {
+uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandler &handle) const {
     if (page.limit != 0 && page.limit <= kPageRows) {
         std::vector<Log> logs;
         Select({}, false, page, [&](const Log &log) { logs.push_back(log); });
@@ -119,18 +119,18 @@ uint64_t LogReader::WalkPage(const Page &page, bool oldestFirst, const LogHandle
     if (last == 0)
         return 0;
     if (!oldestFirst)
-        return Walk({1, last}, false, page.limit, handle);
+        return Scan({1, last}, false, page.limit, handle);
     // Too many to turn round in memory: find where the page begins and walk forward.
     const uint64_t first = page.limit == 0 ? 1 : IdFromNewest(page.offset + page.limit - 1);
-    return Walk({std::max<uint64_t>(first, 1), last}, true, 0, handle);
+    return Scan({std::max<uint64_t>(first, 1), last}, true, 0, handle);
 }
 
 uint64_t LogReader::CountWith(Conditions conditions) const {
     // Always true, and not the text for which the library would answer with the largest id.
     conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}});
-    const int count = SyslogDBSelectCountByTable(source_.path, source_.table, conditions, nullptr, nullptr);
+    const int count = SyslogDBSelectCountByTable(table_.path, table_.name, conditions, nullptr, nullptr);
     if (count < 0)
-        throw DatabaseError(DescribeDatabaseProblem(source_));
+        throw DatabaseError(DescribeDatabaseProblem(table_));
     return static_cast<uint64_t>(count);
 }
 
@@ -141,7 +141,7 @@ uint64_t LogReader::CountIn(const IdRange &range) const {
 }
 
 uint64_t LogReader::Count() const {
-    const LogReader everything(source_, {});
+    const LogReader everything(table_, {});
     const uint64_t newest = everything.IdFromNewest(0);
     if (newest <= kCountableIds)
         return CountWith(conditions_);

@@ -6,7 +6,7 @@
 #include <list>
 
 #include "kelosyslog/dbutil.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 
@@ -39,9 +39,9 @@ struct Page {
 // pass.
 class LogReader {
 public:
-    LogReader(LogSource source, Conditions conditions);
+    LogReader(LogTable table, Conditions conditions);
 
-    const LogSource &Source() const { return source_; }
+    const LogTable &Table() const { return table_; }
     const Conditions &Selected() const { return conditions_; }
 
     // The id of the `index`-th newest selected log (0 is the newest); 0 when there are not that many.
@@ -51,26 +51,26 @@ public:
 
     // Hands the logs with an id in `range` to `handle`, oldest first or newest first, up to `limit` (0 for
     // all). Returns how many.
-    uint64_t Walk(const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle) const;
+    uint64_t Scan(const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle) const;
 
     // Hands a page to `handle`, oldest first or newest first. Returns how many logs it had.
-    uint64_t WalkPage(const Page &page, bool oldestFirst, const LogHandler &handle) const;
+    uint64_t ReadPage(const Page &page, bool oldestFirst, const LogHandler &handle) const;
 
     // Number of selected logs, in all or in `range`, which must not span more than 2^31 - 1 ids.
     uint64_t Count() const;
     uint64_t CountIn(const IdRange &range) const;
 
 private:
-    struct Walked {
+    struct Scanned {
         uint64_t rows = 0;
         uint64_t lastId = 0; // of the last row, 0 for none
     };
 
-    Walked Select(const IdRange &range, bool oldestFirst, const Page &page, const LogHandler &handle) const;
+    Scanned Select(const IdRange &range, bool oldestFirst, const Page &page, const LogHandler &handle) const;
     uint64_t EndId(const IdRange &range, bool isFirst) const;
     uint64_t CountWith(Conditions conditions) const;
 
-    LogSource source_;
+    LogTable table_;
     Conditions conditions_;
 };
 

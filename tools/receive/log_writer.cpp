@@ -34,7 +34,7 @@ ino_t InodeOf(const std::string &path) {
 
 } // namespace
 
-LogWriter::LogWriter(const std::string &path, VolumeWatch &volume)
+LogWriter::LogWriter(const std::string &path, DiskSpaceMonitor &volume)
     : path_(std::filesystem::absolute(path)), volume_(volume) {}
 
 void LogWriter::Take(_SYSLOG_LOG_DATA_tag &log, int64_t now) {

@@ -4,7 +4,7 @@
 #include <optional>
 #include <string>
 
-#include "receive/volume_watch.h"
+#include "receive/disk_space_monitor.h"
 #include "store/log_store.h"
 #include "store/record_batch.h"
 
@@ -20,7 +20,7 @@ namespace kelo::tool {
 class LogWriter {
 public:
     // Opens nothing yet. `volume`, which is told of a full disk, must outlive the writer.
-    LogWriter(const std::string &path, VolumeWatch &volume);
+    LogWriter(const std::string &path, DiskSpaceMonitor &volume);
 
     // Takes the log, and may leave another's contents in it.
     void Take(_SYSLOG_LOG_DATA_tag &log, int64_t now);
@@ -48,7 +48,7 @@ private:
     int64_t PutAside();
 
     std::string path_; // absolute
-    VolumeWatch &volume_;
+    DiskSpaceMonitor &volume_;
     std::optional<LogStore> store_;
     RecordBatch batch_;
     int64_t batchTime_ = 0; // of the batch's first log

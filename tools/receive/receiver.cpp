@@ -86,7 +86,7 @@ bool Receiver::AwaitInput(const LineReader &) {
     for (;;) {
         now_ = NowMs();
         HandleSignals();
-        Beat();
+        Tick();
         const bool isStored = !writer_ || writer_->Advance(now_);
         const bool mayRead = accounting_.MayCount() && isStored;
         if (mayRead && isInputReady_)
@@ -99,7 +99,7 @@ bool Receiver::AwaitInput(const LineReader &) {
 
 // Until there is input, where that may be read, or a signal, or something to do.
 void Receiver::Wait(bool mayRead) {
-    int64_t next = std::min(nextSecond_, nextBeat_);
+    int64_t next = std::min(nextSecond_, nextTick_);
     if (writer_)
         next = std::min(next, writer_->NextTime());
     if (!mayRead && (!writer_ || writer_->Reason().empty()))
@@ -135,19 +135,19 @@ void Receiver::HandleSignals() {
     }
 }
 
-void Receiver::Beat() {
+void Receiver::Tick() {
     if (now_ >= nextSecond_) {
         nextSecond_ = now_ + kSecondMs;
-        accounting_.Beat(now_ / kSecondMs);
-        rules_.Beat(now_ / kSecondMs);
-        setAside_.Beat(now_ / kSecondMs);
+        accounting_.Tick(now_ / kSecondMs);
+        rules_.Tick(now_ / kSecondMs);
+        setAside_.Tick(now_ / kSecondMs);
         Repair();
     }
     const bool isChanged = writer_ && writer_->Reason() != state_.waiting;
-    if (now_ < nextBeat_ && !isChanged)
+    if (now_ < nextTick_ && !isChanged)
         return;
-    nextBeat_ = now_ + kBeatMs;
-    volume_.Beat();
+    nextTick_ = now_ + kBeatMs;
+    volume_.Tick();
     WriteState();
 }
 

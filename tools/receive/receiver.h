@@ -6,12 +6,12 @@
 #include <string>
 
 #include "base/signal_source.h"
-#include "receive/accounting_beat.h"
+#include "receive/accounting_flusher.h"
+#include "receive/disk_space_monitor.h"
 #include "receive/log_writer.h"
 #include "receive/receiver_state.h"
-#include "receive/rule_watch.h"
+#include "receive/rule_checker.h"
 #include "receive/set_aside_file.h"
-#include "receive/volume_watch.h"
 #include "store/log_import.h"
 
 namespace kelo::tool {
@@ -48,7 +48,7 @@ private:
     void Wait(bool mayRead);
     bool HasEnded() const;
     void HandleSignals();
-    void Beat();
+    void Tick();
     void Repair();
     void WriteState();
     void Finish();
@@ -57,10 +57,10 @@ private:
 
     ReceiverOptions options_;
     SignalSource signals_;
-    VolumeWatch volume_;
+    DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
-    RuleWatch rules_;
-    AccountingBeat accounting_;
+    RuleChecker rules_;
+    AccountingFlusher accounting_;
     std::optional<LogWriter> writer_;
     LogImport import_;
     ReceiverState state_;
@@ -72,7 +72,7 @@ private:
     // Of the steady clock, in milliseconds.
     int64_t now_ = 0;
     int64_t nextSecond_ = 0;
-    int64_t nextBeat_ = 0;
+    int64_t nextTick_ = 0;
     int64_t nextRepair_ = 0;
     int64_t silentSince_ = 0;
     std::optional<int64_t> stopTime_; // when the signal came

@@ -61,7 +61,7 @@ bool WriteReceiverState(const std::string &root, const ReceiverState &state) {
     const std::string path = ReceiverStatePath(root);
     std::error_code ignored; // the write fails then, and says why
     std::filesystem::create_directories(std::filesystem::path(path).parent_path(), ignored);
-    return WriteDurably(path + ".new", path, WriteJsonLine(ToJson(state)));
+    return WriteFileAtomically(path + ".new", path, WriteJsonLine(ToJson(state)));
 }
 
 std::optional<ReceiverState> ReadReceiverState(const std::string &root) {

@@ -37,7 +37,7 @@ void SetAsideFile::Add(std::string_view reason, std::string_view line) {
         Flush();
 }
 
-void SetAsideFile::Beat(int64_t now) {
+void SetAsideFile::Tick(int64_t now) {
     Flush();
     if (unreported_ == 0 || now < nextReport_)
         return;

@@ -25,7 +25,7 @@ public:
 
     // Writes what was added. Tells the system log of it, at most once a minute; `now` is seconds of any clock
     // that does not go back.
-    void Beat(int64_t now);
+    void Tick(int64_t now);
 
     // The same, without waiting for the minute.
     void Finish();

@@ -5,7 +5,7 @@
 #include <ctime>
 
 #include "kelosyslog/records.h"
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -72,9 +72,9 @@ TimeGrid MakeTimeGrid(int64_t from, int64_t to) {
     return grid;
 }
 
-std::optional<Period> LogPeriod(const LogSource &source, std::optional<int64_t> since,
+std::optional<Period> LogPeriod(const LogTable &table, std::optional<int64_t> since,
                                 std::optional<int64_t> until) {
-    const auto ends = PlainDatabase(source).FirstRow(
+    const auto ends = ReadOnlyQuery(table).FirstRow(
         "SELECT (SELECT min(utcsec) FROM logs) AS first, (SELECT max(utcsec) FROM logs) AS last",
         {"first", "last"});
     if (!ends || ends->front().empty())
@@ -82,21 +82,21 @@ std::optional<Period> LogPeriod(const LogSource &source, std::optional<int64_t> 
     return Period{since.value_or(Number(ends->front())), until.value_or(Number(ends->back()))};
 }
 
-LogFigures ReadLogFigures(const LogSource &source, const Period &period, bool isWhole, size_t topDevices) {
+LogFigures ReadLogFigures(const LogTable &table, const Period &period, bool isWhole, size_t topDevices) {
     LogFigures figures;
     figures.grid = MakeTimeGrid(period.from, period.to);
     figures.spans.resize(figures.grid.count);
     const std::string which = isWhole ? ""
                                       : " WHERE utcsec BETWEEN " + std::to_string(period.from) + " AND " +
                                             std::to_string(period.to);
-    const PlainDatabase database(source);
+    const ReadOnlyQuery database(table);
     const std::string span =
         "(utcsec - (" + std::to_string(figures.grid.origin) + ")) / " + std::to_string(figures.grid.widthSec);
-    for (const PlainDatabase::Row &row : database.Rows(
+    for (const ReadOnlyQuery::Row &row : database.Rows(
              "SELECT " + span + " AS span, prio, count(*) AS number FROM logs" + which + " GROUP BY 1, 2",
              {"prio", "span", "number"}))
         AddSpan(figures, row[0], Number(row[1]), static_cast<uint64_t>(Number(row[2])));
-    for (const PlainDatabase::Row &row : database.Rows("SELECT host, count(*) AS number FROM logs" + which +
+    for (const ReadOnlyQuery::Row &row : database.Rows("SELECT host, count(*) AS number FROM logs" + which +
                                                            " GROUP BY host ORDER BY number DESC, host",
                                                        {"host", "number"})) {
         if (figures.deviceCount++ < topDevices)

@@ -7,7 +7,7 @@
 #include <utility>
 #include <vector>
 
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 
@@ -49,12 +49,12 @@ struct LogFigures {
 
 // The period from `since` to `until`, each replaced by the time of the oldest or newest log where it is not
 // given; none for an empty table.
-std::optional<Period> LogPeriod(const LogSource &source, std::optional<int64_t> since,
+std::optional<Period> LogPeriod(const LogTable &table, std::optional<int64_t> since,
                                 std::optional<int64_t> until);
 
 // Reads the figures in two statements, which group the rows inside the database: less than a second a
 // million rows. `isWhole` tells that the period leaves no log out, which saves looking. Both functions throw
 // DatabaseError.
-LogFigures ReadLogFigures(const LogSource &source, const Period &period, bool isWhole, size_t topDevices);
+LogFigures ReadLogFigures(const LogTable &table, const Period &period, bool isWhole, size_t topDevices);
 
 } // namespace kelo::tool

@@ -25,7 +25,7 @@ constexpr std::array<const char *, kSeverityClasses> kClassNames = {"errors", "w
 
 // A text from a database as one line without anything that could act on the page.
 std::string CellText(const std::string &text) {
-    std::string visible = VisibleText(text);
+    std::string visible = EscapeForTerminal(text);
     if (visible.size() <= kLongestText)
         return visible;
     size_t end = kLongestText;

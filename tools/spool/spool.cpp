@@ -88,7 +88,7 @@ Progress Spool::ReadRecord(const std::string &name) const {
 
 void Spool::Save(const std::string &name, const Progress &progress) const {
     const std::string temporary = "tmp/" + name.substr(name.find('/') + 1) + "." + std::to_string(getpid());
-    Require(WriteDurably(File(temporary), File(name), ToJson(progress)), name);
+    Require(WriteFileAtomically(File(temporary), File(name), ToJson(progress)), name);
 }
 
 void Spool::SaveProgress(const std::string &id, const Progress &progress) const {

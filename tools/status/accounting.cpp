@@ -4,9 +4,9 @@
 #include <limits>
 
 #include "kelosyslog/dbutil.h"
-#include "read/accounting_source.h"
+#include "read/accounting_samples.h"
 #include "read/eps_series.h"
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -22,7 +22,7 @@ double MeanRate(const std::string &path, int64_t newest, int64_t seconds) {
 
 AccountingStatus GatherAccounting(const std::string &path, int devices) {
     // The library's connections are not the last to be closed, so that none of them has to clean up.
-    const PlainDatabase open({path, "eps"}, std::chrono::milliseconds(150));
+    const ReadOnlyQuery open({path, "eps"}, std::chrono::milliseconds(150));
     AccountingStatus status;
     if (const auto stored = StoredStamps(path, {0, std::numeric_limits<int32_t>::max()})) {
         status.newest = stored->last;

@@ -88,8 +88,8 @@ std::string Receive(int file, std::string &text, Clock::time_point deadline) {
 } // namespace
 
 ControlAnswer AskControlSocket(const std::string &path, const std::string &command,
-                               std::chrono::milliseconds patience) {
-    const auto deadline = Clock::now() + patience;
+                               std::chrono::milliseconds timeout) {
+    const auto deadline = Clock::now() + timeout;
     ControlAnswer answer;
     const FileHandle file(socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0));
     answer.connectError = file ? Connect(file.Get(), path) : errno;

@@ -16,8 +16,8 @@ struct ControlAnswer {
 };
 
 // Sends one command ("STATS") to the control socket at `path`, which may be longer than a socket's address,
-// and reads the answer. Takes `patience` at the most, whatever the other side does.
+// and reads the answer. Takes `timeout` at the most, whatever the other side does.
 ControlAnswer AskControlSocket(const std::string &path, const std::string &command,
-                               std::chrono::milliseconds patience);
+                               std::chrono::milliseconds timeout);
 
 } // namespace kelo::tool

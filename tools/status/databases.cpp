@@ -11,8 +11,8 @@
 
 #include "kelosyslog/records.h"
 #include "print/event_log.h"
-#include "read/accounting_source.h"
-#include "read/plain_database.h"
+#include "read/accounting_samples.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -20,7 +20,7 @@ namespace {
 namespace fs = std::filesystem;
 
 using State = DatabaseStatus::State;
-using Row = PlainDatabase::Row;
+using Row = ReadOnlyQuery::Row;
 
 constexpr std::chrono::milliseconds kPatience{150};
 constexpr int64_t kMostCounted = 100'000; // rows; counting them takes a few milliseconds
@@ -46,7 +46,7 @@ std::optional<int64_t> LocalMoment(const std::string &text) {
 
 // Row numbers are read at both ends of the table, however many rows it has. Where many lie between them, the
 // rows are not counted: that would read a whole index.
-void ReadRows(const PlainDatabase &database, DatabaseStatus &status) {
+void ReadRows(const ReadOnlyQuery &database, DatabaseStatus &status) {
     const auto ends = database.FirstRow("SELECT (SELECT min(rowid) FROM " + status.table +
                                             ") AS low, (SELECT max(rowid) FROM " + status.table + ") AS high",
                                         {"low", "high"});
@@ -63,7 +63,7 @@ void ReadRows(const PlainDatabase &database, DatabaseStatus &status) {
 }
 
 // Transfer logs have no index of times: their first and last row are read.
-void ReadTransferTimes(const PlainDatabase &database, DatabaseStatus &status) {
+void ReadTransferTimes(const ReadOnlyQuery &database, DatabaseStatus &status) {
     for (const char *order : {"ASC", "DESC"}) {
         const auto row = database.FirstRow("SELECT ldate || ' ' || ltime AS moment FROM " + status.table +
                                                " ORDER BY rowid " + order + " LIMIT 1",
@@ -72,7 +72,7 @@ void ReadTransferTimes(const PlainDatabase &database, DatabaseStatus &status) {
     }
 }
 
-void ReadTimes(const PlainDatabase &database, DatabaseStatus &status) {
+void ReadTimes(const ReadOnlyQuery &database, DatabaseStatus &status) {
     const std::string column = status.table == "eps" ? "stamp" : status.table == "log" ? "time" : "utcsec";
     // Each of the two has an end of the index to itself.
     const auto row =
@@ -91,7 +91,7 @@ State StateAfter(int code) {
 
 void Read(DatabaseStatus &status) {
     try {
-        const PlainDatabase database({status.path, status.table}, kPatience);
+        const ReadOnlyQuery database({status.path, status.table}, kPatience);
         ReadRows(database, status);
         try {
             if (status.table == "transfer_log")
@@ -133,10 +133,10 @@ DatabaseStatus Look(const std::string &name, const std::string &path, const std:
 
 std::vector<DatabaseStatus> GatherDatabases(const std::string &root, const std::vector<std::string> &others) {
     std::vector<DatabaseStatus> all;
-    all.push_back(Look("logs", ResolveLogSource({}, root).path, "logs"));
+    all.push_back(Look("logs", ResolveLogTable({}, root).path, "logs"));
     for (int32_t i = 0; i < g_xferlog_info_count - 1; ++i) {
         const std::string name = g_xferlog_info[i].name;
-        const std::string path = ResolveLogSource({"", name, ""}, root).path;
+        const std::string path = ResolveLogTable({"", name, ""}, root).path;
         if (SizeOf(path) || SizeOf(path + ".corrupt"))
             all.push_back(Look(name, path, "transfer_log"));
     }

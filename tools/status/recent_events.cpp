@@ -2,14 +2,14 @@
 
 #include <cstdlib>
 
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 
 std::vector<Event> ReadRecentEvents(const std::string &path, int limit) {
-    const PlainDatabase database({path, "log"}, std::chrono::milliseconds(150));
+    const ReadOnlyQuery database({path, "log"}, std::chrono::milliseconds(150));
     std::vector<Event> events;
-    for (PlainDatabase::Row &row : database.Rows(
+    for (ReadOnlyQuery::Row &row : database.Rows(
              "SELECT id, level, time, user, event FROM log ORDER BY time DESC LIMIT " + std::to_string(limit),
              {"id", "level", "time", "user", "event"})) {
         Event &event = events.emplace_back();

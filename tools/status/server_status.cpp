@@ -37,7 +37,7 @@ void WithDatabase(ServerStatus &status, const std::string &name, auto read) {
 ServerStatus GatherStatus(const StatusOptions &options) {
     ServerStatus status;
     status.time = std::time(nullptr);
-    status.syslogNg = GatherSyslogNg(options.root, options.control, options.patience);
+    status.syslogNg = GatherSyslogNg(options.root, options.control, options.timeout);
     status.receiver = GatherReceiver(options.root, status.time);
     std::vector<std::string> others;
     if (!status.receiver.told.database.empty())

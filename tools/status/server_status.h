@@ -32,9 +32,9 @@ struct ServerStatus {
 };
 
 struct StatusOptions {
-    std::string root;                         // absolute or empty
-    std::string control;                      // another control socket of syslog-ng
-    std::chrono::milliseconds patience{2000}; // with syslog-ng
+    std::string root;                        // absolute or empty
+    std::string control;                     // another control socket of syslog-ng
+    std::chrono::milliseconds timeout{2000}; // with syslog-ng
 };
 
 // Asks everybody. Throws nothing but std::bad_alloc: what cannot be told is part of the status.

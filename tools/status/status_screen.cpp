@@ -41,12 +41,12 @@ std::string Rate(double perSecond) {
 void AddSection(Lines &lines, const std::string &name, const std::string &text, const char *colour) {
     constexpr size_t kColumn = 15;
     lines.push_back({});
-    const std::string value = VisibleText(text);
+    const std::string value = EscapeForTerminal(text);
     lines.push_back({value.empty() ? name : name + std::string(kColumn - name.size(), ' ') + value, colour});
 }
 
 void AddText(Lines &lines, const std::string &text, const char *colour = kPlain) {
-    lines.push_back({"  " + VisibleText(text), colour});
+    lines.push_back({"  " + EscapeForTerminal(text), colour});
 }
 
 // The lines of a table, of which each row has a colour.
@@ -219,7 +219,7 @@ size_t BytesOf(const std::string &text, size_t characters) {
 
 // A point that needs attention, in as many lines as it takes.
 void AddPoint(Lines &lines, const std::string &point, size_t width) {
-    std::string rest = "! " + VisibleText(point);
+    std::string rest = "! " + EscapeForTerminal(point);
     constexpr size_t kLeast = 20;
     while (width >= kLeast && CharacterCount(rest) > width) {
         const size_t room = BytesOf(rest, width);

@@ -110,10 +110,10 @@ uint64_t SyslogNgStatus::Dropped() const {
 }
 
 SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
-                              std::chrono::milliseconds patience) {
+                              std::chrono::milliseconds timeout) {
     SyslogNgStatus status;
     status.control = control.empty() ? root + kControl : control;
-    const ControlAnswer answer = AskControlSocket(status.control, "STATS", patience);
+    const ControlAnswer answer = AskControlSocket(status.control, "STATS", timeout);
     // Another control socket belongs to another syslog-ng than the pid files do.
     const pid_t fromFile = control.empty() ? PidFromFile(root) : 0;
     status.pid = answer.pid != 0 ? answer.pid : fromFile;

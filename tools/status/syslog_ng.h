@@ -45,6 +45,6 @@ struct SyslogNgStatus {
 // Asks the syslog-ng whose files stand below `root`, as Debian lays them, or the one with this control socket
 // where `control` is not empty. Who may not use the socket learns from the pid file whether it runs.
 SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
-                              std::chrono::milliseconds patience);
+                              std::chrono::milliseconds timeout);
 
 } // namespace kelo::tool

@@ -1,7 +1,7 @@
 #include <algorithm>
 #include <cstring>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "files/section_cache.h"
 #include "keloplatform/torvc.h"
 
@@ -14,7 +14,7 @@ int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t
         errno = EINVAL;
         return -1;
     }
-    return Guarded(-1, [&] {
+    return CatchBadAlloc(-1, [&] {
         const std::shared_ptr<const SectionText> text = LoadSectionText(path);
         if (text == nullptr)
             return -1;

@@ -1,6 +1,6 @@
 #include <unordered_set>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "files/refusal.h"
 #include "files/section_cache.h"
 #include "text/sz_hash.h"
@@ -54,11 +54,11 @@ int GetSection(const std::string &path, std::string_view name, TORVSZHASH &hash)
 int TORVCFileEnumSection(const char *path, TORVSZLIST **list) {
     if (path == nullptr || list == nullptr || *list == nullptr)
         return Fail(EINVAL);
-    return Guarded(-1, [&] { return EnumSection(path, **list); });
+    return CatchBadAlloc(-1, [&] { return EnumSection(path, **list); });
 }
 
 int TORVCFileGetSection(const char *path, const char *section, TORVSZHASH **hash) {
     if (path == nullptr || section == nullptr || hash == nullptr || *hash == nullptr)
         return Fail(EINVAL);
-    return Guarded(-1, [&] { return GetSection(path, section, **hash); });
+    return CatchBadAlloc(-1, [&] { return GetSection(path, section, **hash); });
 }

@@ -2,7 +2,7 @@
 #include <cstdlib>
 #include <memory>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "files/read_file.h"
 #include "files/refusal.h"
 #include "files/replace_file.h"
@@ -116,7 +116,7 @@ int TORVCFileSetSection(const char *path, const char *section, const char *newNa
                         const char *lineFormat) {
     if (path == nullptr || section == nullptr)
         return Fail(EINVAL);
-    return Guarded(-1, [&] {
+    return CatchBadAlloc(-1, [&] {
         SectionChange change{section, newName, {}};
         if (newName == nullptr)
             return Apply(path, change);

@@ -1,6 +1,6 @@
 #include <charconv>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "files/refusal.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/settings.h"
@@ -35,7 +35,7 @@ int KELOMailGet(KELOMAIL *mail) {
     if (mail == nullptr)
         return -1;
     *mail = KELOMAIL{};
-    if (Guarded(false, [&] { return Fill(*mail); }))
+    if (CatchBadAlloc(false, [&] { return Fill(*mail); }))
         return 0;
     *mail = KELOMAIL{};
     return -1;

@@ -3,7 +3,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "files/refusal.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/channels.h"
@@ -37,7 +37,7 @@ const char *TextOf(const char *text) {
 
 int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDir, const char *filterFile,
                                             TORVSZHASH **hash, int) {
-    const bool isSent = Guarded(false, [&] {
+    const bool isSent = CatchBadAlloc(false, [&] {
         if (tag == nullptr || tag[0] == '\0') {
             errno = EINVAL;
             return false;

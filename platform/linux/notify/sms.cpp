@@ -1,11 +1,11 @@
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/settings.h"
 
 using namespace kelo::platform;
 
 KELOSMSCONF *KELOSmsConfGet() {
-    return Guarded<KELOSMSCONF *>(nullptr, []() -> KELOSMSCONF * {
+    return CatchBadAlloc<KELOSMSCONF *>(nullptr, []() -> KELOSMSCONF * {
         const Settings settings;
         if (!settings.IsLoaded())
             return nullptr;

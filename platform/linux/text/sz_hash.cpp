@@ -3,9 +3,9 @@
 #include <algorithm>
 #include <memory>
 
-#include "common/guarded.h"
+#include "common/catch_bad_alloc.h"
 
-using kelo::platform::Guarded;
+using kelo::platform::CatchBadAlloc;
 
 namespace {
 
@@ -32,7 +32,7 @@ void TORVSZHASH::Set(std::string_view key, std::string_view value) {
 }
 
 TORVSZHASH *TORVCSzHashAlloc(size_t size) {
-    return Guarded<TORVSZHASH *>(nullptr, [&] {
+    return CatchBadAlloc<TORVSZHASH *>(nullptr, [&] {
         auto hash = std::make_unique<TORVSZHASH>();
         hash->index.reserve(std::min(size, kMaxReserved));
         return hash.release();
@@ -44,7 +44,7 @@ int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, const char *value) {
         errno = EINVAL;
         return -1;
     }
-    return Guarded(-1, [&] {
+    return CatchBadAlloc(-1, [&] {
         (*hash)->Set(key, value);
         return 0;
     });

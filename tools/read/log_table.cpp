@@ -1,4 +1,4 @@
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -53,16 +53,16 @@ bool IsShorterThanItSays(const Header &header, int64_t fileSize) {
     return pages * pageSize > fileSize;
 }
 
-std::string ReasonFromOutside(const LogSource &source, bool forWriting) {
+std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
     struct stat status {};
-    if (stat(source.path.c_str(), &status) != 0)
+    if (stat(table.path.c_str(), &status) != 0)
         return errno == ENOENT ? "no such file" : std::strerror(errno);
     if (S_ISDIR(status.st_mode))
         return "it is a folder";
     if (!S_ISREG(status.st_mode))
         return "it is no regular file";
     Header header{};
-    const ssize_t size = ReadHeader(source.path, header);
+    const ssize_t size = ReadHeader(table.path, header);
     if (size < 0)
         return std::strerror(errno);
     if (size == 0)
@@ -72,10 +72,10 @@ std::string ReasonFromOutside(const LogSource &source, bool forWriting) {
         return "it is not an SQLite database (or an encrypted one)";
     if (size < static_cast<ssize_t>(kHeaderSize) || IsShorterThanItSays(header, status.st_size))
         return "the file is cut short";
-    const std::string folder = std::filesystem::path(source.path).parent_path().string();
-    if (forWriting && (access(source.path.c_str(), W_OK) != 0 || access(folder.c_str(), W_OK) != 0))
+    const std::string folder = std::filesystem::path(table.path).parent_path().string();
+    if (forWriting && (access(table.path.c_str(), W_OK) != 0 || access(folder.c_str(), W_OK) != 0))
         return "no permission to write to it and its folder";
-    return "no usable table '" + source.table + "' in it, or it is locked or damaged; see the system log";
+    return "no usable table '" + table.name + "' in it, or it is locked or damaged; see the system log";
 }
 
 // Throws UsageError when there is no archive of this name.
@@ -94,24 +94,24 @@ std::string ArchivePath(const std::string &name, const std::string &root) {
 
 } // namespace
 
-LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root) {
+LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root) {
     if (!options.db.empty() && !options.log.empty())
         throw UsageError("--log: goes not together with --db");
-    LogSource source;
+    LogTable table;
     if (!options.db.empty()) {
-        source.path = std::filesystem::absolute(options.db).string();
+        table.path = std::filesystem::absolute(options.db).string();
     } else if (options.log.empty() || options.log == kWorkingLog) {
-        source.path = root + kWorkingLogPath;
+        table.path = root + kWorkingLogPath;
     } else {
         const std::string path = XferlogDBPathGet(options.log.c_str());
-        source.path = path.empty() ? ArchivePath(options.log, root) : root + path;
+        table.path = path.empty() ? ArchivePath(options.log, root) : root + path;
         if (!path.empty())
-            source.table = "transfer_log";
+            table.name = "transfer_log";
     }
     if (!options.table.empty())
-        source.table = options.table;
-    source.kind = KindOf(source.table);
-    return source;
+        table.name = options.table;
+    table.kind = KindOf(table.name);
+    return table;
 }
 
 std::string ArchiveFolderPath(const std::string &root) {
@@ -125,9 +125,9 @@ std::string KnownLogNames() {
     return names;
 }
 
-std::string DescribeDatabaseProblem(const LogSource &source, bool forWriting) {
-    return std::string(forWriting ? "cannot change " : "cannot read ") + source.path + ": " +
-           ReasonFromOutside(source, forWriting);
+std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting) {
+    return std::string(forWriting ? "cannot change " : "cannot read ") + table.path + ": " +
+           ReasonFromOutside(table, forWriting);
 }
 
 } // namespace kelo::tool

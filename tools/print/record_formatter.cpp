@@ -1,4 +1,4 @@
-#include "print/record_writer.h"
+#include "print/record_formatter.h"
 
 #include <algorithm>
 
@@ -34,7 +34,7 @@ void AppendColoured(std::string &out, const std::string &text, const char *colou
         out += kColourEnd;
 }
 
-class LayoutWriter : public RecordWriter {
+class LayoutWriter : public RecordFormatter {
 protected:
     explicit LayoutWriter(RecordLayout layout) : layout_(std::move(layout)), time_(layout_.inUtc) {}
 
@@ -66,7 +66,7 @@ public:
     void Add(const Log &log, std::string &out) override {
         std::vector<std::string> cells;
         for (const RecordField *field : Layout().fields)
-            cells.push_back(VisibleText(Value(*field, log, &TimeFormat::Plain)));
+            cells.push_back(EscapeForTerminal(Value(*field, log, &TimeFormat::Plain)));
         Widen(cells);
         if (Layout().hasHeader && !isHeaderWritten_)
             AppendHeader(out);
@@ -113,8 +113,8 @@ public:
     explicit ShortWriter(RecordLayout layout) : LayoutWriter(std::move(layout)) {}
 
     void Add(const Log &log, std::string &out) override {
-        out += VisibleText(Time(log, &TimeFormat::Short) + " " + log.host + " " + log.prog + ": ");
-        AppendColoured(out, VisibleText(RecordMessage(log, Layout().kind)), Colour(log));
+        out += EscapeForTerminal(Time(log, &TimeFormat::Short) + " " + log.host + " " + log.prog + ": ");
+        AppendColoured(out, EscapeForTerminal(RecordMessage(log, Layout().kind)), Colour(log));
         out += '\n';
     }
 };
@@ -191,7 +191,7 @@ OutputFormat ParseOutputFormat(const std::string &name) {
     throw UsageError("--output: '" + name + "' is no format; formats are text, short, json, jsonl, csv");
 }
 
-std::unique_ptr<RecordWriter> MakeRecordWriter(RecordLayout layout) {
+std::unique_ptr<RecordFormatter> MakeRecordWriter(RecordLayout layout) {
     if (layout.fields.empty())
         layout.fields =
             layout.format == OutputFormat::Text ? SummaryFields(layout.kind) : AllFields(layout.kind);

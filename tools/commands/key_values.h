@@ -10,7 +10,7 @@ namespace kelo::tool {
 
 // What a command found out or did: named values, in order, as lines of a name and a value or as one JSON
 // object.
-class Facts {
+class KeyValues {
 public:
     // `number` and `yes` as JSON has them; an unknown value is null there and left out of the lines.
     void Add(const std::string &name, const std::string &text);
@@ -33,10 +33,10 @@ private:
 };
 
 // The option --output for facts.
-void AddFactsFormat(CLI::App &command, std::string &format);
+void AddKeyValuesFormat(CLI::App &command, std::string &format);
 // The format of that name. Throws UsageError for any but text and json.
-OutputFormat ParseFactsFormat(const std::string &format);
+OutputFormat ParseKeyValuesFormat(const std::string &format);
 // Writes to the standard output.
-void Print(const Facts &facts, OutputFormat format);
+void Print(const KeyValues &facts, OutputFormat format);
 
 } // namespace kelo::tool

@@ -1,4 +1,4 @@
-#include "base/replacement_file.h"
+#include "base/atomic_file.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -37,7 +37,7 @@ void SyncFolderOf(const std::string &path) {
 
 } // namespace
 
-ReplacementFile::ReplacementFile(const std::string &target) : target_(target), path_(target + ".XXXXXX") {
+AtomicFile::AtomicFile(const std::string &target) : target_(target), path_(target + ".XXXXXX") {
     struct stat status {};
     if (stat(target.c_str(), &status) == 0 && !S_ISREG(status.st_mode))
         Fail("it is no regular file");
@@ -46,13 +46,13 @@ ReplacementFile::ReplacementFile(const std::string &target) : target_(target), p
         Fail(std::strerror(errno));
 }
 
-ReplacementFile::~ReplacementFile() {
+AtomicFile::~AtomicFile() {
     close(file_);
     if (!path_.empty())
         unlink(path_.c_str());
 }
 
-void ReplacementFile::Write(std::string_view text) {
+void AtomicFile::Write(std::string_view text) {
     while (!text.empty()) {
         const ssize_t written = write(file_, text.data(), text.size());
         if (written < 0 && errno != EINTR)
@@ -62,7 +62,7 @@ void ReplacementFile::Write(std::string_view text) {
     }
 }
 
-void ReplacementFile::Commit() {
+void AtomicFile::Commit() {
     if (fchmod(file_, ModeOf(target_)) != 0 || fsync(file_) != 0 ||
         std::rename(path_.c_str(), target_.c_str()) != 0)
         Fail(std::strerror(errno));
@@ -70,7 +70,7 @@ void ReplacementFile::Commit() {
     SyncFolderOf(target_);
 }
 
-void ReplacementFile::Fail(const std::string &reason) const {
+void AtomicFile::Fail(const std::string &reason) const {
     throw OutputError("cannot write " + target_ + ": " + reason);
 }
 

@@ -1,4 +1,4 @@
-#include "commands/facts.h"
+#include "commands/key_values.h"
 
 #include <algorithm>
 
@@ -7,28 +7,28 @@
 
 namespace kelo::tool {
 
-void Facts::Add(const std::string &name, const std::string &text) {
-    Fact fact{name, {VisibleText(text)}, ""};
+void KeyValues::Add(const std::string &name, const std::string &text) {
+    Fact fact{name, {EscapeForTerminal(text)}, ""};
     AppendJsonString(fact.json, text);
     facts_.push_back(std::move(fact));
 }
 
-void Facts::Add(const std::string &name, int64_t number) {
+void KeyValues::Add(const std::string &name, int64_t number) {
     facts_.push_back({name, {std::to_string(number)}, std::to_string(number)});
 }
 
-void Facts::AddBool(const std::string &name, bool yes) {
+void KeyValues::AddBool(const std::string &name, bool yes) {
     facts_.push_back({name, {yes ? "yes" : "no"}, yes ? "true" : "false"});
 }
 
-void Facts::AddUnknown(const std::string &name) {
+void KeyValues::AddUnknown(const std::string &name) {
     facts_.push_back({name, {}, "null"});
 }
 
-void Facts::AddList(const std::string &name, const std::vector<std::string> &texts) {
+void KeyValues::AddList(const std::string &name, const std::vector<std::string> &texts) {
     Fact fact{name, {}, "["};
     for (const std::string &text : texts) {
-        fact.lines.push_back(VisibleText(text));
+        fact.lines.push_back(EscapeForTerminal(text));
         fact.json += fact.json.size() > 1 ? ", " : "";
         AppendJsonString(fact.json, text);
     }
@@ -36,7 +36,7 @@ void Facts::AddList(const std::string &name, const std::vector<std::string> &tex
     facts_.push_back(std::move(fact));
 }
 
-std::string Facts::Render(OutputFormat format) const {
+std::string KeyValues::Render(OutputFormat format) const {
     size_t width = 0;
     for (const Fact &fact : facts_)
         width = std::max(width, fact.lines.empty() ? 0 : fact.name.size());
@@ -54,18 +54,18 @@ std::string Facts::Render(OutputFormat format) const {
     return format == OutputFormat::Json ? text + "\n}\n" : text;
 }
 
-void AddFactsFormat(CLI::App &command, std::string &format) {
+void AddKeyValuesFormat(CLI::App &command, std::string &format) {
     AddText(command, "-o,--output", format, "FORMAT", "text (default) or json (one object)");
 }
 
-OutputFormat ParseFactsFormat(const std::string &format) {
+OutputFormat ParseKeyValuesFormat(const std::string &format) {
     const OutputFormat parsed = ParseOutputFormat(format);
     if (parsed != OutputFormat::Text && parsed != OutputFormat::Json)
         throw UsageError("--output: there is no form '" + format + "' of this; forms are text, json");
     return parsed;
 }
 
-void Print(const Facts &facts, OutputFormat format) {
+void Print(const KeyValues &facts, OutputFormat format) {
     Output output(false);
     output.Write(facts.Render(format));
     output.Finish();

@@ -1,4 +1,4 @@
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 #include <sqlite3.h>
 #include <sys/stat.h>
@@ -17,40 +17,39 @@ struct ResultFreer {
 
 } // namespace
 
-void PlainDatabase::Closer::operator()(DBConnect_tag *connection) const {
+void ReadOnlyQuery::Closer::operator()(DBConnect_tag *connection) const {
     KELODBClose(connection);
 }
 
-PlainDatabase::PlainDatabase(LogSource source)
-    : source_(std::move(source)),
-      connection_(KELODBConnect(nullptr, nullptr, nullptr, source_.path.c_str())) {
+ReadOnlyQuery::ReadOnlyQuery(LogTable table)
+    : table_(std::move(table)), connection_(KELODBConnect(nullptr, nullptr, nullptr, table_.path.c_str())) {
     if (connection_ == nullptr)
-        throw DatabaseError(DescribeDatabaseProblem(source_));
+        throw DatabaseError(DescribeDatabaseProblem(table_));
 }
 
-PlainDatabase::PlainDatabase(LogSource source, std::chrono::milliseconds patience)
-    : PlainDatabase(std::move(source)) {
+ReadOnlyQuery::ReadOnlyQuery(LogTable table, std::chrono::milliseconds timeout)
+    : ReadOnlyQuery(std::move(table)) {
     constexpr int kInstructions = 10000; // of SQLite's machine, less than a millisecond
-    patience_ = patience;
+    timeout_ = timeout;
     sqlite3 *db = KELODBInternalDBHdlGet(connection_.get());
-    sqlite3_busy_timeout(db, static_cast<int>(patience.count()));
-    sqlite3_progress_handler(db, kInstructions, IsOverdue, this);
+    sqlite3_busy_timeout(db, static_cast<int>(timeout.count()));
+    sqlite3_progress_handler(db, kInstructions, IsPastDeadline, this);
     struct stat log {};
     // One that is empty, or that the last to close leaves behind, SQLite removes as ever.
-    if (stat((source_.path + "-wal").c_str(), &log) == 0 && log.st_size > 0)
+    if (stat((table_.path + "-wal").c_str(), &log) == 0 && log.st_size > 0)
         sqlite3_db_config(db, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
 }
 
-int PlainDatabase::IsOverdue(void *database) {
-    return std::chrono::steady_clock::now() > static_cast<PlainDatabase *>(database)->deadline_ ? 1 : 0;
+int ReadOnlyQuery::IsPastDeadline(void *database) {
+    return std::chrono::steady_clock::now() > static_cast<ReadOnlyQuery *>(database)->deadline_ ? 1 : 0;
 }
 
-std::vector<PlainDatabase::Row> PlainDatabase::Rows(const std::string &sql,
+std::vector<ReadOnlyQuery::Row> ReadOnlyQuery::Rows(const std::string &sql,
                                                     const std::vector<std::string> &columns) const {
     DBResult_tag *raw = nullptr;
-    deadline_ = std::chrono::steady_clock::now() + patience_;
+    deadline_ = std::chrono::steady_clock::now() + timeout_;
     if (KELODBExecute(connection_.get(), sql.c_str(), &raw) < 0)
-        throw StatementError(source_.path + ": " + KELODBErrorGet(connection_.get()),
+        throw StatementError(table_.path + ": " + KELODBErrorGet(connection_.get()),
                              sqlite3_errcode(KELODBInternalDBHdlGet(connection_.get())) & 0xff);
     const std::unique_ptr<DBResult_tag, ResultFreer> result(raw);
     std::vector<Row> rows;
@@ -64,25 +63,25 @@ std::vector<PlainDatabase::Row> PlainDatabase::Rows(const std::string &sql,
     return rows;
 }
 
-std::optional<PlainDatabase::Row> PlainDatabase::FirstRow(const std::string &sql,
+std::optional<ReadOnlyQuery::Row> ReadOnlyQuery::FirstRow(const std::string &sql,
                                                           const std::vector<std::string> &columns) const {
     std::vector<Row> rows = Rows(sql, columns);
     return rows.empty() ? std::nullopt : std::optional(std::move(rows.front()));
 }
 
-std::vector<std::string> PlainDatabase::Column(const std::string &sql, const std::string &column) const {
+std::vector<std::string> ReadOnlyQuery::Column(const std::string &sql, const std::string &column) const {
     std::vector<std::string> values;
     for (Row &row : Rows(sql, {column}))
         values.push_back(std::move(row.front()));
     return values;
 }
 
-int64_t PlainDatabase::Number(const std::string &sql) const {
+int64_t ReadOnlyQuery::Number(const std::string &sql) const {
     const auto row = FirstRow(sql, {"value"});
     return row ? std::strtoll(row->front().c_str(), nullptr, 10) : 0;
 }
 
-bool PlainDatabase::HasTable(const std::string &table) const {
+bool ReadOnlyQuery::HasTable(const std::string &table) const {
     return Number("SELECT count(*) AS value FROM sqlite_master WHERE type = 'table' AND name = '" + table +
                   "'") != 0;
 }

@@ -6,10 +6,10 @@ namespace kelo::tool {
 
 // Tells the administrator when the volume of a folder is full: one event and one notification each time it
 // becomes so. What cannot be told because the volume is full is told when there is room again.
-class VolumeWatch {
+class DiskSpaceMonitor {
 public:
     // `folder` is the absolute path that the notification names.
-    explicit VolumeWatch(std::string folder) : folder_(std::move(folder)) {}
+    explicit DiskSpaceMonitor(std::string folder) : folder_(std::move(folder)) {}
 
     // Something could not be written for want of space.
     void NoteFull();
@@ -17,7 +17,7 @@ public:
     void NoteWritten();
 
     // Looks at the free space; to be called every few seconds.
-    void Beat();
+    void Tick();
 
 private:
     void Enter(bool &cause);

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "base/errors.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 struct DBConnect_tag;
 
@@ -21,15 +21,15 @@ struct StatementError : DatabaseError {
 };
 
 // A connection that only tells what is wrong: unlike a DBHandler it creates no file and puts none aside.
-class PlainDatabase {
+class ReadOnlyQuery {
 public:
     // Throws DatabaseError when the file cannot be opened.
-    explicit PlainDatabase(LogSource source);
-    // For who is in a hurry: a statement fails that waits for a lock, or works, for longer than `patience`
+    explicit ReadOnlyQuery(LogTable table);
+    // For who is in a hurry: a statement fails that waits for a lock, or works, for longer than `timeout`
     // (SQLITE_BUSY, SQLITE_INTERRUPT), and closing leaves the rows of a write-ahead log to others.
-    PlainDatabase(LogSource source, std::chrono::milliseconds patience);
-    PlainDatabase(const PlainDatabase &) = delete;
-    PlainDatabase &operator=(const PlainDatabase &) = delete;
+    ReadOnlyQuery(LogTable table, std::chrono::milliseconds timeout);
+    ReadOnlyQuery(const ReadOnlyQuery &) = delete;
+    ReadOnlyQuery &operator=(const ReadOnlyQuery &) = delete;
 
     // The values of these columns, of all rows or of the first; none without a row. NULL is "". These and the
     // others throw StatementError.
@@ -45,10 +45,10 @@ private:
     struct Closer {
         void operator()(DBConnect_tag *connection) const;
     };
-    static int IsOverdue(void *database);
+    static int IsPastDeadline(void *database);
 
-    LogSource source_;
-    std::chrono::milliseconds patience_{0};
+    LogTable table_;
+    std::chrono::milliseconds timeout_{0};
     mutable std::chrono::steady_clock::time_point deadline_; // of the statement that runs
     std::unique_ptr<DBConnect_tag, Closer> connection_;
 };

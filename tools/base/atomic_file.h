@@ -8,19 +8,19 @@ namespace kelo::tool {
 // A file that is written beside its target and takes the target's name only when it is complete and on the
 // disk. Until then, and whenever something fails, the target stays what it was.
 //
-//     ReplacementFile file("report.html");
+//     AtomicFile file("report.html");
 //     file.Write(text);
 //     file.Commit();
 //
 // All functions throw OutputError, which names the target and the reason.
-class ReplacementFile {
+class AtomicFile {
 public:
     // Creates the temporary file in the target's folder.
-    explicit ReplacementFile(const std::string &target);
+    explicit AtomicFile(const std::string &target);
     // Removes the temporary file, unless it was committed.
-    ~ReplacementFile();
-    ReplacementFile(const ReplacementFile &) = delete;
-    ReplacementFile &operator=(const ReplacementFile &) = delete;
+    ~AtomicFile();
+    AtomicFile(const AtomicFile &) = delete;
+    AtomicFile &operator=(const AtomicFile &) = delete;
 
     // Where the temporary file stands, for others that write it by its name.
     const std::string &Path() const { return path_; }

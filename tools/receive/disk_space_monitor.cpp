@@ -1,4 +1,4 @@
-#include "receive/volume_watch.h"
+#include "receive/disk_space_monitor.h"
 
 #include <sys/statvfs.h>
 #include <syslog.h>
@@ -18,15 +18,15 @@ constexpr uint64_t kRoomBytes = 32 * 1024 * 1024;
 
 } // namespace
 
-void VolumeWatch::NoteFull() {
+void DiskSpaceMonitor::NoteFull() {
     Enter(isWriteFailing_);
 }
 
-void VolumeWatch::NoteWritten() {
+void DiskSpaceMonitor::NoteWritten() {
     Leave(isWriteFailing_);
 }
 
-void VolumeWatch::Beat() {
+void DiskSpaceMonitor::Tick() {
     struct statvfs status {};
     if (statvfs(folder_.c_str(), &status) != 0)
         return;
@@ -37,7 +37,7 @@ void VolumeWatch::Beat() {
         Leave(isSpaceLow_);
 }
 
-void VolumeWatch::Enter(bool &cause) {
+void DiskSpaceMonitor::Enter(bool &cause) {
     const bool wasFull = isWriteFailing_ || isSpaceLow_;
     cause = true;
     if (wasFull)
@@ -48,7 +48,7 @@ void VolumeWatch::Enter(bool &cause) {
     Tell();
 }
 
-void VolumeWatch::Leave(bool &cause) {
+void DiskSpaceMonitor::Leave(bool &cause) {
     const bool wasFull = isWriteFailing_ || isSpaceLow_;
     cause = false;
     if (!wasFull || isWriteFailing_ || isSpaceLow_)
@@ -59,7 +59,7 @@ void VolumeWatch::Leave(bool &cause) {
     isNotificationDue_ = false;
 }
 
-void VolumeWatch::Tell() {
+void DiskSpaceMonitor::Tell() {
     if (isEventDue_)
         isEventDue_ = Logger().LogAddVolFull() != 0;
     if (isNotificationDue_)

@@ -1,10 +1,10 @@
-#include "read/selection.h"
+#include "read/log_filter.h"
 
 #include <ctime>
 
 #include "base/errors.h"
-#include "read/level_selection.h"
 #include "read/log_message_capture.h"
+#include "read/severity_filter.h"
 #include "read/time_expression.h"
 
 namespace kelo::tool {
@@ -49,7 +49,7 @@ Condition Exclusion(const std::string &column, const std::string &value) {
     return RawCondition(column + " IS NOT " + SqlText(value));
 }
 
-void AddValues(Conditions &conditions, _SYSLOG_DB_ATTRI_tag attr, const ValueSelection &values) {
+void AddValues(Conditions &conditions, _SYSLOG_DB_ATTRI_tag attr, const IncludeExclude &values) {
     Condition anyOf;
     for (const std::string &value : values.included) {
         const Condition one{attr, IsPattern(value) ? SYSLOG_OP_GLOB : SYSLOG_OP_EQ, value, {}};
@@ -64,18 +64,18 @@ void AddValues(Conditions &conditions, _SYSLOG_DB_ATTRI_tag attr, const ValueSel
         conditions.push_back(Exclusion(LogAttriStrGet(attr), value));
 }
 
-void AddLevels(Conditions &conditions, const std::vector<std::string> &values) {
-    const LevelSelection levels = ParseLevels(values);
-    ValueSelection words;
-    for (const _SYSLOG_DB_PRIORITY_tag level : levels.included)
-        words.included.emplace_back(g_MappingSyslogPrior[level]);
-    for (const _SYSLOG_DB_PRIORITY_tag level : levels.excluded)
-        words.excluded.emplace_back(g_MappingSyslogPrior[level]);
+void AddSeverities(Conditions &conditions, const std::vector<std::string> &values) {
+    const SeverityFilter severities = ParseSeverities(values);
+    IncludeExclude words;
+    for (const _SYSLOG_DB_PRIORITY_tag severity : severities.included)
+        words.included.emplace_back(g_MappingSyslogPrior[severity]);
+    for (const _SYSLOG_DB_PRIORITY_tag severity : severities.excluded)
+        words.excluded.emplace_back(g_MappingSyslogPrior[severity]);
     AddValues(conditions, SYSLOG_ATTRI_LLEVEL, words);
 }
 
 void AddFacilities(Conditions &conditions, const std::vector<std::string> &values) {
-    ValueSelection words = SplitValues("--facility", values);
+    IncludeExclude words = SplitValues("--facility", values);
     for (std::string &word : words.included)
         word = FacilityName(word);
     for (std::string &word : words.excluded)
@@ -111,46 +111,44 @@ void AddTimeBound(Conditions &conditions, TableKind kind, _SYSLOG_SQL_OP_tag op,
     }
 }
 
-void RequireColumn(bool isUsed, const char *option, const char *column, const LogSource &source) {
+void RequireColumn(bool isUsed, const char *option, const char *column, const LogTable &table) {
     if (isUsed)
-        throw UsageError(std::string(option) + ": table " + source.table + " has no column '" + column + "'");
+        throw UsageError(std::string(option) + ": table " + table.name + " has no column '" + column + "'");
 }
 
 } // namespace
 
-bool IsEmpty(const Selection &selection) {
-    return selection.since.empty() && selection.until.empty() && selection.levels.empty() &&
-           selection.facilities.empty() && selection.hosts.empty() && selection.programs.empty() &&
-           selection.keywords.empty();
+bool IsEmpty(const LogFilter &filter) {
+    return filter.since.empty() && filter.until.empty() && filter.severities.empty() &&
+           filter.facilities.empty() && filter.hosts.empty() && filter.programs.empty() &&
+           filter.keywords.empty();
 }
 
-std::optional<int64_t> LastSecond(const Selection &selection, int64_t now) {
-    if (selection.until.empty())
+std::optional<int64_t> LastSecond(const LogFilter &filter, int64_t now) {
+    if (filter.until.empty())
         return std::nullopt;
-    const Moment until = ParseTimeExpression("--until", selection.until, now);
+    const Moment until = ParseTimeExpression("--until", filter.until, now);
     return until.isDayOnly ? until.seconds - 1 : until.seconds;
 }
 
-std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const Selection &selection, const LogSource &source,
-                                               int64_t now) {
-    RequireColumn(source.kind != TableKind::Logs && !selection.facilities.empty(), "--facility", "fac",
-                  source);
-    RequireColumn(source.kind == TableKind::Transfer && !selection.levels.empty(), "--priority", "llevel",
-                  source);
-    RequireColumn(source.kind == TableKind::Transfer && !selection.keywords.empty(), "--grep", "msg", source);
+std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const LogFilter &filter, const LogTable &table, int64_t now) {
+    RequireColumn(table.kind != TableKind::Logs && !filter.facilities.empty(), "--facility", "fac", table);
+    RequireColumn(table.kind == TableKind::Transfer && !filter.severities.empty(), "--priority", "llevel",
+                  table);
+    RequireColumn(table.kind == TableKind::Transfer && !filter.keywords.empty(), "--grep", "msg", table);
     Conditions conditions;
-    AddValues(conditions, SYSLOG_ATTRI_HOST, SplitValues("--host", selection.hosts));
-    AddLevels(conditions, selection.levels);
-    AddFacilities(conditions, selection.facilities);
-    AddValues(conditions, SYSLOG_ATTRI_PROG, SplitValues("--program", selection.programs));
-    for (const std::string &keyword : selection.keywords)
+    AddValues(conditions, SYSLOG_ATTRI_HOST, SplitValues("--host", filter.hosts));
+    AddSeverities(conditions, filter.severities);
+    AddFacilities(conditions, filter.facilities);
+    AddValues(conditions, SYSLOG_ATTRI_PROG, SplitValues("--program", filter.programs));
+    for (const std::string &keyword : filter.keywords)
         AddKeyword(conditions, keyword);
-    if (!selection.since.empty()) {
-        const Moment since = ParseTimeExpression("--since", selection.since, now);
-        AddTimeBound(conditions, source.kind, SYSLOG_OP_GE, since.seconds);
+    if (!filter.since.empty()) {
+        const Moment since = ParseTimeExpression("--since", filter.since, now);
+        AddTimeBound(conditions, table.kind, SYSLOG_OP_GE, since.seconds);
     }
-    if (const std::optional<int64_t> last = LastSecond(selection, now))
-        AddTimeBound(conditions, source.kind, SYSLOG_OP_LE, *last);
+    if (const std::optional<int64_t> last = LastSecond(filter, now))
+        AddTimeBound(conditions, table.kind, SYSLOG_OP_LE, *last);
     return conditions;
 }
 

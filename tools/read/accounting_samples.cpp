@@ -1,9 +1,9 @@
-#include "read/accounting_source.h"
+#include "read/accounting_samples.h"
 
 #include <cstdlib>
 #include <filesystem>
 
-#include "read/plain_database.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -17,7 +17,7 @@ std::string AccountingPath(const std::string &db, const std::string &root) {
 }
 
 void RequireHistogram(const std::string &path) {
-    PlainDatabase({path, "histogram"}).FirstRow("SELECT device, count FROM histogram LIMIT 1", {});
+    ReadOnlyQuery({path, "histogram"}).FirstRow("SELECT device, count FROM histogram LIMIT 1", {});
 }
 
 std::optional<StampRange> StoredStamps(const std::string &path, const StampRange &range) {
@@ -26,7 +26,7 @@ std::optional<StampRange> StoredStamps(const std::string &path, const StampRange
     // Each of the two has an end of the index to itself.
     const std::string sql = "SELECT (SELECT min(stamp)" + where + ") AS first, (SELECT max(stamp)" + where +
                             ") AS last, (SELECT device || eps FROM eps LIMIT 1) AS probe";
-    const auto ends = PlainDatabase({path, "eps"}).FirstRow(sql, {"first", "last"});
+    const auto ends = ReadOnlyQuery({path, "eps"}).FirstRow(sql, {"first", "last"});
     if (!ends || ends->front().empty())
         return std::nullopt;
     return StampRange{std::strtoll(ends->front().c_str(), nullptr, 10),

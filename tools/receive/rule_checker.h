@@ -5,7 +5,7 @@
 #include <string>
 
 #include "kelosyslog/notification.h"
-#include "receive/notify_limit.h"
+#include "receive/rate_limiter.h"
 
 namespace kelo::tool {
 
@@ -14,15 +14,15 @@ namespace kelo::tool {
 // in the system log, by the library; after an event that failed a minute goes without events.
 //
 // Times are seconds of any clock that does not go back.
-class RuleWatch {
+class RuleChecker {
 public:
     // Loads the rules. `notifyLimit`: notifications a minute and kind of rule, at least 1.
-    explicit RuleWatch(uint64_t notifyLimit);
+    explicit RuleChecker(uint64_t notifyLimit);
 
     void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
 
     // To be called about once a second: tells what was suppressed in a minute that is over.
-    void Beat(int64_t now);
+    void Tick(int64_t now);
 
     // Tells what is left to tell.
     void Finish();
@@ -39,7 +39,7 @@ public:
 private:
     // One kind of rule. Of its last match that was suppressed: the sender, and the severity or keyword.
     struct Kind {
-        NotifyLimit limit;
+        RateLimiter limit;
         std::string host;
         std::string what;
     };

@@ -12,14 +12,14 @@ enum class TableKind {
 };
 
 // A table of a log database.
-struct LogSource {
+struct LogTable {
     std::string path; // absolute
-    std::string table = "logs";
+    std::string name = "logs";
     TableKind kind = TableKind::Logs;
 };
 
 // What the options --db, --log, --table and --root say; "" for an option that was not given.
-struct LogSourceOptions {
+struct LogTableOptions {
     std::string db;
     std::string log;
     std::string table;
@@ -29,7 +29,7 @@ struct LogSourceOptions {
 // path stands below `root`: "logs" for the working log, which is the default, and the names of the transfer
 // logs, or else an archive in the folder of the archives by its file name, with or without ".db". Nothing is
 // opened. Throws UsageError for an unknown log or table.
-LogSource ResolveLogSource(const LogSourceOptions &options, const std::string &root);
+LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root);
 
 // The folder of the archives below `root`.
 std::string ArchiveFolderPath(const std::string &root);
@@ -39,6 +39,6 @@ std::string KnownLogNames();
 
 // One line that names the path and what can be told from outside about why it cannot be read (or changed,
 // with `forWriting`): missing, a folder, no permission, empty, not a database, cut short.
-std::string DescribeDatabaseProblem(const LogSource &source, bool forWriting = false);
+std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting = false);
 
 } // namespace kelo::tool

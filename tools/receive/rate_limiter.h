@@ -8,20 +8,20 @@ namespace kelo::tool {
 //
 // A minute begins with a match. In it so many matches raise a notification, the rest is counted; the first
 // notification of the next minute tells how many. Times are seconds of any clock that does not go back.
-class NotifyLimit {
+class RateLimiter {
 public:
     // `perMinute` is at least 1.
-    explicit NotifyLimit(uint64_t perMinute) : perMinute_(perMinute) {}
+    explicit RateLimiter(uint64_t perMinute) : perMinute_(perMinute) {}
 
     // Whether a match at `now` raises a notification. When not it is counted.
-    bool Admit(int64_t now);
+    bool Allow(int64_t now);
 
     // The matches counted in a minute that is over at `now`; 0 when there is nothing to tell. Who asks tells
     // them, in one notification, which has its place in the new minute.
     uint64_t TakeSuppressed(int64_t now);
 
     // All matches that were counted and not told yet.
-    uint64_t TakeRest();
+    uint64_t Drain();
 
 private:
     void BeginMinute(int64_t now);

@@ -1,4 +1,4 @@
-#include "receive/rule_watch.h"
+#include "receive/rule_checker.h"
 
 #include <syslog.h>
 
@@ -34,64 +34,64 @@ std::string MoreLogs(uint64_t count) {
 
 } // namespace
 
-RuleWatch::RuleWatch(uint64_t notifyLimit)
-    : rules_(std::in_place), severity_{NotifyLimit(notifyLimit), "", ""}, keyword_{NotifyLimit(notifyLimit),
+RuleChecker::RuleChecker(uint64_t notifyLimit)
+    : rules_(std::in_place), severity_{RateLimiter(notifyLimit), "", ""}, keyword_{RateLimiter(notifyLimit),
                                                                                    "", ""} {}
 
-void RuleWatch::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
+void RuleChecker::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
     now_ = now;
     if (rules_->CheckSev(log.prio)) {
         const std::string severity = PriorTypeToStr(log.prio);
-        if (severity_.limit.Admit(now))
+        if (severity_.limit.Allow(now))
             RaiseSeverity(log.host, severity, Content(log.msg));
         else
             Suppress(severity_, log.host, severity);
     }
     if (const std::string keyword = rules_->CheckKeyword(log.msg); !keyword.empty()) {
-        if (keyword_.limit.Admit(now))
+        if (keyword_.limit.Allow(now))
             RaiseKeyword(log.host, keyword, Content(log.msg));
         else
             Suppress(keyword_, log.host, keyword);
     }
 }
 
-void RuleWatch::Beat(int64_t now) {
+void RuleChecker::Tick(int64_t now) {
     now_ = now;
     Tell(severity_.limit.TakeSuppressed(now), keyword_.limit.TakeSuppressed(now));
 }
 
-void RuleWatch::Finish() {
-    Tell(severity_.limit.TakeRest(), keyword_.limit.TakeRest());
+void RuleChecker::Finish() {
+    Tell(severity_.limit.Drain(), keyword_.limit.Drain());
 }
 
-void RuleWatch::Tell(uint64_t severities, uint64_t keywords) {
+void RuleChecker::Tell(uint64_t severities, uint64_t keywords) {
     if (severities > 0)
         RaiseSeverity(severity_.host, severity_.what, MoreLogs(severities));
     if (keywords > 0)
         RaiseKeyword(keyword_.host, keyword_.what, MoreLogs(keywords));
 }
 
-void RuleWatch::Suppress(Kind &kind, const std::string &host, const std::string &what) {
+void RuleChecker::Suppress(Kind &kind, const std::string &host, const std::string &what) {
     kind.host = host;
     kind.what = what;
     ++suppressed_;
 }
 
-void RuleWatch::RaiseSeverity(const std::string &host, const std::string &severity,
-                              const std::string &content) {
+void RuleChecker::RaiseSeverity(const std::string &host, const std::string &severity,
+                                const std::string &content) {
     rules_->NotificationSendSev(host, severity, content);
     AddEvent([&] { return Logger().LogAddNotifySev(severity, content); });
 }
 
-void RuleWatch::RaiseKeyword(const std::string &host, const std::string &keyword,
-                             const std::string &content) {
+void RuleChecker::RaiseKeyword(const std::string &host, const std::string &keyword,
+                               const std::string &content) {
     rules_->NotificationSendKeyword(host, keyword, content);
     AddEvent([&] { return Logger().LogAddNotifyKw(keyword, content); });
 }
 
 // Each event that finds its database locked takes seconds, in which nothing is received.
 template <typename Write>
-void RuleWatch::AddEvent(Write write) {
+void RuleChecker::AddEvent(Write write) {
     if (now_ < nextEvent_) {
         ++lostEvents_;
     } else if (write() != 0) {

@@ -13,15 +13,15 @@ namespace kelo::tool {
 // devices lose nothing by that.
 //
 // Times are seconds of any clock that does not go back.
-class AccountingBeat {
+class AccountingFlusher {
 public:
-    AccountingBeat();
+    AccountingFlusher();
 
     // The accounting database keeps a name up to its first NUL.
     void Count(const std::string &host) { manager_->LogInc(host.c_str()); }
 
     // To be called about once a second. Closes the sample, and flushes when its time has come.
-    void Beat(int64_t now);
+    void Tick(int64_t now);
 
     // Asks for the rules to be loaded anew, which takes a new manager: the present one must have written all
     // that it counted.

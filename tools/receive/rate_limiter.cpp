@@ -1,10 +1,10 @@
-#include "receive/notify_limit.h"
+#include "receive/rate_limiter.h"
 
 #include <utility>
 
 namespace kelo::tool {
 
-void NotifyLimit::BeginMinute(int64_t now) {
+void RateLimiter::BeginMinute(int64_t now) {
     if (hasBegun_ && now - begin_ < kMinuteSec)
         return;
     hasBegun_ = true;
@@ -13,7 +13,7 @@ void NotifyLimit::BeginMinute(int64_t now) {
     raised_ = toTell_ > 0 ? 1 : 0;
 }
 
-bool NotifyLimit::Admit(int64_t now) {
+bool RateLimiter::Allow(int64_t now) {
     BeginMinute(now);
     if (raised_ < perMinute_) {
         ++raised_;
@@ -23,13 +23,13 @@ bool NotifyLimit::Admit(int64_t now) {
     return false;
 }
 
-uint64_t NotifyLimit::TakeSuppressed(int64_t now) {
+uint64_t RateLimiter::TakeSuppressed(int64_t now) {
     if (suppressed_ > 0)
         BeginMinute(now);
     return std::exchange(toTell_, 0);
 }
 
-uint64_t NotifyLimit::TakeRest() {
+uint64_t RateLimiter::Drain() {
     return std::exchange(toTell_, 0) + std::exchange(suppressed_, 0);
 }
 

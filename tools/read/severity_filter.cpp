@@ -1,4 +1,4 @@
-#include "read/level_selection.h"
+#include "read/severity_filter.h"
 
 #include <algorithm>
 #include <array>
@@ -11,7 +11,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr const char *kOption = "--priority";
-// SQLite limits how deep an expression may be; every alternative adds a level.
+// SQLite limits how deep an expression may be; every alternative adds a severity.
 constexpr size_t kMaxValues = 500;
 
 constexpr std::array<const char *, 24> kFacilities = {
@@ -19,7 +19,7 @@ constexpr std::array<const char *, 24> kFacilities = {
     "uucp",   "cron",   "authpriv", "ftp",    "ntp",    "security", "console", "solaris-cron",
     "local0", "local1", "local2",   "local3", "local4", "local5",   "local6",  "local7"};
 
-_SYSLOG_DB_PRIORITY_tag ParseLevel(const std::string &text, const std::string &whole) {
+_SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text, const std::string &whole) {
     if (text.size() == 1 && text[0] >= '0' && text[0] <= '7')
         return static_cast<_SYSLOG_DB_PRIORITY_tag>(text[0] - '0');
     if (text == "error")
@@ -38,28 +38,30 @@ _SYSLOG_DB_PRIORITY_tag ParseLevel(const std::string &text, const std::string &w
         "or a range such as warning..emerg");
 }
 
-void AddRange(std::vector<_SYSLOG_DB_PRIORITY_tag> &levels, int32_t from, int32_t to) {
+void AddRange(std::vector<_SYSLOG_DB_PRIORITY_tag> &severities, int32_t from, int32_t to) {
     for (int32_t prio = std::min(from, to); prio <= std::max(from, to); ++prio) {
-        const auto level = static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
-        if (std::find(levels.begin(), levels.end(), level) == levels.end())
-            levels.push_back(level);
+        const auto severity = static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+        if (std::find(severities.begin(), severities.end(), severity) == severities.end())
+            severities.push_back(severity);
     }
 }
 
-void AddLevels(std::vector<_SYSLOG_DB_PRIORITY_tag> &levels, const std::string &value, bool withMoreSevere) {
+void AddSeverities(std::vector<_SYSLOG_DB_PRIORITY_tag> &severities, const std::string &value,
+                   bool withMoreSevere) {
     const size_t dots = value.find("..");
     if (dots != std::string::npos)
-        AddRange(levels, ParseLevel(value.substr(0, dots), value), ParseLevel(value.substr(dots + 2), value));
-    else if (const int32_t level = ParseLevel(value, value); withMoreSevere)
-        AddRange(levels, SYSLOG_PRIO_EMERG, level);
+        AddRange(severities, ParseSeverity(value.substr(0, dots), value),
+                 ParseSeverity(value.substr(dots + 2), value));
+    else if (const int32_t severity = ParseSeverity(value, value); withMoreSevere)
+        AddRange(severities, SYSLOG_PRIO_EMERG, severity);
     else
-        AddRange(levels, level, level);
+        AddRange(severities, severity, severity);
 }
 
 } // namespace
 
-ValueSelection SplitValues(const std::string &option, const std::vector<std::string> &values) {
-    ValueSelection selection;
+IncludeExclude SplitValues(const std::string &option, const std::vector<std::string> &values) {
+    IncludeExclude filter;
     for (const std::string &value : values) {
         size_t begin = 0;
         while (begin <= value.size()) {
@@ -70,23 +72,23 @@ ValueSelection SplitValues(const std::string &option, const std::vector<std::str
                 piece.erase(0, 1);
             if (piece.empty())
                 throw UsageError(option + ": '" + value + "' holds an empty value");
-            (isExcluded ? selection.excluded : selection.included).push_back(piece);
+            (isExcluded ? filter.excluded : filter.included).push_back(piece);
             begin = end + 1;
         }
     }
-    if (selection.included.size() + selection.excluded.size() > kMaxValues)
+    if (filter.included.size() + filter.excluded.size() > kMaxValues)
         throw UsageError(option + ": more than " + std::to_string(kMaxValues) + " values");
-    return selection;
+    return filter;
 }
 
-LevelSelection ParseLevels(const std::vector<std::string> &values) {
-    const ValueSelection split = SplitValues(kOption, values);
-    LevelSelection levels;
+SeverityFilter ParseSeverities(const std::vector<std::string> &values) {
+    const IncludeExclude split = SplitValues(kOption, values);
+    SeverityFilter severities;
     for (const std::string &value : split.included)
-        AddLevels(levels.included, value, split.included.size() == 1);
+        AddSeverities(severities.included, value, split.included.size() == 1);
     for (const std::string &value : split.excluded)
-        AddLevels(levels.excluded, value, false);
-    return levels;
+        AddSeverities(severities.excluded, value, false);
+    return severities;
 }
 
 std::string FacilityName(const std::string &value) {

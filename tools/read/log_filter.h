@@ -7,28 +7,28 @@
 #include <vector>
 
 #include "kelosyslog/dbutil.h"
-#include "read/log_source.h"
+#include "read/log_table.h"
 
 namespace kelo::tool {
 
 // Which logs a command is about, as the user wrote it. Values of one option are alternatives, the options
-// together narrow the selection.
-struct Selection {
+// together narrow the filter.
+struct LogFilter {
     std::string since = {}; // "" for no bound
     std::string until = {};
-    std::vector<std::string> levels = {};
+    std::vector<std::string> severities = {};
     std::vector<std::string> facilities = {};
     std::vector<std::string> hosts = {};
     std::vector<std::string> programs = {};
     std::vector<std::string> keywords = {};
 };
 
-bool IsEmpty(const Selection &selection);
+bool IsEmpty(const LogFilter &filter);
 
 // The last second that --until includes, if it was given: a day alone ends before it begins.
-std::optional<int64_t> LastSecond(const Selection &selection, int64_t now);
+std::optional<int64_t> LastSecond(const LogFilter &filter, int64_t now);
 
-// The conditions that select these logs in a table of this kind, to be ANDed; none for an empty selection.
+// The conditions that select these logs in a table of this kind, to be ANDed; none for an empty filter.
 //
 // A host, program or facility that holds '*' or '?' is a pattern. What is excluded leaves rows without a
 // value in. Table "logs" is bounded by its `utcsec`; the others, which have none, by their `ldate` and
@@ -36,7 +36,6 @@ std::optional<int64_t> LastSecond(const Selection &selection, int64_t now);
 //
 // Throws UsageError for a value that cannot be read, a broken regular expression, and an option whose column
 // the table does not have.
-std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const Selection &selection, const LogSource &source,
-                                               int64_t now);
+std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const LogFilter &filter, const LogTable &table, int64_t now);
 
 } // namespace kelo::tool

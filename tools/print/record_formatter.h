@@ -31,11 +31,11 @@ struct RecordLayout {
 //     jsonl   one object on each line
 //     csv     RFC 4180 with a heading
 //
-// Text and short make control characters visible (VisibleText); JSON is valid whatever bytes a log holds; CSV
-// carries them unchanged.
-class RecordWriter {
+// Text and short make control characters visible (EscapeForTerminal); JSON is valid whatever bytes a log
+// holds; CSV carries them unchanged.
+class RecordFormatter {
 public:
-    virtual ~RecordWriter() = default;
+    virtual ~RecordFormatter() = default;
 
     // Each appends to `out`. Begin comes first and End last, also when there is no log.
     virtual void Begin(std::string &) {}
@@ -43,6 +43,6 @@ public:
     virtual void End(std::string &) {}
 };
 
-std::unique_ptr<RecordWriter> MakeRecordWriter(RecordLayout layout);
+std::unique_ptr<RecordFormatter> MakeRecordWriter(RecordLayout layout);
 
 } // namespace kelo::tool

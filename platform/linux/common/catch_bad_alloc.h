@@ -10,7 +10,7 @@ namespace kelo::platform {
 // Runs `body` for a function of the C interface, which lets no exception out: it becomes the result `failed`
 // with errno ENOMEM where memory ran out, EIO for anything else.
 template <typename Result, typename Body>
-Result Guarded(Result failed, Body body) noexcept {
+Result CatchBadAlloc(Result failed, Body body) noexcept {
     try {
         return body();
     } catch (const std::bad_alloc &) {

@@ -8,17 +8,17 @@
 namespace kelo::tool {
 
 // The values of an option that names alternatives, split into those to find and those to leave out.
-struct ValueSelection {
+struct IncludeExclude {
     std::vector<std::string> included;
     std::vector<std::string> excluded; // without their '!'
 };
 
 // Splits comma-separated values; a leading '!' excludes. Throws UsageError that names `option` for an empty
 // value and for more values than one statement can hold.
-ValueSelection SplitValues(const std::string &option, const std::vector<std::string> &values);
+IncludeExclude SplitValues(const std::string &option, const std::vector<std::string> &values);
 
 // The severities that --priority selects. With nothing included all are, but those excluded.
-struct LevelSelection {
+struct SeverityFilter {
     std::vector<_SYSLOG_DB_PRIORITY_tag> included;
     std::vector<_SYSLOG_DB_PRIORITY_tag> excluded;
 };
@@ -26,7 +26,7 @@ struct LevelSelection {
 // Reads levels: names ("err", also "error", "warn", "panic"), numbers 0 to 7, and ranges "warning..emerg" in
 // either direction. A single included level stands for itself and everything more severe; a level that is one
 // of several, excluded or a bound of a range stands for itself. Throws UsageError.
-LevelSelection ParseLevels(const std::vector<std::string> &values);
+SeverityFilter ParseSeverities(const std::vector<std::string> &values);
 
 // The name of a facility for its number ("16" gives "local0"); anything else is already a name and stays.
 std::string FacilityName(const std::string &value);

@@ -1,12 +1,12 @@
-#include "receive/notify_limit.h"
+#include "receive/rate_limiter.h"
 
 #include <gtest/gtest.h>
 
 #include <vector>
 
-using kelo::tool::NotifyLimit;
+using kelo::tool::RateLimiter;
 
-TEST(NotifyLimit, BoundsEveryMinuteAndTellsTheRest) {
+TEST(RateLimiter, BoundsEveryMinuteAndTellsTheRest) {
     struct Step {
         int64_t now;
         int matches;
@@ -26,14 +26,14 @@ TEST(NotifyLimit, BoundsEveryMinuteAndTellsTheRest) {
         {"a flood long ago", 2, {{-100, 5, 2, 0}, {1000, 0, 0, 3}, {1000, 4, 1, 0}}, 3},
     };
     for (const auto &[what, perMinute, steps, rest] : kCases) {
-        NotifyLimit limit(perMinute);
+        RateLimiter limit(perMinute);
         for (const auto &[now, matches, raised, told] : steps) {
             int admitted = 0;
             for (int i = 0; i < matches; ++i)
-                admitted += limit.Admit(now) ? 1 : 0;
+                admitted += limit.Allow(now) ? 1 : 0;
             EXPECT_EQ(admitted, raised) << what << " at " << now;
             EXPECT_EQ(limit.TakeSuppressed(now), told) << what << " at " << now;
         }
-        EXPECT_EQ(limit.TakeRest(), rest) << what;
+        EXPECT_EQ(limit.Drain(), rest) << what;
     }
 }

@@ -1,4 +1,4 @@
-#include "print/record_writer.h"
+#include "print/record_formatter.h"
 
 #include <json/json.h>
 
@@ -27,7 +27,7 @@ Log HostileLog() {
 
 std::string Print(const RecordLayout &layout, const std::vector<Log> &logs) {
     std::string out;
-    const std::unique_ptr<RecordWriter> writer = MakeRecordWriter(layout);
+    const std::unique_ptr<RecordFormatter> writer = MakeRecordWriter(layout);
     writer->Begin(out);
     for (const Log &log : logs)
         writer->Add(log, out);
@@ -50,7 +50,7 @@ Json::Value ParseJson(const std::string &text) {
     return value;
 }
 
-TEST(RecordWriter, WritesValidJsonWhateverALogHolds) {
+TEST(RecordFormatter, WritesValidJsonWhateverALogHolds) {
     const Log log = HostileLog();
     const Json::Value array = ParseJson(Print(Layout(OutputFormat::Json), {log, Log{}}));
     ASSERT_EQ(array.size(), 2U);
@@ -73,7 +73,7 @@ TEST(RecordWriter, WritesValidJsonWhateverALogHolds) {
     EXPECT_EQ(line.back(), '\n');
 }
 
-TEST(RecordWriter, WritesCsvByteForByte) {
+TEST(RecordFormatter, WritesCsvByteForByte) {
     const Log log = HostileLog();
     EXPECT_EQ(Print(Layout(OutputFormat::Csv, "host,prog,msg,llevel,id"), {log, Log{}}),
               "host,prog,msg,prio,id\r\n\"h\"\"o,s't\"," + log.prog + ",\"" + log.msg +
@@ -83,7 +83,7 @@ TEST(RecordWriter, WritesCsvByteForByte) {
     EXPECT_EQ(Print(bare, {Log{}}), "\"\"\r\n");
 }
 
-TEST(RecordWriter, ShowsControlBytesInsteadOfSendingThemToTheTerminal) {
+TEST(RecordFormatter, ShowsControlBytesInsteadOfSendingThemToTheTerminal) {
     const std::string message = R"(a\b\r\nc\td \xff\xc3( \xed\xa0\x80 \u009b31m \u202e )"
                                 "\xe6\x97\xa5\xe6\x9c\xac";
     EXPECT_EQ(Print(Layout(OutputFormat::Short), {HostileLog()}),

@@ -1,4 +1,4 @@
-#include "receive/accounting_beat.h"
+#include "receive/accounting_flusher.h"
 
 #include <syslog.h>
 
@@ -27,9 +27,9 @@ uint64_t Total(const AccountingManager &manager) {
 
 } // namespace
 
-AccountingBeat::AccountingBeat() : manager_(std::make_unique<AccountingManager>()) {}
+AccountingFlusher::AccountingFlusher() : manager_(std::make_unique<AccountingManager>()) {}
 
-void AccountingBeat::Beat(int64_t now) {
+void AccountingFlusher::Tick(int64_t now) {
     manager_->CurEpsUpdate();
     if (now < nextFlush_)
         return;
@@ -46,12 +46,12 @@ void AccountingBeat::Beat(int64_t now) {
         now + std::max(isStillFailing ? kFlushWhileFailingSec : kFlushSec, sec + sec * kPausePerFlush);
 }
 
-void AccountingBeat::RequestReload() {
+void AccountingFlusher::RequestReload() {
     mustReload_ = true;
     isReloadPutOff_ = false;
 }
 
-bool AccountingBeat::MayCount() {
+bool AccountingFlusher::MayCount() {
     if (!mustReload_ || isReloadPutOff_)
         return true;
     if (!CloseSample())
@@ -62,16 +62,16 @@ bool AccountingBeat::MayCount() {
     return true;
 }
 
-bool AccountingBeat::Finish() {
+bool AccountingFlusher::Finish() {
     return CloseSample() && Flush();
 }
 
-bool AccountingBeat::CloseSample() {
+bool AccountingFlusher::CloseSample() {
     manager_->CurEpsUpdate();
     return manager_->CurrentEpsGet() == 0;
 }
 
-bool AccountingBeat::Flush() {
+bool AccountingFlusher::Flush() {
     const bool isFlushed = manager_->AccoutingFlush2DB() == 0;
     if (!isFlushed) {
         if (const size_t dropped = manager_->SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
@@ -86,7 +86,7 @@ bool AccountingBeat::Flush() {
 }
 
 // A manager that could not read what the present one has written would later write too low totals.
-void AccountingBeat::Replace() {
+void AccountingFlusher::Replace() {
     auto fresh = std::make_unique<AccountingManager>();
     if (Total(*fresh) < Total(*manager_))
         return;
