@@ -18,6 +18,7 @@
 
 #include "base/json.h"
 #include "base/text_encoding.h"
+#include "base/time_format.h"
 #include "program_run.h"
 #include "status/server_status.h"
 #include "status/status_json.h"

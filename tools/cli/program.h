@@ -51,20 +51,4 @@ void PrintMessage(const std::string &text);
 // Reads the command line, runs the chosen subcommand and maps every failure to an ExitStatus and one line.
 int RunProgram(Program &program, int argc, const char *const *argv);
 
-// The subcommands.
-void AddSearch(Program &program);
-void AddCount(Program &program);
-void AddDelete(Program &program);
-void AddEvents(Program &program);
-void AddReport(Program &program);
-void AddValues(Program &program);
-void AddStats(Program &program);
-void AddRules(Program &program);
-void AddNotify(Program &program);
-void AddParse(Program &program);
-void AddReceive(Program &program);
-void AddDb(Program &program);
-void AddArchive(Program &program);
-void AddStatus(Program &program);
-
 } // namespace kelo::tool

@@ -12,6 +12,7 @@
 #include "base/stop_signals.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "print/statistics_table.h"
 #include "read/time_expression.h"

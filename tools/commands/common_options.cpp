@@ -87,4 +87,15 @@ RecordLayout MakeLayout(const OutputOptions &options, TableKind kind) {
     return layout;
 }
 
+void AddKeyValuesFormat(CLI::App &command, std::string &format) {
+    AddText(command, "-o,--output", format, "FORMAT", "text (default) or json (one object)");
+}
+
+OutputFormat ParseKeyValuesFormat(const std::string &format) {
+    const OutputFormat parsed = ParseOutputFormat(format);
+    if (parsed != OutputFormat::Text && parsed != OutputFormat::Json)
+        throw UsageError("--output: there is no form '" + format + "' of this; forms are text, json");
+    return parsed;
+}
+
 } // namespace kelo::tool

@@ -3,6 +3,7 @@
 #include <string>
 
 #include "cli/program.h"
+#include "print/key_values.h"
 #include "print/output.h"
 #include "print/record_formatter.h"
 #include "read/log_filter.h"
@@ -36,5 +37,10 @@ void AddOutputOptions(CLI::App &command, OutputOptions &options);
 
 // What the options mean for a table of this kind. Throws UsageError.
 RecordLayout MakeLayout(const OutputOptions &options, TableKind kind);
+
+// --output of the commands that print KeyValues.
+void AddKeyValuesFormat(CLI::App &command, std::string &format);
+// The format of that name. Throws UsageError for any but text and json.
+OutputFormat ParseKeyValuesFormat(const std::string &format);
 
 } // namespace kelo::tool

@@ -4,6 +4,7 @@
 
 #include "base/errors.h"
 #include "cli/exit_status.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "read/log_reader.h"
 

@@ -1,5 +1,6 @@
 // kelosyslog db: creates, inspects and maintains one log database.
 
+#include "commands/commands.h"
 #include "commands/db_commands.h"
 
 namespace kelo::tool {

@@ -3,7 +3,7 @@
 #include <string>
 
 #include "commands/common_options.h"
-#include "commands/key_values.h"
+#include "print/key_values.h"
 
 namespace kelo::tool {
 

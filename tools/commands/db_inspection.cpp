@@ -24,11 +24,11 @@ int64_t SizeOf(const std::string &path) {
     return stat(path.c_str(), &status) == 0 ? status.st_size : 0;
 }
 
-void AddTime(KeyValues &facts, const std::string &name, const std::string &utcsec) {
+void AddTime(KeyValues &values, const std::string &name, const std::string &utcsec) {
     if (utcsec.empty())
-        facts.AddUnknown(name);
+        values.AddUnknown(name);
     else
-        facts.Add(name, TimeFormat(false).Iso(std::strtoll(utcsec.c_str(), nullptr, 10)));
+        values.Add(name, TimeFormat(false).Iso(std::strtoll(utcsec.c_str(), nullptr, 10)));
 }
 
 // The time of the first log in one order of time; "" when there is none.
@@ -38,17 +38,17 @@ std::string FirstTime(const ReadOnlyQuery &database, const char *direction) {
     return row ? row->front() : "";
 }
 
-void AddDescription(KeyValues &facts, const ReadOnlyQuery &database) {
+void AddDescription(KeyValues &values, const ReadOnlyQuery &database) {
     if (!database.HasTable("db_info"))
         return;
     const auto row =
         database.FirstRow("SELECT * FROM db_info", {"start_time", "end_time", "log_count", "device"});
     if (!row)
         return;
-    AddTime(facts, "db_info_start_time", row->at(0));
-    AddTime(facts, "db_info_end_time", row->at(1));
-    facts.Add("db_info_log_count", int64_t{std::strtoll(row->at(2).c_str(), nullptr, 10)});
-    facts.Add("db_info_device", row->at(3));
+    AddTime(values, "db_info_start_time", row->at(0));
+    AddTime(values, "db_info_end_time", row->at(1));
+    values.Add("db_info_log_count", int64_t{std::strtoll(row->at(2).c_str(), nullptr, 10)});
+    values.Add("db_info_device", row->at(3));
 }
 
 int Info(const DbOptions &options) {
@@ -56,21 +56,21 @@ int Info(const DbOptions &options) {
     const LogTable table = options.Table();
     const ReadOnlyQuery database(table);
     const auto mode = database.FirstRow("PRAGMA journal_mode", {"journal_mode"});
-    KeyValues facts;
-    facts.Add("path", table.path);
-    facts.Add("size_bytes", SizeOf(table.path));
-    facts.Add("wal_bytes", SizeOf(table.path + "-wal"));
-    facts.Add("generation", int64_t{SyslogDBVersionGet(table.path)});
-    facts.Add("journal_mode", mode ? mode->front() : "");
+    KeyValues values;
+    values.Add("path", table.path);
+    values.Add("size_bytes", SizeOf(table.path));
+    values.Add("wal_bytes", SizeOf(table.path + "-wal"));
+    values.Add("generation", int64_t{SyslogDBVersionGet(table.path)});
+    values.Add("journal_mode", mode ? mode->front() : "");
     if (!database.HasTable(table.name))
         throw DatabaseError(table.path + ": no table " + table.name);
-    facts.Add("rows", database.Number("SELECT count(*) AS value FROM " + table.name));
+    values.Add("rows", database.Number("SELECT count(*) AS value FROM " + table.name));
     if (table.kind == TableKind::Logs) {
-        AddTime(facts, "first_log", FirstTime(database, "ASC"));
-        AddTime(facts, "last_log", FirstTime(database, "DESC"));
+        AddTime(values, "first_log", FirstTime(database, "ASC"));
+        AddTime(values, "last_log", FirstTime(database, "DESC"));
     }
-    AddDescription(facts, database);
-    Print(facts, format);
+    AddDescription(values, database);
+    Print(values, format);
     return kExitFound;
 }
 
@@ -126,11 +126,11 @@ int Check(const DbOptions &options) {
     const OutputFormat format = options.Format();
     const LogTable table = options.Table();
     const std::vector<std::string> problems = Problems(table);
-    KeyValues facts;
-    facts.Add("path", table.path);
-    facts.AddBool("sound", problems.empty());
-    facts.AddList("problems", problems);
-    Print(facts, format);
+    KeyValues values;
+    values.Add("path", table.path);
+    values.AddBool("sound", problems.empty());
+    values.AddList("problems", problems);
+    Print(values, format);
     return problems.empty() ? kExitFound : kExitDatabase;
 }
 

@@ -97,10 +97,10 @@ int Create(const CreateOptions &options) {
         throw UsageError("--schema: cannot read " + schema);
     Attempt("cannot create " + path, [&] { return DBHandler(path, schema).DBCreate() == 0; });
     const auto mode = ReadOnlyQuery(options.Table()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
-    KeyValues facts;
-    facts.Add("created", path);
-    facts.Add("journal_mode", mode ? mode->front() : "");
-    Print(facts, format);
+    KeyValues values;
+    values.Add("created", path);
+    values.Add("journal_mode", mode ? mode->front() : "");
+    Print(values, format);
     return kExitFound;
 }
 
@@ -113,11 +113,11 @@ int SetWal(const DbOptions &options) {
         throw DatabaseError(DescribeDatabaseProblem(table, true));
     const auto checkpoint = database.FirstRow("PRAGMA wal_checkpoint(TRUNCATE)", {"busy"});
     const bool isComplete = checkpoint && checkpoint->front() == "0";
-    KeyValues facts;
-    facts.Add("path", table.path);
-    facts.Add("journal_mode", mode->front());
-    facts.AddBool("checkpointed", isComplete);
-    Print(facts, format);
+    KeyValues values;
+    values.Add("path", table.path);
+    values.Add("journal_mode", mode->front());
+    values.AddBool("checkpointed", isComplete);
+    Print(values, format);
     if (!isComplete)
         PrintMessage(table.path + " is in use; its write-ahead log could not be emptied");
     return isComplete ? kExitFound : kExitNothing;
@@ -137,12 +137,12 @@ int Limit(const LimitOptions &options) {
     const bool isBeyond = before.st_size / 1024 > limit;
     if (isBeyond && !isRemoved)
         throw DatabaseError("cannot remove " + path);
-    KeyValues facts;
-    facts.Add("path", path);
-    facts.Add("size_kib", int64_t{before.st_size / 1024});
-    facts.Add("limit_kib", int64_t{limit});
-    facts.AddBool("removed", isRemoved);
-    Print(facts, format);
+    KeyValues values;
+    values.Add("path", path);
+    values.Add("size_kib", int64_t{before.st_size / 1024});
+    values.Add("limit_kib", int64_t{limit});
+    values.AddBool("removed", isRemoved);
+    Print(values, format);
     return isRemoved ? kExitFound : kExitNothing;
 }
 
@@ -161,10 +161,10 @@ int SetDevice(const DeviceOptions &options) {
         db.DBDiscon();
         return isDone;
     });
-    KeyValues facts;
-    facts.Add("path", table.path);
-    facts.Add("device", options.device);
-    Print(facts, format);
+    KeyValues values;
+    values.Add("path", table.path);
+    values.Add("device", options.device);
+    Print(values, format);
     return kExitFound;
 }
 
@@ -191,11 +191,11 @@ int Quarantine(const QuarantineOptions &options) {
         isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
         return isReloaded || isMoved();
     });
-    KeyValues facts;
-    facts.Add("moved", path);
-    facts.Add("to", aside);
-    facts.AddBool("reloaded", isReloaded);
-    Print(facts, format);
+    KeyValues values;
+    values.Add("moved", path);
+    values.Add("to", aside);
+    values.AddBool("reloaded", isReloaded);
+    Print(values, format);
     if (isReloaded)
         return kExitFound;
     PrintMessage("syslog-ng was not reloaded and goes on writing into the moved file; reload it yourself");
@@ -205,9 +205,9 @@ int Quarantine(const QuarantineOptions &options) {
 int Reopen(const DbOptions &options) {
     const OutputFormat format = options.Format();
     Attempt("cannot make syslog-ng reopen its files", [] { return SyslogngHupSignalSend() == 0; });
-    KeyValues facts;
-    facts.AddBool("reloaded", true);
-    Print(facts, format);
+    KeyValues values;
+    values.AddBool("reloaded", true);
+    Print(values, format);
     return kExitFound;
 }
 

@@ -1,6 +1,7 @@
 // kelosyslog events: the server's own event log.
 
 #include "commands/events.h"
+#include "commands/commands.h"
 
 #include <ctime>
 #include <limits>
@@ -9,7 +10,8 @@
 #include "base/errors.h"
 #include "cli/exit_status.h"
 #include "kelosyslog/logger.h"
-#include "print/event_log.h"
+#include "print/event_fields.h"
+#include "read/event_log.h"
 
 namespace kelo::tool {
 namespace {

@@ -16,7 +16,7 @@
 #include "commands/events.h"
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/logger.h"
-#include "print/event_log.h"
+#include "read/event_log.h"
 #include "read/log_message_capture.h"
 
 namespace kelo::tool {

@@ -3,7 +3,7 @@
 #include <csignal>
 
 #include "cli/help_formatter.h"
-#include "cli/program.h"
+#include "commands/commands.h"
 
 int main(int argc, char **argv) {
     // A reader that goes away is noticed by the failing write.

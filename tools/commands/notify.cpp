@@ -16,6 +16,7 @@
 #include "base/time_format.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
+#include "commands/commands.h"
 #include "commands/rule_set.h"
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/torvc.h"

@@ -13,6 +13,7 @@
 #include "base/errors.h"
 #include "cli/exit_status.h"
 #include "cli/progress_bar.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "store/batch_sink.h"
 

@@ -14,6 +14,7 @@
 #include "base/errors.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
+#include "commands/commands.h"
 #include "receive/receiver.h"
 
 namespace kelo::tool {

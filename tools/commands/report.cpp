@@ -7,6 +7,7 @@
 #include "base/atomic_file.h"
 #include "base/errors.h"
 #include "cli/exit_status.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "read/accounting_samples.h"
 #include "read/eps_series.h"

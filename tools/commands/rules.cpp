@@ -9,6 +9,7 @@
 #include "base/errors.h"
 #include "base/text_encoding.h"
 #include "cli/exit_status.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "commands/rule_set.h"
 #include "commands/rule_test.h"

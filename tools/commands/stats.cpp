@@ -10,6 +10,7 @@
 
 #include "base/errors.h"
 #include "cli/exit_status.h"
+#include "commands/commands.h"
 #include "commands/common_options.h"
 #include "kelosyslog/dbutil.h"
 #include "print/statistics_table.h"

@@ -5,6 +5,7 @@
 #include "base/errors.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
+#include "commands/commands.h"
 #include "print/output.h"
 #include "print/record_formatter.h"
 #include "print/statistics_table.h"

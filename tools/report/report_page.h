@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "print/event_log.h"
+#include "read/event_log.h"
 #include "report/log_figures.h"
 
 namespace kelo::tool {

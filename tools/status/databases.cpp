@@ -10,8 +10,8 @@
 #include <limits>
 
 #include "kelosyslog/records.h"
-#include "print/event_log.h"
 #include "read/accounting_samples.h"
+#include "read/event_log.h"
 #include "read/read_only_query.h"
 
 namespace kelo::tool {

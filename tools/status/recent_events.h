@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "print/event_log.h"
+#include "read/event_log.h"
 
 namespace kelo::tool {
 

@@ -1,4 +1,4 @@
-#include "print/event_log.h"
+#include "read/event_log.h"
 
 #include <unistd.h>
 
@@ -58,14 +58,6 @@ std::vector<int> ParseEventLevels(const std::vector<std::string> &values) {
     return levels;
 }
 
-// An event travels as a log: its level's name as `tag`, its user and text under their own names.
-constexpr std::array<RecordField, 4> kEventFields = {{
-    {"id", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.id); }},
-    {"level", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.tag; }},
-    {"user", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.luser; }},
-    {"event", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.event; }},
-}};
-
 } // namespace
 
 std::string EventDatabasePath(const std::string &db, const std::string &root) {
@@ -103,26 +95,6 @@ EventFilter ParseEventFilter(const LogFilter &filter, int64_t now) {
 std::string EventLevelName(int level) {
     const std::string name = strLevelGet(level);
     return name.empty() ? std::to_string(level) : name;
-}
-
-_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event) {
-    constexpr _SYSLOG_DB_PRIORITY_tag kColours[] = {SYSLOG_PRIO_INFO, SYSLOG_PRIO_WARNING, SYSLOG_PRIO_ERR};
-    _SYSLOG_LOG_DATA_tag log;
-    log.id = static_cast<uint64_t>(event.id);
-    log.utcsec = event.time;
-    log.prio = kColours[event.level >= 0 && event.level <= kWorstLevel ? event.level : 0];
-    log.tag = EventLevelName(event.level);
-    log.luser = event.user;
-    log.event = event.event;
-    return log;
-}
-
-RecordFields EventFields() {
-    RecordFields fields;
-    for (const RecordField &field : kEventFields)
-        fields.push_back(&field);
-    fields.insert(fields.begin() + 1, ParseFields("time", TableKind::Logs).front());
-    return fields;
 }
 
 } // namespace kelo::tool

@@ -7,7 +7,6 @@
 #include <vector>
 
 #include "kelosyslog/logger.h"
-#include "print/record_fields.h"
 #include "read/log_filter.h"
 
 namespace kelo::tool {
@@ -40,9 +39,5 @@ EventFilter ParseEventFilter(const LogFilter &filter, int64_t now);
 
 // The name of an event's level, or its number where it has no name.
 std::string EventLevelName(int level);
-
-// An event in the shape that a RecordFormatter prints with EventFields: id, time, level, user and event.
-_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event);
-RecordFields EventFields();
 
 } // namespace kelo::tool

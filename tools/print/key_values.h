@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "commands/common_options.h"
+#include "print/record_formatter.h"
 
 namespace kelo::tool {
 
@@ -20,23 +20,19 @@ public:
     // An array; in the lines one line each.
     void AddList(const std::string &name, const std::vector<std::string> &texts);
 
-    // `format` is Text or Json.
+    // The forms that Render knows: Text and Json.
     std::string Render(OutputFormat format) const;
 
 private:
-    struct Fact {
+    struct Entry {
         std::string name;
         std::vector<std::string> lines;
         std::string json;
     };
-    std::vector<Fact> facts_;
+    std::vector<Entry> entries_;
 };
 
-// The option --output for facts.
-void AddKeyValuesFormat(CLI::App &command, std::string &format);
-// The format of that name. Throws UsageError for any but text and json.
-OutputFormat ParseKeyValuesFormat(const std::string &format);
 // Writes to the standard output.
-void Print(const KeyValues &facts, OutputFormat format);
+void Print(const KeyValues &values, OutputFormat format);
 
 } // namespace kelo::tool

@@ -1,0 +1,23 @@
+#pragma once
+
+#include "cli/program.h"
+
+namespace kelo::tool {
+
+// The subcommands, each in the file of its name.
+void AddSearch(Program &program);
+void AddCount(Program &program);
+void AddDelete(Program &program);
+void AddEvents(Program &program);
+void AddReport(Program &program);
+void AddValues(Program &program);
+void AddStats(Program &program);
+void AddRules(Program &program);
+void AddNotify(Program &program);
+void AddParse(Program &program);
+void AddReceive(Program &program);
+void AddDb(Program &program);
+void AddArchive(Program &program);
+void AddStatus(Program &program);
+
+} // namespace kelo::tool

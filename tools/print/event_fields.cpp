@@ -1,0 +1,40 @@
+#include "print/event_fields.h"
+
+#include <array>
+#include <iterator>
+
+namespace kelo::tool {
+namespace {
+
+// An event travels as a log: its level's name as `tag`, its user and text under their own names.
+constexpr std::array<RecordField, 4> kEventFields = {{
+    {"id", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.id); }},
+    {"level", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.tag; }},
+    {"user", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.luser; }},
+    {"event", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.event; }},
+}};
+
+} // namespace
+
+_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event) {
+    constexpr _SYSLOG_DB_PRIORITY_tag kColours[] = {SYSLOG_PRIO_INFO, SYSLOG_PRIO_WARNING, SYSLOG_PRIO_ERR};
+    _SYSLOG_LOG_DATA_tag log;
+    log.id = static_cast<uint64_t>(event.id);
+    log.utcsec = event.time;
+    log.prio =
+        kColours[event.level >= 0 && event.level < static_cast<int>(std::size(kColours)) ? event.level : 0];
+    log.tag = EventLevelName(event.level);
+    log.luser = event.user;
+    log.event = event.event;
+    return log;
+}
+
+RecordFields EventFields() {
+    RecordFields fields;
+    for (const RecordField &field : kEventFields)
+        fields.push_back(&field);
+    fields.insert(fields.begin() + 1, ParseFields("time", TableKind::Logs).front());
+    return fields;
+}
+
+} // namespace kelo::tool

@@ -1,0 +1,12 @@
+#pragma once
+
+#include "print/record_fields.h"
+#include "read/event_log.h"
+
+namespace kelo::tool {
+
+// An event in the shape that a RecordFormatter prints with EventFields: id, time, level, user and event.
+_SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event);
+RecordFields EventFields();
+
+} // namespace kelo::tool
