@@ -44,11 +44,4 @@ int sqlite3_step(sqlite3_stmt *statement) {
     return real(statement);
 }
 
-// Waiting for another writer's lock is cut short.
-int sqlite3_busy_timeout(sqlite3 *db, int) {
-    static const auto real =
-        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
-    return real(db, 1);
-}
-
 } // extern "C"

@@ -2,6 +2,7 @@
 
 #include "kelosyslog/accounting.h"
 #include "notify/notify_fixture.h"
+#include "support/short_lock_waits.h"
 
 namespace kelo::test {
 
@@ -25,6 +26,7 @@ protected:
     // The rows of table "histogram": "device count;..." in byte order.
     std::string Histogram() const;
 
+    ShortLockWaits waits_;
     const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
 };
 

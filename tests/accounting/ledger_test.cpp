@@ -70,7 +70,9 @@ protected:
             const Obstacle obstacle(kind, first, times, path_);
             result = accounting_.AccoutingFlush2DB();
         }
-        EXPECT_TRUE(kind != Obstacle::kWriter || result == -1 || pending_.empty());
+        const bool isLocked = kind == Obstacle::kWriter && !pending_.empty();
+        EXPECT_TRUE(!isLocked || result == -1);
+        EXPECT_EQ(waits_.TakeCount() > 0, isLocked);
         const std::vector<std::string> messages = Messages();
         const auto has = [&](const std::string &text) {
             return std::any_of(messages.begin(), messages.end(),

@@ -1,29 +1,14 @@
 // Files that are no good database: every operation says so with its stated result and message, opens nothing
 // for good and creates no file.
 
-#include <dlfcn.h>
-
 #include <chrono>
 
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/dbutil.h"
 #include "support/notify_calls.h"
+#include "support/short_lock_waits.h"
 #include "support/system_calls.h"
 #include "support/test.h"
-
-namespace {
-
-int askedBusyTimeoutMs = 0;
-
-} // namespace
-
-// Waiting for a lock is cut short; what was asked for is kept.
-extern "C" int sqlite3_busy_timeout(sqlite3 *db, int ms) {
-    static const auto real =
-        reinterpret_cast<decltype(&sqlite3_busy_timeout)>(dlsym(RTLD_NEXT, "sqlite3_busy_timeout"));
-    askedBusyTimeoutMs = ms;
-    return real(db, ms > 0 ? 1 : ms);
-}
 
 namespace kelo::test {
 namespace {
@@ -65,6 +50,7 @@ TEST(BadDatabase, IsNotFoundByAPathThatOnlyBeginsWithItsName) {
 }
 
 TEST(LockedDatabase, FailsAfterWaiting) {
+    ShortLockWaits waits;
     const TempRoot root;
     const std::string path = root.File("logs.db");
     CreateSingleFile(path);
@@ -76,11 +62,14 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), -1);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
     EXPECT_EQ(rows, 0);
-    EXPECT_GE(askedBusyTimeoutMs, 1000);
+    EXPECT_EQ(waits.TakeCount(), 3);
+    EXPECT_TRUE(waits.WaitsAtCall(1000)) << "it is asked every millisecond";
     // A writer does not keep readers out of a database with a write-ahead log.
     sqlite3_exec(locker, "COMMIT; PRAGMA journal_mode = WAL; BEGIN IMMEDIATE", nullptr, nullptr, nullptr);
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), 4);
+    EXPECT_EQ(waits.TakeCount(), 0);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
+    EXPECT_EQ(waits.TakeCount(), 1);
     ExpectNothingOpen();
     sqlite3_close(locker);
     EXPECT_EQ(QueryText(path, "SELECT count(*) FROM logs"), "200");
@@ -133,6 +122,7 @@ bool HandleErrors(const std::string &path) {
 }
 
 TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
+    const ShortLockWaits waits;
     NotifyCalls::Reset();
     SystemCalls::Reset();
     const TempRoot root;

@@ -5,6 +5,7 @@
 #include <memory>
 #include <stdexcept>
 
+#include "support/fault_pause.h"
 #include "support/temp_root.h"
 
 namespace kelo::test {
@@ -23,6 +24,7 @@ Database Open(const std::string &path) {
     Database owner(db, sqlite3_close);
     if (status != SQLITE_OK)
         Fail(db, path);
+    const FaultPause pause; // a wait of the test's own
     sqlite3_busy_timeout(db, 10000);
     return owner;
 }
