@@ -11,6 +11,7 @@
 #include <utility>
 
 #include "archive/archive_name.h"
+#include "base/atomic_file.h"
 #include "base/errors.h"
 
 namespace kelo::tool {
@@ -109,10 +110,9 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
     const bool hasGroup = fchown(file.Get(), status.st_uid, status.st_gid) == 0 ||
                           fchown(file.Get(), static_cast<uid_t>(-1), status.st_gid) == 0;
     const mode_t mode = status.st_mode & (hasGroup ? 0666 : 0600);
-    if (fchmod(file.Get(), mode) != 0 || fsync(file.Get()) != 0 ||
-        renameat2(AT_FDCWD, temporary.c_str(), AT_FDCWD, path.c_str(), RENAME_NOREPLACE) != 0)
+    if (fchmod(file.Get(), mode) != 0 || fsync(file.Get()) != 0 || !RenameToFreeName(temporary, path))
         Fail(path, errno);
-    if (fsync(lock_.Get()) != 0) {
+    if (!SyncFolderOf(path)) {
         const int error = errno;
         unlink(path.c_str());
         Fail(path, error);

@@ -8,7 +8,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <filesystem>
 
 #include "base/errors.h"
 
@@ -24,15 +23,8 @@ mode_t ModeOf(const std::string &target) {
     return 0666 & ~mask;
 }
 
-// A rename lasts once the folder is on the disk. Where that cannot be told, the file is complete
-// nevertheless.
-void SyncFolderOf(const std::string &path) {
-    const std::string folder = std::filesystem::absolute(path).parent_path().string();
-    const int file = open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (file < 0)
-        return;
-    fsync(file);
-    close(file);
+bool SyncAndRename(const FileHandle &file, const std::string &from, const std::string &to) {
+    return fsync(file.Get()) == 0 && std::rename(from.c_str(), to.c_str()) == 0;
 }
 
 } // namespace
@@ -41,37 +33,61 @@ AtomicFile::AtomicFile(const std::string &target) : target_(target), path_(targe
     struct stat status {};
     if (stat(target.c_str(), &status) == 0 && !S_ISREG(status.st_mode))
         Fail("it is no regular file");
-    file_ = mkostemp(path_.data(), O_CLOEXEC);
-    if (file_ < 0)
+    file_ = FileHandle(mkostemp(path_.data(), O_CLOEXEC));
+    if (!file_)
         Fail(std::strerror(errno));
 }
 
 AtomicFile::~AtomicFile() {
-    close(file_);
     if (!path_.empty())
         unlink(path_.c_str());
 }
 
 void AtomicFile::Write(std::string_view text) {
-    while (!text.empty()) {
-        const ssize_t written = write(file_, text.data(), text.size());
-        if (written < 0 && errno != EINTR)
-            Fail(std::strerror(errno));
-        if (written > 0)
-            text.remove_prefix(static_cast<size_t>(written));
-    }
+    if (!WriteAll(file_.Get(), text))
+        Fail(std::strerror(errno));
 }
 
 void AtomicFile::Commit() {
-    if (fchmod(file_, ModeOf(target_)) != 0 || fsync(file_) != 0 ||
-        std::rename(path_.c_str(), target_.c_str()) != 0)
+    if (fchmod(file_.Get(), ModeOf(target_)) != 0 || !SyncAndRename(file_, path_, target_))
         Fail(std::strerror(errno));
     path_.clear();
-    SyncFolderOf(target_);
+    SyncFolderOf(target_); // where that fails, the file is complete nevertheless
 }
 
 void AtomicFile::Fail(const std::string &reason) const {
     throw OutputError("cannot write " + target_ + ": " + reason);
+}
+
+bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content) {
+    const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW;
+    const FileHandle file(open(temporary.c_str(), flags, 0640));
+    if (file && WriteAll(file.Get(), content) && SyncAndRename(file, temporary, path))
+        return SyncFolderOf(path);
+    const int cause = errno;
+    unlink(temporary.c_str());
+    errno = cause;
+    return false;
+}
+
+bool RenameDurably(const std::string &from, const std::string &to) {
+    // The new name first: between the two syncs the file may have both names, never none.
+    return std::rename(from.c_str(), to.c_str()) == 0 && SyncFolderOf(to) && SyncFolderOf(from);
+}
+
+bool RenameToFreeName(const std::string &from, const std::string &to) {
+    return renameat2(AT_FDCWD, from.c_str(), AT_FDCWD, to.c_str(), RENAME_NOREPLACE) == 0;
+}
+
+bool RemoveDurably(const std::string &path) {
+    return (unlink(path.c_str()) == 0 || errno == ENOENT) && SyncFolderOf(path);
+}
+
+bool SyncFolderOf(const std::string &path) {
+    const size_t slash = path.rfind('/');
+    const std::string folder = slash == std::string::npos ? "." : path.substr(0, slash + 1);
+    const FileHandle file(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    return file && fsync(file.Get()) == 0;
 }
 
 } // namespace kelo::tool

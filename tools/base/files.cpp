@@ -5,18 +5,12 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
+#include <cstdlib>
 
 namespace kelo::tool {
 namespace {
 
 constexpr off_t kMaxBytes = off_t{16} << 20;
-
-bool SyncFolderOf(const std::string &path) {
-    const FileHandle folder(
-        open(path.substr(0, path.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    return folder && fsync(folder.Get()) == 0;
-}
 
 } // namespace
 
@@ -61,25 +55,13 @@ bool WriteAll(int fd, std::string_view content) {
     return true;
 }
 
-bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content) {
-    const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW;
-    const FileHandle file(open(temporary.c_str(), flags, 0640));
-    if (file && WriteAll(file.Get(), content) && fsync(file.Get()) == 0 &&
-        std::rename(temporary.c_str(), path.c_str()) == 0)
-        return SyncFolderOf(path);
-    const int cause = errno;
-    unlink(temporary.c_str());
-    errno = cause;
-    return false;
-}
+TemporaryFile::TemporaryFile(std::string pattern, std::string_view content)
+    : path_(std::move(pattern)), file_(mkostemp(path_.data(), O_CLOEXEC)),
+      isWritten_(file_ && WriteAll(file_.Get(), content)) {}
 
-bool RenameDurably(const std::string &from, const std::string &to) {
-    // The new name first: between the two syncs the file may have both names, never none.
-    return std::rename(from.c_str(), to.c_str()) == 0 && SyncFolderOf(to) && SyncFolderOf(from);
-}
-
-bool RemoveDurably(const std::string &path) {
-    return (unlink(path.c_str()) == 0 || errno == ENOENT) && SyncFolderOf(path);
+TemporaryFile::~TemporaryFile() {
+    if (file_)
+        unlink(path_.c_str());
 }
 
 } // namespace kelo::tool

@@ -33,14 +33,22 @@ std::optional<std::string> ReadWhole(const std::string &path);
 // Writes all of `content`.
 bool WriteAll(int fd, std::string_view content);
 
-// Writes a file that is there whole or not at all, also after a crash: as `temporary`, synced, renamed to
-// `path`, whose folder is synced. Both paths are on one file system.
-bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content);
+// A file that only its owner may read, and that goes with the object.
+class TemporaryFile {
+public:
+    // `pattern` is the path, ending in "XXXXXX", which becomes what is free.
+    TemporaryFile(std::string pattern, std::string_view content);
+    ~TemporaryFile();
+    TemporaryFile(const TemporaryFile &) = delete;
+    TemporaryFile &operator=(const TemporaryFile &) = delete;
 
-// Renames, and syncs the folders of both paths.
-bool RenameDurably(const std::string &from, const std::string &to);
+    bool IsWritten() const { return isWritten_; }
+    const std::string &Path() const { return path_; }
 
-// Removes a file, and syncs its folder. One that is missing is removed.
-bool RemoveDurably(const std::string &path);
+private:
+    std::string path_;
+    FileHandle file_;
+    bool isWritten_;
+};
 
 } // namespace kelo::tool

@@ -8,6 +8,7 @@
 #include "archive/archive_run.h"
 #include "archive/database_copy.h"
 #include "archive/retention.h"
+#include "base/atomic_file.h"
 #include "base/errors.h"
 #include "base/stop_signals.h"
 #include "cli/confirm.h"

@@ -5,10 +5,10 @@
 
 #include <cctype>
 #include <filesystem>
-#include <fstream>
 #include <limits>
 
 #include "base/errors.h"
+#include "base/files.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/db_commands.h"
@@ -33,25 +33,6 @@ struct DeviceOptions : DbOptions {
 };
 struct QuarantineOptions : DbOptions {
     bool isConfirmed = false;
-};
-
-// The shipped schema in a file of its own, as the sqlite3 tool reads it.
-class SchemaFile {
-public:
-    SchemaFile() : path_((fs::temp_directory_path() / "kelosyslog-schema-XXXXXX").string()) {
-        const int file = mkstemp(path_.data());
-        if (file < 0)
-            throw DatabaseError("cannot create " + path_);
-        close(file);
-        std::ofstream(path_) << kLogsSchema;
-    }
-    ~SchemaFile() { unlink(path_.c_str()); }
-    SchemaFile(const SchemaFile &) = delete;
-    SchemaFile &operator=(const SchemaFile &) = delete;
-    const std::string &Path() const { return path_; }
-
-private:
-    std::string path_;
 };
 
 // Runs `work` and throws DatabaseError with its first message to the system log when it returns false.
@@ -88,10 +69,14 @@ int Create(const CreateOptions &options) {
         PrintMessage(path + " is there already; nothing created");
         return kExitNothing;
     }
-    std::optional<SchemaFile> shipped;
+    std::optional<TemporaryFile> shipped; // a file of its own, as the sqlite3 tool reads it
     std::string schema = options.schema;
-    if (schema.empty())
-        schema = shipped.emplace().Path();
+    if (schema.empty()) {
+        shipped.emplace((fs::temp_directory_path() / "kelosyslog-schema-XXXXXX").string(), kLogsSchema);
+        schema = shipped->Path();
+        if (!shipped->IsWritten())
+            throw DatabaseError("cannot create " + schema);
+    }
     RequirePlainPaths(path, schema);
     if (access(schema.c_str(), R_OK) != 0)
         throw UsageError("--schema: cannot read " + schema);

@@ -4,6 +4,7 @@
 #include "commands/commands.h"
 
 #include <ctime>
+#include <fstream>
 #include <limits>
 
 #include "base/atomic_file.h"
@@ -107,11 +108,9 @@ int Count(const EventsOptions &options, const std::string &root) {
 // The library does not tell when the page could not be written in full, so its end is looked at.
 void RequireWholePage(const AtomicFile &file) {
     std::string end(std::char_traits<char>::length(kPageEnd), '\0');
-    const std::unique_ptr<FILE, int (*)(FILE *)> page(std::fopen(file.Path().c_str(), "r"), std::fclose);
-    const bool isWhole = page != nullptr &&
-                         std::fseek(page.get(), -static_cast<long>(end.size()), SEEK_END) == 0 &&
-                         std::fread(end.data(), 1, end.size(), page.get()) == end.size() && end == kPageEnd;
-    if (!isWhole)
+    std::ifstream page(file.Path());
+    page.seekg(-static_cast<std::streamoff>(end.size()), std::ios::end);
+    if (!page.read(end.data(), static_cast<std::streamsize>(end.size())) || end != kPageEnd)
         file.Fail("the page did not fit; is the disk full?");
 }
 

@@ -11,6 +11,7 @@
 #include <filesystem>
 
 #include "base/errors.h"
+#include "base/files.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/events.h"
@@ -97,10 +98,9 @@ void RequireDatabase(const std::string &path) {
         throw DatabaseError("cannot clear " + path + ": " + std::strerror(errno));
     constexpr std::string_view kMagic("SQLite format 3\0", 16);
     std::array<char, kMagic.size()> start{};
-    const int file = S_ISREG(status.st_mode) ? open(path.c_str(), O_RDONLY | O_CLOEXEC) : -1;
+    const FileHandle file(S_ISREG(status.st_mode) ? open(path.c_str(), O_RDONLY | O_CLOEXEC) : -1);
     const bool isRead =
-        file >= 0 && read(file, start.data(), start.size()) == static_cast<ssize_t>(start.size());
-    close(file);
+        file && read(file.Get(), start.data(), start.size()) == static_cast<ssize_t>(start.size());
     if (!isRead || std::string_view(start.data(), start.size()) != kMagic)
         throw DatabaseError("cannot clear " + path + ": it is not an SQLite database");
 }

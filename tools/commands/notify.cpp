@@ -1,16 +1,13 @@
 // kelosyslog notify: shows and tests the ways notifications go, and the spool that they wait in.
 
-#include <fcntl.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <cerrno>
-#include <cstdlib>
 #include <cstring>
 #include <ctime>
 #include <memory>
 
 #include "base/errors.h"
+#include "base/files.h"
 #include "base/json.h"
 #include "base/text_encoding.h"
 #include "base/time_format.h"
@@ -50,24 +47,6 @@ struct Options {
 
 struct HashFreer {
     void operator()(TORVSZHASH *hash) const { TORVCSzHashFree(hash); }
-};
-
-// A file that disappears with the object.
-class TemporaryFile {
-public:
-    explicit TemporaryFile(const std::string &content) {
-        const FileHandle file(mkostemp(path_, O_CLOEXEC));
-        if (!file || !WriteAll(file.Get(), content))
-            throw OutputError(std::string(path_) + ": " + std::strerror(errno));
-    }
-    ~TemporaryFile() { unlink(path_); }
-    TemporaryFile(const TemporaryFile &) = delete;
-    TemporaryFile &operator=(const TemporaryFile &) = delete;
-
-    const char *Path() const { return path_; }
-
-private:
-    char path_[32] = "/tmp/kelosyslog.XXXXXX";
 };
 
 int Print(const Json::Value &items, bool isJson, const std::string &text) {
@@ -155,12 +134,12 @@ int Retry(const Spool &spool, const Options &options) {
     return kExitFound;
 }
 
-void Send(const std::string &tag, const std::string &root, const char *filter) {
+void Send(const std::string &tag, const std::string &root, const std::string &filter) {
     constexpr size_t kRoom = 8;
     const std::unique_ptr<TORVSZHASH, HashFreer> owned(TORVCSzHashAlloc(kRoom));
     TORVSZHASH *values = owned.get();
     const std::string texts = root + "/usr/kelo/keloman/webman/modules/Quillbay/texts/";
-    if (KELOSysNotifySendNotificationCustomized(tag.c_str(), texts.c_str(), filter, &values, 0) < 0)
+    if (KELOSysNotifySendNotificationCustomized(tag.c_str(), texts.c_str(), filter.c_str(), &values, 0) < 0)
         throw DatabaseError("the notification cannot be stored in the spool: " +
                             std::string(std::strerror(errno)));
 }
@@ -174,10 +153,14 @@ int Test(const Settings &settings, const std::string &name, const std::string &r
         throw UsageError("notify test: channel " + name + " is off in " + settings.Path());
     if (const std::string problem = isChannel ? ChannelProblem(settings, name) : ""; !problem.empty())
         throw UsageError("notify test: " + problem);
-    if (isChannel)
-        Send(kTestTag, root, TemporaryFile(std::string(kTestTag) + "=\"" + name + "\"\n").Path());
-    else
-        Send(name, root, (root + "/etc/kelosyslog/notify.filter").c_str());
+    if (!isChannel) {
+        Send(name, root, root + "/etc/kelosyslog/notify.filter");
+        return kExitFound;
+    }
+    const TemporaryFile filter("/tmp/kelosyslog.XXXXXX", std::string(kTestTag) + "=\"" + name + "\"\n");
+    if (!filter.IsWritten())
+        throw OutputError(filter.Path() + ": " + std::strerror(errno));
+    Send(kTestTag, root, filter.Path());
     return kExitFound;
 }
 

@@ -11,6 +11,7 @@
 #include <system_error>
 
 #include "base/errors.h"
+#include "base/files.h"
 #include "cli/exit_status.h"
 #include "cli/progress_bar.h"
 #include "commands/commands.h"
@@ -41,34 +42,29 @@ struct Options {
     bool verbose = false;
 };
 
-// An input that closes when it goes out of scope.
 class Input {
 public:
     // Throws UsageError naming the file.
-    explicit Input(const std::string &file) : file_(file) {
-        fd_ = file == kStandardInput ? dup(STDIN_FILENO) : open(file.c_str(), O_RDONLY | O_CLOEXEC);
-        if (fd_ < 0)
-            throw UsageError(file + ": " + std::strerror(errno));
-        if (fstat(fd_, &status_) == 0 && S_ISDIR(status_.st_mode)) {
-            close(fd_);
-            throw UsageError(file + ": " + std::strerror(EISDIR));
-        }
+    explicit Input(const std::string &name)
+        : name_(name),
+          file_(name == kStandardInput ? dup(STDIN_FILENO) : open(name.c_str(), O_RDONLY | O_CLOEXEC)) {
+        if (!file_)
+            throw UsageError(name + ": " + std::strerror(errno));
+        if (fstat(file_.Get(), &status_) == 0 && S_ISDIR(status_.st_mode))
+            throw UsageError(name + ": " + std::strerror(EISDIR));
     }
-    ~Input() { close(fd_); }
-    Input(const Input &) = delete;
-    Input &operator=(const Input &) = delete;
 
-    int Fd() const { return fd_; }
+    int Fd() const { return file_.Get(); }
     // Bytes to be read; 0 when that is not known.
     uint64_t Size() const { return S_ISREG(status_.st_mode) ? static_cast<uint64_t>(status_.st_size) : 0; }
     // The name under which progress is kept: the same from every folder.
     std::string Source() const {
-        return file_ == kStandardInput ? file_ : std::filesystem::canonical(file_).string();
+        return name_ == kStandardInput ? name_ : std::filesystem::canonical(name_).string();
     }
 
 private:
-    std::string file_;
-    int fd_;
+    std::string name_;
+    FileHandle file_;
     struct stat status_ {};
 };
 

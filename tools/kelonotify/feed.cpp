@@ -7,7 +7,7 @@
 #include <cerrno>
 #include <cstdio>
 
-#include "base/files.h"
+#include "base/atomic_file.h"
 #include "base/json.h"
 #include "kelonotify/safe_text.h"
 
@@ -55,10 +55,7 @@ Feed::Added Feed::Add(const Entry &entry) const {
     const bool isWritten = file && ftruncate(file.Get(), end) == 0 &&
                            lseek(file.Get(), end, SEEK_SET) == end && WriteAll(file.Get(), Line(entry)) &&
                            fsync(file.Get()) == 0;
-    if (!isWritten)
-        return Added::No;
-    const FileHandle folder(open(folder_.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    return folder && fsync(folder.Get()) == 0 ? Added::Yes : Added::No;
+    return isWritten && SyncFolderOf(path) ? Added::Yes : Added::No;
 }
 
 } // namespace kelo::tool

@@ -8,6 +8,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
+#include <utility>
 
 #include "base/errors.h"
 
@@ -54,7 +55,7 @@ bool WantsColour(ColourMode mode) {
     return WantsColour(mode, isatty(STDOUT_FILENO) == 1, std::getenv("NO_COLOR"), std::getenv("TERM"));
 }
 
-Output::Output(bool mayPage) : file_(STDOUT_FILENO), mayPage_(mayPage && isatty(STDOUT_FILENO) == 1) {}
+Output::Output(bool mayPage) : mayPage_(mayPage && isatty(STDOUT_FILENO) == 1) {}
 
 Output::~Output() {
     ClosePager();
@@ -66,26 +67,28 @@ void Output::StartPager() {
     int ends[2];
     if (command.empty() || command == "cat" || pipe(ends) != 0)
         return;
+    const FileHandle readEnd(ends[0]);
+    FileHandle writeEnd(ends[1]);
     pager_ = fork();
     if (pager_ == 0) {
-        close(ends[1]);
-        RunPager(command, ends[0]);
+        writeEnd = FileHandle();
+        RunPager(command, readEnd.Get());
     }
-    close(ends[0]);
     if (pager_ > 0)
-        file_ = ends[1];
-    else
-        close(ends[1]);
+        pipe_ = std::move(writeEnd);
 }
 
 void Output::ClosePager() {
     if (pager_ <= 0)
         return;
-    close(file_);
+    pipe_ = FileHandle();
     while (waitpid(pager_, nullptr, 0) < 0 && errno == EINTR) {
     }
-    file_ = STDOUT_FILENO;
     pager_ = -1;
+}
+
+int Output::File() const {
+    return pipe_ ? pipe_.Get() : STDOUT_FILENO;
 }
 
 void Output::Write(std::string_view text) {
@@ -99,11 +102,11 @@ void Output::Flush() {
         StartPager();
     std::string_view rest = buffer_;
     while (!rest.empty()) {
-        const ssize_t written = write(file_, rest.data(), rest.size());
+        const ssize_t written = write(File(), rest.data(), rest.size());
         if (written >= 0) {
             rest.remove_prefix(static_cast<size_t>(written));
         } else if (errno == EAGAIN) {
-            pollfd waiting{file_, POLLOUT, 0};
+            pollfd waiting{File(), POLLOUT, 0};
             poll(&waiting, 1, -1);
         } else if (errno == EPIPE) {
             throw OutputClosed();
@@ -115,7 +118,7 @@ void Output::Flush() {
 }
 
 void Output::Wait(int timeoutMs) const {
-    pollfd waiting{file_, 0, 0}; // no event asked for: only a failure ends the wait
+    pollfd waiting{File(), 0, 0}; // no event asked for: only a failure ends the wait
     if (poll(&waiting, 1, timeoutMs) > 0 && (waiting.revents & (POLLERR | POLLHUP | POLLNVAL)) != 0)
         throw OutputClosed();
 }

@@ -5,6 +5,8 @@
 #include <string>
 #include <string_view>
 
+#include "base/files.h"
+
 namespace kelo::tool {
 
 enum class ColourMode { Auto, Always, Never };
@@ -41,9 +43,10 @@ public:
 private:
     void StartPager();
     void ClosePager();
+    int File() const;
 
     std::string buffer_;
-    int file_;
+    FileHandle pipe_; // to the pager
     pid_t pager_ = -1;
     bool mayPage_;
 };

@@ -12,6 +12,7 @@
 #include <string_view>
 
 #include "base/errors.h"
+#include "base/files.h"
 #include "kelosyslog/records.h"
 
 namespace kelo::tool {
@@ -36,14 +37,8 @@ TableKind KindOf(const std::string &table) {
 // The header at the front of a file; the number of bytes that were there, or -1 with errno set.
 ssize_t ReadHeader(const std::string &path, Header &header) {
     // Not blocking: the path may name a pipe.
-    const int file = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
-    if (file < 0)
-        return -1;
-    const ssize_t size = read(file, header.data(), header.size());
-    const int error = errno;
-    close(file);
-    errno = error;
-    return size;
+    const FileHandle file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+    return file ? read(file.Get(), header.data(), header.size()) : -1;
 }
 
 bool IsShorterThanItSays(const Header &header, int64_t fileSize) {

@@ -3,7 +3,7 @@
 #include <filesystem>
 #include <system_error>
 
-#include "base/files.h"
+#include "base/atomic_file.h"
 #include "base/json.h"
 
 namespace kelo::tool {

@@ -10,6 +10,8 @@
 #include <cstring>
 #include <filesystem>
 
+#include "base/atomic_file.h"
+
 namespace kelo::tool {
 namespace {
 

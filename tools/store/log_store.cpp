@@ -1,14 +1,13 @@
 #include "store/log_store.h"
 
-#include <fcntl.h>
 #include <sqlite3.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 #include <cstring>
 #include <filesystem>
 
+#include "base/atomic_file.h"
 #include "store/logs_schema.h"
 
 namespace kelo::tool {
@@ -32,16 +31,6 @@ void BindText(sqlite3_stmt *statement, int index, std::string_view text) {
 
 void BindNumber(sqlite3_stmt *statement, int index, uint64_t number) {
     sqlite3_bind_int64(statement, index, static_cast<sqlite3_int64>(number));
-}
-
-// Makes a new name in a folder survive a loss of power.
-void SyncFolderOf(const std::string &path) {
-    const std::string folder = std::filesystem::path(path).parent_path();
-    const int fd = open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (fd >= 0) {
-        fsync(fd);
-        close(fd);
-    }
 }
 
 // Removes the forerunner of a database that does not get its name.
@@ -97,7 +86,7 @@ void LogStore::Create() {
     Run(kLogsSchema);
     db_.reset();
     // Whoever was faster keeps the name: both files are alike.
-    if (renameat2(AT_FDCWD, file_.c_str(), AT_FDCWD, path_.c_str(), RENAME_NOREPLACE) != 0 && errno != EEXIST)
+    if (!RenameToFreeName(file_, path_) && errno != EEXIST)
         throw StoreError(path_ + ": " + std::strerror(errno), SQLITE_CANTOPEN, errno);
     SyncFolderOf(path_);
 }
