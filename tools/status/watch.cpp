@@ -1,8 +1,6 @@
 #include "status/watch.h"
 
-#include <poll.h>
 #include <sys/ioctl.h>
-#include <sys/signalfd.h>
 #include <termios.h>
 #include <unistd.h>
 
@@ -11,6 +9,7 @@
 #include <csignal>
 
 #include "base/errors.h"
+#include "base/event_loop.h"
 #include "base/files.h"
 #include "print/output.h"
 
@@ -19,35 +18,6 @@ namespace {
 
 constexpr const char *kEnter = "\x1b[?1049h\x1b[?25l"; // the alternate screen, no cursor
 constexpr const char *kLeave = "\x1b[?25h\x1b[?1049l";
-
-// Takes the signals that end or resize, for as long as it lives.
-class Signals {
-public:
-    Signals() {
-        sigset_t set;
-        sigemptyset(&set);
-        for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGWINCH})
-            sigaddset(&set, signal);
-        sigprocmask(SIG_BLOCK, &set, &before_);
-        file_ = FileHandle(signalfd(-1, &set, SFD_CLOEXEC | SFD_NONBLOCK));
-    }
-    ~Signals() { sigprocmask(SIG_SETMASK, &before_, nullptr); }
-    Signals(const Signals &) = delete;
-    Signals &operator=(const Signals &) = delete;
-
-    int File() const { return file_.Get(); }
-    // Whether one of those that came means the end. They are taken away: none strikes later.
-    bool IsEnd() const {
-        bool isEnd = false;
-        for (signalfd_siginfo signal{}; read(File(), &signal, sizeof signal) == sizeof signal;)
-            isEnd = isEnd || signal.ssi_signo != SIGWINCH;
-        return isEnd;
-    }
-
-private:
-    sigset_t before_{};
-    FileHandle file_;
-};
 
 // The terminal of the standard output while screens are drawn in place on it; nothing where they are not.
 class Terminal {
@@ -76,8 +46,8 @@ public:
     Terminal &operator=(const Terminal &) = delete;
 
     bool IsOutput() const { return isOutput_; }
-    // What to wait for keys on; -1 for nothing.
-    int Input() const { return isInput_ ? STDIN_FILENO : -1; }
+    // Whether keys come from the standard input.
+    bool IsInput() const { return isInput_; }
     bool IsQuitTyped() {
         char key = 0;
         const ssize_t size = read(STDIN_FILENO, &key, 1);
@@ -108,39 +78,31 @@ std::string InPlace(const std::string &screen) {
     return text + "\x1b[J";
 }
 
-// Waits for the next screen; false when there is to be none.
-bool WaitForNext(std::chrono::milliseconds pause, const Signals &signals, Terminal &terminal) {
-    pollfd waiting[] = {{signals.File(), POLLIN, 0}, {terminal.Input(), POLLIN, 0}, {STDOUT_FILENO, 0, 0}};
-    const auto deadline = std::chrono::steady_clock::now() + pause;
-    while (true) {
-        const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
-            deadline - std::chrono::steady_clock::now());
-        const int count = poll(waiting, 3, static_cast<int>(std::max<int64_t>(left.count(), 0)));
-        if (count == 0)
-            return true;
-        if (count < 0)
-            continue; // EINTR: a signal that is not taken here, such as a debugger's
-        if (waiting[0].revents != 0)
-            return !signals.IsEnd();
-        if (waiting[2].revents != 0)
-            throw OutputClosed();
-        if (waiting[1].revents != 0 && terminal.IsQuitTyped())
-            return false;
-    }
-}
-
 } // namespace
 
 void Watch(const WatchOptions &options, const DrawScreen &draw) {
-    const Signals signals;
+    EventLoop loop;
+    bool isOver = false;
+    bool isDue = false;
+    const auto end = [&] { isOver = true; };
+    const auto next = [&] { isDue = true; };
+    const EventSource signals[] = {loop.AddSignal(SIGINT, end), loop.AddSignal(SIGTERM, end),
+                                   loop.AddSignal(SIGHUP, end), loop.AddSignal(SIGWINCH, next)};
     Terminal terminal(options.inPlace);
+    const EventSource reader = loop.AddHangUp(STDOUT_FILENO, [] { throw OutputClosed(); });
+    EventSource keys;
+    if (terminal.IsInput())
+        keys = loop.AddInput(STDIN_FILENO, [&] { isOver = terminal.IsQuitTyped(); });
+    EventSource pause = loop.AddTimer(next);
     Output output(false);
-    for (bool isFirst = true;; isFirst = false) {
+    for (bool isFirst = true; !isOver; isFirst = false) {
         const std::string screen = draw(terminal.IsOutput() ? Terminal::Height() : 0);
         output.Write(terminal.IsOutput() ? InPlace(screen) : (isFirst ? "" : options.separator) + screen);
         output.Flush();
-        if (!WaitForNext(options.pause, signals, terminal))
-            return;
+        isDue = false;
+        pause.FireAt(std::chrono::steady_clock::now() + options.pause);
+        while (!isDue && !isOver)
+            loop.Wait();
     }
 }
 

@@ -1,0 +1,77 @@
+#pragma once
+
+#include <chrono>
+#include <exception>
+#include <functional>
+#include <memory>
+
+struct sd_event;
+
+namespace kelo::tool {
+
+// What an EventLoop waits for, for as long as the object lives. It must go before its loop, and not while its
+// own handler runs.
+class EventSource {
+public:
+    // Waits for nothing.
+    EventSource();
+    EventSource(EventSource &&) noexcept;
+    EventSource &operator=(EventSource &&) noexcept;
+    ~EventSource();
+
+    // While a source is off its handler does not run, and what comes waits for it to be on again.
+    void SetEnabled(bool isEnabled);
+
+    // For a timer: runs the handler once at this time, which replaces the one set before; at once when it has
+    // passed.
+    void FireAt(std::chrono::steady_clock::time_point time);
+
+private:
+    friend class EventLoop;
+    struct Watch;
+    std::unique_ptr<Watch> watch_;
+};
+
+// Waits for files, times and signals on the thread that calls it, and runs their handlers there, one event a
+// call. Signals come before anything else.
+//
+// All functions throw std::system_error.
+class EventLoop {
+public:
+    using Handler = std::function<void()>;
+
+    EventLoop();
+    ~EventLoop();
+    EventLoop(const EventLoop &) = delete;
+    EventLoop &operator=(const EventLoop &) = delete;
+
+    // There is something to read, or the input has ended. Regular files and devices that nobody can wait for
+    // are always ready.
+    EventSource AddInput(int file, Handler handler);
+
+    // The other end of an output has gone. Never for an output that has no other end or is not open.
+    EventSource AddHangUp(int file, Handler handler);
+
+    // A time has come; none until EventSource::FireAt.
+    EventSource AddTimer(Handler handler);
+
+    // The signal has come. It does nothing else in the process while the source lives; one that came and was
+    // not handled by then is discarded. A signal has one source at a time.
+    EventSource AddSignal(int signal, Handler handler);
+
+    // Waits for an event and handles it. Throws what its handler throws. May return without any.
+    void Wait();
+
+    // Handles an event that has come. Returns false where there was none. Throws what its handler throws.
+    bool Poll();
+
+private:
+    friend struct EventSource::Watch;
+    EventSource::Watch &Add(EventSource &source, Handler handler);
+    bool Run(uint64_t timeoutUsec);
+
+    sd_event *loop_ = nullptr;
+    std::exception_ptr failure_; // of the handler that was run last
+};
+
+} // namespace kelo::tool
