@@ -1,12 +1,11 @@
 #include "kelonotify/watcher.h"
 
-#include <poll.h>
 #include <sys/inotify.h>
-#include <sys/signalfd.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstring>
 
@@ -15,30 +14,35 @@
 namespace kelo::tool {
 
 Watcher::Watcher(const std::string &folder) : files_(inotify_init1(IN_NONBLOCK | IN_CLOEXEC)) {
-    sigset_t signals;
-    sigemptyset(&signals);
-    sigaddset(&signals, SIGTERM);
-    sigaddset(&signals, SIGINT);
-    sigprocmask(SIG_BLOCK, &signals, nullptr);
-    signals_ = FileHandle(signalfd(-1, &signals, SFD_NONBLOCK | SFD_CLOEXEC));
-    if (!files_ || !signals_ || inotify_add_watch(files_.Get(), folder.c_str(), IN_MOVED_TO | IN_CREATE) < 0)
+    if (!files_ || inotify_add_watch(files_.Get(), folder.c_str(), IN_MOVED_TO | IN_CREATE) < 0)
         throw SpoolError(folder + ": " + std::strerror(errno));
+    news_ = loop_.AddInput(files_.Get(), [this] { TakeNews(); });
+    term_ = loop_.AddSignal(SIGTERM, [this] { isStopped_ = true; });
+    interrupt_ = loop_.AddSignal(SIGINT, [this] { isStopped_ = true; });
+}
+
+void Watcher::TakeNews() {
+    alignas(inotify_event) char events[4096];
+    while (read(files_.Get(), events, sizeof events) > 0) {
+    }
+    hasNews_ = true;
 }
 
 void Watcher::Wait(int64_t seconds) {
     constexpr int64_t kLongestSec = 3600;
-    const int64_t timeoutSec = seconds < 0 ? kLongestSec : std::clamp<int64_t>(seconds, 1, kLongestSec);
-    pollfd waiting[2] = {{files_.Get(), POLLIN, 0}, {signals_.Get(), POLLIN, 0}};
-    poll(waiting, 2, static_cast<int>(timeoutSec) * 1000);
-    alignas(inotify_event) char events[4096];
-    while (read(files_.Get(), events, sizeof events) > 0) {
-    }
+    const std::chrono::seconds pause(seconds < 0 ? kLongestSec
+                                                 : std::clamp<int64_t>(seconds, 1, kLongestSec));
+    bool isOver = false;
+    EventSource timer = loop_.AddTimer([&] { isOver = true; });
+    timer.FireAt(std::chrono::steady_clock::now() + pause);
+    while (!isOver && !hasNews_ && !isStopped_)
+        loop_.Wait();
+    hasNews_ = false;
 }
 
 bool Watcher::ShouldStop() {
-    signalfd_siginfo signal;
-    if (read(signals_.Get(), &signal, sizeof signal) > 0)
-        isStopped_ = true;
+    while (loop_.Poll()) {
+    }
     return isStopped_;
 }
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "base/event_loop.h"
 #include "base/files.h"
 
 namespace kelo::tool {
@@ -8,7 +9,7 @@ namespace kelo::tool {
 // nothing by themselves.
 class Watcher {
 public:
-    // Watches the folder. Throws SpoolError.
+    // Watches the folder. Throws SpoolError, and std::system_error as the other functions do.
     explicit Watcher(const std::string &folder);
 
     // Waits until a file appears in the folder, a signal asks to stop, or the seconds are over (below 0: no
@@ -19,9 +20,15 @@ public:
     bool ShouldStop();
 
 private:
+    void TakeNews();
+
     FileHandle files_;
-    FileHandle signals_;
+    bool hasNews_ = false;
     bool isStopped_ = false;
+    EventLoop loop_;
+    EventSource news_;
+    EventSource term_;
+    EventSource interrupt_;
 };
 
 } // namespace kelo::tool
