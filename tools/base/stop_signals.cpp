@@ -1,41 +1,42 @@
 #include "base/stop_signals.h"
 
+#include <csignal>
+
 namespace kelo::tool {
 namespace {
 
-volatile std::sig_atomic_t received = 0;
+StopSignals *current = nullptr;
 
-void Note(int signal) {
-    received = signal;
+bool IsIgnored(int signal) {
+    struct sigaction action {};
+    return sigaction(signal, nullptr, &action) == 0 && action.sa_handler == SIG_IGN;
 }
 
 } // namespace
 
 StopSignals::StopSignals() {
-    struct sigaction action {};
-    action.sa_handler = Note;
-    sigemptyset(&action.sa_mask);
-    action.sa_flags = SA_RESTART;
-    for (size_t i = 0; i < 3; ++i) {
-        sigaction(kSignals[i], nullptr, &before_[i]);
-        if (before_[i].sa_handler != SIG_IGN) // for example HUP under nohup
-            sigaction(kSignals[i], &action, nullptr);
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+        if (!IsIgnored(signal))
+            sources_.push_back(loop_.AddSignal(signal, [this, signal] { received_ = signal; }));
     }
+    current = this;
 }
 
 StopSignals::~StopSignals() {
-    for (size_t i = 0; i < 3; ++i)
-        sigaction(kSignals[i], &before_[i], nullptr);
-    received = 0;
+    current = nullptr;
 }
 
-int StopSignals::Received() {
-    return received;
+int StopSignals::Received() noexcept {
+    if (current == nullptr)
+        return 0;
+    if (current->received_ == 0)
+        current->loop_.Poll();
+    return current->received_;
 }
 
 void StopSignals::Check() {
-    if (received != 0)
-        throw Interrupted(received);
+    if (const int signal = Received(); signal != 0)
+        throw Interrupted(signal);
 }
 
 } // namespace kelo::tool

@@ -1,7 +1,9 @@
 #pragma once
 
-#include <csignal>
 #include <exception>
+#include <vector>
+
+#include "base/event_loop.h"
 
 namespace kelo::tool {
 
@@ -11,24 +13,27 @@ struct Interrupted : std::exception {
     int signal;
 };
 
-// While the object lives, INT, TERM and HUP only leave a mark, so that the work can end tidily. One object at
-// a time.
+// For work that does not wait for events, and asks now and then whether it is to stop: while the object
+// lives, INT, TERM and HUP do nothing by themselves. One that is ignored stays so, for example HUP under
+// nohup. One object at a time.
 class StopSignals {
 public:
+    // Throws std::system_error.
     StopSignals();
     // The signals do again what they did before.
     ~StopSignals();
     StopSignals(const StopSignals &) = delete;
     StopSignals &operator=(const StopSignals &) = delete;
 
-    // The signal that came, 0 for none so far.
-    static int Received();
+    // The signal that came first, 0 for none so far. Costs a system call until one has come.
+    static int Received() noexcept;
     // Throws Interrupted when one came.
     static void Check();
 
 private:
-    static constexpr int kSignals[] = {SIGINT, SIGTERM, SIGHUP};
-    struct sigaction before_[3];
+    EventLoop loop_;
+    std::vector<EventSource> sources_;
+    int received_ = 0;
 };
 
 } // namespace kelo::tool
