@@ -1,5 +1,6 @@
+# shellcheck shell=bash
 # What the benchmarks of the whole chain share. Sourced by bash, not run.
-cd "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")/.."
+cd "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")/.." || exit
 . scripts/lib/syslog-ng.sh
 
 programs=$PWD/build/release/bin

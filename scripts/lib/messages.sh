@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # Messages as a small office produces them, for the demo and the system tests. Sourced by bash, not run.
 
 # make_messages COUNT FORMAT [FIRST]: prints COUNT messages, one a line and each of them different, numbered from FIRST
@@ -30,7 +31,8 @@ make_messages() {
 # frame_lines: turns lines into octet-counted frames (RFC 6587).
 frame_lines() { LC_ALL=C awk '{ printf "%d %s", length($0), $0 }'; }
 
-# Texts that break careless software, each with the way that it is sent: TEXT must be in column msg as it stands.
+# Texts that break careless software, each with the way that it is sent: TEXT must be in column msg unchanged.
+# shellcheck disable=SC1003,SC2016,SC2034 # meant literally, used by those who source this
 hostileTexts=(
     "it's 5 o'clock; DROP TABLE logs; --"
     'she said "100% sure", 50%% of the time, %s %n %d'

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # A private syslog-ng on loopback for the demo, the system tests and the benchmark. Sourced by bash, not run.
 #
 # Everything stands below ROOT: ROOT/kelosyslog.conf, ROOT/logs.db, ROOT/syslog-ng.{conf,persist,pid,ctl,log}. The

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # Every message over TCP is one row, whatever its format and text, with each of its parts in the right column.
 source "$(dirname "$0")/support.sh"
 syslog_ng_start "$root"

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # What the program writes as HTML, in a real browser: it renders without an error, and no text acts on the report.
 source "$(dirname "$0")/support.sh"
 kelosyslog=("$KELO_BIN_DIR/kelosyslog" --root "$root")

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # A database that is damaged under a running syslog-ng: the first statement that fails puts it aside, the
 # administrator is told, and syslog-ng goes on in a fresh database in which everything sent afterwards is found.
 source "$(dirname "$0")/support.sh"
@@ -48,6 +49,6 @@ for part in pages header wal; do
     expect "$part: rows of the fresh database" "$(query 'SELECT count(DISTINCT msg), min(id) FROM logs')" "2000|1"
     expect "$part: integrity" "$(query 'PRAGMA integrity_check')" ok
     syslog_ng_stop "$root"
-    rm -rf "$database"* "$root/var"
+    rm -rf "$database"* "${root:?}/var"
     first=$((first + 5000))
 done

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # Messages sent to syslog-ng are rows and counts, and fire rules, whoever stores them: syslog-ng or the receiver.
 # usage: receive.sh database|receiver
 source "$(dirname "$0")/support.sh"

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # What syslog-ng has taken over survives kill -9: messages that wait for a locked database are rows after the restart.
 source "$(dirname "$0")/support.sh"
 syslog_ng_start "$root"

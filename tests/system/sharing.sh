@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # A handler runs transactions, checkpoints and queries while syslog-ng writes at full speed: no error, and every
 # message is a row. For KELO_LOAD_SECONDS seconds (5).
 source "$(dirname "$0")/support.sh"

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # kelosyslog status tells how a real syslog-ng is, with its counters, and notices when it is gone or suspended.
 source "$(dirname "$0")/support.sh"
 export PATH=$KELO_BIN_DIR:$PATH

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # What the system tests share: an own root that disappears, a private syslog-ng with the shipped configuration, and
 # checks. Sourced by each test, which ctest runs in parallel with others.
 set -euo pipefail

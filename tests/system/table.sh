@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # The table that syslog-ng creates in a fresh file is the one of logs.sql.
 source "$(dirname "$0")/support.sh"
 
