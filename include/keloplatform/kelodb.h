@@ -3,7 +3,7 @@
 // The appliance's database layer: connections and statements over SQLite.
 //
 // A connection and its results are used by one thread at a time. Nothing here throws, and nothing writes to
-// the system log: a failure is a null or negative result, and the connection tells the cause (KELODBErrorGet,
+// the system log: a failure is a null or negative result, and the connection has the cause (KELODBErrorGet,
 // and sqlite3_errcode() on KELODBInternalDBHdlGet).
 
 #include <cstddef>
@@ -19,15 +19,16 @@ struct DBResult_tag;
 
 extern "C" {
 
-// Opens the existing database file at `path` for reading and writing; where the caller may only read it, for
-// reading. The first three arguments (host, user, password on other systems) are ignored and called with 0.
+// Opens the existing database file at `path` for reading and writing, or only for reading if the caller may
+// not write it. The first three arguments (host, user, password on other systems) are ignored and called with
+// 0.
 //
-// The file is never created, and `path` is taken as it stands (no "file:" URI). Statements wait for another
+// The file is never created, and `path` is taken literally (no "file:" URI). Statements wait for another
 // writer with a time-out. SQL reached through the connection can neither load extensions nor attach other
 // files.
 //
 // Returns a connection that the caller closes with KELODBClose, or null: no path, no such file, no
-// permission, out of memory. A file that is no database is noticed only by the first statement.
+// permission, out of memory. A file that is not a database is detected only by the first statement.
 KELOPLATFORM_API DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path);
 
 // Closes the connection; null is accepted. Results stay valid until they are freed themselves. Returns 0, or
@@ -38,7 +39,7 @@ KELOPLATFORM_API int KELODBClose(DBConnect_tag *connection);
 // without any statement succeeds and does nothing.
 //
 // `result`, when not null, receives the complete result, to be freed with KELODBFreeResult, or null for a
-// statement that has no columns and on failure. Returns 0, or -1 after which the connection tells the cause.
+// statement that has no columns and on failure. Returns 0, or -1 after which the connection has the cause.
 KELOPLATFORM_API int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result);
 
 // As KELODBExecute for one SELECT without a LIMIT clause of its own, of whose rows it skips `offset` and then
@@ -55,8 +56,8 @@ KELOPLATFORM_API int KELODBNumRows(DBResult_tag *result);
 KELOPLATFORM_API int KELODBFetchRow(DBResult_tag *result, unsigned int *row);
 
 // The text of a column, by its exact name, of a row whose handle KELODBFetchRow gave. It is NUL-terminated
-// and belongs to the result. Null when the result has no such row or column, or the value is NULL. Where two
-// columns have one name the first counts.
+// and belongs to the result. Null when the result has no such row or column, or the value is NULL. Of two
+// columns with the same name the first is used.
 KELOPLATFORM_API const char *KELODBFetchField(DBResult_tag *result, unsigned int row, const char *column);
 
 // Frees a result; null is accepted.
@@ -68,7 +69,7 @@ KELOPLATFORM_API const char *KELODBErrorGet(DBConnect_tag *connection);
 // The SQLite handle behind the connection (null for null). It stays the connection's own.
 KELOPLATFORM_API sqlite3 *KELODBInternalDBHdlGet(DBConnect_tag *connection);
 
-// Writes `inLen` bytes of `in` to `out` so that they can stand between single quotes in SQL: every single
+// Writes `inLen` bytes of `in` to `out` so that they can be put between single quotes in SQL: every single
 // quote is doubled and nothing else is changed. `out` is NUL-terminated. The connection may be null.
 //
 // Returns the number of bytes written without the NUL, or -1: an argument is null, `outSize` is too small, or

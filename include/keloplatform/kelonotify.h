@@ -2,7 +2,7 @@
 
 // The appliance's notification service, and its mail and SMS settings.
 //
-// The settings stand in the key/value file /etc/keloinfo.conf (keloinfo.conf(5)) under the platform's root.
+// The settings are in the key/value file /etc/keloinfo.conf (keloinfo.conf(5)) under the platform's root.
 
 #include "keloplatform/export.h"
 
@@ -11,8 +11,8 @@ struct TORVSZHASH;
 // How mail is sent. Texts are empty where the setting is missing.
 struct KELOMAIL {
     char server[256];       // host name or address of the SMTP server; empty: mail is not configured
-    int port;               // TCP port; 0 where the usual one of `security` is meant
-    char security[16];      // "none", "starttls" or "tls", as it stands in the settings
+    int port;               // TCP port; 0: the usual one of `security`
+    char security[16];      // "none", "starttls" or "tls", as in the settings
     char user[256];         // empty: no authentication
     char password[256];     // secret: never log it
     char sender[320];       // address in the From field
@@ -36,10 +36,10 @@ extern "C" {
 // the keys of `*hash` are the placeholders ("%EPS%"). A missing text gives a plain message with all values.
 //
 // The message is put into the spool durably and the call returns: it never waits for a network. kelonotify
-// delivers the spool. Nothing is spooled where no channel is left. `hash`, `*hash`, `textsDir` and
+// delivers the spool. Nothing is spooled when no channel is left. `hash`, `*hash`, `textsDir` and
 // `filterFile` may be null; the map is only read. The last argument is not used; call it with 0.
 //
-// Returns 0 when the message is on the disk or nobody wants it, or -1 when it could not be stored, after a
+// Returns 0 when the message is on the disk or no channel is left, or -1 when it could not be stored, after a
 // line in the system log (priority LOG_ERR) with the cause.
 KELOPLATFORM_API int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDir,
                                                              const char *filterFile, TORVSZHASH **hash, int);

@@ -13,17 +13,17 @@ extern "C" {
 // ignored and called with 0 and 1.
 //
 // Returns 0, also when the folder is there already or "" names the root of an absolute path; -1 with errno
-// set when something cannot be created or is no folder. Parents created before a failure stay.
+// set when something cannot be created or is not a folder. Parents created before a failure stay.
 KELOPLATFORM_API int KELOFSMkdirP(const char *folder, int, int, int uid, int gid, unsigned int mode);
 
 } // extern "C"
 
 // Asks the service manager to reload a service, given without a suffix ("syslog-ng"), as a HUP signal would:
-// it reopens its files and reads its configuration again. Where systemd runs it is asked and its answer
+// it reopens its files and reads its configuration again. Where systemd runs, it is asked and its answer
 // awaited; elsewhere, and under a root (KELORootSet), the process that the service's pid file names
 // (/run/SERVICE.pid or /var/lib/SERVICE/SERVICE.pid), after a check that it is this service's program, gets a
-// HUP signal. While a reload of the same service is under way it is not asked for a second time: its outcome
-// is this call's too.
+// HUP signal. While a reload of the same service is in progress no second one is requested: its outcome is
+// this call's too.
 //
 // Returns whether the service was reloaded; a failure is reported in the system log.
 KELOPLATFORM_API bool KELOSystemdReload(const std::string &service);

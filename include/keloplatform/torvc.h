@@ -3,7 +3,7 @@
 // The appliance's core library: files, section files, and maps and lists of strings.
 //
 // Nothing here throws. A failed call says so by its result and sets errno. Only a file or value that is
-// refused for what it holds is also named in the system log (priority LOG_WARNING, with path and line),
+// refused for its content is also named in the system log (priority LOG_WARNING, with path and line),
 // because errno cannot say which line it was.
 //
 // A section file is text of sections, each a header "[NAME]" and lines KEY="VALUE" under it; a key/value file
@@ -27,8 +27,8 @@ extern "C" {
 
 // Runs a program, given by its path, with up to four arguments, the first null one ending them, and waits for
 // it. The command gets default signal handling, no open file of the caller's but standard error, and
-// /dev/null as standard input and output. Other children of the process, and waits and signal handlers for
-// them, do not get in its way.
+// /dev/null as standard input and output. It is not affected by other children of the process, nor by waits
+// and signal handlers for them.
 //
 // Returns 0 when the command ran and ended with exit status 0, else -1.
 KELOPLATFORM_API int TORVCExec(const char *program, const char *arg1, const char *arg2, const char *arg3,
@@ -38,7 +38,7 @@ KELOPLATFORM_API int TORVCExec(const char *program, const char *arg1, const char
 KELOPLATFORM_API bool TORVCFileExist(const char *path);
 
 // Appends the names of all sections of the file to `*list`, in file order and each name once. A header that
-// names no section ("[abc", "[]") is passed over and reported.
+// names no section ("[abc", "[]") is skipped and reported.
 //
 // Returns 0 (also for a file without sections), or -1: a null argument, or the file cannot be read. The list
 // may then have got a part of the names.
@@ -54,12 +54,12 @@ KELOPLATFORM_API int TORVCFileGetSection(const char *path, const char *section, 
 
 // Replaces the entries of the section by those of `hash`, one line each, and gives it the name `newName`. A
 // section that does not exist is appended; a missing file is created. With a null `newName` the section is
-// removed, with its comments up to its last entry, and `hash` and `lineFormat` are not looked at.
+// removed, with its comments up to its last entry, and `hash` and `lineFormat` are ignored.
 //
-// `lineFormat` is one line that holds "%s" twice (key, then value), no other '%', and ends in its only line
-// feed. An entry that would not be read back as it is (a line feed in it, for one) is refused.
+// `lineFormat` is one line that contains "%s" twice (key, then value), no other '%', and ends in its only
+// line feed. An entry that would not be read back unchanged (for example with a line feed in it) is refused.
 //
-// All else in the file stays byte for byte. The file is replaced through a temporary file beside it that is
+// All other bytes of the file stay. The file is replaced by a temporary file in the same folder that is
 // synced and renamed, under a lock on the folder: a crash leaves the old or the new content, and no writer
 // loses another's section. Mode and owner stay; of a symbolic link the target is replaced.
 //
@@ -70,10 +70,10 @@ KELOPLATFORM_API int TORVCFileGetSection(const char *path, const char *section, 
 KELOPLATFORM_API int TORVCFileSetSection(const char *path, const char *section, const char *newName,
                                          TORVSZHASH *hash, const char *lineFormat);
 
-// Copies the value of the first line with this key, whatever section it stands in, to `buffer`, cut to
+// Copies the value of the first line with this key, in any section, to `buffer`, cut to
 // `size - 1` bytes and always terminated. The last argument is not used; call it with 0.
 //
-// Returns the length of the whole value in bytes (so a result of `size` or more tells that it was cut), or -1
+// Returns the length of the whole value in bytes (so a result of `size` or more means that it was cut), or -1
 // with an empty text in the buffer: a bad argument, the file cannot be read, or no such key (ENOENT).
 KELOPLATFORM_API int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t size, int);
 

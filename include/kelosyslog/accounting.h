@@ -1,18 +1,18 @@
 #pragma once
 
-// Counts of received logs: in total, per second and per sending device.
+// Counts of received records: in total, per second and per sending device.
 //
 //     AccountingManager accounting;      // loads the stored histogram
-//     for (each received log) {
+//     for (each received record) {
 //         accounting.LogInc(host);
 //         ...
 //     }
 //     if (accounting.isNeed2Flush())     // on a beat of 6 seconds or more
 //         accounting.AccoutingFlush2DB();
 //
-// At the first log of a new second the manager closes a sample: logs per device since the sample before. A
-// sample that reaches a rule raises a notification and an event. Samples are kept until a flush has written
-// them. One object per accounting database, used by one thread.
+// At the first record of a new second the manager closes a sample: records per device since the sample
+// before. A sample that reaches the threshold of a rule causes a notification and an event. Samples are kept
+// until a flush has written them. One object per accounting database, used by one thread.
 
 #include <cstdint>
 #include <list>
@@ -39,7 +39,7 @@ struct KELOLOG_LOG_DEVICE_STATISTIC {
 class KELOSYSLOG_API AccountingManager {
 public:
     // Loads the stored histogram and the notification rules. A database that is missing or cannot be read
-    // counts as empty.
+    // is taken as empty.
     AccountingManager();
     // Flushes once more; its failure is only reported.
     ~AccountingManager();
@@ -49,15 +49,15 @@ public:
     // Sets the path of the accounting database, "/var/log/kelolog/.KELOACCOUNTDB". Reads no file; always 0.
     int ConfigLoad();
 
-    // Counts one log from `device`, after closing the sample where the second has changed. Always 0. Its cost
+    // Counts one record from `device`, after closing the sample if the second has changed. Always 0. Its cost
     // does not depend on the number of devices.
     int LogInc(std::string device);
 
-    // Closes the current sample when the clock has left the second in which the last one was closed and there
-    // is something to close. Its stamp is the present second. Always 0.
+    // Closes the current sample if it is not empty and the clock has left the second in which the last one
+    // was closed. Its stamp is the present second. Always 0.
     int CurEpsUpdate();
 
-    // Whether more than 5 seconds have passed since the call before; true at the first call.
+    // Whether more than 5 seconds have passed since the previous call; true at the first call.
     bool isNeed2Flush();
 
     // Writes the closed samples and the histogram to the database, which is created when missing, in one
@@ -68,19 +68,19 @@ public:
     // leaves those before it in the database, and the next flush writes them again.
     int AccoutingFlush2DB();
 
-    // Gives up the oldest closed samples until at most `samples` are left that hold at most `counts` counts
-    // of devices, which take some 16 bytes each. For callers that must bound what waits while the database
-    // cannot be written; the histogram is not touched. Returns the number of samples given up.
+    // Discards the oldest closed samples until at most `samples` are left with at most `counts` counts of
+    // devices, which take about 16 bytes each. For callers that must limit what waits while the database
+    // cannot be written; the histogram does not change. Returns the number of discarded samples.
     size_t SamplesDrop(size_t samples, size_t counts);
 
     // Writes the figures to the debug channel at level 2.
     void AccountingDump();
 
-    // Logs counted since construction.
+    // Records counted since construction.
     int64_t TotalCountGet() const;
-    // Logs counted since the last sample was closed.
+    // Records counted since the last sample was closed.
     int64_t CurrentEpsGet() const;
-    // A copy of the histogram: stored devices by name, then devices in the order of their first log.
+    // A copy of the histogram: stored devices by name, then devices in the order of their first record.
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> HistogramGet() const;
 
 private:
@@ -97,7 +97,7 @@ private:
     int64_t currentCount_ = 0;
     int32_t lastFlushCheck_ = 0;
     std::unique_ptr<kelo::DeviceTable> devices_; // in the histogram's order
-    std::vector<kelo::Device *> openSample_;     // the devices with logs in the open sample
+    std::vector<kelo::Device *> openSample_;     // the devices with records in the open sample
     std::list<Sample> samples_;
     NotificationManager notifications_;
 };

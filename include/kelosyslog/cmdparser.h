@@ -13,8 +13,8 @@
 //
 //     CmdParser().CmdParse(text = R"({"cmd":"start"}{"cmd":"stop","ids":[1,2]})", commands);    // two values
 //
-// So a command is a flat object: an object within an object, or a "}" in a string, cuts it in the wrong place
-// and fails. White space may stand in front of an object but not behind the last one.
+// So a command is a flat object: an object within an object, or a "}" in a string, splits it in the wrong
+// place and fails. White space is allowed before an object but not after the last one.
 class KELOSYSLOG_API CmdParser {
 public:
     CmdParser();
@@ -22,9 +22,9 @@ public:
 
     // Appends the values of `text`, which is only read, to `commands`, which is not cleared.
     //
-    // Returns true when every piece parsed; an empty text has none. At the first piece that is no JSON value,
-    // is nested deeper than the JSON reader allows (1000 levels) or finds no memory, it writes one message to
-    // the system log and returns false: the values before stay appended, what follows is not looked at. Never
-    // throws.
+    // Returns true when every piece parsed; an empty text has none. At the first piece that is not a JSON
+    // value, is nested deeper than the JSON reader allows (1000 levels) or finds no memory, it writes one
+    // message to the system log and returns false: the values before it stay appended, and the rest is not
+    // read. Never throws.
     bool CmdParse(std::string &text, std::vector<Json::Value> &commands);
 };

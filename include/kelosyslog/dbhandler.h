@@ -1,7 +1,6 @@
 #pragma once
 
-// One SQLite database of the log server: created from its schema when missing, guarded while used,
-// quarantined when corrupt.
+// One SQLite database of the log server: created from its schema when missing, and quarantined when corrupt.
 //
 //     DBHandler db("/var/log/kelolog/archive.db", "/usr/kelo/syslog/schema/archive.sql");
 //     if (db.DBCon() == 0) {
@@ -24,8 +23,8 @@ struct DBResult_tag;
 
 // The one row that describes a log database.
 struct _ARCH_DB_INFO_tag {
-    int64_t start_time = 0; // of the first log, seconds since the epoch
-    int64_t end_time = 0;   // of the last log
+    int64_t start_time = 0; // of the first record, seconds since the epoch
+    int64_t end_time = 0;   // of the last record
     uint64_t log_count = 0;
     std::string device;
 };
@@ -60,7 +59,7 @@ public:
     // Runs one statement and hands its result to `callback` (which may be null), then frees it. A failed
     // statement goes to DBErrorHandle.
     int DBExecute(std::string sql, DBHandlerCallback callback, void *context);
-    // Runs one statement without a result. Unlike the form above it says nothing when the handler is not
+    // Runs one statement without a result. Unlike the form above it reports nothing when the handler is not
     // connected.
     int DBExecute(std::string sql);
 
@@ -74,10 +73,10 @@ public:
     std::string DBCmdEscape(std::string text);
 
     // Copies the write-ahead log into the database file. With `removeFiles`, unlinks "-wal" and "-shm"
-    // afterwards: only for a database that nobody else has open.
+    // afterwards: only for a database that is not open anywhere else.
     int DBWalCheckpoint(bool removeFiles);
 
-    // Whether the database has a table of this name, which goes into the statement as it stands. A failed
+    // Whether the database has a table of this name, which goes into the statement unchanged. A failed
     // query is reported and gives false.
     bool DBcheckTableExist(std::string table);
 
@@ -86,8 +85,8 @@ public:
     // (DBErrorHandle_SQLITE_CORRUPT).
     void DBErrorHandle(std::string sql);
 
-    // Facts computed from table "logs". Count: -1 on failure. Times of the earliest and latest log in seconds
-    // since the epoch: 0 for none and on failure. All are read as 32-bit numbers: what lies beyond saturates.
+    // Computed from table "logs". Count: -1 on failure. Times of the earliest and latest record in seconds
+    // since the epoch: 0 for none and on failure. All are read as 32-bit numbers and saturate.
     int64_t DBLogCountGet();
     int64_t DBLogStartTimeGet();
     int64_t DBLogEndTimeGet();
@@ -95,7 +94,7 @@ public:
     int64_t DBInfoCntGet();
     int64_t DBInfoStartGet();
     int64_t DBInfoEndGet();
-    // The same times as local dates ("2020-01-02"); without logs, after a report, the date of the epoch.
+    // The same times as local dates ("2020-01-02"); without records, after a report, the date of the epoch.
     std::string DBInfoStartStrGet();
     std::string DBInfoEndStrGet();
 
@@ -116,16 +115,16 @@ private:
     int32_t inTransaction_ = 0;
 };
 
-// The reaction to a corrupt database: tells the administrator (notification "KELOSYSLOG_DB_CORRUPT"), renames
-// the file to its path followed by ".corrupt", which replaces an older one, and reloads syslog-ng so that it
-// starts a fresh database. The "-wal" and "-shm" files stay where they are. `connection` is not used and
-// stays open: its owner disconnects, for a further statement on it would put the fresh database aside too.
+// The reaction to a corrupt database: sends the notification "KELOSYSLOG_DB_CORRUPT", renames the file to its
+// path followed by ".corrupt", which replaces an older one, and reloads syslog-ng so that it starts a fresh
+// database. The "-wal" and "-shm" files stay where they are. `connection` is not used and stays open: its
+// owner must disconnect, because a further statement on it would move the fresh database too.
 //
 // Returns 0, or -1: the notification could not be sent (the file keeps its name), the rename failed, or the
 // reload failed.
 KELOSYSLOG_API int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, std::string dbPath);
 
-// Makes syslog-ng reopen its files: the package's own service where the package is enabled, else the
+// Makes syslog-ng reopen its files: the package's own service if the package is enabled, else the
 // system's. Returns 0, or -1 after a report.
 KELOSYSLOG_API int32_t SyslogngHupSignalSend();
 

@@ -1,6 +1,6 @@
 #pragma once
 
-// Searching, counting and deleting the logs of a database.
+// Searching, counting and deleting the records of a database.
 //
 //     std::list<_SYSLOG_SQL_COND_tag> conditions;
 //     LogSearchCondListGen("nas,backup", "err", "", "", "disk*full", "2020/01/01", "2020/01/31", conditions);
@@ -9,7 +9,7 @@
 //     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
 //
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
-// statement and closes the connection before it returns. None throws on a database error; where memory
+// statement and closes the connection before it returns. None throws on a database error; when memory
 // runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing deleted.
 // A database is never created.
 
@@ -25,9 +25,9 @@
 // conditions is ANDed.
 //
 // The value is the operand as the user gave it; the library escapes it. For LIKE and NOT LIKE, '*' and '?'
-// are the wildcards and '%' and '_' stand for themselves; for GLOB, '[' and ']' do. A value of SYSLOG_OP_RAW
-// is an SQL expression and goes into the statement as it is: the caller answers for it. The alternatives of
-// alternatives are ignored.
+// are the wildcards and '%' and '_' are literal; for GLOB, '[' and ']' are literal. A value of SYSLOG_OP_RAW
+// is an SQL expression and goes into the statement unchanged: the caller is responsible for it. The
+// alternatives of alternatives are ignored.
 struct _SYSLOG_SQL_COND_tag {
     _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
     _SYSLOG_SQL_OP_tag op = SYSLOG_OP_EQ;
@@ -47,16 +47,16 @@ struct _SYSLOG_SQL_ORDER_tag {
     _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
 };
 
-// Receives one row. `log` is reused for the next row. Returning non-zero ends the walk.
+// Receives one row. `log` is reused for the next row. Returning non-zero ends the scan.
 using SyslogDBRowCallback = int (*)(_SYSLOG_LOG_DATA_tag &log, void *context);
 
-// Hands the rows of `table` that meet all `conditions` to `callback` (which may be null), one by one.
+// Passes the rows of `table` that meet all `conditions` to `callback` (which may be null), one by one.
 //
 // A null `limit` means all rows, a null `order` no order. Without a filter, a page is taken by row id: the
-// rows whose id lies in (largest - offset - limit, largest - offset]; after deletions such a page may hold
+// rows whose id lies in (largest - offset - limit, largest - offset]; after deletions such a page may have
 // fewer rows. `trimUser` removes the user name from the messages of table "logs".
 //
-// Returns 0, also when the callback stopped the walk, or -1 with a message in the system log: a path that is
+// Returns 0, also when the callback ended the scan, or -1 with a message in the system log: a path that is
 // not absolute, a database that cannot be opened, a statement that failed.
 KELOSYSLOG_API int SyslogDBSelectByTable(const std::string &dbPath, const std::string &table,
                                          const std::list<_SYSLOG_SQL_COND_tag> &conditions,
@@ -106,37 +106,37 @@ KELOSYSLOG_API int SyslogDBVersionGet(const std::string &dbPath);
 // The statistics of an accounting database. All of these answer a failure like an empty table, with 0 or an
 // empty map; only a bad path is reported in the system log.
 
-// One sample of received logs.
+// One sample of received records.
 struct SYSLOG_LOG_EPS {
     int64_t stamp = 0;                      // seconds since the epoch
-    int64_t eps = 0;                        // logs since the sample before
+    int64_t eps = 0;                        // records since the sample before
     std::map<std::string, int32_t> devices; // the same by sending device
 };
 
 // Sum of the counts of all devices.
 KELOSYSLOG_API uint64_t SyslogDBHistTotalGet(const std::string &dbPath);
 
-// Count of one device. `device` goes into the statement as it is, between single quotes: the caller doubles
-// the quotes that it holds.
+// Count of one device. `device` goes into the statement unchanged, between single quotes: the caller doubles
+// the quotes in it.
 KELOSYSLOG_API uint64_t SyslogDBHistGetSingle(const std::string &dbPath, std::string device);
 
-// Counts by device, of the `top` devices with the highest counts or, for 0, of all. Of two rows of one device
-// the first counts.
+// Counts by device, of the `top` devices with the highest counts or, for 0, of all. Of two rows of the same
+// device the first is used.
 KELOSYSLOG_API std::map<std::string, uint64_t> SyslogDBHistGet(const std::string &dbPath, int top);
 
 // The samples with stamps in [from, to], seconds since the epoch, by stamp. A sample's total sums all its
-// rows; of two rows of one device in a sample, `devices` has the first. The bounds are meant to be 0 or more:
-// a negative one lies above every stamp.
+// rows; of two rows of one device in a sample, `devices` has the first. The bounds should be 0 or more: a
+// negative one is above every stamp.
 KELOSYSLOG_API std::map<int, SYSLOG_LOG_EPS> SyslogDBEpsGet(const std::string &dbPath, int from, int to);
 
 // Appends the distinct values of a column of table "logs", named as LogAttriType knows it, to `values` in
-// ascending order; a NULL counts as the empty text. A null `limit` means all values.
+// ascending order; a NULL is read as the empty text. A null `limit` means all values.
 //
 // Returns 0 or -1; a bad path and an unknown name are reported in the system log.
 KELOSYSLOG_API int SyslogDBAttriValueGet(const std::string &dbPath, const std::string &name,
                                          _SYSLOG_SQL_LIMIT_tag *limit, std::list<std::string> &values);
 
-// A kind of name that databases of generation 1 keep in a table of its own, by numeric key.
+// A kind of name that databases of generation 1 store in a separate table, by numeric key.
 enum _SYSLOG_EXTKEY_TB_TYPE_tag : int32_t {
     SYSLOG_EXTKEY_HOST = 0,
     SYSLOG_EXTKEY_PROG = 1,
@@ -144,8 +144,8 @@ enum _SYSLOG_EXTKEY_TB_TYPE_tag : int32_t {
     SYSLOG_EXTKEY_FAC = 3,
 };
 
-// Fills `names` with the names of one kind by their keys; keys that it holds already keep their names. A
-// database of generation 2 has no keys: its distinct names are numbered from 0 as they come.
+// Fills `names` with the names of one kind by their keys; keys that are already in it keep their names. A
+// database of generation 2 has no keys: its distinct names are numbered from 0 in the order of the result.
 //
 // Returns 0 or -1; a bad path is reported in the system log.
 KELOSYSLOG_API int SyslogDBExtkeyMapGet(const std::string &dbPath, _SYSLOG_EXTKEY_TB_TYPE_tag type,

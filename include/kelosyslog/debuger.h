@@ -19,7 +19,7 @@ public:
     // are written whatever the threshold. May be called from any thread.
     static void ThresholdSet(int32_t level);
 
-    // The threshold in force; what costs something to compose need not be composed above it.
+    // The current threshold. A text of a higher level need not be composed.
     static int32_t ThresholdGet();
 
 private:

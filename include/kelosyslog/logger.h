@@ -1,6 +1,6 @@
 #pragma once
 
-// The log server's own event log: who started, stopped, archived and cleared what, and which rules fired.
+// The log server's own event log: starts, stops, archives, cleared logs, and rules that fired.
 //
 //     Logger logger;
 //     logger.LogAddServStart("1.0");
@@ -8,7 +8,7 @@
 //         printf("%s\n", event.event.c_str());
 //
 // A Logger holds no state: every operation opens its database, works and closes it. Operations return 0 or -1
-// unless stated otherwise; every failure is reported in the system log.
+// unless stated otherwise. A failure is reported in the system log unless stated otherwise.
 
 #include <cstdint>
 #include <list>
@@ -46,15 +46,16 @@ public:
     // Records that `user` cleared the log database at `dbPath`.
     int LogAddLogClear(std::string dbPath, std::string user);
 
-    // Deletes the log database file at `dbPath`, existing or not, and records that. Always 0.
+    // Deletes the log database file at `dbPath` and records that, also when there is no such file or it
+    // cannot be deleted, which is not reported. Always 0.
     int LogClear(std::string dbPath, std::string user);
 
-    // Number of events in the database at the absolute path `dbPath`; -1 on failure, -2 when the count does
-    // not come as exactly one row.
+    // Number of events in the database at the absolute path `dbPath`; -1 on failure, -2 when the statement
+    // did not yield exactly one row (not reported).
     int LogCount(std::string dbPath);
 
-    // Tidies a database of 20,000 events or more: removes events whose time is 0 or less, and compacts the
-    // file. Smaller ones are left alone.
+    // Rotates a database of 20,000 events or more: removes events whose time is 0 or less, and compacts the
+    // file. Smaller ones do not change.
     int LogRotation(std::string dbPath);
 
     // The events of the database at `dbPath`, newest first: `limit` of them after `offset`, or all when
@@ -62,14 +63,15 @@ public:
     std::list<_SSYSLOG_LOG_LOG_tag> LogEnum(std::string dbPath, int offset, int limit);
 
     // Writes all events of the database at `dbPath`, newest first and in local time, as an HTML page to
-    // `outPath`, created or truncated. Users and events are written as they are, without escaping. `second`
+    // `outPath`, created or truncated. Users and events are written unchanged, without escaping. `second`
     // only has to be non-empty.
     //
     // Returns -1 for an empty argument, else 0: also when there are no events (no file is written) and when
-    // `outPath` cannot be opened.
+    // `outPath` cannot be opened or not be written in full. None of these is reported.
     int LogHtmlGen(std::string dbPath, std::string second, std::string outPath);
 
-    // Deletes the file at `path`. Returns -1 for an empty path or when it could not be deleted.
+    // Deletes the file at `path`. Returns -1, without a report, for an empty path or when it could not be
+    // deleted.
     int LogHtmlRemove(std::string path);
 };
 

@@ -1,15 +1,15 @@
 #pragma once
 
-// Log text turned into records.
+// Conversion of log text to records.
 //
-// One entry is one line: eleven fields, each a run of bytes other than the blank (0x20), separated by one or
-// more blanks, and the message, which follows after exactly one blank, as it stands:
+// One entry is one line: eleven fields, each a sequence of bytes other than the blank (0x20), separated by
+// one or more blanks, and the message, which follows unchanged after exactly one blank:
 //
 //     local0 info 2020/01/02 10:11:12 1577931072 200 +08:00 nas 127.0.0.1 prog tag the message
 //     fac    prio ldate      ltime    utcsec  extnum tzoffset host ip     prog tag msg
 //
-// Only the blank separates: tabs, carriage returns, NUL bytes and invalid UTF-8 are text like any other. An
-// unknown severity word counts as "debug"; the two numbers are read as strtoll() reads them.
+// Only the blank is a separator: tabs, carriage returns, NUL bytes and invalid UTF-8 are ordinary text. An
+// unknown severity word is read as "debug"; the two numbers are read as strtoll() reads them.
 //
 //     LogParser parser;
 //     parser.LogAdd(text);
@@ -38,9 +38,9 @@ public:
     LogParser &operator=(const LogParser &) = default;
 
     // Parses every line of `text` and appends the records to the list, complete or not. A line with fewer
-    // than eleven fields is reported in the system log and skipped; empty lines vanish. The last line needs
-    // no line feed. A fragment that was set (PartialLogSet) is first put in front of `text`, in the caller's
-    // string. Always returns 0.
+    // than eleven fields is reported in the system log and skipped; empty lines are ignored. The last line
+    // needs no line feed. A fragment that was set (PartialLogSet) is first prefixed to `text`, in the
+    // caller's string. Always returns 0.
     uint32_t LogAdd(std::string &text);
 
     // Parses one line, without its line feed, into `record`. Fields other than the twelve are not touched.
@@ -53,7 +53,7 @@ public:
 
     // Returns 1 when host, ip, ldate, ltime, prog and msg are all non-empty. Otherwise reports it in the
     // system log, keeps a copy of the record for PartialLogDump and returns 0. The copies stay until the
-    // parser goes.
+    // parser is destroyed.
     int32_t isValidLog(_SYSLOG_LOG_DATA_tag &record);
 
     // Number of records in the list, and a copy of the list in the order of the input.
@@ -68,7 +68,7 @@ public:
     void LogDump();
     void PartialLogDump();
 
-    // Sets the text that every following LogAdd puts in front of its input; "" (as at the start) for none.
+    // Sets the text that every following LogAdd prefixes to its input; "" (as at the start) for none.
     void PartialLogSet(std::string fragment);
 
     // LogListGet and LogReset in one, without the copy.
@@ -80,7 +80,7 @@ private:
     std::list<_SYSLOG_LOG_DATA_tag> logList_;
 };
 
-// Feeds a parser from a stream that arrives in pieces cut anywhere: an unterminated last line waits for its
+// Feeds a parser from a stream in pieces of any size: an unterminated last line waits for its
 // rest. The records are the same as if the whole stream had been added in one LogAdd.
 //
 //     LogStream stream(parser);
@@ -98,10 +98,10 @@ public:
     // `parser` must outlive the stream. `maxLineBytes` does not include the line feed.
     explicit LogStream(LogParser &parser, size_t maxLineBytes = kMaxLineBytes);
 
-    // Parses what `piece` completes and keeps the rest. After std::bad_alloc the stream is to be given up.
+    // Parses the lines that `piece` completes and keeps the rest. Do not use the stream after std::bad_alloc.
     void Add(std::string_view piece);
 
-    // Ends the stream: parses the waiting line, if there is one. The stream may then start anew.
+    // Ends the stream: parses the waiting line, if there is one. The stream may then be used again.
     void Finish();
 
     // Lines dropped because of their length.

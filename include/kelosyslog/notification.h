@@ -8,9 +8,9 @@
 //     if (const std::string keyword = manager.CheckKeyword(log.msg); !keyword.empty())
 //         manager.NotificationSendKeyword(log.host, keyword, log);
 //
-// A notification goes to the appliance's notification service (keloplatform/kelonotify.h), which tells the
-// administrator. An `int` result is 0 for success and -1 for failure; failures are written to the system log
-// unless stated otherwise. Fixed paths stand under the root of kelosyslog/root.h.
+// Notifications go to the appliance's notification service (keloplatform/kelonotify.h), which delivers them
+// to the administrator. An `int` result is 0 for success and -1 for failure; failures are written to the
+// system log unless stated otherwise. Fixed paths are under the root of kelosyslog/root.h.
 
 #include <cstdint>
 #include <list>
@@ -27,15 +27,15 @@ struct _SYSLOG_NOTIFY_RULES_tag {
     int32_t type = 0; // 0: severity, 1: events per second, 2: keyword; any other is in no list
     _SYSLOG_DB_PRIORITY_tag pri = SYSLOG_PRIO_EMERG; // fires for this severity and all more severe ones
     uint64_t eps = 0;                                // fires for this many events per second and more
-    std::string pattern;                             // fires for a text that holds it; empty: never
+    std::string pattern;                             // fires for a text that contains it; empty: never
     bool enable = false;
 };
 
-// The rules of the rule file as they were when the object was made. Used by one thread at a time.
+// The rules of the rule file at the time when the object was created. Used by one thread at a time.
 class KELOSYSLOG_API NotificationManager {
 public:
-    // Loads the rules of /etc/kelosyslog/notify.conf. Where that fails the manager is usable with what was
-    // loaded: with no rule, every check answers no.
+    // Loads the rules of /etc/kelosyslog/notify.conf. If that fails, the manager can be used with the rules
+    // that were loaded: without rules every check fails.
     NotificationManager();
     ~NotificationManager();
 
@@ -48,26 +48,26 @@ public:
     // Whether an enabled rule for events per second has a threshold of at most `eps`.
     bool CheckEps(uint64_t eps) const;
 
-    // Whether an enabled severity rule has a level that is as severe as `pri` or less.
+    // Whether an enabled severity rule has a severity that is as severe as `pri` or less severe.
     bool CheckSev(_SYSLOG_DB_PRIORITY_tag pri) const;
 
     // The pattern of the first enabled keyword rule that occurs in `content`, byte by byte; "" for none.
     std::string CheckKeyword(const std::string &content) const;
 
     // Sends the notification `tag` with the placeholders in `*hash`, to which it adds the class of the log
-    // server's notifications. The hash stays the caller's and may be allocated anew.
+    // server's notifications. The hash stays the caller's and may be reallocated.
     int NotificationSend(const char *tag, TORVSZHASH **hash);
 
-    // Events per second exceeded. The message names the threshold of the first rule in the file, whichever
-    // fired (0 when there is none).
+    // Events per second exceeded. The message names the threshold of the first rule in the file, even if
+    // another one fired (0 when there is none).
     int NotificationSendEps(uint64_t eps);
 
     // The volume of a shared folder is full.
     int NotificationSendVolFull(const std::string &share);
 
-    // A log as severe as a rule asks for, or with a rule's keyword, came from `host`. A content that says
-    // "Failed to send email." is not sent, with result 0: a failing notification raises no other. A content
-    // that takes 2048 bytes or more, with quotes and backslashes escaped, is refused.
+    // A record of the severity of a rule or worse, or with the keyword of a rule, came from `host`. A content
+    // that contains "Failed to send email." is not sent, with result 0: a failed notification causes no
+    // other. A content of 2048 bytes or more, with quotes and backslashes escaped, is refused.
     int NotificationSendSev(const std::string &host, const std::string &sev, const std::string &content);
     int NotificationSendKeyword(const std::string &host, const std::string &keyword,
                                 const std::string &content);
@@ -89,12 +89,12 @@ private:
 KELOSYSLOG_API int SyslogNotifyConfGet(const std::string &path, const std::string &section,
                                        _SYSLOG_NOTIFY_RULES_tag &rule);
 
-// Writes `rule` as the section of its name into the file at `path`, in place of what the section held;
+// Writes `rule` as the section of its name into the file at `path`, replacing the section's content;
 // `section` is not used. Of the threshold the low 32 bits are stored, as a signed number: from 2147483648 on
-// it is not read back as it was.
+// another value is read back.
 //
 // Returns 0 when the rule is on the disk, or -1 with the file unchanged: it cannot be written, or it cannot
-// hold the name or the pattern (a line feed, for one).
+// contain the name or the pattern (for example with a line feed).
 KELOSYSLOG_API int SyslogNotifyConfSet(const std::string &path, const std::string &section,
                                        _SYSLOG_NOTIFY_RULES_tag &rule);
 

@@ -1,6 +1,6 @@
 #pragma once
 
-// The log entry, the vocabulary that names its parts, and the conversion of a database row into it.
+// The record, the vocabulary that names its parts, and the conversion of a database row to it.
 //
 //     _SYSLOG_LOG_DATA_tag log;
 //     if (DBRecToLogInfo("logs", result, row, &log, false) == 0)
@@ -66,7 +66,7 @@ enum _SYSLOG_SQL_OP_tag : int32_t {
     SYSLOG_OP_RAW = 10, // the value is itself an SQL expression
 };
 
-// One log entry. Texts are UTF-8 as received; nothing is escaped.
+// One record. Texts are UTF-8 as received; nothing is escaped.
 struct _SYSLOG_LOG_DATA_tag {
     uint64_t id = 0;
     int64_t utcsec = 0; // seconds since the epoch
@@ -118,7 +118,7 @@ KELOSYSLOG_API _SYSLOG_DB_PRIORITY_tag PriorStrToType(const char *word);
 // Severity word of a severity, 0 to 7 (not checked).
 KELOSYSLOG_API std::string PriorTypeToStr(_SYSLOG_DB_PRIORITY_tag prio);
 
-// What follows the first colon of `text` (a blank after it included), or all of it when it holds none.
+// The text after the first colon of `text` (including a blank after it), or all of it without a colon.
 KELOSYSLOG_API std::string TrimUserName(const std::string &text);
 
 // Path of the database of the transfer log with this type name ("smbxfer"), "" when there is none. The text
@@ -128,14 +128,14 @@ KELOSYSLOG_API const char *XferlogDBPathGet(const char *name);
 // Fills `log` from one row of a table: "logs", "general_log", "connection_log" or "transfer_log".
 //
 // `row` is a handle that KELODBFetchRow gave for `result`. Fields that the table does not have keep their
-// values; a missing column and a NULL count as the empty text, and a number is read from the leading digits
-// of its text. With `trimUser` the message of a row of "logs" loses its user name (TrimUserName).
+// values; a missing column and a NULL are read as the empty text, and a number is read from the leading
+// digits of its text. With `trimUser` the message of a row of "logs" loses its user name (TrimUserName).
 //
 // Returns 0, or -1 with `log` untouched: another table, or a null pointer.
 KELOSYSLOG_API int DBRecToLogInfo(const std::string &table, DBResult_tag *result, uint32_t row,
                                   _SYSLOG_LOG_DATA_tag *log, bool trimUser);
 
-// The row shapes behind DBRecToLogInfo: table "logs"; "general_log" and "connection_log" (whose message goes
+// The conversions behind DBRecToLogInfo: table "logs"; "general_log" and "connection_log" (whose message goes
 // into `event`); "transfer_log". Each returns 0, or -1 when `result` or `log` is null.
 KELOSYSLOG_API int DBRecToAllLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log,
                                      bool trimUser);

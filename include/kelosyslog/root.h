@@ -1,12 +1,12 @@
 #pragma once
 
-// The root that the library's fixed paths stand under.
+// The root that the library's fixed paths are under.
 
 #include <string>
 
 #include "kelosyslog/export.h"
 
-// Puts `root` in front of every fixed path of the library (databases, schemas, rule file, settings, texts).
+// Prefixes `root` to every fixed path of the library (databases, schemas, rule file, settings, texts).
 // The default is empty: the paths are exactly the fixed ones. Paths that a caller passes to a function are
 // never rewritten.
 //

@@ -42,7 +42,7 @@ int AccountingManager::LogInc(std::string device) {
     kelo::Device &entry = devices_->Find(device);
     if (entry.inOpenSample == 0)
         openSample_.push_back(&entry);
-    // Nothing throws from here on: a log is in all figures or, without memory, in none.
+    // Nothing throws from here on: a record is in all figures or, without memory, in none.
     ++entry.inOpenSample;
     ++entry.total;
     ++currentCount_;

@@ -8,8 +8,8 @@
 
 namespace kelo {
 
-// What is counted of one sending device. In a cache line of its own: with many devices, reaching it is what
-// counting a log costs.
+// The counts of one sending device. In a separate cache line: with many devices, loading that line is the
+// main cost of counting a record.
 struct alignas(64) Device {
     std::string name;
     uint64_t total = 0;       // in the histogram
@@ -19,8 +19,8 @@ struct alignas(64) Device {
 // The devices in the order in which they were first asked for. They keep their place in memory.
 class DeviceTable {
 public:
-    // The device of this name, compared byte by byte; a new one when there is none yet. Throws
-    // std::bad_alloc, with the table as it was.
+    // The device of this name, compared byte by byte; a new one when there is none yet. Throws std::bad_alloc
+    // and then leaves the table unchanged.
     Device &Find(const std::string &name);
 
     size_t Size() const { return size_; }
@@ -29,7 +29,7 @@ public:
 private:
     static constexpr size_t kChunk = 256;
 
-    // Where a device with this hash stands: from the slot of the hash on, before the first that is free.
+    // The position of a device with this hash: from the slot of the hash on, before the first free one.
     struct Slot {
         uint32_t hash = 0;
         uint32_t number = 0; // of the device, from 1 on; 0 for a free slot

@@ -33,7 +33,7 @@ void ReportFailedStatement(const std::string &sql) {
     Debuger::MSG(0, "Fail to execute SQL command: " + sql);
 }
 
-// The database of one flush. Whatever happened, the transaction is ended and the connection closed.
+// The database of one flush. In every case the transaction is ended and the connection closed.
 class FlushDatabase {
 public:
     explicit FlushDatabase(const std::string &path)
@@ -79,7 +79,7 @@ public:
         return false;
     }
 
-    // Deletes old samples from a file that has grown large. Only a file whose size cannot be told is a
+    // Deletes old samples from a file that has grown large. Only a file whose size is unknown is a
     // failure.
     bool Trim() {
         struct stat status {};

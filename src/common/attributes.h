@@ -4,8 +4,8 @@
 
 namespace kelo {
 
-// Whether the column of an attribute, 0 to 18 (not checked), holds integers, so that its literals stand
-// without quotes.
+// Whether the column of an attribute, 0 to 18 (not checked), holds integers, so that its literals need
+// no quotes.
 bool IsIntegerAttribute(_SYSLOG_DB_ATTRI_tag attr);
 
 } // namespace kelo

@@ -4,7 +4,7 @@
 
 namespace kelo {
 
-// Where a fixed path of the library stands under the root in force: the root followed by `path`, which begins
+// The place of a fixed path of the library under the current root: the root followed by `path`, which begins
 // with '/'.
 std::string RootedPath(const std::string &path);
 

@@ -8,9 +8,9 @@ using kelo::FieldText;
 
 namespace {
 
-// Whether `text` is nothing but digits whose number fits without a look at the limits. Most numbers of a log
-// are; the C library's conversions, which also take blanks and signs and saturate, cost several times as
-// much.
+// Whether `text` consists only of digits and its number fits without a check of the limits. Most numbers of a
+// record do; the C library's conversions, which also accept blanks and signs and saturate, take several times
+// as long.
 bool IsPlainNumber(const char *text, uint64_t &number) {
     constexpr int kSafeDigits = 18;
     number = 0;

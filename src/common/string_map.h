@@ -7,7 +7,7 @@
 
 namespace kelo {
 
-// Room that the library's maps and lists are allocated with.
+// Initial capacity of the library's maps and lists.
 inline constexpr size_t kSzCapacity = 1024;
 
 struct SzListFreer {
@@ -16,8 +16,8 @@ struct SzListFreer {
 // A list of strings that frees itself.
 using SzList = std::unique_ptr<TORVSZLIST, SzListFreer>;
 
-// A map of strings that frees itself. The platform may allocate it anew whenever a value is set, so it is
-// handed on by the address of its pointer.
+// A map of strings that frees itself. The platform may reallocate it whenever a value is set, so it is passed
+// by the address of its pointer.
 class SzHash {
 public:
     // Allocates; false in a condition when that failed.

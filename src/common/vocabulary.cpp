@@ -54,7 +54,7 @@ _SYSLOG_DB_ATTRI_tag LogAttriType(std::string name) {
 _SYSLOG_DB_PRIORITY_tag PriorStrToType(const char *word) {
     if (word != nullptr) {
         for (int32_t prio = SYSLOG_PRIO_EMERG; prio <= SYSLOG_PRIO_DEBUG; ++prio) {
-            // Every row of a search comes through here; most words differ in their first letter.
+            // Called for every row of a search; most words differ in their first letter.
             const char *name = g_MappingSyslogPrior[prio];
             if (word[0] == name[0] && std::strcmp(word, name) == 0)
                 return static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);

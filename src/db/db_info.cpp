@@ -22,12 +22,12 @@ struct NumberQuery {
     }
 };
 
-// The time of the first log in the given order of time; 0 for none and on failure.
+// The time of the first record in the given order of time; 0 for none and on failure.
 int64_t TimeOfFirstLog(DBHandler &db, const char *direction) {
     const std::string sql = std::string("SELECT * FROM logs ORDER BY utcsec ") + direction + " LIMIT 1";
     NumberQuery query{"utcsec", 0};
     if (db.DBExecute(sql, NumberQuery::Read, &query) != 0) {
-        // A new database without logs is normal.
+        // A new database without records is normal.
         if (db.DBcheckTableExist("logs"))
             Debuger::MSG(0, "Fail to execute SQL command: " + sql);
         return 0;

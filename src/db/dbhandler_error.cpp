@@ -13,8 +13,8 @@ void DBHandler::DBErrorHandle(std::string sql) {
     int priority = LOG_ERR;
     switch (code) {
     case SQLITE_ERROR:
-        // A database that has its logs survives a wrong statement. The question itself is not asked about its
-        // own failure.
+        // A wrong statement does not harm a database that has its table. The check is not repeated when the
+        // check itself fails.
         if (sql != kelo::CatalogueQuery("logs") && DBcheckTableExist("logs"))
             priority = LOG_INFO;
         break;

@@ -22,7 +22,7 @@ std::string LocalTime(int64_t utcsec) {
     return text;
 }
 
-// Users and events go out as they are, for the programs that read this page expect it so.
+// Users and events are written unchanged, because the programs that read this page expect that.
 void WriteEvent(FILE *page, const _SSYSLOG_LOG_LOG_tag &event) {
     char level[1024] = {};
     szLevelGet(event.level, level, sizeof level);

@@ -1,7 +1,7 @@
 #include "kelosyslog/cmdparser.h"
 
-// Json::Reader is deprecated in favour of CharReader, which by default takes comments and repeated keys
-// differently and words its errors differently. What commands may look like is defined by this reader.
+// Json::Reader is deprecated in favour of CharReader, which by default treats comments and repeated keys
+// differently and has other error texts. This reader defines the format of commands.
 #pragma GCC diagnostic ignored "-Wdeprecated-declarations"
 
 #include <json/reader.h>
@@ -41,6 +41,6 @@ bool CmdParser::CmdParse(std::string &text, std::vector<Json::Value> &commands) 
     }
     return true;
 } catch (const std::exception &error) {
-    ReportFailure(error.what()); // too deep a nesting, or no memory
+    ReportFailure(error.what()); // nested too deep, or no memory
     return false;
 }

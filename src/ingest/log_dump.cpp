@@ -2,7 +2,7 @@
 #include "kelosyslog/logparser.h"
 #include "kelosyslog/utils.h"
 
-// Nothing is composed while the debug channel drops it.
+// No text is composed while the debug channel drops it.
 
 void LogParser::LogDump() {
     if (Debuger::ThresholdGet() < 2)

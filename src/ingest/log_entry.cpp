@@ -11,12 +11,12 @@ bool IsDigit(char byte) {
     return byte >= '0' && byte <= '9';
 }
 
-// White space as strtoll() skips it. A field may begin with it, for only the blank separates fields.
+// White space as strtoll() skips it. A field may begin with it, because only the blank separates fields.
 bool IsWhiteSpace(char byte) {
     return byte == ' ' || (byte >= '\t' && byte <= '\r');
 }
 
-// strtoll() with base 10 on bytes without a terminator: the number saturates, and what is none gives 0.
+// strtoll() with base 10 on bytes without a terminator: the number saturates, and other text gives 0.
 int64_t ToNumber(std::string_view text) {
     const char *begin = text.data();
     const char *const end = begin + text.size();
@@ -36,7 +36,7 @@ int64_t ToNumber(std::string_view text) {
 }
 
 _SYSLOG_DB_PRIORITY_tag ToPriority(std::string_view text) {
-    char word[16] = {}; // longer than any severity word: what does not fit equals none either way
+    char word[16] = {}; // longer than any severity word: a longer text equals none of them
     std::memcpy(word, text.data(), std::min(text.size(), sizeof word - 1));
     return PriorStrToType(word);
 }

@@ -6,8 +6,8 @@
 
 namespace kelo {
 
-// Parses one line into `record`, field by field. Returns false when it has fewer than eleven fields; those
-// it has are in `record` then.
+// Parses one line into `record`, field by field. Returns false when it has fewer than eleven fields; these
+// are then in `record`.
 bool ParseLogEntry(std::string_view line, _SYSLOG_LOG_DATA_tag &record);
 
 } // namespace kelo

@@ -16,7 +16,8 @@ uint32_t LogParser::LogAdd(std::string &text) {
         text.insert(0, partialLog_);
     }
     kelo::ForEachLine(text, [this](std::string_view line) {
-        // Filled in its own list, so that the record is never moved, and gone if memory ends half-way.
+        // Filled in a list of its own, so that the record is never moved, and is discarded if memory runs
+        // out.
         std::list<_SYSLOG_LOG_DATA_tag> entry(1);
         if (kelo::ParseLogEntry(line, entry.front()))
             logList_.splice(logList_.end(), entry);

@@ -7,7 +7,7 @@ LogStream::LogStream(LogParser &parser, size_t maxLineBytes)
     : parser_(parser), maxLineBytes_(std::max<size_t>(maxLineBytes, 1)) {}
 
 void LogStream::Add(std::string_view piece) {
-    // So cut, a line that lies within one part is short enough.
+    // In parts of this size a line within one part is short enough.
     for (; !piece.empty(); piece.remove_prefix(std::min(piece.size(), maxLineBytes_)))
         TakePart(piece.substr(0, maxLineBytes_));
 }
@@ -30,7 +30,7 @@ uint64_t LogStream::OverlongCount() const {
     return overlongCount_;
 }
 
-// Parses the waiting line, which ends here, and the complete `lines` behind it.
+// Parses the waiting line, which ends here, and the complete `lines` after it.
 void LogStream::ParseLines(std::string_view lines) {
     std::string text(lines);
     if (!waiting_.empty() || !text.empty()) {

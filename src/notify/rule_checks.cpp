@@ -22,7 +22,7 @@ int NotificationManager::ConfigLoad(const std::string &path) {
         Debuger::MSG(0, "Fail to allocate memory");
         return -1;
     }
-    // The platform may allocate the list anew.
+    // The platform may reallocate the list.
     TORVSZLIST *list = sections.release();
     const int status = TORVCFileEnumSection(path.c_str(), &list);
     sections.reset(list);

@@ -22,8 +22,7 @@ bool HasColumn(_SYSLOG_DB_ATTRI_tag attr) {
     return attr >= SYSLOG_ATTRI_ID && attr < SYSLOG_ATTRI_NONE;
 }
 
-// A lone '!' is no token of SQL, so that a condition which cannot be expressed is an error wherever it
-// stands.
+// A lone '!' is not an SQL token, so a condition that cannot be expressed is an error in any position.
 const char *OperatorText(_SYSLOG_SQL_OP_tag op) {
     const bool hasText = op >= SYSLOG_OP_EQ && op < SYSLOG_OP_RAW;
     return hasText ? g_MappingSyslogOP[op] : "! operator";
@@ -36,7 +35,7 @@ std::string Escaped(size_t length, EscapeFunction escape) {
     std::string buffer(2 * length + 1, '\0');
     if (escape(buffer.data(), buffer.size()) < 0)
         return "";
-    // What counts is the C string, whatever length the function reports.
+    // The C string is used, not the length that the function reports.
     buffer.resize(strnlen(buffer.data(), buffer.size()));
     return buffer;
 }

@@ -8,7 +8,7 @@
 namespace kelo {
 
 // Appends the body of a WHERE clause for `conditions`, ANDed, to `out`; nothing for an empty list. Returns 0,
-// or -1 when a condition could not be rendered, with what came before it left in `out`.
+// or -1 when a condition could not be rendered; the conditions before it are then in `out`.
 int SyslogSQLCondListStrGen(const std::list<_SYSLOG_SQL_COND_tag> &conditions, std::string &out);
 
 // Replaces `out` by one condition in parentheses, its alternatives ORed. Returns 0.
@@ -21,8 +21,8 @@ int SyslogSQLCondStrGen(const _SYSLOG_SQL_COND_tag &condition, std::string &out)
 // operator. "" for null, and when an escape function fails or memory runs out.
 std::string SyslogSQLCondValueEscape(const _SYSLOG_SQL_COND_tag *condition);
 
-// Whether a clause body lets every row pass, so that a statement with it can take a shortcut. Only the empty
-// body and the one exact text that stands for a match-all keyword count.
+// Whether a clause body matches every row, so that a statement with it can take a shortcut. Only the empty
+// body and the one exact text of a match-all keyword do.
 bool IsMatchAll(const std::string &body);
 
 // The column of an attribute; for an attribute out of range a text that fails in any SQL.

@@ -14,7 +14,7 @@ int SyslogDBSelectCountByTable(const std::string &dbPath, const std::string &tab
     std::string body;
     if (SyslogSQLCondListStrGen(conditions, body) != 0)
         return -1;
-    // The largest row id costs nothing, however large the table is.
+    // The largest row id is found immediately in a table of any size.
     const char *expression = IsMatchAll(body) ? "max(rowid)" : "COUNT(*)";
     const std::string sql = std::string("SELECT ") + expression + " FROM " + table +
                             (body.empty() ? "" : " WHERE " + body) + OrderClause(order);

@@ -9,8 +9,8 @@ using namespace kelo;
 
 namespace {
 
-// Where the names of one kind stand: in databases of generation 1 in a table of keys and names, in those of
-// generation 2 in a column of the logs.
+// The place of the names of one kind: in databases of generation 1 a table of keys and names, in those of
+// generation 2 a column of table "logs".
 struct NameSource {
     const char *keyTable;
     const char *keyColumn;

@@ -4,7 +4,7 @@
 
 namespace {
 
-// Builds an equality with any of the comma-separated values. Returns false, with `condition` untouched, where
+// Builds an equality with any of the comma-separated values. Returns false, with `condition` untouched, if
 // the value means no restriction.
 bool SyslogSQLCondMultiValueGen(_SYSLOG_SQL_COND_tag &condition, _SYSLOG_DB_ATTRI_tag attr,
                                 const std::string &value) {

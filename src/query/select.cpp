@@ -23,8 +23,8 @@ std::string SelectText(const std::string &table, const std::string &body,
     return sql + OrderClause(order);
 }
 
-// Hands the rows to the callback. Returns 0, also when the callback or a row that has no conversion ended the
-// walk, or -1 when a row could not be fetched.
+// Passes the rows to the callback. Returns 0, also when the callback or a row without a conversion ended the
+// scan, or -1 when a row could not be fetched.
 int WalkRows(DBResult_tag *result, const std::string &table, SyslogDBRowCallback callback, void *context,
              bool trimUser) {
     const int rowCount = KELODBNumRows(result);

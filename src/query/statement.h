@@ -16,7 +16,7 @@ bool CheckDbPath(const std::string &path, int line);
 // " ORDER BY column asc" or "... desc"; "" for null.
 std::string OrderClause(const _SYSLOG_SQL_ORDER_tag *order);
 
-// Runs `sql` and stores its rows in `result`: as it stands, or with a `page` through the platform's limited
+// Runs `sql` and stores its rows in `result`: unchanged, or with a `page` through the platform's limited
 // select, which takes the low 32 bits of the page's numbers. Returns false when the statement failed, and for
 // a text with a NUL byte, which would silently cut the statement and with it a part of its filter.
 bool RunQuery(DBConnect_tag *connection, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
@@ -25,8 +25,8 @@ bool RunQuery(DBConnect_tag *connection, const std::string &sql, const _SYSLOG_S
 // The same for a statement without rows.
 bool RunCommand(DBConnect_tag *connection, const std::string &sql);
 
-// The rows of one statement with the connection that they came from, for callers that make no difference
-// between a failed connection and a failed statement.
+// The rows of one statement with their connection, for callers that do not distinguish between a failed
+// connection and a failed statement.
 struct Answer {
     DbConnection connection;
     DbResult result;
@@ -34,8 +34,8 @@ struct Answer {
 };
 Answer Ask(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page = nullptr);
 
-// Asks and calls `take(result, row)` for every row, in order. Returns false when the connection, the
-// statement or the fetch of a row failed; rows before it have been taken.
+// Runs the query and calls `take(result, row)` for every row, in order. Returns false when the connection,
+// the statement or the fetch of a row failed; rows before it have been taken.
 template <typename Take>
 bool AskRows(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
              Take take) {

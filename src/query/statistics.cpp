@@ -26,7 +26,7 @@ int32_t Int32Field(DBResult_tag *result, uint32_t row, const char *column) {
     using Limits = std::numeric_limits<int32_t>;
     const char *text = FieldText(result, row, column);
     const char *end = text + std::strlen(text);
-    int32_t plain = 0; // nearly all are plain numbers, which are read in a fraction of the time
+    int32_t plain = 0; // nearly all are plain digits, which are read in a fraction of the time
     if (const auto [stop, error] = std::from_chars(text, end, plain); error == std::errc() && stop == end)
         return plain;
     const long long number = std::strtoll(text, nullptr, 10);
@@ -44,8 +44,8 @@ uint64_t AskNumber(const std::string &dbPath, const std::string &sql, const char
 
 using Samples = std::map<int, SYSLOG_LOG_EPS>;
 
-// The sample of a stamp. The accounting manager writes stamps in ascending order, so the last one is where to
-// look first.
+// The sample of a stamp. The accounting manager writes stamps in ascending order, so the last one is checked
+// first.
 SYSLOG_LOG_EPS &SampleOf(Samples &samples, int32_t stamp) {
     if (!samples.empty() && samples.rbegin()->first == stamp)
         return samples.rbegin()->second;

@@ -7,8 +7,8 @@
 
 namespace kelo::platform {
 
-// Runs `body` for a function of the C interface, which lets no exception out: it becomes the result `failed`
-// with errno ENOMEM where memory ran out, EIO for anything else.
+// Runs `body` for a function of the C interface, which throws no exception: an exception becomes the result
+// `failed` with errno ENOMEM if memory ran out, EIO for anything else.
 template <typename Result, typename Body>
 Result CatchBadAlloc(Result failed, Body body) noexcept {
     try {

@@ -4,7 +4,7 @@
 
 namespace kelo::platform {
 
-// Where a fixed path of the platform stands under the root in force: the root followed by `path`, which
+// The place of a fixed path of the platform under the current root: the root followed by `path`, which
 // begins with '/'.
 std::string RootedPath(const std::string &path);
 

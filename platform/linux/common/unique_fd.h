@@ -6,7 +6,7 @@
 
 namespace kelo::platform {
 
-// A file descriptor that closes when it goes out of scope. Closing leaves errno alone.
+// A file descriptor that closes when it goes out of scope. Closing keeps errno.
 class UniqueFd {
 public:
     explicit UniqueFd(int fd = -1) : fd_(fd) {}

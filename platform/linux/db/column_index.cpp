@@ -25,7 +25,7 @@ void ColumnIndex::Add(std::string_view name) {
         return;
     }
     uint32_t &slot = slots_[SlotOf(Name(column))];
-    if (slot == kNone) // of columns with one name the first counts
+    if (slot == kNone) // of columns with the same name the first is used
         slot = column;
 }
 

@@ -9,8 +9,8 @@ namespace kelo::platform {
 
 // Positions of a result's columns by their exact names.
 //
-// Whoever reads a result asks for the same columns in the same order row after row, so the index remembers
-// which column followed which, and looks there before it searches.
+// Readers ask for the same columns in the same order in every row, so the index remembers which column
+// followed which, and looks there before it searches.
 class ColumnIndex {
 public:
     static constexpr uint32_t kNone = UINT32_MAX;
@@ -40,7 +40,7 @@ private:
     }
     const char *Name(uint32_t column) const { return names_.data() + nameAt_[column]; }
     uint32_t Search(const char *name);
-    // The slot that holds `name`, or the empty one where it belongs.
+    // The slot of `name`, or the empty one for it.
     size_t SlotOf(const char *name) const;
     void Grow();
 

@@ -17,7 +17,7 @@ struct Limit {
     int id;
     int value;
 };
-// Far above what a log needs and far below what a damaged file can ask for.
+// Far above what a record needs and far below what a damaged file can request.
 constexpr Limit kLimits[] = {
     {SQLITE_LIMIT_ATTACHED, 1},          // VACUUM attaches its copy
     {SQLITE_LIMIT_LENGTH, 64 << 20},     // bytes of a value or a row
@@ -31,7 +31,7 @@ int Authorize(void *, int action, const char *file, const char *, const char *, 
     return attachesFile ? SQLITE_DENY : SQLITE_OK;
 }
 
-// What a file holds must not make SQLite do more than read it, and SQL must stay inside the file.
+// The content of a file must not make SQLite do more than read it, and SQL must not reach outside the file.
 bool Harden(sqlite3 *db) {
     for (const Limit &limit : kLimits)
         sqlite3_limit(db, limit.id, limit.value);
@@ -43,8 +43,8 @@ bool Harden(sqlite3 *db) {
            sqlite3_exec(db, "PRAGMA cell_size_check=ON", nullptr, nullptr, nullptr) == SQLITE_OK;
 }
 
-// Asks for a lock every millisecond: with growing pauses, as SQLite makes them by itself, it would hardly
-// ever meet the short moment between two transactions of a busy writer.
+// Asks for a lock every millisecond: with the growing pauses of SQLite's own handler it would hardly ever hit
+// the short moment between two transactions of a busy writer.
 int WaitForLock(void *, int calls) {
     if (calls >= kBusyTimeoutMs)
         return 0;

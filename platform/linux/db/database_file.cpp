@@ -63,7 +63,7 @@ Database DatabaseFile::Open() {
     struct stat info;
     if (stat(path_.c_str(), &info) != 0 || !S_ISREG(info.st_mode))
         return nullptr;
-    // SQLite itself falls back to reading where it may not write.
+    // SQLite itself falls back to reading if it may not write.
     Database db = OpenNamed(path_.c_str(), SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX);
     if (db != nullptr && IsAtRestInReadOnlyFolder() && CannotRead(db.get()))
         return OpenWithoutLocks();

@@ -21,22 +21,22 @@ public:
     explicit DatabaseFile(const char *path);
 
     // Opens the existing file: for writing, else for reading. Null when that is impossible, or when the path
-    // is no regular file (a FIFO would wait for its other end for ever).
+    // is not a regular file (opening a FIFO would wait for its other end forever).
     //
     // A database in WAL mode needs its "-shm" file, which a reader without write permission in the folder
-    // cannot create. Where no "-wal" file holds rows either, nobody has the database open and the main file
-    // is complete: it is then read without locks, and HasChanged() tells whether that has stopped being true.
+    // cannot create. If no "-wal" file has rows either, the database is not open anywhere and the main file
+    // is complete: it is then read without locks, and HasChanged() says whether the file has changed since.
     Database Open();
 
-    // True when the file is read without locks and somebody has written to it since.
+    // True when the file is read without locks and has been written since.
     bool HasChanged() const;
 
 private:
     bool IsAtRestInReadOnlyFolder() const;
     Database OpenWithoutLocks();
 
-    // Absolute, as SQLite resolves it to name the files beside it; so neither "file:x" nor ":memory:" is more
-    // than a name. Empty where there is no such file.
+    // Absolute, as SQLite resolves it to name the companion files; so "file:x" and ":memory:" are only names.
+    // Empty if there is no such file.
     std::string path_;
     std::optional<struct stat> atRest_; // set when the file is read without locks
 };

@@ -4,7 +4,7 @@
 
 namespace {
 
-// Copies `inLen` bytes with `escape(byte)` put before a byte where it is not NUL.
+// Copies `inLen` bytes with `escape(byte)` before a byte unless it is NUL.
 template <typename EscapeOf>
 int CopyEscaped(char *out, size_t outSize, const char *in, size_t inLen, EscapeOf escapeOf) {
     if (out == nullptr || in == nullptr)

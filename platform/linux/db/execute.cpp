@@ -16,12 +16,12 @@ using kelo::platform::Statement;
 
 namespace {
 
-// A sink costs a second prepare: not worth it for a value or two, or for a page. How many rows there are is
-// known only when they come, so the first ones are taken one by one and then taken again.
+// A sink costs a second prepare, which is not worth it for a value or two, or for a page. The number of rows
+// is not known in advance, so the first ones are read one by one and then read again.
 constexpr size_t kSinkColumns = 3;
 constexpr unsigned int kSinkRows = 200;
-// Of SQLite's machine, up to the first kSinkRows rows: about a millisecond. A statement that needs more
-// spends its time on finding or sorting rows, not on their delivery.
+// Instructions of SQLite's machine up to the first kSinkRows rows: about a millisecond. A statement that
+// needs more spends its time on finding or sorting rows, not on their delivery.
 constexpr int kCheapSteps = 100000;
 
 enum class Delivery { kByRow, kBySink };
@@ -61,13 +61,13 @@ bool TakeAllRows(sqlite3_stmt *statement, DBResult_tag &result) {
     return TakeRows(statement, result, UINT64_MAX) == Progress::kDone;
 }
 
-// Whether to begin again costs next to nothing, and changes nothing.
+// True if a restart is cheap and has no side effects.
 bool MayBeginAgain(sqlite3_stmt *statement) {
     return sqlite3_stmt_readonly(statement) != 0 && sqlite3_stmt_isexplain(statement) == 0 &&
            sqlite3_stmt_status(statement, SQLITE_STMTSTATUS_VM_STEP, 0) < kCheapSteps;
 }
 
-// Runs a prepared statement; `result` is null where its rows are not wanted.
+// Runs a prepared statement; `result` is null if its rows are not wanted.
 bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
              std::unique_ptr<DBResult_tag> &result) {
     sqlite3_stmt *statement = single.prepared.get();
@@ -87,7 +87,7 @@ bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
     return sink != nullptr ? StepToEnd(sink.get()) : TakeAllRows(statement, *result);
 }
 
-// Runs the one statement of `sql`; `rows` stays null where it has no columns or they are not wanted.
+// Runs the one statement of `sql`; `rows` stays null if it has no columns or they are not wanted.
 bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
                std::unique_ptr<DBResult_tag> &rows) {
     SingleStatement single;
@@ -106,7 +106,7 @@ bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult
     std::unique_ptr<DBResult_tag> rows;
     if (!RunSingle(connection.db, sql, delivery, result != nullptr, rows))
         return false;
-    // An error is raised when no statement is left: finalising one that succeeded would clear it.
+    // The error is raised after the last statement is finalised: finalising a successful one would clear it.
     if (connection.file.HasChanged()) {
         RaiseError(connection.db, SQLITE_BUSY, "database changed while it was read without locks");
         return false;
@@ -116,7 +116,7 @@ bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult
     return true;
 }
 
-// The one SELECT of `sql` with its bounds, "" where the text holds no statement.
+// The one SELECT of `sql` with its bounds, "" if the text has no statement.
 bool BoundedText(sqlite3 *db, const char *sql, unsigned int limit, unsigned int offset,
                  std::string &bounded) {
     SingleStatement single;
@@ -136,8 +136,8 @@ bool BoundedText(sqlite3 *db, const char *sql, unsigned int limit, unsigned int 
     return true;
 }
 
-// Runs `work` for a statement of the caller and turns its outcome into the result code, with the connection's
-// error set where it failed.
+// Runs `work` for a statement of the caller and converts its outcome to the result code. On failure the
+// connection's error is set.
 template <typename Work>
 int Guarded(DBConnect_tag *connection, const char *sql, DBResult_tag **result, Work work) {
     if (result != nullptr)

@@ -8,9 +8,9 @@
 namespace kelo::platform {
 namespace {
 
-constexpr size_t kMaxTextLength = 4096; // longer ones cost more to write than to compile
+constexpr size_t kMaxTextLength = 4096; // writing longer ones takes longer than compiling them
 constexpr const char *kBlanks = " \t\n\r\f";
-// What the head of a statement may hold: no quotes, no comments, no second statement.
+// Characters allowed in the head of a statement: no quotes, no comments, no second statement.
 constexpr const char *kHeadBytes =
     "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789_,() \t\n\r\f";
 
@@ -38,7 +38,7 @@ std::optional<bool> InsertCache::Run(sqlite3 *db, const char *sql) {
     return RunPrepared();
 }
 
-// Splits a text into its form and its literals; false when it is none of the known kind.
+// Splits a text into its form and its literals; false for any other kind of text.
 bool InsertCache::Read(const char *sql) {
     form_.clear();
     literalCount_ = 0;
@@ -75,7 +75,7 @@ bool InsertCache::ReadHead(const char *&text) {
         return false;
     form_.assign(head, 0, bracket + 1);
     text += bracket + 1;
-    return strcasestr(form_.c_str(), "SELECT") == nullptr; // its values are more than what is stored
+    return strcasestr(form_.c_str(), "SELECT") == nullptr; // it has more values than one row
 }
 
 bool InsertCache::ReadLiteral(const char *&text) {
@@ -97,7 +97,7 @@ InsertCache::Literal &InsertCache::NextLiteral() {
     return literals_[literalCount_++];
 }
 
-// A text between single quotes; a text that does not end gives null.
+// A text between single quotes; an unterminated text gives null.
 void InsertCache::ReadText(const char *&text) {
     Literal &literal = NextLiteral();
     if (!std::holds_alternative<std::string>(literal))
@@ -114,7 +114,7 @@ void InsertCache::ReadText(const char *&text) {
     text = nullptr;
 }
 
-// A whole number that surely is one to SQLite too.
+// A whole number that SQLite reads as a whole number too.
 bool InsertCache::ReadNumber(const char *&text) {
     constexpr size_t kSafeDigits = 18;
     const char *digits = text + (*text == '-');

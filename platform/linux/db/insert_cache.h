@@ -12,12 +12,12 @@ namespace kelo::platform {
 // Runs INSERT statements that differ only in their literals through one prepared statement, with the literals
 // bound: compiling such a statement costs several times as much as running it.
 //
-// Known are texts of the form INSERT [OR word] INTO table [(columns)] VALUES (literals) [;] with texts, whole
-// numbers and NULL. What they do does not depend on whether they are known.
+// This applies to texts of the form INSERT [OR word] INTO table [(columns)] VALUES (literals) [;] with texts,
+// whole numbers and NULL. Their effect is the same either way.
 class InsertCache {
 public:
-    // Runs `sql` if it has the form of the text before it. Returns whether that succeeded, with the
-    // connection's error set where not; nothing when the statement has to be run the ordinary way.
+    // Runs `sql` if it has the form of the text before it. Returns whether that succeeded (otherwise the
+    // connection's error is set), or nothing when the statement has to be run in the ordinary way.
     std::optional<bool> Run(sqlite3 *db, const char *sql);
 
     // Ends the prepared statement: before the connection is closed.
@@ -37,7 +37,7 @@ private:
     std::string knownForm_; // with a '?' for each literal
     Statement prepared_;    // of the known form, from its second text on
 
-    // Of the text at hand. They keep their memory from one text to the next.
+    // Of the current text. They keep their memory from one text to the next.
     std::string form_;
     std::vector<Literal> literals_;
     size_t literalCount_ = 0;

@@ -10,7 +10,7 @@ struct Error {
     const char *message;
 };
 
-// Called by anything but RaiseError the function gives NULL, for SQL cannot make such a pointer.
+// For any caller but RaiseError the function gives NULL, because SQL cannot create such a pointer.
 void Raise(sqlite3_context *context, int, sqlite3_value **arguments) {
     const auto *error = static_cast<const Error *>(sqlite3_value_pointer(arguments[0], kPointerType));
     if (error == nullptr)
@@ -21,7 +21,7 @@ void Raise(sqlite3_context *context, int, sqlite3_value **arguments) {
 
 } // namespace
 
-// SQLite lets nobody set its error, but a statement that fails sets it. Where there is no memory for that
+// SQLite has no function that sets its error, but a statement that fails sets it. Without memory for that
 // statement, the error is that there is no memory.
 void RaiseError(sqlite3 *db, int code, const char *message) {
     Error error{code, message};

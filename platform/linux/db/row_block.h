@@ -15,25 +15,25 @@ struct Cell {
     size_t size = 0; // bytes, the NUL not counted
 };
 
-// Rows of texts, packed one behind the other into a few large chunks that never move or grow. A row costs its
-// texts with their NULs, two bytes a cell (four where the row passes 64 KiB) and nine bytes.
+// Rows of texts, packed one after the other into a few large chunks that never move or grow. A row takes its
+// texts with their NULs, two bytes per cell (four if the row exceeds 64 KiB) and nine bytes.
 class RowBlock {
 public:
     // Appends a row. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
-    // either leaves the rows as they were.
+    // either leaves the rows unchanged.
     void Add(std::span<const Cell> cells);
 
     uint64_t Count() const { return count_; }
 
-    // Text of a cell, null for NULL. Both positions have to exist.
+    // Text of a cell, null for NULL. Both positions must exist.
     const char *Text(uint64_t row, size_t column) const {
         const char *start = tables_[row / kRowsPerTable][row % kRowsPerTable];
         return start[0] == kNarrow ? ReadText<uint16_t>(start, column) : ReadText<uint32_t>(start, column);
     }
 
 private:
-    // A row is a byte that tells the width of its offsets, the offsets of its texts from the row's start, and
-    // the texts. No text starts at 0, so that offset stands for NULL.
+    // A row is a byte with the width of its offsets, the offsets of its texts from the row's start, and the
+    // texts. No text starts at 0, so that offset means NULL.
     enum Width : char { kNarrow = 0, kWide = 1 };
     template <typename Offset>
     static void WriteRow(char *row, Width width, std::span<const Cell> cells);

@@ -50,7 +50,7 @@ void Deliver(sqlite3_context *context, int count, sqlite3_value **values) {
 
 void Finish(sqlite3_context *) {}
 
-// The columns are renamed, for their own names may be anything, and twice the same.
+// The columns are renamed, because their own names can be any text and need not be unique.
 std::string WrappedText(std::string_view query, size_t columnCount) {
     std::string names;
     for (size_t column = 0; column < columnCount; ++column)

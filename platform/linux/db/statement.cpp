@@ -24,7 +24,7 @@ const char *SkipBlanks(const char *text) {
     }
 }
 
-// A pragma may act while it is prepared, so what follows it is looked at before.
+// A pragma may act while it is prepared, so the text after it is checked first.
 bool IsPragmaWithCompany(const char *statement) {
     constexpr std::string_view kPragma = "PRAGMA";
     if (strncasecmp(statement, kPragma.data(), kPragma.size()) != 0)

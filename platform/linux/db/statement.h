@@ -14,13 +14,13 @@ using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
 
 // The one statement of an SQL text.
 struct SingleStatement {
-    Statement prepared; // null where the text holds no statement
-    // The statement in the text, without a closing semicolon. It may end inside a comment: what is put behind
-    // it has to start with kCommentEnd.
+    Statement prepared; // null if the text has no statement
+    // The statement in the text, without a closing semicolon. It may end inside a comment: text appended to
+    // it must start with kCommentEnd.
     std::string_view text;
 };
 
-// Ends a comment of either kind and is blank where there is none.
+// Ends a comment of either kind and is blank without one.
 inline constexpr char kCommentEnd[] = "\n/**/";
 
 // Prepares the one statement of `sql`. Returns false with the connection's error set when it does not

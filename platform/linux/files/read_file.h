@@ -9,11 +9,11 @@
 
 namespace kelo::platform {
 
-// A file that is larger is refused (EFBIG): configuration never is, and memory has an end.
+// A larger file is refused (EFBIG): configuration is never so large, and memory is limited.
 inline constexpr off_t kMaxTextFileBytes = off_t{256} << 20;
 
 // Opens the regular file at `path` for reading and stores its status. An empty descriptor with errno set on
-// failure: EISDIR for a folder, EINVAL for what else is no regular file. Never waits for a FIFO's writer.
+// failure: EISDIR for a folder, EINVAL for anything else but a regular file. Never waits for a FIFO's writer.
 UniqueFd OpenForReading(const std::string &path, struct stat &status);
 
 // Everything from the descriptor's position to the end; nothing on failure, with errno set. `sizeHint` is the

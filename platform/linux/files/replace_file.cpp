@@ -12,7 +12,7 @@ namespace {
 constexpr int kLockPollMs = 10;
 constexpr int kLockPolls = 30 * 1000 / kLockPollMs;
 
-// Any process that may read the folder could hold the lock, so the wait has an end.
+// Any process that may read the folder could hold the lock, so the wait is limited.
 bool WaitForLock(int fd) {
     const timespec pause{0, kLockPollMs * 1'000'000};
     for (int poll = 0; poll < kLockPolls; ++poll) {

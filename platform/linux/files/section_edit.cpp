@@ -5,7 +5,7 @@
 namespace kelo::platform {
 namespace {
 
-// A header with another name in place of the old one; blanks and a comment around it stay.
+// The header with another name; blanks and a comment around the name stay.
 std::string RenameHeader(const SectionLine &header, std::string_view newName) {
     const auto at = static_cast<size_t>(header.key.data() - header.text.data());
     std::string renamed(header.text);

@@ -30,7 +30,7 @@ void ParseHeader(std::string_view trimmed, SectionLine &line) {
     line.key = name;
 }
 
-// Quotes around the whole value are taken off; inside them every character stands for itself, a quote too.
+// Quotes around the whole value are removed; inside them every character is literal, including a quote.
 void ParseEntry(std::string_view trimmed, SectionLine &line) {
     line.kind = LineKind::kBroken;
     const size_t equals = trimmed.find('=');

@@ -24,10 +24,10 @@ struct SectionLine {
 // Parses one line, with or without its line feed.
 SectionLine ParseSectionLine(std::string_view text);
 
-// Takes the first line off `rest`, which is not empty.
+// Removes and returns the first line of `rest`, which is not empty.
 SectionLine NextSectionLine(std::string_view &rest);
 
-// Whether a header can carry this name: not empty, no square bracket, line feed or NUL byte.
+// Whether a header can have this name: not empty, no square bracket, line feed or NUL byte.
 bool IsSectionName(std::string_view name);
 
 } // namespace kelo::platform

@@ -20,7 +20,7 @@ struct SectionEntry {
 class SectionText {
 public:
     struct Section {
-        std::string_view name; // empty where the header is broken
+        std::string_view name; // empty if the header is invalid
         size_t begin;          // offset of the header line
         size_t end;            // offset after the last line
         size_t line;           // number of the header line, from 1
@@ -31,16 +31,16 @@ public:
     SectionText &operator=(const SectionText &) = delete;
 
     std::string_view Content() const { return content_; }
-    // In file order, those of one name all.
+    // In file order, including all of the same name.
     const std::vector<Section> &Sections() const { return sections_; }
     // The first section of this name; null when there is none.
     const Section *Find(std::string_view name) const;
 
-    // Appends the section's entries to `entries`, of one key only the first. Returns 0, or the number of the
-    // first broken line.
+    // Appends the section's entries to `entries`, of each key only the first. Returns 0, or the number of the
+    // first invalid line.
     size_t Entries(const Section &section, std::vector<SectionEntry> &entries) const;
 
-    // The value of the first entry with this key in the whole text, whatever section it stands in.
+    // The value of the first entry with this key in the whole text, in any section.
     std::optional<std::string_view> FindKey(std::string_view key) const;
 
 private:

@@ -32,8 +32,8 @@ struct FilePlace {
     std::string name;
 };
 
-// Where the file stands that a writer has to replace: behind all symbolic links. It need not exist yet, but a
-// link to nothing is refused: nobody could tell where the file was meant to be. False with errno set.
+// The path of the file that a writer has to replace: behind all symbolic links. It need not exist yet, but a
+// dangling link is refused, because the intended place of the file is unknown. False with errno set.
 bool Locate(const std::string &path, FilePlace &place) {
     std::string real = path;
     if (const std::unique_ptr<char, FreeString> resolved(realpath(path.c_str(), nullptr)); resolved) {
@@ -56,14 +56,14 @@ bool Locate(const std::string &path, FilePlace &place) {
     return false;
 }
 
-// What a writer wants: `newName` null to remove the section.
+// The change of a writer: `newName` is null to remove the section.
 struct SectionChange {
     std::string_view name;
     const char *newName;
     std::vector<RenderedEntry> entries;
 };
 
-// Renders the hash; false with errno set after a report, which leaves the value out: it may be a secret.
+// Renders the hash; false with errno set after a report without the value, which may be a secret.
 bool RenderEntries(const std::string &path, const TORVSZHASH &hash, std::string_view format,
                    std::vector<RenderedEntry> &entries) {
     for (const TORVSZHASH::Entry &entry : hash.entries) {

@@ -51,7 +51,7 @@ std::vector<std::string_view> Words(std::string_view text) {
     }
 }
 
-// The value of the tag in the filter file; "all" where the file or the tag is missing.
+// The value of the tag in the filter file; "all" if the file or the tag is missing.
 std::string FilterOf(const std::string &path, std::string_view tag) {
     if (path.empty())
         return "all";

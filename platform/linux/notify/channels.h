@@ -8,9 +8,8 @@
 
 namespace kelo::platform {
 
-// The channels that the notification `tag` is to go to: those that the settings enable, of which the filter
-// file at `filterFile` may take some away. Never throws away what it cannot understand: an unreadable filter
-// file counts as absent, and is reported.
+// The channels of the notification `tag`: those that the settings enable and the filter file at `filterFile`
+// allows. An unreadable filter file is taken as absent, and is reported, so that no notification is lost.
 std::vector<std::string_view> WantedChannels(const Settings &settings, const std::string &filterFile,
                                              std::string_view tag);
 

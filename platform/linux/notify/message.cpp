@@ -60,7 +60,7 @@ std::string Unescape(std::string_view text) {
     return plain;
 }
 
-// The placeholder that `text` (which begins with a percent sign) begins with; empty when it begins with none.
+// The placeholder at the start of `text` (which begins with a percent sign); empty if there is none.
 std::string_view PlaceholderAt(std::string_view text) {
     const size_t end = text.find_first_not_of(kPlaceholderCharacters, 1);
     if (end == std::string_view::npos || end == 1 || text[end] != '%')

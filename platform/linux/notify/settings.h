@@ -8,17 +8,17 @@
 
 namespace kelo::platform {
 
-// The appliance's settings, as they stand in one moment.
+// The appliance's settings at one moment.
 class Settings {
 public:
-    // Reads /etc/keloinfo.conf under the platform's root. Check IsLoaded; where it is not, errno tells why
+    // Reads /etc/keloinfo.conf under the platform's root. Check IsLoaded; if it is not, errno says why
     // and every setting is missing.
     Settings();
 
     bool IsLoaded() const { return text_ != nullptr; }
     const std::string &Path() const { return path_; }
 
-    // The value of `key`, or `fallback` where it is missing.
+    // The value of `key`, or `fallback` if it is missing.
     std::string Get(std::string_view key, std::string_view fallback = "") const;
     // Whether the value is exactly "yes".
     bool IsOn(std::string_view key, bool fallback = false) const;

@@ -18,9 +18,9 @@ namespace kelo::platform {
 namespace {
 
 constexpr mode_t kFolderMode = 0750;
-constexpr mode_t kEntryMode = 0640; // log texts are not for everybody
+constexpr mode_t kEntryMode = 0640; // log texts may be confidential
 
-// Sorts by time, and no other process or call has the same.
+// Sorts by time and is unique among all processes and calls.
 std::string NewId(const timespec &now) {
     static std::atomic<unsigned> counter{0};
     char id[80];
@@ -59,8 +59,8 @@ UniqueFd OpenExisting(int parent, const std::string &name) {
     return UniqueFd(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
 }
 
-// Opens a folder of the parent, created where it is missing. A created folder is synced into its parent, so
-// that it outlives a crash as its content does.
+// Opens a folder of the parent, creating it if it is missing. A created folder is synced into its parent, so
+// that it survives a crash like its content.
 UniqueFd OpenOrCreate(int parent, const std::string &name) {
     UniqueFd folder = OpenExisting(parent, name);
     if (folder || errno != ENOENT)
@@ -71,7 +71,7 @@ UniqueFd OpenOrCreate(int parent, const std::string &name) {
     return OpenExisting(parent, name);
 }
 
-// Opens the folder at the absolute `path`, with its parents created where they are missing.
+// Opens the folder at the absolute `path`, creating missing parents.
 UniqueFd OpenFolder(const std::string &path) {
     UniqueFd folder = OpenExisting(AT_FDCWD, path);
     if (folder || errno != ENOENT)

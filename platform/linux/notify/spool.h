@@ -9,7 +9,7 @@
 
 namespace kelo::platform {
 
-// One notification on its way. docs/notification-spool.md describes the file that carries it.
+// One notification to deliver. docs/notification-spool.md describes its file.
 struct SpoolEntry {
     std::string tag;
     std::string language;
@@ -18,10 +18,10 @@ struct SpoolEntry {
     const TORVSZHASH *values = nullptr;
 };
 
-// The folder that the spool stands in, under the platform's root.
+// The folder of the spool, under the platform's root.
 std::string SpoolPath();
 
-// Puts the entry into the spool, whose folders are created where they are missing. True when it is on the
+// Puts the entry into the spool, whose missing folders are created. True when it is on the
 // disk; false with errno set, and then no part of it is left.
 bool AddToSpool(const SpoolEntry &entry);
 

@@ -7,8 +7,8 @@ namespace kelo::platform {
 namespace {
 
 constexpr std::string_view kBlanks = " \t\n\v\f\r";
-// What a backslash makes literal in a word and in a phrase. Before anything else it is text itself, so that
-// paths like c:\windows need no care.
+// The characters that a backslash makes literal in a word and in a phrase. Before any other it is text, so
+// that paths like c:\windows need no escapes.
 constexpr std::string_view kEscapedInWord = "*?\"\\-/";
 constexpr std::string_view kEscapedInPhrase = "\"\\";
 
@@ -26,7 +26,7 @@ void AppendLiteral(std::vector<Piece> &pieces, char byte) {
     pieces.back().literal += byte;
 }
 
-// A term is found anywhere in a text, so that any text at its ends says nothing.
+// A term is found anywhere in a text, so kAnyText at its ends has no effect.
 void AppendAnyText(std::vector<Piece> &pieces) {
     if (!pieces.empty() && pieces.back().kind != Piece::Kind::kAnyText)
         pieces.push_back({Piece::Kind::kAnyText, {}});
@@ -56,7 +56,7 @@ public:
 
     bool AtEnd() const { return rest_.empty(); }
     Term TakeTerm();
-    // Takes an OR that stands before another term. Any other OR is a term like the rest.
+    // Takes an OR before another term. Any other OR is an ordinary term.
     bool TakeOr();
 
 private:
@@ -75,7 +75,7 @@ Term Reader::TakeTerm() {
         rest_.remove_prefix(1);
     }
     if (!TakeRegex(term.regex)) {
-        // A quotation mark with nothing behind it can open no phrase.
+        // A quotation mark at the very end cannot open a phrase.
         const bool isPhrase = rest_[0] == '"' && rest_.size() > 1;
         term.pieces = isPhrase ? TakePhrase() : TakeWord();
     }
@@ -93,7 +93,7 @@ bool Reader::TakeOr() {
     return true;
 }
 
-// The first slash that is not escaped has to end the term: otherwise this is a path, not a regex.
+// The first slash that is not escaped must end the term: otherwise this is a path, not a regex.
 bool Reader::TakeRegex(std::string &regex) {
     if (rest_[0] != '/')
         return false;

@@ -10,14 +10,14 @@ namespace kelo::platform {
 struct Piece {
     enum class Kind { kLiteral, kAnyText, kAnyCharacter };
     Kind kind = Kind::kLiteral;
-    std::string literal; // never empty for kLiteral, else empty
+    std::string literal; // empty unless kLiteral
 };
 
 // One term of a keyword.
 struct Term {
     bool excluded = false;
     std::string regex; // of a /regex/, not empty; then there are no pieces
-    // Of a text term, to be found anywhere in a text. No kAnyText stands at either end or beside another one;
+    // Of a text term, to find anywhere in a text. There is no kAnyText at either end or next to another one;
     // no pieces at all match every text.
     std::vector<Piece> pieces;
 
@@ -29,7 +29,7 @@ struct Term {
 using Alternatives = std::vector<Term>;
 
 // Reads a keyword (see gensqlregexp.h for the language). Any text is a keyword; a blank one has no terms. A
-// row has to match every group of alternatives. `keyword` is UTF-8 without NUL bytes.
+// row must match every group of alternatives. `keyword` is UTF-8 without NUL bytes.
 std::vector<Alternatives> ParseKeyword(std::string_view keyword);
 
 } // namespace kelo::platform

@@ -10,13 +10,13 @@ bool IsCapital(char byte) {
     return byte >= 'A' && byte <= 'Z';
 }
 
-// Length of what `rest` begins with up to and with the first of `ends`.
+// Length of the beginning of `rest` up to and including the first of `ends`.
 size_t LengthThrough(std::string_view rest, std::string_view ends) {
     const size_t end = rest.find_first_of(ends);
     return end == std::string_view::npos ? rest.size() : end + 1;
 }
 
-// Length of the escape that `rest` begins with: a backslash and what belongs to it.
+// Length of the escape at the start of `rest`: a backslash and its characters.
 size_t EscapeLength(std::string_view rest) {
     const char kind = rest.size() > 1 ? rest[1] : '\0';
     if (kind != 'p' && kind != 'P' && kind != 'x')
@@ -26,7 +26,7 @@ size_t EscapeLength(std::string_view rest) {
     return kind == 'x' ? 4 : 3;
 }
 
-// Length of the construct that `rest` (not empty) begins with and whose letters name something.
+// Length of the construct at the start of `rest` (not empty) whose letters are names and not text.
 size_t NamingLength(std::string_view rest) {
     if (rest[0] == '\\')
         return EscapeLength(rest);

@@ -39,7 +39,7 @@ void Match(sqlite3_context *context, sqlite3_value *regexValue, sqlite3_value *t
     if (!compiled->ok())
         return FailForRegex(context, regexText, compiled->error());
     sqlite3_result_int(context, IsFound(*compiled, text));
-    // SQLite may destroy what it is given at once.
+    // SQLite may destroy the object immediately.
     sqlite3_set_auxdata(context, 0, compiled.release(),
                         [](void *regex) { delete static_cast<RE2 *>(regex); });
 }

@@ -10,8 +10,8 @@ class RE2;
 
 namespace kelo::platform {
 
-// Compiles a regular expression (RE2 syntax, UTF-8) with bounded memory. The result is to be asked for ok()
-// and error(); nothing is logged.
+// Compiles a regular expression (RE2 syntax, UTF-8) with bounded memory. Check ok() and error() of the
+// result; nothing is logged.
 std::unique_ptr<re2::RE2> CompileRegex(const std::string &regex, bool ignoreCase);
 
 // Gives the connection the SQL functions regexp(REGEX, TEXT), which also is what TEXT REGEXP REGEX calls, and
@@ -19,10 +19,10 @@ std::unique_ptr<re2::RE2> CompileRegex(const std::string &regex, bool ignoreCase
 //
 //   1 or 0   whether the regex is found anywhere in the text. As for LIKE and GLOB the text ends at its first
 //            NUL; bytes that are not UTF-8 are read as Latin-1.
-//   NULL     where an argument is NULL
-//   error    for a broken regex; it names the regex and what is wrong with it
+//   NULL     if an argument is NULL
+//   error    for an invalid regex, with the regex and the reason
 //
-// A regex that is the same for every row is compiled once a statement. Triggers and views cannot call the
+// A regex that is the same for every row is compiled once per statement. Triggers and views cannot call the
 // functions. The sqlite3 shell has functions of the same names, so that a statement works there too.
 //
 // Returns false when SQLite refuses (out of memory).

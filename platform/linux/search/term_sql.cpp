@@ -42,7 +42,7 @@ LetterCase LetterCaseOf(const Pieces &pieces) {
     return letterCase;
 }
 
-// How a pattern language writes the pieces of a term.
+// The notation of a pattern language for the pieces of a term.
 struct PatternSyntax {
     const char *anyText;
     const char *anyCharacter;
@@ -70,7 +70,7 @@ std::string Pattern(const Pieces &pieces, const PatternSyntax &syntax) {
     return pattern;
 }
 
-// "0" and the reason in `broken` where RE2 refuses the regex.
+// "0" and the reason in `broken` if RE2 refuses the regex.
 std::string RegexSql(const std::string &regex, bool ignoreCase, const std::string &column,
                      std::vector<BrokenRegex> &broken) {
     const auto compiled = CompileRegex(regex, ignoreCase);
@@ -87,7 +87,7 @@ std::string LiteralSql(const std::string &literal, bool ignoreCase, const std::s
 
 std::string TextSql(const Pieces &pieces, const std::string &column, std::vector<BrokenRegex> &broken) {
     const LetterCase letterCase = LetterCaseOf(pieces);
-    // GLOB is the fastest search there is, as long as its pattern begins with a character and not with a set.
+    // GLOB is the fastest search if its pattern begins with a character and not with a set.
     const bool globIsFast = kGlob.special.find(pieces[0].literal.substr(0, 1)) == std::string_view::npos;
     const bool ignoreCase =
         letterCase == LetterCase::kIgnored || (letterCase == LetterCase::kNoLetters && !globIsFast);

@@ -13,8 +13,8 @@ struct BrokenRegex {
     std::string reason;
 };
 
-// SQL that is true for the rows whose `column` matches the term, able to stand as an operand of AND and OR. A
-// NULL is matched by exclusions only. A term with a broken regex gives "0" whether it excludes or not, so
+// SQL that is true for the rows whose `column` matches the term, usable as an operand of AND and OR. A
+// NULL is matched by exclusions only. A term with an invalid regex gives "0" whether it excludes or not, so
 // that a mistake never widens a search, and is appended to `broken`.
 std::string TermSql(const Term &term, const std::string &column, std::vector<BrokenRegex> &broken);
 

@@ -24,7 +24,7 @@ size_t AsciiPrefix(std::string_view text) {
     return length;
 }
 
-// Length of the well-formed multi-byte sequence that `text` (not empty) begins with, or 0.
+// Length of the well-formed multi-byte sequence at the start of `text` (not empty), or 0.
 size_t SequenceLength(std::string_view text) {
     const uint8_t lead = ByteAt(text, 0);
     if (lead < 0xC2 || lead > 0xF4)
@@ -32,7 +32,7 @@ size_t SequenceLength(std::string_view text) {
     const size_t length = lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
     if (text.size() < length)
         return 0;
-    // The second byte excludes overlong forms, surrogates and what lies beyond U+10FFFF.
+    // The second byte excludes overlong forms, surrogates and values above U+10FFFF.
     const uint8_t lowest = lead == 0xE0 ? 0xA0 : lead == 0xF0 ? 0x90 : 0x80;
     const uint8_t highest = lead == 0xED ? 0x9F : lead == 0xF4 ? 0x8F : 0xBF;
     if (ByteAt(text, 1) < lowest || ByteAt(text, 1) > highest)

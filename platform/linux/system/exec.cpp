@@ -10,7 +10,7 @@
 
 namespace {
 
-// What runs between fork and exec may call async-signal-safe functions only: other threads may hold any lock.
+// The code between fork and exec may call only async-signal-safe functions: other threads may hold any lock.
 
 // A fork without the handlers and locks of the C library, whose child sends `exitSignal` at its end. A child
 // that sends none is reaped only by a wait with __WALL: neither a wait for any child elsewhere in the process
@@ -38,7 +38,7 @@ void ResetSignals() {
     sigprocmask(SIG_SETMASK, &none, nullptr);
 }
 
-// Leaves only standard input and output, both on /dev/null, and standard error, which goes there too where
+// Leaves only standard input and output, both on /dev/null, and standard error, which goes there too if
 // the caller has none: a file that the command opens must not become one of the three.
 void ResetDescriptors() {
     close_range(STDERR_FILENO + 1, ~0U, 0);
@@ -51,8 +51,8 @@ void ResetDescriptors() {
     close_range(STDERR_FILENO + 1, ~0U, 0);
 }
 
-// Keeps signals off this thread while it lives: a handler of the caller's must not run in the child, which
-// has it until it resets it.
+// Blocks the signals of this thread during its lifetime: a handler of the caller must not run in the child,
+// which inherits it until it resets it.
 class SignalBlock {
 public:
     SignalBlock() {

@@ -29,8 +29,7 @@ std::string HangUp(const std::string &path, const std::string &program) {
     pid_t pid = 0;
     if (!(file >> pid) || pid <= 0 || !(file >> std::ws).eof())
         return "no process id in " + path;
-    // The descriptor holds on to the process, so that the one that was checked is the one that gets the
-    // signal.
+    // The descriptor identifies the process, so that the process that was checked gets the signal.
     const UniqueFd process(static_cast<int>(syscall(SYS_pidfd_open, pid, 0)));
     if (process.Get() < 0 || NameOf(pid) != program.substr(0, kNameLength))
         return "process " + std::to_string(pid) + " of " + path + " is not " + program;

@@ -33,7 +33,7 @@ using Bus = std::unique_ptr<sd_bus, BusCloser>;
 using CText = std::unique_ptr<char, void (*)(void *)>;
 using Message = std::unique_ptr<sd_bus_message, MessageUnref>;
 
-// What has become of the jobs that ended since the reload was asked for.
+// The results of the jobs that ended since the reload was requested.
 struct AwaitedJob {
     std::string path; // known once systemd has answered
     std::string result;
@@ -65,7 +65,7 @@ std::string AwaitResult(sd_bus *bus, const AwaitedJob &job) {
     return job.result == "done" ? "" : "the reload ended as " + job.result;
 }
 
-// The job that is reloading the unit at the moment; "" for none, or when that cannot be told.
+// The job that is reloading the unit at the moment; "" for none, or if that is unknown.
 std::string JobUnderWay(sd_bus *bus, const std::string &unit) {
     char *rawObject = nullptr;
     if (sd_bus_path_encode("/org/freedesktop/systemd1/unit", unit.c_str(), &rawObject) < 0)
@@ -109,8 +109,7 @@ std::string ReloadUnit(const std::string &unit) {
     const Bus bus(rawBus);
     BusError error;
     AwaitedJob job;
-    // Signals are taken from the bus only after the job's path has been read, so none is missed before it is
-    // known.
+    // Signals are read from the bus only after the job's path is known, so none is missed.
     if (status >= 0)
         status = sd_bus_match_signal(bus.get(), nullptr, kDestination, kPath, kManager, "JobRemoved",
                                      AwaitedJob::Removed, &job);

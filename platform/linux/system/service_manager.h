@@ -5,8 +5,8 @@
 namespace kelo::platform {
 
 // Asks systemd over the system bus to reload a unit ("syslog-ng.service") and waits for the outcome. A reload
-// that is under way already, whoever asked for it, is awaited instead; one that has not begun systemd itself
-// makes one with ours.
+// that is already in progress, requested by any program, is awaited instead; one that has not begun is merged
+// with ours by systemd itself.
 //
 // Returns "" when the unit was reloaded, else the reason.
 std::string ReloadUnit(const std::string &unit);

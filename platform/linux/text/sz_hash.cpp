@@ -9,7 +9,7 @@ using kelo::platform::CatchBadAlloc;
 
 namespace {
 
-// More room than this is made only when there are keys for it.
+// A larger table is allocated only when there are keys for it.
 constexpr size_t kMaxReserved = 65536;
 
 } // namespace

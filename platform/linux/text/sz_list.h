@@ -6,7 +6,7 @@
 
 namespace kelo::platform {
 
-// Appends a copy of `text`, which holds no NUL byte. Throws std::bad_alloc, and then the list is as before.
+// Appends a copy of `text`, which has no NUL byte. Throws std::bad_alloc and then leaves the list unchanged.
 void ListAppend(TORVSZLIST &list, std::string_view text);
 
 } // namespace kelo::platform

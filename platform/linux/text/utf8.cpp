@@ -5,7 +5,7 @@ namespace {
 
 constexpr std::string_view kReplacement = "\xEF\xBF\xBD";
 
-// Length of the well-formed sequence (RFC 3629) that `text` begins with; 0 when it begins with none.
+// Length of the well-formed sequence (RFC 3629) at the start of `text`; 0 if there is none.
 size_t SequenceLength(std::string_view text) {
     const auto byte = [&](size_t i) { return static_cast<unsigned char>(text[i]); };
     const unsigned char lead = byte(0);
@@ -14,7 +14,7 @@ size_t SequenceLength(std::string_view text) {
     const size_t length = lead < 0xC2 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : lead < 0xF5 ? 4 : 0;
     if (length == 0 || text.size() < length)
         return 0;
-    // Overlong forms, surrogates and what lies above U+10FFFF show in the second byte.
+    // The second byte shows overlong forms, surrogates and values above U+10FFFF.
     const unsigned char low = lead == 0xE0 ? 0xA0 : lead == 0xF0 ? 0x90 : 0x80;
     const unsigned char high = lead == 0xED ? 0x9F : lead == 0xF4 ? 0x8F : 0xBF;
     if (byte(1) < low || byte(1) > high)
