@@ -1,6 +1,6 @@
 // Filtered counts and keyword searches, against the sqlite3 shell running the same SQL.
 //
-// The shell's own timer tells how long a statement took in it, so that neither the start of its process nor
+// The shell's own timer measures a statement, so that neither the start of its process nor
 // the opening of the database counts for it; both sides then scan the same pages with the same SQLite.
 
 #include <dlfcn.h>
@@ -80,7 +80,7 @@ constexpr Search kSearches[] = {
 
 } // namespace
 
-// Stands before the platform's functions, to see what is sent.
+// Replaces the platform's functions to record the statements.
 int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result) {
     sentSql = sql;
     static const auto real = reinterpret_cast<decltype(&KELODBExecute)>(dlsym(RTLD_NEXT, "KELODBExecute"));

@@ -1,5 +1,5 @@
 // Which SQL finds a word fastest? The forms that a search keyword could take, each as the time of one count
-// over a table of log messages, beside the form that GenSQLRegexp chose.
+// over a table of log messages, compared with the form that GenSQLRegexp chose.
 //
 //   keyword_forms [ROWS]      1,000,000 rows of about 100 bytes unless given
 

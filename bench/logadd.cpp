@@ -1,6 +1,6 @@
-// LogParser::LogAdd on a million lines of 200 bytes, beside two peers: a loop that only looks for the line
+// LogParser::LogAdd on a million lines of 200 bytes, compared with a loop that only looks for the line
 // feeds, and the parser that one would write with std::getline and std::istringstream. And the memory that
-// the records take, beside what they must take.
+// the records take, compared with the minimum.
 
 #include <malloc.h>
 

@@ -1,5 +1,5 @@
-// Storing a million records through LogStore, beside a bare loop of one prepared insert per row in the same
-// batches, each into a fresh database in the current folder.
+// Storing a million records through LogStore, compared with a bare loop of one prepared insert per row in the
+// same batches, each into a fresh database in the current folder.
 
 #include <sqlite3.h>
 

@@ -9,6 +9,6 @@ if(KELO_SANITIZE)
     add_link_options(-fsanitize=${KELO_SANITIZE})
 endif()
 if(KELO_BUILD_FUZZ)
-    # The libraries too tell libFuzzer which ways their code went.
+    # The libraries too report their coverage to libFuzzer.
     add_compile_options(-fsanitize=fuzzer-no-link)
 endif()

@@ -1,4 +1,4 @@
-// Any keyword gives SQL that SQLite prepares and runs, and that means the same wherever it stands.
+// Any keyword gives SQL that SQLite prepares and runs, and that means the same in every position.
 
 #include <unistd.h>
 

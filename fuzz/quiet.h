@@ -1,6 +1,6 @@
 #pragma once
 
-// A fuzzer must not write to the machine's log, and ends with what it was told when a target fails.
+// A fuzzer must not write to the machine's log. When a target fails, it prints what was reported.
 
 #include <cstdio>
 #include <cstdlib>

@@ -19,7 +19,7 @@ double Time(const std::function<void()> &work);
 // machine does meets all of them. Returns the median time of each, in milliseconds.
 std::vector<double> MedianTimes(const std::vector<Variant> &variants, int rounds);
 
-// Prints the heading of a table, or a row of it: a figure beside the one it is measured against, their ratio,
+// Prints the heading of a table, or a row of it: a figure, its baseline, their ratio,
 // and the most that the ratio may be. Returns whether it is kept.
 void PrintHeading(const std::string &title, const std::string &unit);
 bool PrintRatio(const std::string &name, double figure, const std::string &baseName, double base,

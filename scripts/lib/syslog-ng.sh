@@ -1,7 +1,7 @@
 # shellcheck shell=bash
 # A private syslog-ng on loopback for the demo, the system tests and the benchmark. Sourced by bash, not run.
 #
-# Everything stands below ROOT: ROOT/kelosyslog.conf, ROOT/logs.db, ROOT/syslog-ng.{conf,persist,pid,ctl,log}. The
+# Everything is below ROOT: ROOT/kelosyslog.conf, ROOT/logs.db, ROOT/syslog-ng.{conf,persist,pid,ctl,log}. The
 # daemon runs as the calling user and is stopped by its process id alone.
 
 PATH=$PATH:/usr/sbin # where Debian puts syslog-ng, and users do not look
@@ -32,7 +32,7 @@ port_in_use() {
         2>/dev/null
 }
 
-# Prints a port that nobody uses at the moment, below the range that the kernel hands out itself.
+# Prints a port that is free at the moment, below the range from which the kernel assigns ports.
 free_port() {
     local port
     for _ in {1..200}; do
@@ -123,7 +123,7 @@ syslog_ng_stop() {
     rm -f "$1/pid"
 }
 
-# One file is sent as it stands: as lines over TCP, as frames that are already counted, as one datagram.
+# One file is sent unchanged: as lines over TCP, as frames that are already counted, as one datagram.
 send_lines() { cat "$1" >"/dev/tcp/127.0.0.1/$syslogPort"; }
 send_frames() { cat "$1" >"/dev/tcp/127.0.0.1/$framePort"; }
 send_datagram() { cat "$1" >"/dev/udp/127.0.0.1/$syslogPort"; }

@@ -15,7 +15,7 @@ struct Machine {
 extern Machine machine;
 
 // An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
-// a clock that stands still until a test moves it.
+// a clock that only the test advances.
 class AccountingTest : public NotifyTest {
 protected:
     AccountingTest();

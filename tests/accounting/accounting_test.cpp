@@ -19,7 +19,7 @@ TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
         // The clock jumps back.
         {{{1000, {"a", "a"}}, {990, {"b"}}, {1000, {"c"}}}, "1000 a 1;990 a 1;1000 b 1", 1},
         {{{5000000000, {"a", "a"}}}, "5000000000 a 1", 1},
-        // Devices stand in the order of their bytes.
+        // Devices are in the order of their bytes.
         {{{1, {"x", "b", "B", "\xff", "b"}}, {2, {"x", "x"}}}, "1 x 1;2 B 1;2 b 2;2 \xff 1", 2},
     };
     for (const auto &c : cases) {

@@ -48,7 +48,8 @@ private:
 
 class Ledger : public AccountingTest {
 protected:
-    // SQLite calls a database corrupt that the disk cannot read. It keeps its name where nobody can be told.
+    // SQLite calls a database corrupt that the disk cannot read. It keeps its name if no notification can be
+    // sent.
     Ledger() { NotifyCalls::AnswerWith(-1); }
 
     void CountSecond() {
@@ -84,7 +85,7 @@ protected:
             EXPECT_EQ(Stored(), counted_);
             pending_.clear();
             ++done_;
-        } else if (result == 0) { // nobody knows whether the commit took place
+        } else if (result == 0) { // the commit may have taken place or not
             EXPECT_TRUE(gained.empty() || gained == pending_);
             pending_.clear();
             ++unknown_;

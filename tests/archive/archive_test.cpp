@@ -1,4 +1,4 @@
-// Archiving beside a writer, and what it leaves when something fails.
+// Archiving while a writer works, and what a failure leaves.
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

@@ -23,7 +23,7 @@ protected:
     ~DBErrorHandle() override { injectedCode = 0; }
 };
 
-// The text without the source line, which is nobody's business.
+// The text without the source line, which may change.
 std::string WithoutLine(const std::string &text) {
     EXPECT_THAT(text, MatchesRegex("dbhandler:[0-9]+ .*"));
     return text.substr(text.find(' ') + 1);

@@ -51,7 +51,7 @@ using namespace kelo::test;
 
 namespace {
 
-// Counts an allocation and tells whether it has to fail.
+// Counts an allocation; whether it must fail.
 bool MustFail() {
     if (state.failTimes == 0 || FaultPause::IsActive())
         return false;

@@ -68,7 +68,7 @@ protected:
         return static_cast<size_t>(std::distance(begin(files), end(files)));
     }
 
-    // The names of all files, without what SQLite keeps beside a database after a failure.
+    // The names of all files, without the companion files that SQLite keeps after a failure.
     std::set<std::string> FileNames() const {
         std::set<std::string> names;
         for (const auto &file : fs::directory_iterator(ground_.root.Path()))

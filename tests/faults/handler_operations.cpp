@@ -106,7 +106,7 @@ int Quarantine(Fixture &ground) {
     return DBErrorHandle_SQLITE_CORRUPT(nullptr, ground.root.File("logs.db"));
 }
 
-// The file is moved once and only after the administrator was told, and never lost.
+// The file is moved once, only after the notification was sent, and never lost.
 void CheckQuarantine(const Fixture &ground, const Outcome &outcome) {
     const bool isMoved = ReadFile(ground.root.File("logs.db.corrupt")) == "damaged";
     EXPECT_TRUE(fs::exists(ground.root.File("logs.db-wal"))) << "the companions stay";

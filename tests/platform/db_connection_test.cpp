@@ -58,7 +58,7 @@ TEST_F(Connecting, KeepsSqlInsideTheFile) {
     EXPECT_THAT(Execute(connection, "SELECT * FROM bait").error, HasSubstr("unsafe use"));
 }
 
-// Acts with the rights of nobody while the object lives; those of root would hide every permission.
+// Acts as user nobody during the lifetime of the object, because root ignores permissions.
 struct Unprivileged {
     Unprivileged() { EXPECT_TRUE(getuid() != 0 || seteuid(65534) == 0); }
     ~Unprivileged() { EXPECT_TRUE(getuid() != 0 || seteuid(0) == 0); }

@@ -53,7 +53,7 @@ TEST_F(Executing, BoundsOnlyASelect) { // Debian's SQLite knows DELETE ... LIMIT
     EXPECT_EQ(SelectLimit(connection, sql, 4294967295U, 0, {}).rows.size(), 3U);
 }
 
-// Few rows are taken one by one, many of several columns by another way: nobody may notice.
+// Few rows are read one by one, many of several columns in another way: the result must be the same.
 TEST_F(Executing, DeliversManyRowsAsItDeliversFew) {
     RunSql(
         path,

@@ -84,7 +84,7 @@ TEST_F(Reload, HangsUpTheProgramThatAPidFileNames) {
         {"pkg-Quillbay-syslog", "/run/pkg-Quillbay-syslog.pid"},
         {"a-service-with-a-long-name", "/run/a-service-with-a-long-name.pid"},
     };
-    isBooted = 1; // is nothing to what stands under a root
+    isBooted = 1; // has no effect under a root
     for (const auto &c : cases) {
         Daemon daemon(std::string(c.service).starts_with("pkg") ? "syslog-ng" : c.service);
         WritePidFile(c.file, std::to_string(daemon.Pid()) + "\n");

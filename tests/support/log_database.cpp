@@ -85,7 +85,7 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
 }
 
 void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs) {
-    // The last connection that closes empties the log, unless it is told not to.
+    // The last connection that closes empties the log, unless this is switched off.
     const Database last = Open(path);
     Run(last.get(), "SELECT count(*) FROM sqlite_schema");
     InsertLogs(path, logs);

@@ -22,7 +22,7 @@ void CreateLogDatabase(const std::string &path, const std::string &schema = "log
 // `llevel` get the severity word.
 void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
 
-// The same, and leaves the records in the write-ahead log beside the database, as a writer at work does.
+// The same, and leaves the records in the write-ahead log, as an active writer does.
 void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs);
 
 // A record that differs by `number` in a repeatable way: host "host00".."host49", program "prog00".."prog29",

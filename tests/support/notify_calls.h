@@ -16,8 +16,8 @@ struct SentNotification {
     bool operator==(const SentNotification &) const = default;
 };
 
-// Watches the platform functions that notifications need, beside PlatformCalls and on the same count of calls
-// that can fail. Part of the program that lists notify_calls.cpp among its sources.
+// Watches the platform functions that notifications need, in addition to PlatformCalls and on the same count
+// of calls that can fail. Part of the program that lists notify_calls.cpp among its sources.
 class NotifyCalls {
 public:
     // Forgets what was sent; the notification service answers 0 without being reached.

@@ -41,7 +41,7 @@ public:
     static int OpenConnections() { return openConnections_; }
     static int OpenResults() { return openResults_; }
 
-    // For the doubles of platform functions: records a call and tells whether it has to fail.
+    // For the doubles of platform functions: records a call; whether it must fail.
     static bool MustFail(const char *function, const char *text, unsigned int limit = 0,
                          unsigned int offset = 0);
     // Counts a connection or result that was opened (1) or closed (-1).

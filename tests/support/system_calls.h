@@ -4,10 +4,10 @@
 
 namespace kelo::test {
 
-// Watches TORVCExec, KELOFSMkdirP and KELOSystemdReload, beside PlatformCalls and on the same count of calls
-// that can fail; each is recorded with all of its arguments ("/bin/sh -c COMMAND", "FOLDER 0 1 -1 -1 777",
-// "SERVICE"). Commands and folders reach the platform, a reload never does. Part of the program that lists
-// system_calls.cpp among its sources.
+// Watches TORVCExec, KELOFSMkdirP and KELOSystemdReload, in addition to PlatformCalls and on the same count
+// of calls that can fail; each is recorded with all of its arguments ("/bin/sh -c COMMAND", "FOLDER 0 1 -1 -1
+// 777", "SERVICE"). Commands and folders reach the platform, a reload never does. Part of the program that
+// lists system_calls.cpp among its sources.
 class SystemCalls {
 public:
     // Reloads succeed from now on.

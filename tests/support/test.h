@@ -1,6 +1,6 @@
 #pragma once
 
-// What every test stands on: GoogleTest, the test ground, and the system's headers that nearly all of them
+// Common includes of the tests: GoogleTest, the fixtures, and the system's headers that nearly all of them
 // need.
 
 #include <fcntl.h>

@@ -1,4 +1,4 @@
-"""Servers on loopback that keep what they receive and can be told to misbehave."""
+"""Servers on loopback that keep what they receive and can be made to misbehave."""
 import http.server
 import socket
 import threading

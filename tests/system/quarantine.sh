@@ -1,11 +1,11 @@
 # shellcheck shell=bash
-# A database that is damaged under a running syslog-ng: the first statement that fails puts it aside, the
-# administrator is told, and syslog-ng goes on in a fresh database in which everything sent afterwards is found.
+# A database that is damaged under a running syslog-ng: the first statement that fails moves it away, the
+# administrator is notified, and syslog-ng continues in a fresh database that contains everything sent afterwards.
 source "$(dirname "$0")/support.sh"
 mkdir "$root/run"
 ln -s ../syslog-ng.pid "$root/run/syslog-ng.pid"
 
-# smash FILE OFFSET: makes what stands there no page of a database.
+# smash FILE OFFSET: destroys the page of a database at this offset.
 smash() { printf '\377\377\377\377\377\377\377\377' | dd of="$1" bs=1 seek="$2" conv=notrunc status=none; }
 
 # damage PART: overwrites what syslog-ng has written, in place. The first page stays readable as the head of a database.
@@ -14,7 +14,7 @@ damage() {
     case $1 in
     pages) for ((offset = 4096; offset < $(stat -c %s "$database"); offset += 4096)); do smash "$database" $offset; done ;;
     header) smash "$database" 100 ;; # where the schema begins
-    wal) # 32 bytes, then pages with 24 bytes before each, of which the first four tell its number
+    wal) # 32 bytes, then pages with 24 bytes before each, of which the first four are its number
         for ((offset = 32; offset < $(stat -c %s "$database-wal"); offset += 4120)); do
             [[ $(od -An -tx1 -j $offset -N 4 "$database-wal") == ' 00 00 00 01' ]] || smash "$database-wal" $((offset + 24))
         done ;;

@@ -1,5 +1,5 @@
 # shellcheck shell=bash
-# Messages sent to syslog-ng are rows and counts, and fire rules, whoever stores them: syslog-ng or the receiver.
+# Messages sent to syslog-ng are stored, counted and checked, with either of syslog-ng and the receiver storing them.
 # usage: receive.sh database|receiver
 source "$(dirname "$0")/support.sh"
 define "$root/kelosyslog.conf" kelo_store "$1"

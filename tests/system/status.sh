@@ -1,5 +1,5 @@
 # shellcheck shell=bash
-# kelosyslog status tells how a real syslog-ng is, with its counters, and notices when it is gone or suspended.
+# kelosyslog status shows the state of a real syslog-ng with its counters, and detects that it is gone or suspended.
 source "$(dirname "$0")/support.sh"
 export PATH=$KELO_BIN_DIR:$PATH
 mkdir -p "$root/var/log/kelolog"

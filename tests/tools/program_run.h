@@ -13,7 +13,7 @@ struct ProgramResult {
 
 struct ProgramRun {
     std::vector<std::string> arguments;
-    std::vector<std::string> environment = {}; // "NAME=value", beside the test's own
+    std::vector<std::string> environment = {}; // "NAME=value", in addition to the test's own
     std::string stdoutPath = {};               // an existing file that gets the output instead of `out`
 };
 

@@ -20,7 +20,7 @@ protected:
     }
     ProgramResult OnSample(Arguments arguments) const { return On(db_, std::move(arguments)); }
 
-    // The line that a failure is told by: exactly one, with the program's name.
+    // The line that reports a failure: exactly one, with the program's name.
     static std::string OnlyLine(const ProgramResult &result) {
         EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
         EXPECT_EQ(result.err.rfind("kelosyslog: ", 0), 0U) << result.err;
@@ -168,7 +168,7 @@ TEST_F(Program, FollowsNewLogsUntilItsBoundsEndIt) {
     InsertLogs(root_.File("fresh"), {SampleLog(0)});
     std::filesystem::rename(root_.File("fresh"), db_);
     EXPECT_EQ(nextLine(), "{\"id\":1}\n");
-    fclose(stream); // nobody reads any more
+    fclose(stream); // there is no reader any more
     runner.join();
     EXPECT_EQ(live.status, 0);
     EXPECT_EQ(live.err, "");
