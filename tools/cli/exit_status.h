@@ -2,7 +2,7 @@
 
 namespace kelo::tool {
 
-// What the program ends with. Scripts tell "no match" from "error" by it.
+// The exit status of the program. It distinguishes "no match" from "error" for scripts.
 enum ExitStatus : int {
     kExitFound = 0,
     kExitNothing = 1,

@@ -13,7 +13,7 @@
 namespace kelo::tool {
 namespace {
 
-// "--option=" has to give an empty value: CLI11 would take the next argument instead, which is dangerous
+// "--option=" must give an empty value: CLI11 would take the next argument instead, which is dangerous
 // where the option limits what a deletion removes.
 std::vector<std::string> SplitEmptyValues(int argc, const char *const *argv) {
     std::vector<std::string> arguments;

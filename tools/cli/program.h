@@ -7,10 +7,10 @@
 
 namespace kelo::tool {
 
-// What the command line asks for, as far as it does not belong to a single subcommand.
+// The parts of the command line that do not belong to a single subcommand.
 //
-// A subcommand lives in a file of its own and shows one function that adds it to `app`. The function declares
-// the options and leaves in `run` what is to be done when the subcommand was chosen:
+// A subcommand has its own file with one public function that adds it to `app`. The function declares the
+// options and sets the action that runs when the subcommand was chosen:
 //
 //     void AddCount(Program &program) {
 //         auto options = std::make_shared<Options>();
@@ -34,18 +34,18 @@ CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &n
                         const std::string &description, std::function<int()> run);
 
 // Adds an option whose values arrive as they were typed, one per occurrence; none is split or interpreted. An
-// empty value is a usage error: it is rather an unset shell variable than a wish.
+// empty value is a usage error, because it probably is an unset shell variable.
 CLI::Option *AddTexts(CLI::App &command, const std::string &names, std::vector<std::string> &values,
                       const std::string &typeName, const std::string &description);
 
-// The same for an option that may stand only once.
+// The same for an option that may occur only once.
 CLI::Option *AddText(CLI::App &command, const std::string &names, std::string &value,
                      const std::string &typeName, const std::string &description);
 
 // Reads a whole number from `minimum` to `maximum`; throws UsageError naming `option` and `text` otherwise.
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum);
 
-// One line on the standard error, with the program's name in front and control bytes made visible.
+// One line on the standard error, after the program's name, with control bytes made visible.
 void PrintMessage(const std::string &text);
 
 // Reads the command line, runs the chosen subcommand and maps every failure to an ExitStatus and one line.

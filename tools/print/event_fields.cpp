@@ -6,7 +6,7 @@
 namespace kelo::tool {
 namespace {
 
-// An event travels as a log: its level's name as `tag`, its user and text under their own names.
+// An event is passed as a record: its level's name as `tag`, its user and text under their own names.
 constexpr std::array<RecordField, 4> kEventFields = {{
     {"id", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.id); }},
     {"level", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.tag; }},

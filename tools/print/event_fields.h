@@ -5,7 +5,7 @@
 
 namespace kelo::tool {
 
-// An event in the shape that a RecordFormatter prints with EventFields: id, time, level, user and event.
+// An event as the record that a RecordFormatter prints with EventFields: id, time, level, user and event.
 _SYSLOG_LOG_DATA_tag RecordOfEvent(const Event &event);
 RecordFields EventFields();
 

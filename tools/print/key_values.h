@@ -8,8 +8,7 @@
 
 namespace kelo::tool {
 
-// What a command found out or did: named values, in order, as lines of a name and a value or as one JSON
-// object.
+// The result of a command: named values, in order, as lines of a name and a value or as one JSON object.
 class KeyValues {
 public:
     // `number` and `yes` as JSON has them; an unknown value is null there and left out of the lines.
@@ -17,10 +16,10 @@ public:
     void Add(const std::string &name, int64_t number);
     void AddBool(const std::string &name, bool yes);
     void AddUnknown(const std::string &name);
-    // An array; in the lines one line each.
+    // An array; printed as one line for each element.
     void AddList(const std::string &name, const std::vector<std::string> &texts);
 
-    // The forms that Render knows: Text and Json.
+    // The formats of Render: Text and Json.
     std::string Render(OutputFormat format) const;
 
 private:

@@ -118,7 +118,7 @@ void Output::Flush() {
 }
 
 void Output::Wait(int timeoutMs) const {
-    pollfd waiting{File(), 0, 0}; // no event asked for: only a failure ends the wait
+    pollfd waiting{File(), 0, 0}; // no event requested: only a failure ends the wait
     if (poll(&waiting, 1, timeoutMs) > 0 && (waiting.revents & (POLLERR | POLLHUP | POLLNVAL)) != 0)
         throw OutputClosed();
 }

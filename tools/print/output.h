@@ -14,13 +14,13 @@ enum class ColourMode { Auto, Always, Never };
 // The mode of this name ("auto", "always", "never"). Throws UsageError naming --color.
 ColourMode ParseColourMode(const std::string &name);
 
-// Whether to colour: "auto" means on a terminal that is not "dumb", unless the environment holds NO_COLOR
-// with a value (https://no-color.org).
+// Whether to colour: "auto" means on a terminal that is not "dumb", unless the environment has NO_COLOR with
+// a value (https://no-color.org).
 bool WantsColour(ColourMode mode, bool isTerminal, const char *noColor, const char *term);
 // The same for the standard output and environment of the process.
 bool WantsColour(ColourMode mode);
 
-// The standard output: buffered, with a pager in front where one is wanted, and with honest failures.
+// The standard output: buffered, with a pager if one is wanted. Every failure is reported.
 class Output {
 public:
     // With `mayPage` the first text starts the pager (environment PAGER, else "less" with FRX), provided that
@@ -30,14 +30,14 @@ public:
     Output(const Output &) = delete;
     Output &operator=(const Output &) = delete;
 
-    // Throws OutputClosed when the reader went away and OutputError when the text cannot be written.
+    // Throws OutputClosed when the reader has closed its end and OutputError when the text cannot be written.
     void Write(std::string_view text);
     void Flush();
 
-    // Waits up to `timeoutMs`, shorter when the reader goes away, and then throws OutputClosed.
+    // Waits up to `timeoutMs`. Throws OutputClosed as soon as the reader closes its end.
     void Wait(int timeoutMs) const;
 
-    // Writes what is left and waits until the user leaves the pager.
+    // Writes the rest and waits until the user leaves the pager.
     void Finish();
 
 private:

@@ -22,7 +22,7 @@ std::string LevelOf(const Log &log) {
     return g_MappingSyslogPrior[log.prio];
 }
 
-// "llevel" of table "logs" says the same as "prio", which stands for both.
+// "llevel" of table "logs" is the same as "prio", which is shown for both.
 constexpr std::array<RecordField, 21> kFields = {{
     {"id", true, kAll, 0, [](const Log &log) { return std::to_string(log.id); }},
     {"time", false, kAll, kAll, [](const Log &) { return std::string(); }},

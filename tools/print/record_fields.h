@@ -9,19 +9,19 @@
 
 namespace kelo::tool {
 
-// One thing that can be told about a log, under the name of its column. "time" is no column: it is `utcsec`
-// written out or, in tables without it, `ldate` and `ltime`.
+// One printable field of a record, with the name of its column. "time" is not a column: it is `utcsec` as
+// text or, in tables without it, `ldate` and `ltime`.
 struct RecordField {
     const char *name;
     bool isNumber;
     unsigned tables;  // bit per TableKind: the tables that have it
-    unsigned summary; // bit per TableKind: the tables for whose readable form it is chosen
+    unsigned summary; // bit per TableKind: the tables that show it by default
     std::string (*value)(const _SYSLOG_LOG_DATA_tag &log);
 };
 
 using RecordFields = std::vector<const RecordField *>;
 
-// All fields of a table, each thing once, or the few that people read.
+// All fields of a table without duplicates, or those that are shown by default.
 RecordFields AllFields(TableKind kind);
 RecordFields SummaryFields(TableKind kind);
 
@@ -32,11 +32,11 @@ RecordFields ParseFields(const std::string &names, TableKind kind);
 // Whether the field is "time", whose text depends on the time zone and on the form (RecordTime).
 bool IsTime(const RecordField &field);
 
-// The time of a log: `local` of its `utcsec`, or its own `ldate` and `ltime` in a table without `utcsec`.
+// The time of a record: `local` of its `utcsec`, or its own `ldate` and `ltime` in a table without `utcsec`.
 std::string RecordTime(const _SYSLOG_LOG_DATA_tag &log, TableKind kind, const TimeFormat &format,
                        std::string (TimeFormat::*form)(int64_t) const);
 
-// What people call the message: the text, or for a transfer what was done with which file.
+// The message: the text, or for a transfer the action and the file.
 std::string RecordMessage(const _SYSLOG_LOG_DATA_tag &log, TableKind kind);
 
 } // namespace kelo::tool

@@ -62,7 +62,7 @@ public:
             widths_.push_back(CharacterCount(field->name));
     }
 
-    // The heading waits for the first log, so that nothing found prints nothing.
+    // The heading waits for the first record, so that an empty result prints nothing.
     void Add(const Log &log, std::string &out) override {
         std::vector<std::string> cells;
         for (const RecordField *field : Layout().fields)
@@ -77,7 +77,7 @@ public:
 
 private:
     void Widen(const std::vector<std::string> &cells) {
-        constexpr size_t kWidest = 40; // one odd value must not push all others off the screen
+        constexpr size_t kWidest = 40; // a single long value must not push all others off the screen
         for (size_t i = 0; i < cells.size(); ++i)
             widths_[i] = std::max(widths_[i], std::min(CharacterCount(cells[i]), kWidest));
     }

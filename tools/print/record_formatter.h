@@ -17,27 +17,27 @@ OutputFormat ParseOutputFormat(const std::string &name);
 struct RecordLayout {
     OutputFormat format = OutputFormat::Text;
     TableKind kind = TableKind::Logs;
-    RecordFields fields; // empty for the format's own choice
+    RecordFields fields; // empty for the format's default
     bool hasHeader = true;
     bool hasColour = false;
     bool inUtc = false;
 };
 
-// Turns logs into text, one by one as they come:
+// Formats records as text, one by one:
 //
-//     text    columns under a heading, each as wide as its widest value so far; one line for a log
+//     text    columns under a heading, each as wide as its widest value so far; one line per record
 //     short   "Jan 02 10:11:12 host program: message"
 //     json    one array of objects
 //     jsonl   one object on each line
 //     csv     RFC 4180 with a heading
 //
-// Text and short make control characters visible (EscapeForTerminal); JSON is valid whatever bytes a log
-// holds; CSV carries them unchanged.
+// Text and short make control characters visible (EscapeForTerminal); JSON is valid with any bytes in a
+// record; CSV has them unchanged.
 class RecordFormatter {
 public:
     virtual ~RecordFormatter() = default;
 
-    // Each appends to `out`. Begin comes first and End last, also when there is no log.
+    // Each appends to `out`. Call Begin first and End last, also without a record.
     virtual void Begin(std::string &) {}
     virtual void Add(const _SYSLOG_LOG_DATA_tag &log, std::string &out) = 0;
     virtual void End(std::string &) {}

@@ -81,7 +81,7 @@ std::string StatisticsTable::Plot(size_t bar, size_t width, bool hasHeader, bool
     return out;
 }
 
-// Numbers stand at the right of their column, all else at the left.
+// Numbers are aligned to the right, all else to the left.
 std::vector<std::string> StatisticsTable::TextLines(bool hasHeader) const {
     std::vector<std::vector<std::string>> table;
     if (hasHeader && !rows_.empty()) {

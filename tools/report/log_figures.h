@@ -11,12 +11,12 @@
 
 namespace kelo::tool {
 
-// What a chart tells apart.
+// The categories of a chart.
 enum class SeverityClass { Errors, Warnings, Information, Debug };
 constexpr size_t kSeverityClasses = 4;
 constexpr size_t kSeverities = 8;
 
-// Equal spans of time, laid so that they begin at round times of the process's time zone.
+// Equal spans of time that begin at round times of the process's time zone.
 struct TimeGrid {
     int64_t origin = 0;   // begin of the first span, seconds since the epoch
     int64_t widthSec = 1; // of a span
@@ -36,25 +36,25 @@ struct Period {
     int64_t to = 0;
 };
 
-// What a table "logs" holds in a period.
+// The figures of a table "logs" in a period.
 struct LogFigures {
     TimeGrid grid;
     std::vector<std::array<uint64_t, kSeverityClasses>> spans; // by span of the grid
     std::array<uint64_t, kSeverities> severities{};            // by severity
-    uint64_t otherSeverities = 0;                              // words that are no severity
-    std::vector<std::pair<std::string, uint64_t>> devices;     // the top ones, most logs first
+    uint64_t otherSeverities = 0;                              // words that are not a severity
+    std::vector<std::pair<std::string, uint64_t>> devices;     // the top ones, most records first
     uint64_t deviceCount = 0;
     uint64_t total = 0;
 };
 
-// The period from `since` to `until`, each replaced by the time of the oldest or newest log where it is not
+// The period from `since` to `until`, each replaced by the time of the oldest or newest record if it is not
 // given; none for an empty table.
 std::optional<Period> LogPeriod(const LogTable &table, std::optional<int64_t> since,
                                 std::optional<int64_t> until);
 
-// Reads the figures in two statements, which group the rows inside the database: less than a second a
-// million rows. `isWhole` tells that the period leaves no log out, which saves looking. Both functions throw
-// DatabaseError.
+// Reads the figures in two statements, which group the rows inside the database: less than a second per
+// million rows. `isWhole` says that the period includes every record, which saves a condition. Both functions
+// throw DatabaseError.
 LogFigures ReadLogFigures(const LogTable &table, const Period &period, bool isWhole, size_t topDevices);
 
 } // namespace kelo::tool

@@ -23,7 +23,7 @@ constexpr size_t kLongestText = 2000; // bytes of one cell
 constexpr std::array<const char *, kSeverityClasses> kClassNames = {"errors", "warnings", "information",
                                                                     "debug"};
 
-// A text from a database as one line without anything that could act on the page.
+// A text from a database as one line without markup.
 std::string CellText(const std::string &text) {
     std::string visible = EscapeForTerminal(text);
     if (visible.size() <= kLongestText)
@@ -120,7 +120,7 @@ public:
         List labels;
         for (size_t i = 0; i < kTimeLabels; ++i) {
             const std::string moment = time.Plain(grid_.Begin(i * grid_.count / kTimeLabels));
-            Data label; // "2020-01-02 10:11:12" without what says nothing here
+            Data label; // "2020-01-02 10:11:12" without parts that are redundant here
             label.set("day", moment.substr(5, 5));
             label.set("time", grid_.widthSec < 86400 ? moment.substr(11, grid_.widthSec < 60 ? 8 : 5) : "");
             labels.push_back(label);
@@ -171,7 +171,7 @@ Data AccountingChart(const Report &report, const TimeFormat &time) {
     return chart.Finish(time);
 }
 
-// The strip under the chart: one mark for a span with events, in the colour of the worst.
+// The strip under the chart: one mark per span with events, in the colour of the worst.
 List EventMarks(const Report &report, const TimeFormat &time) {
     struct Mark {
         uint64_t count = 0;

@@ -11,17 +11,17 @@
 
 namespace kelo::tool {
 
-// Counts of the accounting database, taken as the logs were received.
+// Counts of the accounting database, taken when the records were received.
 struct AccountingFigures {
-    std::vector<int64_t> peaks; // most logs of a sample, by span of the grid of LogFigures; empty for none
+    std::vector<int64_t> peaks; // largest sample, by span of the grid of LogFigures; empty for none
     std::map<std::string, uint64_t> devices; // with the highest counts, over all time
 };
 
-// Everything that a report shows. Texts are as they came from the databases.
+// The content of a report. Texts are unchanged from the databases.
 struct Report {
     std::string logDatabase;
     std::string eventDatabase;
-    std::string program; // name and version of who writes it
+    std::string program; // name and version of the program
     int64_t now = 0;
     Period period;
     LogFigures logs;

@@ -6,8 +6,8 @@
 
 namespace kelo::tool {
 
-// One notification of the spool; docs/notification-spool.md describes its file. The texts are as they stand
-// there: whoever sends them on makes them safe for the place.
+// One notification of the spool; docs/notification-spool.md describes its file. The texts are unchanged: a
+// sender must escape them for their use.
 struct Entry {
     std::string id;
     int64_t time = 0; // seconds since the epoch
@@ -23,7 +23,7 @@ struct Entry {
 bool IsEntryId(const std::string &text);
 
 // Reads an entry. Throws std::runtime_error with the reason when it is damaged, is of a higher version, or
-// does not bear this id.
+// has another id.
 Entry ParseEntry(const std::string &content, const std::string &id);
 
 } // namespace kelo::tool

@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// How far one thing that may fail has come: the delivery to a target, or the use of a channel.
+// The state of an operation that may fail: the delivery to a target, or the use of a channel.
 struct Attempts {
     bool isDone = false;
     int failures = 0;
@@ -14,10 +14,10 @@ struct Attempts {
     std::string reason; // of the last failure
 };
 
-// Notes a failure at `now`. The next attempt follows after 15 s, 30 s, one minute and so on, up to an hour.
+// Records a failure at `now`. The next attempt follows after 15 s, 30 s, one minute and so on, up to an hour.
 void NoteFailure(Attempts &attempts, const std::string &reason, int64_t now);
 
-// What is recorded of an entry beside it, or of all channels in common.
+// The delivery record of an entry, or the common record of all channels.
 struct Progress {
     std::map<std::string, Attempts> targets; // "mail:admin@example.org", "push_mobile"; or names of channels
     int64_t since = 0;                       // when an administrator asked for a new try, 0 for never

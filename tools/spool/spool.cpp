@@ -84,7 +84,7 @@ Progress Spool::ReadRecord(const std::string &name) const {
     try {
         return content ? ParseProgress(*content) : Progress();
     } catch (const std::runtime_error &) {
-        return Progress(); // rather told twice than not at all
+        return Progress(); // better delivered twice than not at all
     }
 }
 
@@ -138,7 +138,7 @@ void Spool::CleanUp(int64_t now) const {
         if (lstat(File("tmp/" + name).c_str(), &status) == 0 && status.st_mtime < now - kTemporarySec)
             unlink(File("tmp/" + name).c_str());
     }
-    // First `failed`, then `new`: an entry on its way back is seen in one of them.
+    // First `failed`, then `new`: an entry that is moved back is found in one of them.
     for (const std::string &id : Ids("state")) {
         if (!Exists(File("failed/" + id + ".json")) && !Exists(File("new/" + id + ".json")))
             unlink(File("state/" + id + ".json").c_str());

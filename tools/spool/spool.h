@@ -15,13 +15,13 @@ struct SpoolError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// The entry is not there any more.
+// The entry does not exist any more.
 struct EntryGone : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// The folders of docs/notification-spool.md below `root`. What changes them is on the disk when the call
-// returns; every function throws SpoolError when that cannot be done.
+// The folders of docs/notification-spool.md below `root`. A change is on the disk when the call returns;
+// every function throws SpoolError if that fails.
 class Spool {
 public:
     explicit Spool(const std::string &root) : path_(root + "/var/spool/kelonotify") {}
@@ -32,11 +32,11 @@ public:
     // Creates the folders that are missing.
     void CreateFolders() const;
 
-    // Makes this process the one that delivers, for as long as the handle lives; an empty handle when
-    // another one does.
+    // Makes this process the one that delivers, during the lifetime of the handle; an empty handle if another
+    // one does.
     FileHandle Lock() const;
 
-    // The ids in `new/` and in `failed/`, oldest first. A folder that is missing holds none.
+    // The ids in `new/` and in `failed/`, oldest first. A missing folder has none.
     std::vector<std::string> NewIds() const { return Ids("new"); }
     std::vector<std::string> FailedIds() const { return Ids("failed"); }
 
@@ -44,7 +44,7 @@ public:
     Entry ReadNew(const std::string &id) const { return ReadEntry("new/" + id + ".json", id); }
     Entry ReadFailed(const std::string &id) const { return ReadEntry("failed/" + id + ".json", id); }
 
-    // What is recorded of an entry; empty when nothing is, or the record is damaged.
+    // The delivery record of an entry; empty if there is none or it is damaged.
     Progress ReadProgress(const std::string &id) const { return ReadRecord("state/" + id + ".json"); }
     Progress ReadFailedProgress(const std::string &id) const { return ReadRecord("failed/" + id + ".state"); }
     void SaveProgress(const std::string &id, const Progress &progress) const;
@@ -55,17 +55,17 @@ public:
 
     // The entry was delivered: removes it, then its record.
     void Finish(const std::string &id) const;
-    // Puts the entry and its record into `failed/`.
+    // Moves the entry and its record to `failed/`.
     void GiveUp(const std::string &id, const Progress &progress) const;
-    // Puts a given-up entry back into `new/`; what was delivered of it stays delivered. False when there is
-    // no such entry.
+    // Moves a given-up entry back to `new/`; its completed deliveries stay recorded. False if there is no
+    // such entry.
     bool Retry(const std::string &id, int64_t now) const;
 
-    // Asks the deliverer to try everything at once; TakeRetryRequest tells it, once.
+    // Asks the deliverer to try everything immediately; TakeRetryRequest returns the request once.
     void RequestRetry() const;
     bool TakeRetryRequest() const;
 
-    // Removes records whose entries are gone, and temporary files that a crash left behind a day ago.
+    // Removes records whose entries are gone, and temporary files that a crash left a day ago.
     void CleanUp(int64_t now) const;
 
 private:

@@ -11,7 +11,7 @@
 namespace kelo::tool {
 namespace {
 
-// Logs a second of the `seconds` that end with `newest`.
+// Records a second in the `seconds` that end with `newest`.
 double MeanRate(const std::string &path, int64_t newest, int64_t seconds) {
     int64_t logs = 0;
     ReadEps(path, newest - seconds + 1, newest, [&](const SYSLOG_LOG_EPS &sample) { logs += sample.eps; });
@@ -21,7 +21,7 @@ double MeanRate(const std::string &path, int64_t newest, int64_t seconds) {
 } // namespace
 
 AccountingStatus GatherAccounting(const std::string &path, int devices) {
-    // The library's connections are not the last to be closed, so that none of them has to clean up.
+    // Keeps the library's connections from being the last to close, so that none of them has to clean up.
     const ReadOnlyQuery open({path, "eps"}, std::chrono::milliseconds(150));
     AccountingStatus status;
     if (const auto stored = StoredStamps(path, {0, std::numeric_limits<int32_t>::max()})) {

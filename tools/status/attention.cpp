@@ -1,4 +1,4 @@
-// What of a status an administrator should see to.
+// The parts of a status that need attention.
 
 #include "status/figures.h"
 #include "status/server_status.h"
@@ -45,8 +45,8 @@ void LookAtDatabases(const ServerStatus &status, Lines &lines) {
     using State = DatabaseStatus::State;
     const std::string &ofReceiver = status.receiver.told.database;
     for (const DatabaseStatus &database : status.databases) {
-        // Accounting and events begin when there is something to write. The working log is missed unless the
-        // receiver stores elsewhere.
+        // The accounting and event databases are created with their first content. The working log must exist
+        // unless the receiver stores elsewhere.
         const bool isMissed = (database.name == "logs" && ofReceiver.empty()) || database.path == ofReceiver;
         if (database.state == State::Damaged)
             lines.push_back("database " + database.name + " is damaged: " + database.problem);

@@ -7,16 +7,16 @@
 
 namespace kelo::tool {
 
-// What became of a question to a syslog-ng through its control socket.
+// The result of a request to a syslog-ng through its control socket.
 struct ControlAnswer {
-    int connectError = 0; // errno of the connection; 0 when somebody listens
-    pid_t pid = 0;        // of who listens; 0 when nobody does
+    int connectError = 0; // errno of the connection; 0 when a process listens
+    pid_t pid = 0;        // of the listening process; 0 when there is none
     std::string text;     // the answer, without the line "." that ends it
-    std::string problem;  // why there is no whole answer; "" when there is
+    std::string problem;  // why the answer is incomplete; "" when it is complete
 };
 
 // Sends one command ("STATS") to the control socket at `path`, which may be longer than a socket's address,
-// and reads the answer. Takes `timeout` at the most, whatever the other side does.
+// and reads the answer. Takes `timeout` at most in any case.
 ControlAnswer AskControlSocket(const std::string &path, const std::string &command,
                                std::chrono::milliseconds timeout);
 

@@ -44,8 +44,8 @@ std::optional<int64_t> LocalMoment(const std::string &text) {
     return std::mktime(&parts);
 }
 
-// Row numbers are read at both ends of the table, however many rows it has. Where many lie between them, the
-// rows are not counted: that would read a whole index.
+// The row numbers are read at both ends of the table. If many are between them, the rows are not counted:
+// that would read a whole index.
 void ReadRows(const ReadOnlyQuery &database, DatabaseStatus &status) {
     const auto ends = database.FirstRow("SELECT (SELECT min(rowid) FROM " + status.table +
                                             ") AS low, (SELECT max(rowid) FROM " + status.table + ") AS high",
@@ -74,7 +74,7 @@ void ReadTransferTimes(const ReadOnlyQuery &database, DatabaseStatus &status) {
 
 void ReadTimes(const ReadOnlyQuery &database, DatabaseStatus &status) {
     const std::string column = status.table == "eps" ? "stamp" : status.table == "log" ? "time" : "utcsec";
-    // Each of the two has an end of the index to itself.
+    // Each of the two uses one end of the index.
     const auto row =
         database.FirstRow("SELECT (SELECT min(" + column + ") FROM " + status.table +
                               ") AS first, (SELECT max(" + column + ") FROM " + status.table + ") AS last",

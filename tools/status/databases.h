@@ -8,7 +8,8 @@
 namespace kelo::tool {
 
 struct DatabaseStatus {
-    // Damaged: SQLite says so of what was looked at. Unreadable: all other reasons, told by `problem`.
+    // Damaged: SQLite reported it for the parts that were read. Unreadable: any other reason, given by
+    // `problem`.
     enum class State { Good, Missing, Locked, Damaged, Unreadable };
 
     std::string name; // "logs", "accounting", "events", a name of --log, or "receive"
@@ -18,11 +19,11 @@ struct DatabaseStatus {
     std::string problem;          // "" when the state is good
     int64_t size = 0;             // bytes
     int64_t walSize = 0;          // bytes of the write-ahead log
-    std::optional<int64_t> rows;  // nothing when it cannot be told, as the next
-    bool isEstimate = false;      // `rows` counts the rows that were deleted in between too
+    std::optional<int64_t> rows;  // nothing when unknown, as the next
+    bool isEstimate = false;      // `rows` includes rows that were deleted in between
     std::optional<int64_t> first; // seconds since the epoch
     std::optional<int64_t> last;
-    std::optional<int64_t> quarantined; // bytes of PATH.corrupt, where that is there
+    std::optional<int64_t> quarantined; // bytes of PATH.corrupt, if it exists
 };
 
 struct ArchiveStatus {
@@ -32,11 +33,11 @@ struct ArchiveStatus {
     std::string problem;
 };
 
-// The working log, the accounting and the event database below `root`; the transfer logs that are there; and
+// The working log, the accounting and the event database below `root`; the transfer logs that exist; and
 // `others`, which are log databases by their absolute paths, unless they are one of these.
 //
-// Reads a few pages of each, waits neither for a writer nor for anything else longer than a fraction of a
-// second, and changes nothing.
+// Reads a few pages of each, waits for a writer or anything else no longer than a fraction of a second, and
+// changes nothing.
 std::vector<DatabaseStatus> GatherDatabases(const std::string &root, const std::vector<std::string> &others);
 
 // The folder of the archives below `root`; an empty status when there is none.

@@ -12,7 +12,7 @@ std::string ProcFile(pid_t pid, const char *name) {
     return "/proc/" + std::to_string(pid) + "/" + name;
 }
 
-// When the machine was started, in seconds since the epoch; 0 where that cannot be read.
+// When the machine was started, in seconds since the epoch; 0 if that cannot be read.
 int64_t BootTime() {
     std::ifstream file("/proc/stat");
     for (std::string line; std::getline(file, line);) {
@@ -33,7 +33,7 @@ std::string ProcessName(pid_t pid) {
 int64_t ProcessStart(pid_t pid) {
     std::string line;
     std::getline(std::ifstream(ProcFile(pid, "stat")), line);
-    // The name in parentheses may hold anything; field 22 is the twentieth behind it.
+    // The name in parentheses may contain any byte; field 22 is the twentieth after it.
     const size_t end = line.rfind(')');
     if (end == std::string::npos)
         return 0;

@@ -7,7 +7,7 @@
 
 namespace kelo::tool {
 
-// What the kernel tells anybody of a process, from /proc (proc(5)).
+// Public information about a process, from /proc (proc(5)).
 
 // The name of a running process, of which the kernel keeps 15 characters; "" when there is none.
 std::string ProcessName(pid_t pid);

@@ -13,7 +13,7 @@ constexpr const char *kProgram = "kelosyslog";
 constexpr int64_t kSilentSec = 60;
 constexpr int64_t kClockSlackSec = 5; // the kernel rounds, and clocks are set
 
-// Whether the process is there and not another one that got its number later.
+// Whether the process exists and is not another one that got its number later.
 bool IsAlive(const ReceiverState &told) {
     const auto pid = static_cast<pid_t>(told.pid);
     return ProcessName(pid) == kProgram && ProcessStart(pid) <= told.started + kClockSlackSec;

@@ -7,10 +7,10 @@
 
 namespace kelo::tool {
 
-// What has become of `kelosyslog receive`.
+// The state of `kelosyslog receive`.
 struct ReceiverStatus {
-    // None: it never ran here. Silent: it runs, and has not told of itself for a minute. Died: it is gone
-    // without having ended.
+    // None: it never ran here. Silent: it runs, but its state file is older than a minute. Died: it disappeared
+    // without ending.
     enum class State { None, Running, Silent, Stopped, Died, Unreadable };
     State state = State::None;
     std::string path; // of its state file

@@ -7,8 +7,8 @@
 
 namespace kelo::tool {
 
-// The newest events of the event database at `path`, newest first. Unlike ReadEvents it puts no damaged
-// database aside. Throws DatabaseError.
+// The newest events of the event database at `path`, newest first. Unlike ReadEvents it does not
+// quarantine a damaged database. Throws DatabaseError.
 std::vector<Event> ReadRecentEvents(const std::string &path, int limit);
 
 } // namespace kelo::tool

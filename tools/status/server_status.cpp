@@ -19,7 +19,7 @@ DatabaseStatus *GoodDatabase(ServerStatus &status, const std::string &name) {
     return nullptr;
 }
 
-// Runs `read` on the database of this name if it is good, and notes in its status what then went wrong.
+// Runs `read` on the database of this name if it is good, and records a failure in its status.
 void WithDatabase(ServerStatus &status, const std::string &name, auto read) {
     DatabaseStatus *database = GoodDatabase(status, name);
     if (database == nullptr)

@@ -15,7 +15,7 @@
 
 namespace kelo::tool {
 
-// All that `kelosyslog status` tells, of one moment.
+// The data of `kelosyslog status` at one moment.
 struct ServerStatus {
     int64_t time = 0; // seconds since the epoch, as all times
     SyslogNgStatus syslogNg;
@@ -27,7 +27,7 @@ struct ServerStatus {
     std::vector<Event> events; // newest first
     std::vector<VolumeStatus> volumes;
 
-    // What an administrator should see to, one line each, in the order of the screen; empty when all is well.
+    // What needs attention, one line each, in the order of the screen; empty for nothing.
     std::vector<std::string> attention;
 };
 
@@ -37,7 +37,7 @@ struct StatusOptions {
     std::chrono::milliseconds timeout{2000}; // with syslog-ng
 };
 
-// Asks everybody. Throws nothing but std::bad_alloc: what cannot be told is part of the status.
+// Collects everything. Throws nothing but std::bad_alloc: what is unknown is part of the status.
 ServerStatus GatherStatus(const StatusOptions &options);
 
 // What needs attention of a status whose other members are filled.

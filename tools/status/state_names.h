@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// The words for states on the screen and in JSON: "running", "silent", "stopped", "unknown"; "none",
+// The names of states on the screen and in JSON: "running", "silent", "stopped", "unknown"; "none",
 // "running", "silent", "stopped", "died", "unreadable"; "good", "missing", "locked", "damaged", "unreadable".
 const char *StateName(SyslogNgStatus::State state);
 const char *StateName(ReceiverStatus::State state);

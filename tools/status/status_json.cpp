@@ -15,7 +15,7 @@ Value Number(int64_t number) {
 Value Count(uint64_t number) {
     return Json::UInt64{number};
 }
-// A time or a process, of which 0 says that it is unknown.
+// A time or a process; 0 means unknown.
 Value Known(int64_t number) {
     return number != 0 ? Number(number) : Value();
 }
@@ -183,7 +183,7 @@ std::string StatusJson(const ServerStatus &status) {
     json["volumes"] = ToArray(status.volumes);
     Json::StreamWriterBuilder builder;
     builder["indentation"] = "";
-    // Texts are ASCII then, with U+FFFD for what is no UTF-8.
+    // Texts are then ASCII, with U+FFFD for bytes that are not UTF-8.
     builder["emitUTF8"] = false;
     builder["precision"] = 2;
     builder["precisionType"] = "decimal";

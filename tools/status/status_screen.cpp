@@ -49,7 +49,7 @@ void AddText(Lines &lines, const std::string &text, const char *colour = kPlain)
     lines.push_back({"  " + EscapeForTerminal(text), colour});
 }
 
-// The lines of a table, of which each row has a colour.
+// The lines of a table with a colour for each row.
 void AddTable(Lines &lines, const StatisticsTable &table, const std::vector<const char *> &colours) {
     std::istringstream text(table.Write(OutputFormat::Text, true));
     std::string line;
@@ -206,7 +206,7 @@ void AddVolumes(Lines &lines, const std::vector<VolumeStatus> &volumes) {
     }
 }
 
-// The first bytes of the text that make up so many characters.
+// The first so many characters of the text.
 size_t BytesOf(const std::string &text, size_t characters) {
     size_t at = 0;
     for (; at < text.size() && characters > 0; --characters) {
@@ -217,7 +217,7 @@ size_t BytesOf(const std::string &text, size_t characters) {
     return at;
 }
 
-// A point that needs attention, in as many lines as it takes.
+// A point that needs attention, in as many lines as necessary.
 void AddPoint(Lines &lines, const std::string &point, size_t width) {
     std::string rest = "! " + EscapeForTerminal(point);
     constexpr size_t kLeast = 20;

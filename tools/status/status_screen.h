@@ -13,9 +13,9 @@ struct ScreenLayout {
     bool hasColour = false;
 };
 
-// The status as people read it, in lines that end in a line feed: first what needs attention, then a section
-// for each subject. Times are in the time zone of the process. What does not fit is cut off, except from what
-// needs attention, which is broken into lines.
+// The status in readable form, in lines that end in a line feed: first what needs attention, then a section
+// for each subject. Times are in the time zone of the process. Long lines are cut, except those of what
+// needs attention, which are wrapped.
 std::string RenderStatus(const ServerStatus &status, const ScreenLayout &layout);
 
 } // namespace kelo::tool

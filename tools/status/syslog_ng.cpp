@@ -15,12 +15,12 @@ namespace kelo::tool {
 namespace {
 
 constexpr const char *kControl = "/var/lib/syslog-ng/syslog-ng.ctl";
-// The first is the init script's, the second the daemon's own.
+// The first is the init script's, the second the daemon's default.
 constexpr const char *kPidFiles[] = {"/run/syslog-ng.pid", "/var/lib/syslog-ng/syslog-ng.pid"};
 constexpr const char *kProgram = "syslog-ng";
 
-// The fields of a line; one that holds a semicolon stands between double quotes, with backslashes in front of
-// those that belong to it.
+// The fields of a line; one with a semicolon is in double quotes, with a backslash before each quote of its
+// own.
 std::vector<std::string> SplitLine(const std::string &line) {
     std::vector<std::string> fields(1);
     bool isQuoted = false;
@@ -65,7 +65,7 @@ SyslogNgStatus::State StateOf(const ControlAnswer &answer, pid_t pid) {
     using State = SyslogNgStatus::State;
     if (answer.connectError == 0)
         return answer.problem.empty() ? State::Running : State::Silent;
-    if (answer.connectError == EAGAIN) // nobody takes the connections that wait
+    if (answer.connectError == EAGAIN) // no process accepts the waiting connections
         return State::Silent;
     if (pid != 0)
         return State::Running;
@@ -114,7 +114,7 @@ SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &contro
     SyslogNgStatus status;
     status.control = control.empty() ? root + kControl : control;
     const ControlAnswer answer = AskControlSocket(status.control, "STATS", timeout);
-    // Another control socket belongs to another syslog-ng than the pid files do.
+    // Another control socket belongs to another syslog-ng than the pid files.
     const pid_t fromFile = control.empty() ? PidFromFile(root) : 0;
     status.pid = answer.pid != 0 ? answer.pid : fromFile;
     status.state = StateOf(answer, status.pid);

@@ -10,7 +10,7 @@
 
 namespace kelo::tool {
 
-// The counters of one of syslog-ng's sources or destinations since it was started. One that syslog-ng does
+// The counters of one of syslog-ng's sources or destinations since its start. A counter that syslog-ng does
 // not keep is 0.
 struct SyslogNgCounters {
     std::string driver;   // "dst.sql"; "source" for all drivers of a source
@@ -20,15 +20,15 @@ struct SyslogNgCounters {
     uint64_t written = 0;
     uint64_t dropped = 0;
     uint64_t queued = 0;
-    uint64_t memory = 0; // bytes of what is queued in memory
+    uint64_t memory = 0; // bytes queued in memory
 };
 
 // Reads the answer to "STATS" (syslog-ng-ctl(1)): the sources as a whole and the drivers of destinations, in
-// the order of their ids. Counters of what was removed by a reload or a closed connection are left out.
+// the order of their ids. Counters of objects that a reload or a closed connection removed are left out.
 std::vector<SyslogNgCounters> ParseSyslogNgCounters(const std::string &text);
 
 struct SyslogNgStatus {
-    // Running: it answers. Silent: it listens and does not answer. Unknown: nobody may ask it.
+    // Running: it answers. Silent: it listens and does not answer. Unknown: no permission to ask.
     enum class State { Running, Silent, Stopped, Unknown };
     State state = State::Unknown;
     std::string control; // the path of its control socket
@@ -42,8 +42,8 @@ struct SyslogNgStatus {
     uint64_t Dropped() const;
 };
 
-// Asks the syslog-ng whose files stand below `root`, as Debian lays them, or the one with this control socket
-// where `control` is not empty. Who may not use the socket learns from the pid file whether it runs.
+// Asks the syslog-ng whose files are below `root`, in Debian's places, or the one with this control socket if
+// `control` is not empty. Without permission for the socket, the pid file shows whether it runs.
 SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
                               std::chrono::milliseconds timeout);
 

@@ -13,7 +13,7 @@ namespace {
 constexpr const char *kFolders[] = {"/var/log/kelolog", "/var/log/kelolog/archive", "/var/lib/syslog-ng",
                                     "/var/spool/kelonotify", "/usr/kelo/etc"};
 
-// The folder, or the nearest one above it that is there.
+// The folder, or the nearest existing one above it.
 std::string ExistingFolder(const std::string &path, struct stat &status) {
     std::filesystem::path folder(path);
     while (stat(folder.c_str(), &status) != 0 && folder != folder.root_path())
@@ -38,7 +38,7 @@ std::vector<VolumeStatus> GatherVolumes(const std::string &root) {
             continue;
         const auto [at, isNew] = known.emplace(status.st_dev, volumes.size());
         if (isNew) {
-            // What is kept for root counts as taken, as df(1) has it.
+            // Space reserved for root counts as used, as in df(1).
             const uint64_t used = space.f_blocks - space.f_bfree;
             volumes.push_back(
                 {{}, (used + space.f_bavail) * space.f_frsize, space.f_bavail * space.f_frsize});

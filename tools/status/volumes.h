@@ -6,11 +6,11 @@
 
 namespace kelo::tool {
 
-// The volume that holds some of the system's folders.
+// The volume of some of the system's folders.
 struct VolumeStatus {
-    std::vector<std::string> folders; // absolute; the one that is there, where the system's own is missing
-    uint64_t size = 0;                // bytes that users may fill
-    uint64_t free = 0;                // bytes of these
+    std::vector<std::string> folders; // absolute; the nearest existing one if the system's own is missing
+    uint64_t size = 0;                // bytes that ordinary users can fill
+    uint64_t free = 0;                // free bytes of these
 
     double FreePercent() const;
     bool IsNearlyFull() const { return FreePercent() < 10; }
