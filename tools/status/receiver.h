@@ -9,8 +9,8 @@ namespace kelo::tool {
 
 // The state of `kelosyslog receive`.
 struct ReceiverStatus {
-    // None: it never ran here. Silent: it runs, but its state file is older than a minute. Died: it disappeared
-    // without ending.
+    // None: it never ran here. Silent: it runs, but its state file is older than a minute. Died: it
+    // disappeared without ending.
     enum class State { None, Running, Silent, Stopped, Died, Unreadable };
     State state = State::None;
     std::string path; // of its state file
