@@ -13,6 +13,7 @@
 #include "archive/archive_name.h"
 #include "base/atomic_file.h"
 #include "base/errors.h"
+#include "base/sqlite.h"
 
 namespace kelo::tool {
 namespace {
@@ -81,8 +82,7 @@ std::string ArchiveFolder::NewTemporary() {
 }
 
 void ArchiveFolder::RemoveTemporary(const std::string &path) const {
-    for (const char *suffix : {"", "-journal", "-wal", "-shm"})
-        unlink((path + suffix).c_str());
+    RemoveDatabase(path);
 }
 
 std::string ArchiveFolder::FreeName(const std::string &device, const std::string &firstDate,

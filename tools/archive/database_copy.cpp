@@ -6,8 +6,8 @@
 #include <filesystem>
 
 #include "archive/archive_schema.h"
+#include "archive/open_options.h"
 #include "base/errors.h"
-#include "base/sqlite_file.h"
 #include "base/stop_signals.h"
 #include "kelosyslog/dbhandler.h"
 #include "read/log_message_capture.h"
@@ -18,14 +18,14 @@ namespace {
 
 constexpr int kPagesPerStep = 1024;
 
-SqliteFile OpenSource(const std::string &path) {
+SqliteConnection OpenSource(const std::string &path) {
     std::error_code error;
     if (!std::filesystem::is_regular_file(path, error)) // a pipe would wait for its other end
         throw DatabaseError(DescribeDatabaseProblem({path}));
-    return {path, SqliteFile::Mode::kWrite}; // WAL mode needs to write its shared memory even for reading
+    return {path, kToWrite}; // WAL mode needs to write its shared memory even for reading
 }
 
-uint64_t CountIn(SqliteFile &database, const std::string &host) {
+uint64_t CountIn(SqliteConnection &database, const std::string &host) {
     return static_cast<uint64_t>(host.empty()
                                      ? database.Number("SELECT count(*) FROM logs")
                                      : database.Number("SELECT count(*) FROM logs WHERE host = ?1", host));
@@ -33,7 +33,8 @@ uint64_t CountIn(SqliteFile &database, const std::string &host) {
 
 // Copies the pages of what `source` sees. Its open transaction keeps that the same: without one the copying
 // would begin anew with every write of another connection.
-void CopyPages(SqliteFile &source, SqliteFile &copy, const std::function<void(uint64_t)> &onCopied) {
+void CopyPages(SqliteConnection &source, SqliteConnection &copy,
+               const std::function<void(uint64_t)> &onCopied) {
     const auto pageSize = static_cast<uint64_t>(source.Number("PRAGMA page_size"));
     const std::unique_ptr<sqlite3_backup, int (*)(sqlite3_backup *)> backup(
         sqlite3_backup_init(copy.Get(), "main", source.Get(), "main"), sqlite3_backup_finish);
@@ -44,7 +45,7 @@ void CopyPages(SqliteFile &source, SqliteFile &copy, const std::function<void(ui
         StopSignals::Check();
         status = sqlite3_backup_step(backup.get(), kPagesPerStep);
         if (status != SQLITE_OK && status != SQLITE_DONE)
-            throw DatabaseError(source.Path() + " cannot be copied to " + copy.Path() + ": " +
+            throw DatabaseError(source.Name() + " cannot be copied to " + copy.Name() + ": " +
                                 sqlite3_errstr(status));
         const int done = sqlite3_backup_pagecount(backup.get()) - sqlite3_backup_remaining(backup.get());
         onCopied(static_cast<uint64_t>(std::max(done - before, 0)) * pageSize);
@@ -54,16 +55,16 @@ void CopyPages(SqliteFile &source, SqliteFile &copy, const std::function<void(ui
 
 // Returns the number of the order's logs at the moment that was copied.
 uint64_t CopySnapshot(const CopyOrder &order, const std::string &target) {
-    SqliteFile source = OpenSource(order.source);
+    SqliteConnection source = OpenSource(order.source);
     source.Run("BEGIN; SELECT 1 FROM sqlite_schema");
     const uint64_t logs = CountIn(source, order.host);
-    SqliteFile copy(target, SqliteFile::Mode::kWrite);
+    SqliteConnection copy(target, kToWrite);
     copy.Run("PRAGMA synchronous=OFF; PRAGMA journal_mode=OFF"); // a copy that fails is thrown away
     CopyPages(source, copy, order.onCopied);
     return logs;
 }
 
-void RequireSound(SqliteFile &copy, const std::string &source) {
+void RequireSound(SqliteConnection &copy, const std::string &source) {
     std::string finding;
     try {
         finding = copy.Text("PRAGMA integrity_check(1)");
@@ -74,7 +75,7 @@ void RequireSound(SqliteFile &copy, const std::string &source) {
         throw DatabaseError(source + " is damaged, so it is not archived: " + finding);
 }
 
-void AddSchema(SqliteFile &copy, const std::string &source) {
+void AddSchema(SqliteConnection &copy, const std::string &source) {
     try {
         copy.Run(kArchiveSchema);
     } catch (const DatabaseError &error) { // for example where a column lacks
@@ -84,7 +85,7 @@ void AddSchema(SqliteFile &copy, const std::string &source) {
 
 // Drops what does not belong into the archive; returns the path of the temporary file that is the archive.
 std::string Refine(const CopyOrder &order, const std::string &path, ArchiveFolder &folder) {
-    SqliteFile copy(path, SqliteFile::Mode::kWrite);
+    SqliteConnection copy(path, kToWrite);
     copy.Run("PRAGMA synchronous=OFF; PRAGMA journal_mode=OFF"); // ends the WAL mode of the source
     if (copy.Text("PRAGMA journal_mode") != "off")
         throw DatabaseError(path + ": cannot leave write-ahead logging");
@@ -132,7 +133,7 @@ void Describe(const std::string &device, DatabaseCopy &copy) {
 } // namespace
 
 uint64_t CountLogs(const std::string &source, const std::string &host) {
-    SqliteFile database = OpenSource(source);
+    SqliteConnection database = OpenSource(source);
     return CountIn(database, host);
 }
 
@@ -144,7 +145,7 @@ DatabaseCopy CopyDatabase(const CopyOrder &order, ArchiveFolder &folder) {
     if (copy.path != whole)
         folder.RemoveTemporary(whole);
     Describe(order.device, copy);
-    SqliteFile written(copy.path, SqliteFile::Mode::kRead);
+    SqliteConnection written(copy.path, kToRead);
     if (const uint64_t found = CountIn(written, ""); found != copy.logs)
         throw DatabaseError(order.source + ": the copy holds " + std::to_string(found) + " logs instead of " +
                             std::to_string(copy.logs));

@@ -1,12 +1,12 @@
 #include "archive/removal.h"
 
-#include <sqlite3.h>
 #include <sys/stat.h>
 
 #include <algorithm>
 #include <chrono>
 #include <thread>
 
+#include "archive/open_options.h"
 #include "base/errors.h"
 #include "base/stop_signals.h"
 
@@ -42,15 +42,15 @@ off_t SizeOf(const std::string &path) {
 } // namespace
 
 Removal::Removal(const std::string &source, const std::string &archive)
-    : source_(source, SqliteFile::Mode::kWrite), archive_(archive, SqliteFile::Mode::kRead),
-      rows_(archive_.Prepare(kRows)), remove_(source_.Prepare(kRemove)), rowLimit_(kFirstRowLimit) {
+    : source_(source, kToWrite), archive_(archive, kToRead), rows_(archive_, kRows),
+      remove_(source_, kRemove), rowLimit_(kFirstRowLimit) {
     source_.SetBusyTimeout(kLockTimeoutMs);
 }
 
 void Removal::Run() {
     try {
-        sqlite3_bind_int64(rows_.get(), 1, source_.Number("SELECT min(id) FROM logs"));
-        hasRow_ = archive_.Step(rows_.get());
+        rows_.Bind(1, source_.Number("SELECT min(id) FROM logs"));
+        hasRow_ = rows_.Step();
         while (hasRow_) {
             StopSignals::Check();
             const auto start = steady_clock::now();
@@ -67,17 +67,10 @@ void Removal::Run() {
 
 // One transaction. Returns whether it removed anything.
 bool Removal::RemoveSome() {
-    source_.Run("BEGIN IMMEDIATE");
+    SqliteTransaction transaction(source_);
     const auto start = steady_clock::now();
-    uint64_t count = 0;
-    try {
-        count = RemoveRows();
-        source_.Run("COMMIT");
-    } catch (...) {
-        sqlite3_reset(remove_.get());
-        sqlite3_exec(source_.Get(), "ROLLBACK", nullptr, nullptr, nullptr);
-        throw;
-    }
+    const uint64_t count = RemoveRows();
+    transaction.Commit();
     removed_ += count;
     const auto time = std::max<steady_clock::duration>(steady_clock::now() - start, milliseconds(1));
     rowLimit_ =
@@ -92,23 +85,22 @@ uint64_t Removal::RemoveRows() {
         if (row % kRowsPerLook == 0 && steady_clock::now() >= end)
             break;
         for (int column = 0; column < kColumns; ++column)
-            sqlite3_bind_value(remove_.get(), column + 1, sqlite3_column_value(rows_.get(), column));
-        source_.Step(remove_.get());
-        sqlite3_reset(remove_.get());
-        count += static_cast<uint64_t>(sqlite3_changes(source_.Get()));
-        hasRow_ = archive_.Step(rows_.get());
+            remove_.BindColumn(column + 1, rows_, column);
+        remove_.Run();
+        count += source_.Changes();
+        hasRow_ = rows_.Step();
     }
     return count;
 }
 
 // Every commit copies what it can of the log into the file, but only a log that nobody uses begins anew.
 void Removal::BoundWriteAheadLog() {
-    if (SizeOf(source_.Path() + "-wal") <= kLargestWal)
+    if (SizeOf(source_.Name() + "-wal") <= kLargestWal)
         return;
     // Most of it first, without keeping writers out.
-    sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_PASSIVE, nullptr, nullptr);
+    source_.Checkpoint(false);
     source_.SetBusyTimeout(kCheckpointTimeoutMs);
-    sqlite3_wal_checkpoint_v2(source_.Get(), "main", SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr);
+    source_.Checkpoint(true);
     source_.SetBusyTimeout(kLockTimeoutMs);
 }
 

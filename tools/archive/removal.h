@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <string>
 
-#include "base/sqlite_file.h"
+#include "base/sqlite.h"
 
 namespace kelo::tool {
 
@@ -30,8 +30,8 @@ private:
     uint64_t RemoveRows();
     void BoundWriteAheadLog();
 
-    SqliteFile source_;
-    SqliteFile archive_;
+    SqliteConnection source_;
+    SqliteConnection archive_;
     SqliteStatement rows_; // of the archive, by id
     SqliteStatement remove_;
     bool hasRow_ = false; // whether `rows_` stands on a row that is to be removed

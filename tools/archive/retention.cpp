@@ -1,7 +1,5 @@
 #include "archive/retention.h"
 
-#include <sqlite3.h>
-
 #include <algorithm>
 #include <charconv>
 #include <cstdio>
@@ -10,8 +8,8 @@
 #include <tuple>
 
 #include "archive/archive_name.h"
+#include "archive/open_options.h"
 #include "base/errors.h"
-#include "base/sqlite_file.h"
 
 namespace kelo::tool {
 namespace {
@@ -28,16 +26,15 @@ std::optional<Archive> ReadArchive(const fs::directory_entry &file) {
         return std::nullopt;
     archive.bytes = file.file_size(error);
     try {
-        SqliteFile database(file.path().string(), SqliteFile::Mode::kRead);
-        const SqliteStatement row =
-            database.Prepare("SELECT start_time, end_time, log_count, device FROM db_info WHERE id = 1");
-        if (error || !database.Step(row.get()))
+        SqliteConnection database(file.path().string(), kToRead);
+        SqliteStatement row(database,
+                            "SELECT start_time, end_time, log_count, device FROM db_info WHERE id = 1");
+        if (error || !row.Step())
             return std::nullopt;
-        archive.first = sqlite3_column_int64(row.get(), 0);
-        archive.last = sqlite3_column_int64(row.get(), 1);
-        archive.logs = static_cast<uint64_t>(sqlite3_column_int64(row.get(), 2));
-        if (const auto *device = reinterpret_cast<const char *>(sqlite3_column_text(row.get(), 3)))
-            archive.device = device;
+        archive.first = row.Number(0);
+        archive.last = row.Number(1);
+        archive.logs = static_cast<uint64_t>(row.Number(2));
+        archive.device = row.Text(3);
     } catch (const DatabaseError &) {
         return std::nullopt;
     }

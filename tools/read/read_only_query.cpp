@@ -49,8 +49,8 @@ std::vector<ReadOnlyQuery::Row> ReadOnlyQuery::Rows(const std::string &sql,
     DBResult_tag *raw = nullptr;
     deadline_ = std::chrono::steady_clock::now() + timeout_;
     if (KELODBExecute(connection_.get(), sql.c_str(), &raw) < 0)
-        throw StatementError(table_.path + ": " + KELODBErrorGet(connection_.get()),
-                             sqlite3_errcode(KELODBInternalDBHdlGet(connection_.get())) & 0xff);
+        throw SqliteError(table_.path + ": " + KELODBErrorGet(connection_.get()),
+                          sqlite3_errcode(KELODBInternalDBHdlGet(connection_.get())) & 0xff, 0);
     const std::unique_ptr<DBResult_tag, ResultFreer> result(raw);
     std::vector<Row> rows;
     for (unsigned int row = 0; result != nullptr && KELODBFetchRow(result.get(), &row) >= 0;) {

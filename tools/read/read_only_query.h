@@ -7,18 +7,12 @@
 #include <string>
 #include <vector>
 
-#include "base/errors.h"
+#include "base/sqlite.h"
 #include "read/log_table.h"
 
 struct DBConnect_tag;
 
 namespace kelo::tool {
-
-// A statement failed. The text has the path and SQLite's words.
-struct StatementError : DatabaseError {
-    StatementError(const std::string &text, int resultCode) : DatabaseError(text), code(resultCode) {}
-    int code; // SQLite's primary result code
-};
 
 // A connection that only tells what is wrong: unlike a DBHandler it creates no file and puts none aside.
 class ReadOnlyQuery {
@@ -32,7 +26,7 @@ public:
     ReadOnlyQuery &operator=(const ReadOnlyQuery &) = delete;
 
     // The values of these columns, of all rows or of the first; none without a row. NULL is "". These and the
-    // others throw StatementError.
+    // others throw SqliteError.
     using Row = std::vector<std::string>;
     std::vector<Row> Rows(const std::string &sql, const std::vector<std::string> &columns) const;
     std::optional<Row> FirstRow(const std::string &sql, const std::vector<std::string> &columns) const;

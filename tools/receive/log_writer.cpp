@@ -21,7 +21,7 @@ constexpr int64_t kRetrySoonMs = 100;
 constexpr int64_t kRetryMs = 1000;
 constexpr int64_t kRetryDamagedMs = 60'000; // each try notifies the administrator
 
-bool IsFull(const StoreError &error) {
+bool IsFull(const SqliteError &error) {
     return error.code == SQLITE_FULL || error.systemError == ENOSPC || error.systemError == EDQUOT ||
            error.systemError == EFBIG;
 }
@@ -61,7 +61,7 @@ bool LogWriter::Write(int64_t now) {
     try {
         Open();
         store_->Store(batch_.Records());
-    } catch (const StoreError &error) {
+    } catch (const SqliteError &error) {
         Pause(error, now);
         return false;
     }
@@ -92,7 +92,7 @@ void LogWriter::Open() {
     store_.emplace(path_, kStoreOptions);
 }
 
-void LogWriter::Pause(const StoreError &error, int64_t now) {
+void LogWriter::Pause(const SqliteError &error, int64_t now) {
     const bool isLocked = error.code == SQLITE_BUSY || error.code == SQLITE_LOCKED;
     retryTime_ = now + (isLocked ? kRetrySoonMs : kRetryMs);
     if (reason_.empty())

@@ -44,7 +44,7 @@ public:
 private:
     bool Write(int64_t now);
     void Open();
-    void Pause(const StoreError &error, int64_t now);
+    void Pause(const SqliteError &error, int64_t now);
     int64_t PutAside();
 
     std::string path_; // absolute

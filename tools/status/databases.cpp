@@ -98,11 +98,11 @@ void Read(DatabaseStatus &status) {
                 ReadTransferTimes(database, status);
             else
                 ReadTimes(database, status);
-        } catch (const StatementError &error) {
+        } catch (const SqliteError &error) {
             if (error.code != SQLITE_INTERRUPT) // a table without its index
                 throw;
         }
-    } catch (const StatementError &error) {
+    } catch (const SqliteError &error) {
         status.state = StateAfter(error.code);
         status.problem = status.size == 0 ? status.path + ": the file is empty" : error.what();
     } catch (const DatabaseError &error) {

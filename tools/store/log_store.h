@@ -3,16 +3,12 @@
 // Storing records into table "logs" of a log database.
 
 #include <cstdint>
-#include <memory>
 #include <optional>
 #include <span>
 #include <string>
 
-#include "base/errors.h"
+#include "base/sqlite.h"
 #include "kelosyslog/records.h"
-
-struct sqlite3;
-struct sqlite3_stmt;
 
 namespace kelo::tool {
 
@@ -23,14 +19,6 @@ struct StoreProgress {
     uint64_t offset = 0; // bytes whose records are stored: whole lines
     uint64_t lines = 0;  // lines within them
     bool operator==(const StoreProgress &) const = default;
-};
-
-// What SQLite said of a database that cannot be used.
-struct StoreError : DatabaseError {
-    StoreError(const std::string &text, int code, int systemError)
-        : DatabaseError(text), code(code), systemError(systemError) {}
-    int code;        // SQLite's primary result code
-    int systemError; // errno of the file operation that failed, else 0
 };
 
 struct LogStoreOptions {
@@ -46,7 +34,7 @@ class LogStore {
 public:
     // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
     // missing; it appears under its name only when it is complete. A database without any table gets the
-    // schema too. All functions throw StoreError, or another DatabaseError.
+    // schema too. All functions throw SqliteError.
     explicit LogStore(const std::string &path, const LogStoreOptions &options = {});
     ~LogStore();
     LogStore(const LogStore &) = delete;
@@ -63,38 +51,20 @@ public:
 
     // Whether the file was removed or renamed since it was opened. What is stored no longer is where it is
     // looked for then.
-    bool HasMoved();
+    bool HasMoved() const { return db_.HasMoved(); }
 
     const std::string &Path() const { return path_; }
 
 private:
-    struct CloseDatabase {
-        void operator()(sqlite3 *db) const;
-    };
-    struct FinalizeStatement {
-        void operator()(sqlite3_stmt *statement) const;
-    };
-    using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
-
-    void Open(int flags);
-    void Create();
     void FillEmpty();
-    void Run(const char *sql);
-    Statement Prepare(const char *sql);
-    void StepToEnd(sqlite3_stmt *statement);
     void InsertLog(const _SYSLOG_LOG_DATA_tag &log);
-    template <typename Work>
-    void InTransaction(Work work);
     void PrepareProgress();
     void SaveProgress(const StoreProgress &progress);
-    [[noreturn]] void Fail();
 
-    LogStoreOptions options_;
     std::string path_; // absolute
-    std::string file_; // what is open: `path_`, or its forerunner while it is created
-    std::unique_ptr<sqlite3, CloseDatabase> db_;
-    Statement insertLog_;
-    Statement saveProgress_; // made when it is needed
+    SqliteConnection db_;
+    std::optional<SqliteStatement> insertLog_;
+    std::optional<SqliteStatement> saveProgress_; // made when it is needed
 };
 
 } // namespace kelo::tool
