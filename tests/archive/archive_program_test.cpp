@@ -9,6 +9,7 @@
 #include <filesystem>
 
 #include "support/log_database.h"
+#include "support/source_dir.h"
 #include "support/temp_root.h"
 #include "tools/program_run.h"
 
@@ -23,7 +24,7 @@ protected:
     ArchiveProgram() {
         fs::create_directories(root_.File("var/log/kelolog"));
         fs::create_directories(root_.File("usr/kelo/syslog"));
-        fs::copy(KELO_SOURCE_DIR "/package/schema", root_.File("usr/kelo/syslog/schema"));
+        fs::copy(SourcePath("package/schema"), root_.File("usr/kelo/syslog/schema"));
         CreateLogDatabase(source_);
         InsertSampleLogs(source_, 500);
     }

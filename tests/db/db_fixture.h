@@ -2,6 +2,7 @@
 
 #include "kelosyslog/dbhandler.h"
 #include "support/notify_calls.h"
+#include "support/source_dir.h"
 #include "support/system_calls.h"
 #include "support/test.h"
 
@@ -41,7 +42,7 @@ protected:
     }
 
     const std::string path_ = root_.File("logs.db");
-    DBHandler db_{path_, KELO_SOURCE_DIR "/package/schema/archive.sql"};
+    DBHandler db_{path_, SourcePath("package/schema/archive.sql")};
 };
 
 // What a report and a message of other priority look like.

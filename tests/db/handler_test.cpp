@@ -2,11 +2,12 @@
 
 #include "db/db_fixture.h"
 #include "keloplatform/kelodb.h"
+#include "support/source_dir.h"
 
 namespace kelo::test {
 namespace {
 
-const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
+const std::string kSchema = SourcePath("package/schema/archive.sql");
 
 using DBHandlerTest = DbTest;
 

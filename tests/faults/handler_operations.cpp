@@ -6,12 +6,13 @@
 #include "kelosyslog/root.h"
 #include "support/fault_pause.h"
 #include "support/notify_calls.h"
+#include "support/source_dir.h"
 #include "support/system_calls.h"
 
 namespace kelo::test {
 namespace {
 
-const std::string kSchema = KELO_SOURCE_DIR "/package/schema/archive.sql";
+const std::string kSchema = SourcePath("package/schema/archive.sql");
 
 // A handler whose owner disconnects on every way out, as the handler asks for.
 struct Connected {

@@ -5,6 +5,7 @@
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/torvc.h"
 #include "notify/notify_fixture.h"
+#include "support/source_dir.h"
 
 using namespace kelo::test;
 
@@ -21,7 +22,7 @@ protected:
 
     void InstallTexts() {
         std::filesystem::create_directories(root_.Path() + kTexts);
-        std::filesystem::copy(std::string(KELO_SOURCE_DIR) + "/package/texts", root_.Path() + kTexts,
+        std::filesystem::copy(SourcePath("package/texts"), root_.Path() + kTexts,
                               std::filesystem::copy_options::recursive);
     }
 

@@ -13,6 +13,7 @@
 
 #include "receive/receiver_state.h"
 #include "support/log_database.h"
+#include "support/source_dir.h"
 #include "support/temp_root.h"
 
 using kelo::test::QueryText;
@@ -38,7 +39,7 @@ protected:
         for (const char *folder :
              {"/usr/kelo/syslog", "/usr/kelo/etc", "/var/log/kelolog", "/etc/kelosyslog"})
             std::filesystem::create_directories(root_.Path() + folder);
-        std::filesystem::create_symlink(KELO_SOURCE_DIR "/package/schema",
+        std::filesystem::create_symlink(kelo::test::SourcePath("package/schema"),
                                         root_.File("usr/kelo/syslog/schema"));
     }
     void TearDown() override {

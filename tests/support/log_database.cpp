@@ -6,6 +6,7 @@
 #include <stdexcept>
 
 #include "support/fault_pause.h"
+#include "support/source_dir.h"
 #include "support/temp_root.h"
 
 namespace kelo::test {
@@ -57,7 +58,7 @@ std::string QueryText(const std::string &path, const std::string &sql) {
 }
 
 void CreateLogDatabase(const std::string &path, const std::string &schema) {
-    const std::string sql = ReadFile(std::string(KELO_SOURCE_DIR) + "/package/schema/" + schema);
+    const std::string sql = ReadFile(SourcePath("package/schema/") + schema);
     if (sql.empty())
         throw std::runtime_error("no schema " + schema);
     RunSql(path, "PRAGMA journal_mode=WAL;" + sql);

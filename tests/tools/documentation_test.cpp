@@ -3,6 +3,7 @@
 #include <re2/re2.h>
 
 #include "program_run.h"
+#include "support/source_dir.h"
 #include "support/test.h"
 
 namespace kelo::test {
@@ -10,7 +11,7 @@ namespace {
 
 using Words = std::set<std::string>;
 
-const std::string kCompletion = KELO_SOURCE_DIR "/package/completion/kelosyslog";
+const std::string kCompletion = SourcePath("package/completion/kelosyslog");
 
 // What the one group of `pattern` finds, anywhere in the text; '^' and '$' are line ends.
 Words Matches(const std::string &text, const std::string &pattern) {
@@ -46,7 +47,7 @@ Words CommandsOf(const std::vector<std::string> &parent) {
 }
 
 TEST(Documentation, KnowsEveryCommandAndOption) {
-    const std::string manual = ReadFile(KELO_SOURCE_DIR "/package/man/kelosyslog.1");
+    const std::string manual = ReadFile(SourcePath("package/man/kelosyslog.1"));
     const Words commands = CommandsOf({});
     ASSERT_GE(commands.size(), 4U);
     Words offered = commands;
