@@ -9,9 +9,10 @@
 //     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
 //
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
-// statement and closes the connection before it returns. None throws on a database error; when memory
-// runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing deleted.
-// A database is never created.
+// statement and closes the connection before it returns. (SyslogDBExtkeyMapGet and SyslogDBExtkeyLookupByName
+// ask for the generation first: two statements on two connections.) None throws on a database error; where
+// memory runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing
+// deleted. A database is never created.
 
 #include <cstdint>
 #include <list>
@@ -25,9 +26,10 @@
 // conditions is ANDed.
 //
 // The value is the operand as the user gave it; the library escapes it. For LIKE and NOT LIKE, '*' and '?'
-// are the wildcards and '%' and '_' are literal; for GLOB, '[' and ']' are literal. A value of SYSLOG_OP_RAW
-// is an SQL expression and goes into the statement unchanged: the caller is responsible for it. The
-// alternatives of alternatives are ignored.
+// are the wildcards and '%' and '_' stand for themselves; for GLOB, '[' and ']' do. A value of SYSLOG_OP_RAW
+// is an SQL expression and goes into the statement as it is: the caller answers for it. The alternatives of
+// alternatives are ignored. A value with a NUL byte cannot be asked for: select, count and delete answer -1
+// before anything runs.
 struct _SYSLOG_SQL_COND_tag {
     _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
     _SYSLOG_SQL_OP_tag op = SYSLOG_OP_EQ;
@@ -72,8 +74,8 @@ KELOSYSLOG_API int SyslogDBSelect(const std::string &dbPath,
 // Counts the rows of `table` that meet all `conditions`. Without a filter the count is the largest row id,
 // which is instant but counts deleted rows too. `limit` and `order` go into the counting statement itself.
 //
-// Returns the count, narrowed to int; -1 for a failure (only a bad path is reported in the system log); -2
-// when the statement did not yield exactly one row.
+// Returns the count, narrowed to int; -1 for a failure (only a bad path is reported in the system log), to
+// which a statement without a row belongs (a `limit` that skips it); -2 when there were several rows.
 KELOSYSLOG_API int SyslogDBSelectCountByTable(const std::string &dbPath, const std::string &table,
                                               const std::list<_SYSLOG_SQL_COND_tag> &conditions,
                                               _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
@@ -84,7 +86,8 @@ KELOSYSLOG_API int SyslogDBSelectCount(const std::string &dbPath,
                                        _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
 
 // Deletes the rows of table "logs" that meet all `conditions`; all rows when there are none. Returns 0, or
-// -1: only a bad path is reported in the system log.
+// -1 with nothing deleted: only a bad path is reported in the system log. Where a condition cannot be
+// rendered exactly nothing runs.
 KELOSYSLOG_API int SyslogDBDelete(const std::string &dbPath,
                                   const std::list<_SYSLOG_SQL_COND_tag> &conditions);
 

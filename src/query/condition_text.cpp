@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 #include <new>
+#include <optional>
 
 #include "common/attributes.h"
 #include "keloplatform/kelodb.h"
@@ -29,30 +30,32 @@ const char *OperatorText(_SYSLOG_SQL_OP_tag op) {
 }
 
 // Runs a platform escape function, which writes at most two bytes for one, over a text of `length` bytes.
-// Returns "" when it fails.
+// Nothing when it fails.
 template <typename EscapeFunction>
-std::string Escaped(size_t length, EscapeFunction escape) {
+std::optional<std::string> Escaped(size_t length, EscapeFunction escape) {
     std::string buffer(2 * length + 1, '\0');
     if (escape(buffer.data(), buffer.size()) < 0)
-        return "";
-    // The C string is used, not the length that the function reports.
+        return std::nullopt;
+    // What counts is the C string, whatever length the function reports.
     buffer.resize(strnlen(buffer.data(), buffer.size()));
     return buffer;
 }
 
-std::string EscapedForSql(const std::string &value) {
+std::optional<std::string> EscapedForSql(const std::string &value) {
     return Escaped(value.size(), [&](char *out, size_t size) {
         return KELODBEscapeStringEX2(nullptr, out, size, value.data(), value.size());
     });
 }
 
 // The user's own '%' and '_' are escaped first, so that only the translated '*' and '?' are wildcards.
-std::string LikePattern(const std::string &text) {
-    std::string pattern = Escaped(text.size(), [&](char *out, size_t size) {
+std::optional<std::string> LikePattern(const std::string &text) {
+    std::optional<std::string> pattern = Escaped(text.size(), [&](char *out, size_t size) {
         return KELODBEscapeBackslashEX2(nullptr, out, size, text.c_str());
     });
-    std::replace(pattern.begin(), pattern.end(), '*', '%');
-    std::replace(pattern.begin(), pattern.end(), '?', '_');
+    if (pattern) {
+        std::replace(pattern->begin(), pattern->end(), '*', '%');
+        std::replace(pattern->begin(), pattern->end(), '?', '_');
+    }
     return pattern;
 }
 
@@ -69,16 +72,36 @@ std::string GlobPattern(const std::string &text) {
     return pattern;
 }
 
-void AppendComparison(const _SYSLOG_SQL_COND_tag &condition, std::string &out) {
-    const std::string value = SyslogSQLCondValueEscape(&condition);
+// The escaped value of a condition; nothing when an escape function fails or memory runs out.
+std::optional<std::string> EscapedValue(const _SYSLOG_SQL_COND_tag &condition) {
+    try {
+        std::optional<std::string> text = EscapedForSql(condition.value);
+        if (text && IsLike(condition.op))
+            return LikePattern(*text);
+        return text && IsGlob(condition.op) ? GlobPattern(*text) : text;
+    } catch (const std::bad_alloc &) {
+        return std::nullopt;
+    }
+}
+
+bool HoldsNul(const _SYSLOG_SQL_COND_tag &condition) {
+    return condition.value.find('\0') != std::string::npos;
+}
+
+// False when the condition cannot be rendered.
+bool AppendComparison(const _SYSLOG_SQL_COND_tag &condition, LostValue lost, std::string &out) {
+    const std::optional<std::string> value = EscapedValue(condition);
+    if (HoldsNul(condition) || (!value && lost == LostValue::IsFailure))
+        return false;
     out.append("(").append(ColumnText(condition.attr)).append(" ");
     out.append(OperatorText(condition.op)).append(" ");
     if (HasColumn(condition.attr) && IsIntegerAttribute(condition.attr))
-        out.append(value).append(")");
+        out.append(value.value_or("")).append(")");
     else if (IsLike(condition.op))
-        out.append("'").append(value).append("' escape '\\')");
+        out.append("'").append(value.value_or("")).append("' escape '\\')");
     else
-        out.append("'").append(value).append("')");
+        out.append("'").append(value.value_or("")).append("')");
+    return true;
 }
 
 bool IsRaw(const _SYSLOG_SQL_COND_tag &condition) {
@@ -96,41 +119,37 @@ bool IsMatchAll(const std::string &body) {
 }
 
 std::string SyslogSQLCondValueEscape(const _SYSLOG_SQL_COND_tag *condition) {
-    if (condition == nullptr)
-        return "";
-    try {
-        const std::string text = EscapedForSql(condition->value);
-        if (IsLike(condition->op))
-            return LikePattern(text);
-        return IsGlob(condition->op) ? GlobPattern(text) : text;
-    } catch (const std::bad_alloc &) {
-        return "";
-    }
+    return condition != nullptr ? EscapedValue(*condition).value_or("") : "";
 }
 
-int SyslogSQLCondStrGen(const _SYSLOG_SQL_COND_tag &condition, std::string &out) {
+int SyslogSQLCondStrGen(const _SYSLOG_SQL_COND_tag &condition, std::string &out, LostValue lost) {
     out.clear();
     if (!condition.alternatives.empty())
         out.append("(");
-    if (IsRaw(condition))
+    if (IsRaw(condition)) {
+        if (HoldsNul(condition))
+            return -1;
         out.append("(").append(condition.value).append(")");
-    else
-        AppendComparison(condition, out);
+    } else if (!AppendComparison(condition, lost, out)) {
+        return -1;
+    }
     for (const _SYSLOG_SQL_COND_tag &alternative : condition.alternatives) {
         out.append(" OR ");
-        AppendComparison(alternative, out);
+        if (!AppendComparison(alternative, lost, out))
+            return -1;
     }
     if (!condition.alternatives.empty())
         out.append(")");
     return 0;
 }
 
-int SyslogSQLCondListStrGen(const std::list<_SYSLOG_SQL_COND_tag> &conditions, std::string &out) {
+int SyslogSQLCondListStrGen(const std::list<_SYSLOG_SQL_COND_tag> &conditions, std::string &out,
+                            LostValue lost) {
     const char *separator = "";
     std::string text;
     for (const _SYSLOG_SQL_COND_tag &condition : conditions) {
         out.append(separator);
-        if (SyslogSQLCondStrGen(condition, text) != 0)
+        if (SyslogSQLCondStrGen(condition, text, lost) != 0)
             return -1;
         out.append(text);
         separator = " AND ";

@@ -7,7 +7,8 @@ int SyslogDBDelete(const std::string &dbPath, const std::list<_SYSLOG_SQL_COND_t
     if (!CheckDbPath(dbPath, 661))
         return -1;
     std::string body;
-    if (SyslogSQLCondListStrGen(conditions, body) != 0)
+    // A condition that lost its value would delete what was never meant.
+    if (SyslogSQLCondListStrGen(conditions, body, LostValue::IsFailure) != 0)
         return -1;
     const std::string sql = "DELETE FROM logs" + (body.empty() ? "" : " WHERE " + body);
 

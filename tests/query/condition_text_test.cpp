@@ -29,7 +29,6 @@ TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
         {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "msg > 'it''s'", {}}, "(msg > 'it''s')"},
         {{SYSLOG_ATTRI_ID, SYSLOG_OP_GT, "15", {}}, "(id > 15)"},
         {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_LIKE, "1?*", {}}, "(utcsec LIKE 1_%)"},
-        {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, std::string("a\0b", 3), {}}, "(host = '')"},
         {{SYSLOG_ATTRI_MSG,
           SYSLOG_OP_RAW,
           "1",
@@ -56,11 +55,15 @@ TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
         {noAttribute, SYSLOG_OP_RAW, "1", {}},
         {SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, std::string("1)\0", 3), {}}, // must not cut the statement
         {SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "1", {{SYSLOG_ATTRI_HOST, SYSLOG_OP_RAW, "1", {}}}},
+        {SYSLOG_ATTRI_HOST, SYSLOG_OP_GE, std::string("zz\0", 3), {}}, // must not become >= 'zz', nor >= ''
+        {SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "1", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, {"a\0", 2}, {}}}},
     };
     for (const auto &condition : bad) {
         EXPECT_EQ(SyslogDBSelectCount(path_, {plain, condition}, nullptr, nullptr), -1);
         EXPECT_EQ(SyslogDBDelete(path_, {condition, plain}), -1);
     }
+    PlatformCalls::FailFrom(1, 1); // the value cannot be escaped
+    EXPECT_EQ(SyslogDBDelete(path_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_GE, "zz", {}}}), -1);
     _SYSLOG_SQL_ORDER_tag order{1, noAttribute};
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, &order), -1);
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, nullptr), 3);
