@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <memory>
 #include <new>
+#include <utility>
 
 #include "accounting/device_table.h"
 #include "common/root.h"
@@ -33,14 +34,16 @@ void ReportFailedStatement(const std::string &sql) {
     Debuger::MSG(0, "Fail to execute SQL command: " + sql);
 }
 
-// The database of one flush. In every case the transaction is ended and the connection closed.
+// The database of one flush. Whatever happened, the transaction is ended and the connection closed.
+//
+// Without a transaction, because its BEGIN failed, every row is stored by itself.
 class FlushDatabase {
 public:
     explicit FlushDatabase(const std::string &path)
         : path_(path), db_(path, kelo::RootedPath("/usr/kelo/syslog/schema/accinfo.sql")) {}
     ~FlushDatabase() {
         try {
-            db_.DBTranEnd();
+            End();
         } catch (const std::bad_alloc &) {
             syslog(LOG_ERR, "Fail to end transaction");
         }
@@ -54,8 +57,15 @@ public:
             Debuger::MSG(0, "Fail to connect db");
             return false;
         }
-        db_.DBTranStart();
+        isOpen_ = db_.DBTranStart() == 0;
         return true;
+    }
+
+    // Ends the transaction, at the first call. Returns false when rows of it may not be in the file.
+    bool End() {
+        if (std::exchange(hasEnded_, true))
+            return true;
+        return db_.DBTranEnd() == 0 || !isOpen_;
     }
 
     // A failure leaves the rows before it in the transaction, to be committed.
@@ -100,6 +110,8 @@ public:
 private:
     const std::string &path_;
     DBHandler db_;
+    bool isOpen_ = false;
+    bool hasEnded_ = false;
 };
 
 } // namespace
@@ -123,7 +135,7 @@ int AccountingManager::AccoutingFlush2DB() {
         if (!db.WriteHistogram((*devices_)[i].name, (*devices_)[i].total))
             return -1;
     }
-    if (!db.Trim())
+    if (!db.Trim() || !db.End())
         return -1;
     samples_.clear();
     return 0;

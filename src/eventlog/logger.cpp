@@ -36,18 +36,19 @@ std::string InsertStatement(int level, const std::string &user, const std::strin
 
 } // namespace
 
-int Logger::LogAdd(std::string dbPath, int level, std::string user, std::string event) {
+int Logger::LogAdd(std::string dbPath, int level, std::string user, std::string event) const {
     kelo::EventDatabase db(dbPath);
     if (!db.Connect())
         return -1;
-    db->DBTranStart();
+    const bool isOpen = db->DBTranStart() == 0; // else the insert stands alone
     const std::string sql = InsertStatement(level, user, event);
     if (db->DBExecute(sql) < 0) {
         // Disconnecting ends the transaction.
         Debuger::MSG(0, "Fail to execute SQL command: " + sql);
         return -1;
     }
-    db->DBTranEnd();
+    if (db->DBTranEnd() < 0 && isOpen)
+        return -1; // a full disk, for one: disconnecting rolls back
     if (LogRotation(dbPath) < 0)
         Debuger::MSG(0, "Fail to rotate log database");
     return 0;
