@@ -4,10 +4,11 @@
 
 namespace {
 
-// Constructed on first use: nothing of ours runs when the library is loaded.
+// Constructed on first use: nothing of ours runs when the library is loaded. Never destroyed: a static object
+// of the program may use the library until the very end, as an AccountingManager does that flushes then.
 std::string &Root() {
-    static std::string root;
-    return root;
+    static std::string *const root = new std::string;
+    return *root;
 }
 
 } // namespace

@@ -6,9 +6,10 @@
 
 namespace {
 
+// Never destroyed: static objects of a program may use the platform until the very end.
 std::string &Root() {
-    static std::string root;
-    return root;
+    static std::string *const root = new std::string;
+    return *root;
 }
 
 } // namespace

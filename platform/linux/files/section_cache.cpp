@@ -15,9 +15,10 @@ struct Cache {
     std::shared_ptr<const SectionText> text;
 };
 
+// Never destroyed: static objects of a program may read section files until the very end.
 Cache &TheCache() {
-    static Cache cache;
-    return cache;
+    static Cache *const cache = new Cache;
+    return *cache;
 }
 
 bool IsSameFile(const struct stat &one, const struct stat &other) {
