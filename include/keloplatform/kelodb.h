@@ -55,9 +55,10 @@ KELOPLATFORM_API int KELODBNumRows(DBResult_tag *result);
 // 0 when there is no further row or an argument is null.
 KELOPLATFORM_API int KELODBFetchRow(DBResult_tag *result, unsigned int *row);
 
-// The text of a column, by its exact name, of a row whose handle KELODBFetchRow gave. It is NUL-terminated
-// and belongs to the result. Null when the result has no such row or column, or the value is NULL. Of two
-// columns with the same name the first is used.
+// The text of a column of a row whose handle KELODBFetchRow gave. The name is compared without regard to the
+// case of ASCII letters, as in SQL; where two columns have one name the first counts. The text is
+// NUL-terminated and belongs to the result. Null when the result has no such row or column, or the value is
+// NULL.
 KELOPLATFORM_API const char *KELODBFetchField(DBResult_tag *result, unsigned int row, const char *column);
 
 // Frees a result; null is accepted.

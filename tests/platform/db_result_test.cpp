@@ -24,9 +24,9 @@ protected:
 TEST_F(Result, HoldsEveryKindOfValueHoweverItIsDelivered) {
     RunSql(path, "INSERT INTO logs VALUES(1, 'a', 9223372036854775807, 'x'),"
                  "(2, '', -1.5, NULL), (3, NULL, x'', x'616200630a'), (-4, '\"''%', 1e300, '日本')");
-    const Rows expected = {{"-4", "\"'%", "1.0e+300", "日本", std::nullopt},
-                           {"1", "a", "9223372036854775807", "x", std::nullopt},
-                           {"2", "", "-1.5", std::nullopt, std::nullopt},
+    const Rows expected = {{"-4", "\"'%", "1.0e+300", "日本", "\"'%"},
+                           {"1", "a", "9223372036854775807", "x", "a"},
+                           {"2", "", "-1.5", std::nullopt, ""},
                            {"3", std::nullopt, "", "ab", std::nullopt}};
     const std::vector<std::string> columns = {"id", "host", "size", "msg", "Host"};
     const std::string sql = "SELECT * FROM logs ORDER BY id";
@@ -35,9 +35,9 @@ TEST_F(Result, HoldsEveryKindOfValueHoweverItIsDelivered) {
     EXPECT_EQ(Execute(connection, "DELETE FROM logs RETURNING id, host, size, msg", columns).rows.size(), 4U);
 }
 
-TEST_F(Result, TakesTheFirstOfColumnsWithOneName) {
+TEST_F(Result, TakesTheFirstOfColumnsWithOneNameInAnyCase) {
     EXPECT_EQ(Execute(connection, "SELECT 1 AS a, 2 AS a, 3 AS \"a b\", 4 AS A", {"a", "a b", "A", "b"}).rows,
-              (Rows{{"1", "3", "4", std::nullopt}}));
+              (Rows{{"1", "3", "1", std::nullopt}}));
 }
 
 TEST_F(Result, HoldsRowsOfAnyWidth) {

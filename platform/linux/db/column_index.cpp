@@ -1,13 +1,15 @@
 #include "db/column_index.h"
 
+#include <sqlite3.h>
+
 namespace kelo::platform {
 namespace {
 
-// FNV-1a: column names are a few bytes long.
+// FNV-1a: column names are a few bytes long. The bit that tells letter case is left out.
 size_t HashOf(const char *name) {
     uint32_t hash = 2166136261U;
     for (; *name != '\0'; ++name)
-        hash = (hash ^ static_cast<unsigned char>(*name)) * 16777619U;
+        hash = (hash ^ (static_cast<unsigned char>(*name) | 0x20U)) * 16777619U;
     return hash;
 }
 
@@ -41,7 +43,7 @@ void ColumnIndex::Grow() {
 size_t ColumnIndex::SlotOf(const char *name) const {
     const size_t mask = slots_.size() - 1;
     size_t slot = HashOf(name) & mask;
-    while (slots_[slot] != kNone && !IsSame(Name(slots_[slot]), name))
+    while (slots_[slot] != kNone && sqlite3_stricmp(Name(slots_[slot]), name) != 0)
         slot = (slot + 1) & mask;
     return slot;
 }

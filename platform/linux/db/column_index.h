@@ -7,7 +7,7 @@
 
 namespace kelo::platform {
 
-// Positions of a result's columns by their exact names.
+// Positions of a result's columns by their names, without regard to the case of ASCII letters, as in SQL.
 //
 // Readers ask for the same columns in the same order in every row, so the index remembers which column
 // followed which, and looks there before it searches.
