@@ -38,6 +38,7 @@ int64_t TimeOfFirstLog(DBHandler &db, const char *direction) {
 std::string LocalDate(int64_t utcsec) {
     const time_t time = static_cast<int32_t>(utcsec);
     tm parts{};
+    tzset(); // localtime_r need not
     localtime_r(&time, &parts);
     char text[1024] = {};
     std::strftime(text, sizeof text, "%Y-%m-%d", &parts);
