@@ -3,16 +3,23 @@
 // Counts of received records: in total, per second and per sending device.
 //
 //     AccountingManager accounting;      // loads the stored histogram
-//     for (each received record) {
+//     for (std::string host; Receive(host);)
 //         accounting.LogInc(host);
-//         ...
-//     }
-//     if (accounting.isNeed2Flush())     // on a beat of 6 seconds or more
+//     if (accounting.isNeed2Flush())     // to be asked every 6 seconds or more rarely
 //         accounting.AccoutingFlush2DB();
 //
-// At the first record of a new second the manager closes a sample: records per device since the sample
-// before. A sample that reaches the threshold of a rule causes a notification and an event. Samples are kept
-// until a flush has written them. One object per accounting database, used by one thread.
+// At the first log of a new second the manager closes a sample: logs per device since the sample before. A
+// sample that reaches a rule raises a notification and an event. Samples are kept until a flush has written
+// them. One object per accounting database, used by one thread.
+//
+// Only closed samples are flushed, and the histogram only together with one: what was counted since is lost
+// with the object. To end without loss, repeat these two lines until CurrentEpsGet() is 0 and the flush
+// answers 0; the first closes the open sample as soon as the second has changed:
+//
+//     accounting.CurEpsUpdate();
+//     accounting.AccoutingFlush2DB();
+//
+// Where memory runs out, operations throw std::bad_alloc; the counts stay as they were.
 
 #include <cstdint>
 #include <list>
@@ -41,7 +48,7 @@ public:
     // Loads the stored histogram and the notification rules. A database that is missing or cannot be read
     // is taken as empty.
     AccountingManager();
-    // Flushes once more; its failure is only reported.
+    // Flushes the closed samples once more; a failure is only reported. The open sample is not closed.
     ~AccountingManager();
     AccountingManager(const AccountingManager &) = delete;
     AccountingManager &operator=(const AccountingManager &) = delete;
@@ -49,8 +56,9 @@ public:
     // Sets the path of the accounting database, "/var/log/kelolog/.KELOACCOUNTDB". Reads no file; always 0.
     int ConfigLoad();
 
-    // Counts one record from `device`, after closing the sample if the second has changed. Always 0. Its cost
-    // does not depend on the number of devices.
+    // Counts one log from `device`, a text of any bytes (the database keeps it up to its first NUL), after
+    // closing the sample where the second has changed. Always 0. Its cost does not depend on the number of
+    // devices.
     int LogInc(std::string device);
 
     // Closes the current sample if it is not empty and the clock has left the second in which the last one
@@ -64,8 +72,9 @@ public:
     // transaction. Without samples it does nothing. When the file is larger than 5 MiB, samples older than a
     // day are deleted.
     //
-    // Returns 0, or -1 after a report; the samples then stay for the next flush. A failed insert of a sample
-    // leaves those before it in the database, and the next flush writes them again.
+    // Returns 0 when all of it is in the file, or -1 after a report; the samples then stay for the next
+    // flush. A failed insert of a sample leaves those before it in the database, and the next flush writes
+    // them again. Where the transaction could not be begun the rows are stored one by one.
     int AccoutingFlush2DB();
 
     // Discards the oldest closed samples until at most `samples` are left with at most `counts` counts of

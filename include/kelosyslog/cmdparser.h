@@ -11,7 +11,9 @@
 
 // Splits a command text after every closing brace and reads each piece as one JSON value:
 //
-//     CmdParser().CmdParse(text = R"({"cmd":"start"}{"cmd":"stop","ids":[1,2]})", commands);    // two values
+//     std::string text = R"({"cmd":"start"}{"cmd":"stop","ids":[1,2]})";
+//     std::vector<Json::Value> commands;
+//     CmdParser().CmdParse(text, commands); // appends two values
 //
 // So a command is a flat object: an object within an object, or a "}" in a string, splits it in the wrong
 // place and fails. White space is allowed before an object but not after the last one.

@@ -13,7 +13,7 @@
 //
 //     LogParser parser;
 //     parser.LogAdd(text);
-//     for (_SYSLOG_LOG_DATA_tag &log : parser.LogListGet())
+//     for (const _SYSLOG_LOG_DATA_tag &log : parser.LogListTake())
 //         if (parser.isValidLog(log))
 //             Store(log);
 //     parser.LogReset();
@@ -45,28 +45,28 @@ public:
 
     // Parses one line, without its line feed, into `record`. Fields other than the twelve are not touched.
     // Returns 0, or -1 when the line has fewer than eleven fields, which leaves those it has in `record`.
-    int32_t ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record);
+    int32_t ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record) const;
 
     // Splits `text` at every character of `delimiters` and drops empty pieces. (The free function Tokenize
     // keeps them.)
-    std::list<std::string> Tokenize(const std::string &text, const std::string &delimiters);
+    std::list<std::string> Tokenize(const std::string &text, const std::string &delimiters) const;
 
     // Returns 1 when host, ip, ldate, ltime, prog and msg are all non-empty. Otherwise reports it in the
     // system log, keeps a copy of the record for PartialLogDump and returns 0. The copies stay until the
-    // parser is destroyed.
-    int32_t isValidLog(_SYSLOG_LOG_DATA_tag &record);
+    // parser goes.
+    int32_t isValidLog(const _SYSLOG_LOG_DATA_tag &record);
 
     // Number of records in the list, and a copy of the list in the order of the input.
-    int32_t LogGetCount();
-    std::list<_SYSLOG_LOG_DATA_tag> LogListGet();
+    int32_t LogGetCount() const;
+    std::list<_SYSLOG_LOG_DATA_tag> LogListGet() const;
 
     // Empties the list. The fragment and the rejected records stay. Returns 0.
     int32_t LogReset();
 
     // Write the list, and the records that isValidLog rejected, to the debug channel at level 2, which is
     // silent unless the program raised the threshold (Debuger::ThresholdSet).
-    void LogDump();
-    void PartialLogDump();
+    void LogDump() const;
+    void PartialLogDump() const;
 
     // Sets the text that every following LogAdd prefixes to its input; "" (as at the start) for none.
     void PartialLogSet(std::string fragment);
@@ -83,10 +83,12 @@ private:
 // Feeds a parser from a stream in pieces of any size: an unterminated last line waits for its
 // rest. The records are the same as if the whole stream had been added in one LogAdd.
 //
+//     char buffer[65536];
 //     LogStream stream(parser);
-//     while ((length = read(fd, buffer, sizeof buffer)) > 0)
+//     while (const size_t length = std::fread(buffer, 1, sizeof buffer, input))
 //         stream.Add({buffer, length});
-//     stream.Finish();
+//     if (std::ferror(input) == 0) // else the line that waits may be cut
+//         stream.Finish();
 //
 // The parser's fragment belongs to the stream while it is in use. Memory stays bounded by the longest line
 // allowed: a longer one is dropped as a whole, reported in the system log like one that does not parse, and

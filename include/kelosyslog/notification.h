@@ -8,9 +8,10 @@
 //     if (const std::string keyword = manager.CheckKeyword(log.msg); !keyword.empty())
 //         manager.NotificationSendKeyword(log.host, keyword, log);
 //
-// Notifications go to the appliance's notification service (keloplatform/kelonotify.h), which delivers them
-// to the administrator. An `int` result is 0 for success and -1 for failure; failures are written to the
-// system log unless stated otherwise. Fixed paths are under the root of kelosyslog/root.h.
+// A notification goes to the appliance's notification service (keloplatform/kelonotify.h), which tells the
+// administrator. An `int` result is 0 for success and -1 for failure; failures are written to the system log
+// unless stated otherwise. Fixed paths are below the root of kelosyslog/root.h. Where memory runs out,
+// operations throw std::bad_alloc, but for those that state another result.
 
 #include <cstdint>
 #include <list>
@@ -72,6 +73,7 @@ public:
     int NotificationSendKeyword(const std::string &host, const std::string &keyword,
                                 const std::string &content);
 
+    int NotificationSendSev(const std::string &, int, const std::string &) = delete; // 0 is no text
     // The same with the severity's word (`pri` is 0 to 7, not checked) and the message of `log`.
     int NotificationSendSev(const std::string &host, _SYSLOG_DB_PRIORITY_tag pri,
                             const _SYSLOG_LOG_DATA_tag &log);
@@ -96,7 +98,7 @@ KELOSYSLOG_API int SyslogNotifyConfGet(const std::string &path, const std::strin
 // Returns 0 when the rule is on the disk, or -1 with the file unchanged: it cannot be written, or it cannot
 // contain the name or the pattern (for example with a line feed).
 KELOSYSLOG_API int SyslogNotifyConfSet(const std::string &path, const std::string &section,
-                                       _SYSLOG_NOTIFY_RULES_tag &rule);
+                                       const _SYSLOG_NOTIFY_RULES_tag &rule);
 
 // Whether any channel is on: SMS, mail (switched on, with a server and a recipient), or a push service. False
 // also, after a message, when any of the settings cannot be read.

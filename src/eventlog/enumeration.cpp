@@ -38,7 +38,7 @@ int ReadEvents(DBResult_tag *result, void *context) {
 
 } // namespace
 
-std::list<_SSYSLOG_LOG_LOG_tag> Logger::LogEnum(std::string dbPath, int offset, int limit) {
+std::list<_SSYSLOG_LOG_LOG_tag> Logger::LogEnum(std::string dbPath, int offset, int limit) const {
     std::list<_SSYSLOG_LOG_LOG_tag> events;
     kelo::EventDatabase db(dbPath);
     if (!db.Connect())

@@ -16,7 +16,7 @@ struct StringPut {
     void operator()(char *text) const { TORVCStrPut(text); }
 };
 
-int AddServerEvent(Logger &logger, int level, const char *event) {
+int AddServerEvent(const Logger &logger, int level, const char *event) {
     if (event == nullptr || logger.LogAdd(kelo::ServerEventDatabase(), level, "SYSTEM", event) < 0) {
         Debuger::MSG(0, "Fail to add log");
         return -1;
@@ -26,7 +26,7 @@ int AddServerEvent(Logger &logger, int level, const char *event) {
 
 // Adds an event of one kind; `arguments` fill its format, which the compiler checks.
 template <kelo::EventKind Kind, typename... Arguments>
-int AddEvent(Logger &logger, Arguments... arguments) {
+int AddEvent(const Logger &logger, Arguments... arguments) {
     constexpr const char *format = kelo::kEventKinds[Kind].format;
     const std::unique_ptr<char, StringPut> event(TORVCStrGet(format, arguments...));
     return AddServerEvent(logger, kelo::kEventKinds[Kind].level, event.get());
@@ -34,54 +34,54 @@ int AddEvent(Logger &logger, Arguments... arguments) {
 
 } // namespace
 
-int Logger::LogAddServStart(std::string text) {
+int Logger::LogAddServStart(std::string text) const {
     return AddEvent<kelo::kServerStart>(*this, text.c_str());
 }
 
-int Logger::LogAddServStop(std::string text) {
+int Logger::LogAddServStop(std::string text) const {
     return AddEvent<kelo::kServerStop>(*this, text.c_str());
 }
 
-int Logger::LogAddNotifyEps(uint64_t eps) {
+int Logger::LogAddNotifyEps(uint64_t eps) const {
     return AddEvent<kelo::kNotifyEps>(*this, static_cast<unsigned long long>(eps));
 }
 
-int Logger::LogAddNotifySev(std::string sev, std::string content) {
+int Logger::LogAddNotifySev(std::string sev, std::string content) const {
     return AddEvent<kelo::kNotifySeverity>(*this, sev.c_str(), content.c_str());
 }
 
-int Logger::LogAddNotifySev(_SYSLOG_DB_PRIORITY_tag prio, std::string content) {
+int Logger::LogAddNotifySev(_SYSLOG_DB_PRIORITY_tag prio, std::string content) const {
     return LogAddNotifySev(PriorTypeToStr(prio), content);
 }
 
-int Logger::LogAddNotifyKw(std::string keyword, std::string content) {
+int Logger::LogAddNotifyKw(std::string keyword, std::string content) const {
     return AddEvent<kelo::kNotifyKeyword>(*this, keyword.c_str(), content.c_str());
 }
 
-int Logger::LogAddArchStart(std::string dbName) {
+int Logger::LogAddArchStart(std::string dbName) const {
     return AddEvent<kelo::kArchiveStart>(*this, dbName.c_str());
 }
 
-int Logger::LogAddArchFinish(std::string dbName) {
+int Logger::LogAddArchFinish(std::string dbName) const {
     return AddEvent<kelo::kArchiveFinish>(*this, dbName.c_str());
 }
 
-int Logger::LogAddArchFailed(std::string dbName) {
+int Logger::LogAddArchFailed(std::string dbName) const {
     return AddEvent<kelo::kArchiveFailed>(*this, dbName.c_str());
 }
 
-int Logger::LogAddVolFull() {
+int Logger::LogAddVolFull() const {
     const kelo::EventKindRow &row = kelo::kEventKinds[kelo::kVolumeFull];
     const std::unique_ptr<char, StringPut> event(TORVCStrGet("%s", row.format));
     return AddServerEvent(*this, row.level, event.get());
 }
 
-int Logger::LogAddLogClear(std::string dbPath, std::string user) {
+int Logger::LogAddLogClear(std::string dbPath, std::string user) const {
     return AddServerEvent(*this, kelo::kEventKinds[kelo::kLogClear].level,
                           (dbPath + " was cleared by " + user).c_str());
 }
 
-int Logger::LogClear(std::string dbPath, std::string user) {
+int Logger::LogClear(std::string dbPath, std::string user) const {
     unlink(dbPath.c_str());
     if (LogAddLogClear(dbPath, user) < 0) {
         kelo::ReportErrorAt("logger", 638,

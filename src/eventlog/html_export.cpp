@@ -54,7 +54,7 @@ void WritePage(FILE *page, const std::list<_SSYSLOG_LOG_LOG_tag> &events) {
 
 } // namespace
 
-int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPath) {
+int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPath) const {
     if (dbPath.empty() || second.empty() || outPath.empty())
         return -1;
     const std::list<_SSYSLOG_LOG_LOG_tag> events = LogEnum(dbPath, 0, 0);
@@ -67,6 +67,6 @@ int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPa
     return 0;
 }
 
-int Logger::LogHtmlRemove(std::string path) {
+int Logger::LogHtmlRemove(std::string path) const {
     return path.empty() ? -1 : unlink(path.c_str());
 }

@@ -34,7 +34,7 @@ std::string RunRotation(DBHandler &db) {
 
 } // namespace
 
-int Logger::LogCount(std::string dbPath) {
+int Logger::LogCount(std::string dbPath) const {
     if (dbPath.empty() || dbPath.front() != '/') {
         Debuger::MSG(0, "Invalid syslog db path!");
         return -1;
@@ -60,7 +60,7 @@ int Logger::LogCount(std::string dbPath) {
     return static_cast<int>(std::strtol(kelo::FieldText(result.get(), row, "COUNT(*)"), nullptr, 10));
 }
 
-int Logger::LogRotation(std::string dbPath) {
+int Logger::LogRotation(std::string dbPath) const {
     if (LogCount(dbPath) <= kMostRowsWithoutRotation)
         return 0;
     kelo::EventDatabase db(dbPath);

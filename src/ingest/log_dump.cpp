@@ -4,7 +4,7 @@
 
 // No text is composed while the debug channel drops it.
 
-void LogParser::LogDump() {
+void LogParser::LogDump() const {
     if (Debuger::ThresholdGet() < 2)
         return;
     Debuger::MSG(2, "Log count: " + ullNumberToString(logList_.size()));
@@ -12,7 +12,7 @@ void LogParser::LogDump() {
         Debuger::MSG(2, "Log countent: " + log.msg);
 }
 
-void LogParser::PartialLogDump() {
+void LogParser::PartialLogDump() const {
     if (Debuger::ThresholdGet() < 2)
         return;
     Debuger::MSG(2, "Partial log count: " + ullNumberToString(partialLogList_.size()));

@@ -27,11 +27,11 @@ uint32_t LogParser::LogAdd(std::string &text) {
     return 0;
 }
 
-int32_t LogParser::ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record) {
+int32_t LogParser::ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record) const {
     return kelo::ParseLogEntry(line, record) ? 0 : -1;
 }
 
-std::list<std::string> LogParser::Tokenize(const std::string &text, const std::string &delimiters) {
+std::list<std::string> LogParser::Tokenize(const std::string &text, const std::string &delimiters) const {
     std::list<std::string> pieces;
     size_t start = text.find_first_not_of(delimiters);
     while (start != std::string::npos) {
@@ -42,7 +42,7 @@ std::list<std::string> LogParser::Tokenize(const std::string &text, const std::s
     return pieces;
 }
 
-int32_t LogParser::isValidLog(_SYSLOG_LOG_DATA_tag &record) {
+int32_t LogParser::isValidLog(const _SYSLOG_LOG_DATA_tag &record) {
     for (const std::string *field :
          {&record.host, &record.ip, &record.ldate, &record.ltime, &record.prog, &record.msg}) {
         if (field->empty()) {
@@ -54,11 +54,11 @@ int32_t LogParser::isValidLog(_SYSLOG_LOG_DATA_tag &record) {
     return 1;
 }
 
-int32_t LogParser::LogGetCount() {
+int32_t LogParser::LogGetCount() const {
     return static_cast<int32_t>(logList_.size());
 }
 
-std::list<_SYSLOG_LOG_DATA_tag> LogParser::LogListGet() {
+std::list<_SYSLOG_LOG_DATA_tag> LogParser::LogListGet() const {
     return logList_;
 }
 

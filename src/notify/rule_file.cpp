@@ -57,7 +57,7 @@ int SyslogNotifyConfGet(const std::string &path, const std::string &section, _SY
     return 0;
 }
 
-int SyslogNotifyConfSet(const std::string &path, const std::string &, _SYSLOG_NOTIFY_RULES_tag &rule) {
+int SyslogNotifyConfSet(const std::string &path, const std::string &, const _SYSLOG_NOTIFY_RULES_tag &rule) {
     kelo::SzHash values;
     if (!values || !FillSection(values, rule)) {
         kelo::ReportErrorAt(kSource, 124, "Fail to allocate memory");

@@ -28,7 +28,7 @@ std::string NameOfThisMachine() {
 }
 
 // An event that cannot be written must not cost the archive.
-void AddEvent(int (Logger::*add)(std::string), const std::string &source) {
+void AddEvent(int (Logger::*add)(std::string) const, const std::string &source) {
     std::string reason;
     {
         const LogMessageCapture messages;
