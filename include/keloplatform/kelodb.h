@@ -56,7 +56,7 @@ KELOPLATFORM_API int KELODBNumRows(DBResult_tag *result);
 KELOPLATFORM_API int KELODBFetchRow(DBResult_tag *result, unsigned int *row);
 
 // The text of a column of a row whose handle KELODBFetchRow gave. The name is compared without regard to the
-// case of ASCII letters, as in SQL; where two columns have one name the first counts. The text is
+// case of ASCII letters, as in SQL; of two columns with the same name the first is used. The text is
 // NUL-terminated and belongs to the result. Null when the result has no such row or column, or the value is
 // NULL.
 KELOPLATFORM_API const char *KELODBFetchField(DBResult_tag *result, unsigned int row, const char *column);

@@ -5,21 +5,21 @@
 //     AccountingManager accounting;      // loads the stored histogram
 //     for (std::string host; Receive(host);)
 //         accounting.LogInc(host);
-//     if (accounting.isNeed2Flush())     // to be asked every 6 seconds or more rarely
+//     if (accounting.isNeed2Flush())     // call it every 6 seconds or less often
 //         accounting.AccoutingFlush2DB();
 //
-// At the first log of a new second the manager closes a sample: logs per device since the sample before. A
-// sample that reaches a rule raises a notification and an event. Samples are kept until a flush has written
-// them. One object per accounting database, used by one thread.
+// At the first record of a new second the manager closes a sample: records per device since the sample
+// before. A sample that reaches the threshold of a rule causes a notification and an event. Samples are kept
+// until a flush has written them. One object per accounting database, used by one thread.
 //
-// Only closed samples are flushed, and the histogram only together with one: what was counted since is lost
-// with the object. To end without loss, repeat these two lines until CurrentEpsGet() is 0 and the flush
-// answers 0; the first closes the open sample as soon as the second has changed:
+// Only closed samples are flushed, and the histogram only together with one: what was counted after that is
+// lost with the object. To end without loss, repeat these two lines until CurrentEpsGet() is 0 and the flush
+// returns 0; the first closes the open sample as soon as the second has changed:
 //
 //     accounting.CurEpsUpdate();
 //     accounting.AccoutingFlush2DB();
 //
-// Where memory runs out, operations throw std::bad_alloc; the counts stay as they were.
+// When memory runs out, operations throw std::bad_alloc; the counts stay as they were.
 
 #include <cstdint>
 #include <list>
@@ -56,8 +56,8 @@ public:
     // Sets the path of the accounting database, "/var/log/kelolog/.KELOACCOUNTDB". Reads no file; always 0.
     int ConfigLoad();
 
-    // Counts one log from `device`, a text of any bytes (the database keeps it up to its first NUL), after
-    // closing the sample where the second has changed. Always 0. Its cost does not depend on the number of
+    // Counts one record from `device`, a text of any bytes (the database keeps it up to its first NUL), after
+    // closing the sample if the second has changed. Always 0. Its cost does not depend on the number of
     // devices.
     int LogInc(std::string device);
 
@@ -74,7 +74,7 @@ public:
     //
     // Returns 0 when all of it is in the file, or -1 after a report; the samples then stay for the next
     // flush. A failed insert of a sample leaves those before it in the database, and the next flush writes
-    // them again. Where the transaction could not be begun the rows are stored one by one.
+    // them again. If the transaction could not be started the rows are stored one by one.
     int AccoutingFlush2DB();
 
     // Discards the oldest closed samples until at most `samples` are left with at most `counts` counts of

@@ -10,7 +10,7 @@
 //
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
 // statement and closes the connection before it returns. (SyslogDBExtkeyMapGet and SyslogDBExtkeyLookupByName
-// ask for the generation first: two statements on two connections.) None throws on a database error; where
+// ask for the generation first: two statements on two connections.) None throws on a database error; when
 // memory runs out outside the database layer they throw std::bad_alloc, with everything closed and nothing
 // deleted. A database is never created.
 
@@ -26,9 +26,9 @@
 // conditions is ANDed.
 //
 // The value is the operand as the user gave it; the library escapes it. For LIKE and NOT LIKE, '*' and '?'
-// are the wildcards and '%' and '_' stand for themselves; for GLOB, '[' and ']' do. A value of SYSLOG_OP_RAW
-// is an SQL expression and goes into the statement as it is: the caller answers for it. The alternatives of
-// alternatives are ignored. A value with a NUL byte cannot be asked for: select, count and delete answer -1
+// are the wildcards and '%' and '_' are literal; for GLOB, '[' and ']' are literal. A value of SYSLOG_OP_RAW
+// is an SQL expression and goes into the statement unchanged: the caller is responsible for it. The
+// alternatives of alternatives are ignored. With a NUL byte in a value, select, count and delete return -1
 // before anything runs.
 struct _SYSLOG_SQL_COND_tag {
     _SYSLOG_DB_ATTRI_tag attr = SYSLOG_ATTRI_ID;
@@ -74,8 +74,8 @@ KELOSYSLOG_API int SyslogDBSelect(const std::string &dbPath,
 // Counts the rows of `table` that meet all `conditions`. Without a filter the count is the largest row id,
 // which is instant but counts deleted rows too. `limit` and `order` go into the counting statement itself.
 //
-// Returns the count, narrowed to int; -1 for a failure (only a bad path is reported in the system log), to
-// which a statement without a row belongs (a `limit` that skips it); -2 when there were several rows.
+// Returns the count, narrowed to int; -1 for a failure (only a bad path is reported in the system log),
+// also when the statement gave no row (a `limit` that skips it); -2 when it gave several rows.
 KELOSYSLOG_API int SyslogDBSelectCountByTable(const std::string &dbPath, const std::string &table,
                                               const std::list<_SYSLOG_SQL_COND_tag> &conditions,
                                               _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
@@ -86,8 +86,8 @@ KELOSYSLOG_API int SyslogDBSelectCount(const std::string &dbPath,
                                        _SYSLOG_SQL_LIMIT_tag *limit, _SYSLOG_SQL_ORDER_tag *order);
 
 // Deletes the rows of table "logs" that meet all `conditions`; all rows when there are none. Returns 0, or
-// -1 with nothing deleted: only a bad path is reported in the system log. Where a condition cannot be
-// rendered exactly nothing runs.
+// -1 with nothing deleted: only a bad path is reported in the system log. Nothing runs if a condition cannot
+// be rendered exactly.
 KELOSYSLOG_API int SyslogDBDelete(const std::string &dbPath,
                                   const std::list<_SYSLOG_SQL_COND_tag> &conditions);
 

@@ -9,7 +9,7 @@
 //
 // A Logger holds no state: every operation opens its database, works and closes it. Operations return 0 or -1
 // unless stated otherwise, and report a failure in the system log. Silent are LogHtmlGen and LogHtmlRemove, a
-// LogCount of -2, and in LogClear a file that could not be deleted. Where memory runs out they throw
+// LogCount of -2, and in LogClear a file that could not be deleted. When memory runs out they throw
 // std::bad_alloc, with everything closed.
 
 #include <cstdint>
@@ -50,16 +50,16 @@ public:
     // Records that `user` cleared the log database at `dbPath`.
     int LogAddLogClear(std::string dbPath, std::string user) const;
 
-    // Deletes the log database file at `dbPath` and records that, also where there was none and where it
-    // could not be deleted. Always 0.
+    // Deletes the log database file at `dbPath` and records that, also when there is no such file or it
+    // cannot be deleted, which is not reported. Always 0.
     int LogClear(std::string dbPath, std::string user) const;
 
-    // Number of events in the database at the absolute path `dbPath`; -1 on failure, -2 when the count does
-    // not come as exactly one row.
+    // Number of events in the database at the absolute path `dbPath`; -1 on failure, -2 when the statement
+    // did not yield exactly one row (not reported).
     int LogCount(std::string dbPath) const;
 
-    // Tidies a database of 20,000 events or more: removes events whose time is 0 or less, and compacts the
-    // file. Smaller ones are left alone.
+    // Rotates a database of 20,000 events or more: removes events whose time is 0 or less, and compacts the
+    // file. Smaller ones do not change.
     int LogRotation(std::string dbPath) const;
 
     // The events of the database at `dbPath`, newest first: `limit` of them after `offset`, or all when

@@ -16,7 +16,6 @@
 //     for (const _SYSLOG_LOG_DATA_tag &log : parser.LogListTake())
 //         if (parser.isValidLog(log))
 //             Store(log);
-//     parser.LogReset();
 //
 // A parser is used by one thread at a time. Out of memory is reported as std::bad_alloc; what was parsed
 // before stays.
@@ -53,7 +52,7 @@ public:
 
     // Returns 1 when host, ip, ldate, ltime, prog and msg are all non-empty. Otherwise reports it in the
     // system log, keeps a copy of the record for PartialLogDump and returns 0. The copies stay until the
-    // parser goes.
+    // parser is destroyed.
     int32_t isValidLog(const _SYSLOG_LOG_DATA_tag &record);
 
     // Number of records in the list, and a copy of the list in the order of the input.

@@ -8,6 +8,7 @@
 #include <stdexcept>
 
 #include "base/files.h"
+#include "support/source_dir.h"
 
 namespace kelo::test {
 namespace {
@@ -26,7 +27,7 @@ protected:
     FileHandle out_;
     FileHandle in_;
     FileHandle null_{open("/dev/null", O_RDWR | O_CLOEXEC)};
-    FileHandle regular_{open(KELO_SOURCE_DIR "/CMakeLists.txt", O_RDONLY | O_CLOEXEC)};
+    FileHandle regular_{open(kelo::test::SourcePath("CMakeLists.txt").c_str(), O_RDONLY | O_CLOEXEC)};
     int count_ = 0;
 };
 
