@@ -99,6 +99,10 @@ CLI::Option *AddText(CLI::App &command, const std::string &names, std::string &v
     return command.add_option(names, take, description)->type_name(typeName);
 }
 
+void AddRoot(Program &program) {
+    AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
+}
+
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum) {
     uint64_t number = 0;
     const char *end = text.data() + text.size();
@@ -115,7 +119,6 @@ void PrintMessage(const std::string &text) {
 }
 
 int RunProgram(Program &program, int argc, const char *const *argv) {
-    AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
     return RunApp(program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
                   [&] { return RunCommand(program, argc, argv); });
 }

@@ -33,6 +33,9 @@ CLI::App *AddSubcommand(Program &program, const std::string &name, const std::st
 CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &name,
                         const std::string &description, std::function<int()> run);
 
+// Adds --root, which goes with every subcommand.
+void AddRoot(Program &program);
+
 // Adds an option whose values arrive as they were typed, one per occurrence; none is split or interpreted. An
 // empty value is a usage error, because it probably is an unset shell variable.
 CLI::Option *AddTexts(CLI::App &command, const std::string &names, std::vector<std::string> &values,

@@ -11,6 +11,7 @@
 #include "base/atomic_file.h"
 #include "base/errors.h"
 #include "base/stop_signals.h"
+#include "cli/completion.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
@@ -260,8 +261,9 @@ void AddArchive(Program &program) {
     command->add_flag("--list", options->isListing, "List the archives, oldest first");
     command->add_flag("--dry-run", options->isDryRun, "Only tell what would be archived and removed");
     command->add_flag("-y,--yes", options->isConfirmed, "Do not ask");
-    AddText(*command, "-o,--output", options->format, "FORMAT",
-            "--list: text (default), json (one array), jsonl (an object per line), csv");
+    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
+                       "--list: text (default), json (one array), jsonl (an object per line), csv"),
+               {"text", "json", "jsonl", "csv"});
     command->add_flag("--no-header", options->noHeader, "--list: no heading in text and csv");
     AddUtcOption(*command, options->inUtc);
     AddTableOptions(*command, options->table, false);

@@ -4,6 +4,9 @@
 
 namespace kelo::tool {
 
+// Everything that the command line of kelosyslog knows.
+void DeclareCommandLine(Program &program);
+
 // The subcommands, each in the file of its name.
 void AddSearch(Program &program);
 void AddCount(Program &program);

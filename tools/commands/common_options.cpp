@@ -4,20 +4,26 @@
 #include <ctime>
 
 #include "base/errors.h"
+#include "cli/completion.h"
+#include "read/severity_filter.h"
 
 namespace kelo::tool {
 
 void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable) {
     const std::string group = "Where to look";
     AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
-    AddText(command, "--log", options.log, "NAME",
-            "One of the system's logs: " + KnownLogNames() + " (default: logs), or an archive by its name")
+    OfferLogs(AddText(command, "--log", options.log, "NAME",
+                      "One of the system's logs: " + KnownLogNames() +
+                          " (default: logs), or an archive by its name"),
+              LogNames())
         ->group(group);
     if (withTable)
-        AddText(
-            command, "--table", options.table, "TABLE",
-            "logs (default), general_log, connection_log or transfer_log; the last three have no facility "
-            "and take times from ldate and ltime, and a transfer_log has no level and no message")
+        OfferWords(
+            AddText(command, "--table", options.table, "TABLE",
+                    "logs (default), general_log, connection_log or transfer_log; the last three have no "
+                    "facility and take times from ldate and ltime, and a transfer_log has no level and no "
+                    "message"),
+            {"logs", "general_log", "connection_log", "transfer_log"})
             ->group(group);
 }
 
@@ -29,12 +35,14 @@ void AddFilterOptions(CLI::App &command, LogFilter &filter) {
         "Up to this second; a day alone ends before it begins. TIME: 2020-01-02, '2020/01/02 10:11[:12]', "
         "10:11, today, 'yesterday 18:00', now, 1h or -1h, '2 days ago', @1577836800")
         ->group(group);
-    AddTexts(
-        command, "-p,--priority", filter.severities, "LEVEL",
-        "Severity by name or number. A single one means it and all more severe; warning..emerg is a range; "
-        "err..err is err alone, and so is each of several")
+    OfferList(AddTexts(command, "-p,--priority", filter.severities, "LEVEL",
+                       "Severity by name or number. A single one means it and all more severe; "
+                       "warning..emerg is a range; err..err is err alone, and so is each of several"),
+              SeverityNames())
         ->group(group);
-    AddTexts(command, "--facility", filter.facilities, "NAME", "Facility by name or number")->group(group);
+    OfferList(AddTexts(command, "--facility", filter.facilities, "NAME", "Facility by name or number"),
+              FacilityNames())
+        ->group(group);
     AddTexts(command, "-H,--host", filter.hosts, "HOST", "Sending host; * and ? are wildcards")->group(group);
     AddTexts(command, "-t,--program", filter.programs, "PROGRAM", "Program; * and ? are wildcards")
         ->group(group);
@@ -57,12 +65,14 @@ void ApplyUtc(bool inUtc) {
 
 void AddOutputOptions(CLI::App &command, OutputOptions &options) {
     const std::string group = "How to print";
-    AddText(command, "-o,--output", options.format, "FORMAT",
-            "text (default), short, json (one array), jsonl (an object per line), csv")
+    OfferWords(AddText(command, "-o,--output", options.format, "FORMAT",
+                       "text (default), short, json (one array), jsonl (an object per line), csv"),
+               {"text", "short", "json", "jsonl", "csv"})
         ->group(group);
-    AddText(
-        command, "--fields", options.fields, "NAMES",
-        "These fields, in this order: column names, and 'time'. Default: what people read in text, else all")
+    OfferList(AddText(command, "--fields", options.fields, "NAMES",
+                      "These fields, in this order: column names, and 'time'. Default: what people read in "
+                      "text, else all"),
+              FieldNames())
         ->group(group);
     command.add_flag("--no-header", options.noHeader, "No heading in text and csv")->group(group);
     command.add_flag("--utc", options.inUtc, "Read and print times in UTC, not in local time")->group(group);
@@ -88,7 +98,8 @@ RecordLayout MakeLayout(const OutputOptions &options, TableKind kind) {
 }
 
 void AddKeyValuesFormat(CLI::App &command, std::string &format) {
-    AddText(command, "-o,--output", format, "FORMAT", "text (default) or json (one object)");
+    OfferWords(AddText(command, "-o,--output", format, "FORMAT", "text (default) or json (one object)"),
+               {"text", "json"});
 }
 
 OutputFormat ParseKeyValuesFormat(const std::string &format) {

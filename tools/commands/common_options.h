@@ -38,7 +38,7 @@ void AddOutputOptions(CLI::App &command, OutputOptions &options);
 // What the options mean for a table of this kind. Throws UsageError.
 RecordLayout MakeLayout(const OutputOptions &options, TableKind kind);
 
-// --output of the commands that print KeyValues.
+// --output of the commands that print text or one JSON object.
 void AddKeyValuesFormat(CLI::App &command, std::string &format);
 // The format of that name. Throws UsageError for any but text and json.
 OutputFormat ParseKeyValuesFormat(const std::string &format);

@@ -9,6 +9,7 @@
 
 #include "base/atomic_file.h"
 #include "base/errors.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "kelosyslog/logger.h"
 #include "print/event_fields.h"
@@ -145,16 +146,19 @@ void AddListOptions(CLI::App &command, EventsOptions &options) {
     AddText(command, "-U,--until", options.filter.until, "TIME",
             "Up to this second; a day alone ends before it begins")
         ->group(which);
-    AddTexts(command, "-p,--priority", options.filter.severities, "LEVEL",
-             "information, warning or error. A single one means it and all worse; '!level' excludes")
+    OfferList(
+        AddTexts(command, "-p,--priority", options.filter.severities, "LEVEL",
+                 "information, warning or error. A single one means it and all worse; '!level' excludes"),
+        {"information", "warning", "error"})
         ->group(which);
     const std::string howMany = "How many";
     AddText(command, "-n,--lines", options.lines, "N", "The newest N events, or 'all' (default)")
         ->group(howMany);
     AddText(command, "--offset", options.offset, "N", "Skip the N newest events first")->group(howMany);
     const std::string how = "How to print";
-    AddText(command, "-o,--output", options.output.format, "FORMAT",
-            "text (default), json (one array), jsonl (an object per line), csv")
+    OfferWords(AddText(command, "-o,--output", options.output.format, "FORMAT",
+                       "text (default), json (one array), jsonl (an object per line), csv"),
+               {"text", "json", "jsonl", "csv"})
         ->group(how);
     command.add_flag("--no-header", options.output.noHeader, "No heading in text and csv")->group(how);
     command.add_flag("--utc", options.output.inUtc, "Read and print times in UTC, not in local time")

@@ -12,6 +12,7 @@
 
 #include "base/errors.h"
 #include "base/files.h"
+#include "cli/completion.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/events.h"
@@ -147,10 +148,13 @@ void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions 
                                             return Add(*state, add->kind, add->arguments, program.root);
                                         });
     std::string footer = "Kinds and their values:\n";
-    for (const Kind &kind : kKinds)
+    std::vector<std::string> names;
+    for (const Kind &kind : kKinds) {
         footer += std::string("  ") + kind.name + " " + kind.arguments + "\n";
+        names.emplace_back(kind.name);
+    }
     command->footer(footer);
-    AddText(*command, "kind", add->kind, "KIND", "")->required();
+    OfferWords(AddText(*command, "kind", add->kind, "KIND", ""), names)->required();
     AddTexts(*command, "value", add->arguments, "VALUE", "")->expected(0, -1)->allow_extra_args();
 }
 

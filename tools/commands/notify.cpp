@@ -11,6 +11,7 @@
 #include "base/json.h"
 #include "base/text_encoding.h"
 #include "base/time_format.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "commands/commands.h"
@@ -195,10 +196,15 @@ void AddNotify(Program &program) {
     CLI::App *command = AddSubcommand(program, "notify", "Show and test how notifications go",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddText(*command, "action", options->action, "", "status, test, list or retry")->required();
-    AddTexts(*command, "names", options->names, "", "A channel or a tag, or ids")->expected(-1);
+    OfferWords(AddText(*command, "action", options->action, "", "status, test, list or retry"),
+               {"status", "test", "list", "retry"})
+        ->required();
+    OfferWords(AddTexts(*command, "names", options->names, "", "A channel or a tag, or ids"),
+               {std::begin(kChannelNames), std::end(kChannelNames)}, "test")
+        ->expected(-1);
     command->add_flag("--all", options->isAll, "Take up again everything that was given up");
-    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default) or json");
+    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT", "text (default) or json"),
+               {"text", "json"});
 }
 
 } // namespace kelo::tool

@@ -8,6 +8,7 @@
 
 #include "base/errors.h"
 #include "base/text_encoding.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
@@ -176,10 +177,14 @@ void AddRules(Program &program) {
     CLI::App *command = AddSubcommand(program, "rules", "Show, change and test the notification rules",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddText(*command, "action", options->action, "", "list, add, set, enable, disable, remove or test")
+    OfferWords(
+        AddText(*command, "action", options->action, "", "list, add, set, enable, disable, remove or test"),
+        {"list", "add", "set", "enable", "disable", "remove", "test"})
         ->required();
     AddTexts(*command, "names", options->names, "", "Names of rules")->expected(-1);
-    AddText(*command, "--severity", options->severity, "LEVEL", "This severity and all that are more severe");
+    OfferWords(AddText(*command, "--severity", options->severity, "LEVEL",
+                       "This severity and all that are more severe"),
+               SeverityNames());
     AddText(*command, "--eps", options->eps, "N", "N logs or more in one second, up to 2147483647");
     AddText(*command, "--keyword", options->keyword, "TEXT", "Messages that hold this text, byte for byte");
     command->add_flag("--disabled", options->isDisabled, "The rule is off");
@@ -187,7 +192,8 @@ void AddRules(Program &program) {
     AddText(*command, "-n,--lines", options->test.lines, "N", "Test the newest N stored logs (100)");
     command->add_flag("--notify", options->test.mustNotify,
                       "Send the notifications of the logs that are tested");
-    AddText(*command, "-o,--output", options->test.format, "FORMAT", "text (default) or json");
+    OfferWords(AddText(*command, "-o,--output", options->test.format, "FORMAT", "text (default) or json"),
+               {"text", "json"});
     AddTableOptions(*command, options->test.table, false);
 }
 

@@ -9,6 +9,7 @@
 #include <limits>
 
 #include "base/errors.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
@@ -212,17 +213,23 @@ void AddStats(Program &program) {
     CLI::App *command = AddSubcommand(program, "stats", "Print how many logs were received",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddText(*command, "what", options->what, "", "devices, device, total or eps")->required();
+    OfferWords(AddText(*command, "what", options->what, "", "devices, device, total or eps"),
+               {"devices", "device", "total", "eps"})
+        ->required();
     AddText(*command, "name", options->name, "", "The device of 'stats device'");
     AddText(*command, "--top", options->top, "N", "devices: the N that sent most");
     AddText(*command, "-S,--since", options->period.since, "TIME", "eps: from this time on");
     AddText(*command, "-U,--until", options->period.until, "TIME",
             "eps: up to this second; a day alone ends before it begins");
-    AddText(*command, "--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour");
+    OfferWords(
+        AddText(*command, "--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour"),
+        {"second", "minute", "hour"});
     AddText(*command, "--device", options->device, "NAME", "eps: only of this device");
     command->add_flag("--per-device", options->perDevice, "eps: a row for each device");
     command->add_flag("--plot", options->plot, "Draw the counts as bars");
-    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv");
+    OfferWords(
+        AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv"),
+        {"text", "json", "jsonl", "csv"});
     command->add_flag("--no-header", options->noHeader, "No heading in text and csv");
     AddUtcOption(*command, options->inUtc);
     AddText(*command, "--db", options->db, "PATH", "This accounting database");

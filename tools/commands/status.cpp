@@ -6,6 +6,7 @@
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "commands/commands.h"
+#include "commands/common_options.h"
 #include "print/output.h"
 #include "print/record_formatter.h"
 #include "print/statistics_table.h"
@@ -91,7 +92,7 @@ void AddStatus(Program &program) {
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
     AddWatch(*command, *options);
-    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default) or json (one object)");
+    AddKeyValuesFormat(*command, options->format);
     AddText(*command, "--color", options->colour, "WHEN",
             "auto (default: on a terminal, unless NO_COLOR is set), always, never");
     AddText(*command, "--control", options->control, "PATH",

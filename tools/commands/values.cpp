@@ -4,6 +4,7 @@
 
 #include "base/errors.h"
 #include "base/text_encoding.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
@@ -30,13 +31,19 @@ struct Options {
 };
 
 // The columns of table "logs", which is the only one that is asked.
+std::vector<std::string> AttributeNames() {
+    std::vector<std::string> names;
+    for (int32_t i = SYSLOG_ATTRI_ID; i <= SYSLOG_ATTRI_MSG; ++i)
+        names.emplace_back(LogAttriStrGet(static_cast<_SYSLOG_DB_ATTRI_tag>(i)));
+    return names;
+}
+
 void RequireAttribute(const std::string &name) {
     std::string names;
-    for (int32_t i = SYSLOG_ATTRI_ID; i <= SYSLOG_ATTRI_MSG; ++i) {
-        const char *column = LogAttriStrGet(static_cast<_SYSLOG_DB_ATTRI_tag>(i));
-        if (name == column)
+    for (const std::string &attribute : AttributeNames()) {
+        if (name == attribute)
             return;
-        names += (i == 0 ? "" : ", ") + std::string(column);
+        names += (names.empty() ? "" : ", ") + attribute;
     }
     throw UsageError("values: '" + name + "' is no attribute; attributes are " + names);
 }
@@ -100,12 +107,15 @@ void AddValues(Program &program) {
         AddSubcommand(program, "values", "Print the distinct values of a column of table logs",
                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    AddText(*command, "attribute", options->attribute, "",
-            "host, ip, fac, prio, llevel, tag, utcsec, tzoffset, ldate, ltime, prog, msg or id")
+    OfferWords(AddText(*command, "attribute", options->attribute, "",
+                       "host, ip, fac, prio, llevel, tag, utcsec, tzoffset, ldate, ltime, prog, msg or id"),
+               AttributeNames())
         ->required();
     AddText(*command, "-n,--lines", options->lines, "N", "The first N values");
     AddText(*command, "--offset", options->offset, "N", "Skip N values first");
-    AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv");
+    OfferWords(
+        AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv"),
+        {"text", "json", "jsonl", "csv"});
     command->add_flag("--no-header", options->noHeader, "No heading in csv");
     AddTableOptions(*command, options->table, false);
 }

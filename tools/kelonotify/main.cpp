@@ -13,6 +13,7 @@
 #include "base/errors.h"
 #include "cli/command_line.h"
 #include "kelonotify/deliverer.h"
+#include "kelonotify/options.h"
 #include "kelonotify/watcher.h"
 #include "keloplatform/root.h"
 
@@ -27,19 +28,13 @@ enum ExitStatus : int {
     kExitSpool = 4,
 };
 
-struct Options {
-    std::string root;
-    bool mustStay = false;
-    DelivererOptions delivery;
-};
-
 void WarnOfOpenSettings(const Settings &settings) {
     if (settings.IsOpenToOthers())
         syslog(LOG_WARNING, "%s holds passwords and may be read by everybody: give it mode 0640",
                settings.Path().c_str());
 }
 
-int Run(const Options &options) {
+int Run(const NotifierOptions &options) {
     const Spool spool(options.root);
     const Settings settings(options.root);
     spool.CreateFolders();
@@ -60,21 +55,6 @@ int Run(const Options &options) {
     return deliverer.IsAllDelivered() ? kExitDelivered : kExitLeft;
 }
 
-void AddOptions(CLI::App &app, Options &options) {
-    app.set_version_flag("--version", "kelonotify " KELOSYSLOG_VERSION);
-    app.add_option("--root", options.root, "Work on the spool and the settings below DIR")->type_name("DIR");
-    app.add_flag("--watch", options.mustStay, "Stay, and deliver what comes");
-    app.add_option("--timeout", options.delivery.timeoutSec, "End a step on a network after SECONDS (30)")
-        ->type_name("SECONDS")
-        ->check(CLI::Range(1, 600));
-    app.add_option("--give-up-after", options.delivery.giveUpAfterSec,
-                   "Put what is not delivered at this age into failed/ (259200, three days)")
-        ->type_name("SECONDS")
-        ->check(CLI::Range(0, 31536000));
-    app.footer("Exit status: 0 everything delivered, 1 something waits or was given up, 2 usage, 3 another "
-               "instance delivers, 4 the spool cannot be read or written.");
-}
-
 void ApplyRoot(std::string &root) {
     if (root.empty())
         return;
@@ -88,9 +68,9 @@ void ApplyRoot(std::string &root) {
 int Main(int argc, char **argv) {
     std::signal(SIGPIPE, SIG_IGN); // a server that goes away is noticed by the failing write
     openlog("kelonotify", LOG_PID | LOG_PERROR, LOG_DAEMON);
-    Options options;
-    CLI::App app("Deliver the notifications that wait in the spool.", "kelonotify");
-    AddOptions(app, options);
+    NotifierOptions options;
+    CLI::App app;
+    DeclareCommandLine(app, options);
     const ExitHandling exits = {
         kExitUsage, kExitSpool,
         [](const std::string &text) { std::fprintf(stderr, "kelonotify: %s\n", text.c_str()); },

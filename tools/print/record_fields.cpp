@@ -77,6 +77,15 @@ RecordFields SummaryFields(TableKind kind) {
     return Choose(&RecordField::summary, kind);
 }
 
+std::vector<std::string> FieldNames() {
+    std::vector<std::string> names;
+    for (const RecordField &field : kFields) {
+        if (std::find(names.begin(), names.end(), field.name) == names.end())
+            names.emplace_back(field.name);
+    }
+    return names;
+}
+
 RecordFields ParseFields(const std::string &names, TableKind kind) {
     RecordFields fields;
     for (size_t begin = 0; begin <= names.size();) {

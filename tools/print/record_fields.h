@@ -25,6 +25,9 @@ using RecordFields = std::vector<const RecordField *>;
 RecordFields AllFields(TableKind kind);
 RecordFields SummaryFields(TableKind kind);
 
+// The names of the fields of all tables, each once.
+std::vector<std::string> FieldNames();
+
 // The fields of a comma-separated list of names. Throws UsageError naming a name that the table does not
 // have.
 RecordFields ParseFields(const std::string &names, TableKind kind);

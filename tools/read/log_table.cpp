@@ -113,11 +113,18 @@ std::string ArchiveFolderPath(const std::string &root) {
     return root + "/var/log/kelolog/archive";
 }
 
-std::string KnownLogNames() {
-    std::string names = kWorkingLog;
+std::vector<std::string> LogNames() {
+    std::vector<std::string> names = {kWorkingLog};
     for (int32_t i = 0; i < g_xferlog_info_count - 1; ++i)
-        names += std::string(", ") + g_xferlog_info[i].name;
+        names.emplace_back(g_xferlog_info[i].name);
     return names;
+}
+
+std::string KnownLogNames() {
+    std::string text;
+    for (const std::string &name : LogNames())
+        text += (text.empty() ? "" : ", ") + name;
+    return text;
 }
 
 std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 namespace kelo::tool {
 
@@ -34,7 +35,8 @@ LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root
 // The folder of the archives below `root`.
 std::string ArchiveFolderPath(const std::string &root);
 
-// The names that --log knows apart from archives, separated by commas.
+// The names that --log knows apart from archives, and the same as a text, separated by commas.
+std::vector<std::string> LogNames();
 std::string KnownLogNames();
 
 // One line that names the path and what can be told from outside about why it cannot be read (or changed,

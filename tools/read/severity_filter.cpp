@@ -91,6 +91,14 @@ SeverityFilter ParseSeverities(const std::vector<std::string> &values) {
     return severities;
 }
 
+std::vector<std::string> SeverityNames() {
+    return {std::begin(g_MappingSyslogPrior), std::end(g_MappingSyslogPrior)};
+}
+
+std::vector<std::string> FacilityNames() {
+    return {kFacilities.begin(), kFacilities.end()};
+}
+
 std::string FacilityName(const std::string &value) {
     size_t number = 0;
     const char *end = value.data() + value.size();

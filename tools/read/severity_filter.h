@@ -28,6 +28,10 @@ struct SeverityFilter {
 // of several, excluded or a bound of a range stands for itself. Throws UsageError.
 SeverityFilter ParseSeverities(const std::vector<std::string> &values);
 
+// The names of all severities, the most severe first, and of all facilities in the order of their numbers.
+std::vector<std::string> SeverityNames();
+std::vector<std::string> FacilityNames();
+
 // The name of a facility for its number ("16" gives "local0"); anything else is already a name and stays.
 std::string FacilityName(const std::string &value);
 
