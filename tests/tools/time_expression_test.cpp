@@ -51,6 +51,23 @@ TEST(TimeExpression, GivesTheSecondThatTheUserMeans) {
     }
 }
 
+// 2020-10-25 02:30 comes twice in Berlin: at 00:30 and at 01:30 UTC.
+TEST(TimeExpression, TakesTheFirstOfTwoLocalTimesUnlessItIsStillToCome) {
+    constexpr int64_t kFirst = 1603585800;
+    for (const char *zone : {kBerlin, "Europe/Berlin"}) {
+        SetZone(zone);
+        for (const auto &[now, expected] : {std::pair{kFirst + 600, kFirst},
+                                            {kFirst + 86400, kFirst},
+                                            {kFirst, kFirst},
+                                            {kFirst - 1, kFirst + 3600}}) {
+            EXPECT_EQ(ParseTimeExpression("--until", "2020-10-25 02:30", now).seconds, expected) << zone;
+            SetZone(zone);
+            ParseTimeExpression("--since", "2020-01-01", now); // what the C library did last must not matter
+            EXPECT_EQ(ParseTimeExpression("--until", "2020-10-25 02:30", now).seconds, expected) << zone;
+        }
+    }
+}
+
 // Midnight to midnight has 23 hours on the day that the clocks go forward.
 TEST(TimeExpression, CountsDaysByTheCalendarWhenClocksChange) {
     SetZone(kBerlin);

@@ -1,5 +1,6 @@
 #include "read/time_expression.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <ctime>
@@ -153,6 +154,23 @@ std::optional<tm> TakeDayWord(Scanner &scanner, int64_t now) {
     return std::nullopt;
 }
 
+// The second of a local time. When clocks are set back a time comes twice: the first is meant, or the second
+// while the first is still to come. (The C library chooses by what it did last.)
+int64_t LocalSecond(tm parts, int64_t now) {
+    parts.tm_isdst = -1;
+    tm wanted = parts;
+    const time_t one = mktime(&wanted); // and normalises the day
+    for (const time_t setBack : {-7200, -3600, -1800, 1800, 3600, 7200}) {
+        const time_t other = one + setBack;
+        tm found{};
+        localtime_r(&other, &found);
+        if (found.tm_mday == wanted.tm_mday && found.tm_hour == wanted.tm_hour &&
+            found.tm_min == wanted.tm_min)
+            return std::min(one, other) <= now ? std::min(one, other) : std::max(one, other);
+    }
+    return one;
+}
+
 // A day with or without a time of day, or a time of day alone.
 std::optional<Moment> ParseCalendar(std::string_view text, int64_t now) {
     Scanner scanner(text);
@@ -180,8 +198,7 @@ std::optional<Moment> ParseCalendar(std::string_view text, int64_t now) {
     day->tm_hour = static_cast<int>(clock.value_or(Clock{}).hour);
     day->tm_min = static_cast<int>(clock.value_or(Clock{}).minute);
     day->tm_sec = static_cast<int>(clock.value_or(Clock{}).second);
-    day->tm_isdst = -1; // let the time zone decide
-    return Moment{isUtc ? timegm(&*day) : mktime(&*day), !clock.has_value()};
+    return Moment{isUtc ? timegm(&*day) : LocalSecond(*day, now), !clock.has_value()};
 }
 
 std::optional<Moment> ParseRelative(std::string_view text, int64_t now) {
