@@ -16,8 +16,14 @@ protected:
 
     static Ids Collect(const LogReader &reader, const Page &page, bool oldestFirst) {
         Ids ids;
+        size_t told = 0;
         const uint64_t count = reader.ReadPage(
-            page, oldestFirst, [&](const _SYSLOG_LOG_DATA_tag &log) { ids.push_back(log.id); });
+            page, oldestFirst, [&](const _SYSLOG_LOG_DATA_tag &log) { ids.push_back(log.id); },
+            [&] {
+                EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
+                told = ids.size();
+            });
+        EXPECT_EQ(told, ids.size());
         EXPECT_EQ(count, ids.size());
         return ids;
     }
@@ -38,7 +44,7 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
             newestFirst.push_back(id + 99000);
     }
     const LogReader reader(table_, {});
-    for (const uint64_t limit : {0U, 1U, 50U, 55000U, 99999U}) {
+    for (const uint64_t limit : {0U, 1U, 50U, 10001U, 55000U, 99999U}) {
         for (const uint64_t offset : {0U, 1U, 7U, 186U, 59934U, 59935U, 99999U}) {
             SCOPED_TRACE(std::to_string(limit) + " after " + std::to_string(offset));
             const size_t first = std::min<size_t>(offset, newestFirst.size());

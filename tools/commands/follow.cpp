@@ -31,19 +31,19 @@ std::optional<FileIdentity> IdentifyFile(const std::string &path) {
 
 class Follower {
 public:
-    Follower(const LogReader &reader, const LogHandler &print)
-        : reader_(reader), everything_(reader.Table(), {}), print_(print) {}
+    Follower(const LogReader &reader, const LogHandler &format, const ChunkHandler &print)
+        : reader_(reader), everything_(reader.Table(), {}), format_(format), print_(print) {}
 
     uint64_t PrintPresent(const FollowOptions &options) {
         file_ = IdentifyFile(reader_.Table().path);
         lastId_ = everything_.IdFromNewest(0);
         if (!options.showAll && options.lines == 0)
             return 0;
-        return reader_.ReadPage({options.showAll ? 0 : options.lines, 0}, true,
-                                [this](const _SYSLOG_LOG_DATA_tag &log) {
-                                    print_(log);
-                                    lastId_ = std::max(lastId_, log.id);
-                                });
+        const auto format = [this](const _SYSLOG_LOG_DATA_tag &log) {
+            format_(log);
+            lastId_ = std::max(lastId_, log.id);
+        };
+        return reader_.ReadPage({options.showAll ? 0 : options.lines, 0}, true, format, print_);
     }
 
     uint64_t PrintNews() {
@@ -57,7 +57,7 @@ public:
             const uint64_t newest = everything_.IdFromNewest(0);
             file_ = current;
             lastId_ = isReplaced ? newest : std::max(lastId_, newest);
-            return newest < first ? 0 : reader_.Scan({first, newest}, true, 0, print_);
+            return newest < first ? 0 : reader_.Scan({first, newest}, true, 0, format_, print_);
         } catch (const DatabaseError &) {
             if (!isReplaced || file_ == current)
                 throw;
@@ -68,16 +68,17 @@ public:
 private:
     const LogReader &reader_;
     LogReader everything_;
-    const LogHandler &print_;
+    const LogHandler &format_;
+    const ChunkHandler &print_;
     std::optional<FileIdentity> file_; // the one that was read last
     uint64_t lastId_ = 0;
 };
 
 } // namespace
 
-uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &print,
-                Output &output) {
-    Follower follower(reader, print);
+uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &format,
+                const ChunkHandler &print, Output &output) {
+    Follower follower(reader, format, print);
     uint64_t count = follower.PrintPresent(options);
     output.Flush();
     Clock::time_point lastNews = Clock::now();

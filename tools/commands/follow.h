@@ -15,12 +15,13 @@ struct FollowOptions {
     std::optional<int64_t> until = {}; // stop when this second (of the epoch) has passed
 };
 
-// Hands the logs that are there and then every new one to `print`, and flushes `output` after each batch.
-// Returns their number when the bounds of `options` end it; OutputClosed ends it when nobody reads any more.
+// Hands the logs that are there and then every new one to `format`, calls `print` once the database is
+// closed, and flushes `output` after each batch. Returns their number when the bounds of `options` end it;
+// OutputClosed ends it when nobody reads any more.
 //
 // When another file takes the place of the database (a quarantine, a rotation), it goes on with the first log
 // of the new one; while there is no file it waits.
-uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &print,
-                Output &output);
+uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &format,
+                const ChunkHandler &print, Output &output);
 
 } // namespace kelo::tool

@@ -74,19 +74,16 @@ int Run(const Options &options, const std::string &root) {
     Output output(!options.follow && !options.output.noPager);
     const std::unique_ptr<RecordFormatter> writer = MakeRecordWriter(layout);
     std::string text;
-    const auto send = [&] {
+    writer->Begin(text);
+    const auto format = [&](const _SYSLOG_LOG_DATA_tag &log) { writer->Add(log, text); };
+    const auto print = [&] {
         output.Write(text);
         text.clear();
     };
-    writer->Begin(text);
-    const auto print = [&](const _SYSLOG_LOG_DATA_tag &log) {
-        writer->Add(log, text);
-        send();
-    };
-    const uint64_t count = options.follow ? Follow(reader, follow, print, output)
-                                          : reader.ReadPage(page, !options.newestFirst, print);
+    const uint64_t count = options.follow ? Follow(reader, follow, format, print, output)
+                                          : reader.ReadPage(page, !options.newestFirst, format, print);
     writer->End(text);
-    send();
+    print();
     output.Finish();
     return count > 0 ? kExitFound : kExitNothing;
 }

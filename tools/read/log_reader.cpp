@@ -12,9 +12,12 @@ namespace {
 
 using Log = _SYSLOG_LOG_DATA_tag;
 
-constexpr uint64_t kChunkIds = 50000;
+// Rows of one statement, some 3 MB, and the ids that it starts with.
+constexpr uint64_t kChunkRows = 10000;
 // The largest page that is kept in memory.
-constexpr uint64_t kPageRows = 50000;
+constexpr uint64_t kPageRows = kChunkRows;
+// Ids that one statement looks at, at most: of sparse ids, such as those made from a time.
+constexpr uint64_t kLargestSpan = uint64_t{1} << 60;
 // A count comes as an int; no range of this many ids can exceed it.
 constexpr uint64_t kCountableIds = std::numeric_limits<int32_t>::max();
 
@@ -81,48 +84,58 @@ uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
     return id;
 }
 
-uint64_t LogReader::Scan(const IdRange &range, bool oldestFirst, uint64_t limit,
-                         const LogHandler &handle) const {
+uint64_t LogReader::Scan(const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle,
+                         const ChunkHandler &chunkDone) const {
     IdRange rest = range;
+    uint64_t span = kChunkRows;
     uint64_t total = 0;
+    const auto moveTo = [&](uint64_t id) { (oldestFirst ? rest.first : rest.last) = id; };
     while (rest.first <= rest.last) {
-        const uint64_t span = std::min(kChunkIds - 1, rest.last - rest.first);
+        const uint64_t further = std::min(span - 1, rest.last - rest.first);
         const IdRange chunk =
-            oldestFirst ? IdRange{rest.first, rest.first + span} : IdRange{rest.last - span, rest.last};
-        const uint64_t rows = Select(chunk, oldestFirst,
-                                     {limit == 0 ? kChunkIds : std::min(kChunkIds, limit - total), 0}, handle)
-                                  .rows;
-        total += rows;
+            oldestFirst ? IdRange{rest.first, rest.first + further} : IdRange{rest.last - further, rest.last};
+        const uint64_t maxRows = limit == 0 ? kChunkRows : std::min(kChunkRows, limit - total);
+        const Scanned scanned = Select(chunk, oldestFirst, {maxRows, 0}, handle);
+        chunkDone();
+        total += scanned.rows;
         if (limit != 0 && total == limit)
             break;
-        (oldestFirst ? rest.first : rest.last) = oldestFirst ? chunk.last + 1 : chunk.first - 1;
-        if (rows > 0)
+        if (scanned.rows == maxRows) { // the rest of the range is still to come
+            moveTo(oldestFirst ? scanned.lastId + 1 : scanned.lastId - 1);
+            continue;
+        }
+        moveTo(oldestFirst ? chunk.last + 1 : chunk.first - 1);
+        if (scanned.rows < kChunkRows / 4)
+            span = std::min(4 * span, kLargestSpan);
+        if (scanned.rows > 0)
             continue;
         const uint64_t next = EndId(rest, oldestFirst); // over a gap, or to the next of rare matches
         if (next == 0)
             break;
-        (oldestFirst ? rest.first : rest.last) = next;
+        moveTo(next);
     }
     return total;
 }
 
-uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandler &handle) const {
+uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandler &handle,
+                             const ChunkHandler &chunkDone) const {
     if (page.limit != 0 && page.limit <= kPageRows) {
         std::vector<Log> logs;
         Select({}, false, page, [&](const Log &log) { logs.push_back(log); });
         if (oldestFirst)
             std::reverse(logs.begin(), logs.end());
         std::for_each(logs.begin(), logs.end(), handle);
+        chunkDone();
         return logs.size();
     }
     const uint64_t last = IdFromNewest(page.offset);
     if (last == 0)
         return 0;
     if (!oldestFirst)
-        return Scan({1, last}, false, page.limit, handle);
-    // Too many to turn round in memory: find where the page begins and walk forward.
+        return Scan({1, last}, false, page.limit, handle, chunkDone);
+    // Too many to reverse in memory: find where the page begins and scan forward.
     const uint64_t first = page.limit == 0 ? 1 : IdFromNewest(page.offset + page.limit - 1);
-    return Scan({std::max<uint64_t>(first, 1), last}, true, 0, handle);
+    return Scan({std::max<uint64_t>(first, 1), last}, true, 0, handle, chunkDone);
 }
 
 uint64_t LogReader::CountWith(Conditions conditions) const {

@@ -11,7 +11,10 @@
 namespace kelo::tool {
 
 using Conditions = std::list<_SYSLOG_SQL_COND_tag>;
+// Takes a record while the database is open for reading: it neither prints nor waits.
 using LogHandler = std::function<void(const _SYSLOG_LOG_DATA_tag &)>;
+// Told that the records so far are complete and the database is closed: the place to print them.
+using ChunkHandler = std::function<void()>;
 
 // Row ids, both ends included.
 struct IdRange {
@@ -30,10 +33,14 @@ struct Page {
 // which they arrived.
 //
 // Pages and counts are exact also after deletions. (The library answers an unfiltered page or count from the
-// largest id alone, so every statement here carries a filter of its own.) Long walks go through ranges of
+// largest id alone, so every statement here carries a filter of its own.) Long scans go through ranges of
 // ids, one statement each, because the library hands out rows only once the result of a statement is
 // complete: so memory stays flat, no statement keeps a snapshot of the database for long, and none sorts more
-// than its range whichever index SQLite chooses.
+// than its range whichever index SQLite chooses. The ranges grow while they hold few rows, so that ids may be
+// far apart.
+//
+// No database is open while a ChunkHandler runs: a reader that prints slowly keeps nobody from removing the
+// file or emptying its write-ahead log.
 //
 // Every function throws DatabaseError when the database cannot be read, and lets the exceptions of a handler
 // pass.
@@ -50,11 +57,16 @@ public:
     uint64_t FirstId(const IdRange &range) const { return EndId(range, true); }
 
     // Hands the logs with an id in `range` to `handle`, oldest first or newest first, up to `limit` (0 for
-    // all). Returns how many.
-    uint64_t Scan(const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle) const;
+    // all), and calls `chunkDone` after each statement. Returns how many.
+    uint64_t Scan(
+        const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle,
+        const ChunkHandler &chunkDone = [] {}) const;
 
-    // Hands a page to `handle`, oldest first or newest first. Returns how many logs it had.
-    uint64_t ReadPage(const Page &page, bool oldestFirst, const LogHandler &handle) const;
+    // Hands a page to `handle`, oldest first or newest first, and calls `chunkDone` after each statement.
+    // Returns how many records it had.
+    uint64_t ReadPage(
+        const Page &page, bool oldestFirst, const LogHandler &handle,
+        const ChunkHandler &chunkDone = [] {}) const;
 
     // Number of selected logs, in all or in `range`, which must not span more than 2^31 - 1 ids.
     uint64_t Count() const;
