@@ -1,11 +1,15 @@
 // kelosyslog delete: removes logs.
 
 #include <algorithm>
+#include <chrono>
+#include <csignal>
 #include <ctime>
 
 #include "base/errors.h"
+#include "base/stop_signals.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
+#include "cli/progress_bar.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
 #include "read/log_reader.h"
@@ -23,8 +27,10 @@ constexpr const char *kFooter =
     "  kelosyslog delete --all --db /volume1/old.db\n\n"
     "Exit status: 0 deleted, 1 nothing matched or not confirmed, 2 usage, 3 database.";
 
-// Ids that one statement covers: about 40 ms, for which other writers wait.
-constexpr uint64_t kStepIds = 10000;
+// How long one statement may keep other writers waiting, roughly.
+constexpr std::chrono::milliseconds kStepTime{100};
+constexpr uint64_t kSmallestStep = 50;
+constexpr uint64_t kLargestStep = 5000; // records
 
 struct Options {
     LogTableOptions table;
@@ -39,24 +45,74 @@ std::string Logs(uint64_t count) {
     return std::to_string(count) + (count == 1 ? " matching log" : " matching logs");
 }
 
-// Deletes what is selected up to `lastId`, range by range, hopping over ranges without a match. Returns how
-// many logs matched right before each step.
-uint64_t DeleteUpTo(const LogReader &reader, uint64_t lastId) {
-    const std::string &path = reader.Table().path;
-    uint64_t deleted = 0;
-    uint64_t next = reader.FirstId({1, lastId});
-    while (next != 0 && next <= lastId) {
-        const IdRange step{next, std::min(next + kStepIds - 1, lastId)};
-        const uint64_t count = reader.CountIn(step);
-        Conditions conditions = reader.Selected();
-        AddRange(conditions, step);
-        if (count > 0 && SyslogDBDelete(path, conditions) != 0)
-            throw DatabaseError(DescribeDatabaseProblem(reader.Table(), true) +
-                                (deleted > 0 ? "; " + Logs(deleted) + " were deleted before" : ""));
-        deleted += count;
-        next = count > 0 ? step.last + 1 : reader.FirstId({step.last + 1, lastId});
+// The condition that a record has one of these ids: SQLite then goes straight to the rows, whatever the
+// filter was, and holds the write lock for no longer than their removal takes.
+_SYSLOG_SQL_COND_tag HasId(const std::vector<uint64_t> &ids, size_t first, size_t count) {
+    std::string list;
+    for (size_t i = first; i < first + count; ++i)
+        list += (i == first ? "" : ",") + std::to_string(ids[i]);
+    return {SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "id IN (" + list + ")", {}};
+}
+
+// Deletes records in steps, so that others write in between.
+class Deletion {
+public:
+    Deletion(const LogTable &table, uint64_t total)
+        : table_(table), total_(total), progress_(total, ProgressBar::Unit::Records) {}
+
+    // Throws DatabaseError and Interrupted, which tell how many were deleted before.
+    void Delete(const std::vector<uint64_t> &ids) {
+        for (size_t next = 0; next < ids.size();) {
+            if (StopSignals::Received() != 0) {
+                progress_.Clear();
+                PrintMessage("interrupted; " + Deleted() + " were deleted");
+                StopSignals::Check();
+            }
+            const size_t count = std::min<size_t>(step_, ids.size() - next);
+            const auto begin = std::chrono::steady_clock::now();
+            if (SyslogDBDelete(table_.path, {HasId(ids, next, count)}) != 0) {
+                progress_.Clear();
+                throw DatabaseError(DescribeDatabaseProblem(table_, true) +
+                                    (deleted_ > 0 ? "; " + Deleted() + " were deleted before" : ""));
+            }
+            Adapt(std::chrono::steady_clock::now() - begin);
+            next += count;
+            deleted_ += count;
+            progress_.Add(count);
+        }
     }
-    return deleted;
+
+    uint64_t Count() const { return deleted_; }
+
+private:
+    std::string Deleted() const { return std::to_string(deleted_) + " of " + Logs(total_); }
+
+    void Adapt(std::chrono::steady_clock::duration taken) {
+        if (taken > kStepTime)
+            step_ = std::max(step_ / 2, kSmallestStep);
+        else if (taken < kStepTime / 2)
+            step_ = std::min(step_ * 2, kLargestStep);
+    }
+
+    const LogTable &table_;
+    uint64_t total_;
+    ProgressBar progress_;
+    uint64_t deleted_ = 0;
+    uint64_t step_ = 500;
+};
+
+// Deletes the selected records up to `newest`. Returns how many.
+uint64_t DeleteUpTo(const LogReader &reader, uint64_t newest, uint64_t total) {
+    const StopSignals signals;
+    Deletion deletion(reader.Table(), total);
+    std::vector<uint64_t> ids;
+    reader.Scan(
+        {1, newest}, true, 0, [&](const _SYSLOG_LOG_DATA_tag &log) { ids.push_back(log.id); },
+        [&] {
+            deletion.Delete(ids);
+            ids.clear();
+        });
+    return deletion.Count();
 }
 
 int Run(const Options &options, const std::string &root) {
@@ -84,9 +140,16 @@ int Run(const Options &options, const std::string &root) {
         PrintMessage("nothing deleted");
         return kExitNothing;
     }
-    const uint64_t deleted = DeleteUpTo(reader, newest);
-    output.Write("deleted " + Logs(deleted) + " from " + table.path + "\n");
-    output.Finish();
+    int stopSignal = 0;
+    try {
+        const uint64_t deleted = DeleteUpTo(reader, newest, count);
+        output.Write("deleted " + Logs(deleted) + " from " + table.path + "\n");
+        output.Finish();
+    } catch (const Interrupted &interruption) {
+        stopSignal = interruption.signal;
+    }
+    if (stopSignal != 0)
+        std::raise(stopSignal); // whoever waits sees what ended the program
     return kExitFound;
 }
 
