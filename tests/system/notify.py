@@ -102,7 +102,12 @@ class NotifyTest(unittest.TestCase):
         silence.stop()
         server.refuse = {"data": "451 later"}
         server.start()
-        self.retry(status=1)
+        second = self.add()
+        log = self.retry(status=1)
+        for target in (ADMIN, NIGHT):
+            self.assertEqual(log.count(f"mail:{target}, entry"), 1, "one line an answer, whatever it refuses: " + log)
+        self.assertEqual(log.count(": 451 later"), 2, "the server's own words: " + log)
+        os.remove(f"{self.spool}/new/{second}.json")
         server.refuse = {NIGHT: "550 nobody"}
         self.retry(status=1)
         self.assertEqual([mail[1] for mail in server.mails], [[ADMIN]])

@@ -139,10 +139,20 @@ void Deliverer::SendOne(const Entry &entry, Progress &progress, const std::strin
         NoteFailure(attempts, result.reason, Now());
     else
         attempts.reason = result.reason;
-    if (result.outcome == Outcome::Refused && attempts.failures == 1)
-        syslog(LOG_WARNING, "%s %s, entry %s: %s", Words(channel), SafeLine(target, 300).c_str(),
-               entry.id.c_str(), result.reason.c_str());
+    NoteRefusal(entry, channel, target, result);
     NoteChannel(channel, result);
+}
+
+// One line in the system log for each answer that a target gives, however many entries it refuses with it.
+void Deliverer::NoteRefusal(const Entry &entry, const std::string &channel, const std::string &target,
+                            const Result &result) {
+    if (result.outcome == Outcome::Sent)
+        refusals_.erase(target);
+    if (result.outcome != Outcome::Refused || refusals_[target] == result.reason)
+        return;
+    refusals_[target] = result.reason;
+    syslog(LOG_WARNING, "%s %s, entry %s: %s", Words(channel), SafeLine(target, 300).c_str(),
+           entry.id.c_str(), result.reason.c_str());
 }
 
 // One line in the system log when a channel fails, and one when it works again; the attempts between stay

@@ -41,6 +41,8 @@ private:
     void SendOne(const Entry &entry, Progress &progress, const std::string &channel,
                  const std::string &target);
     bool IsDue(const std::string &channel, const Attempts &attempts) const;
+    void NoteRefusal(const Entry &entry, const std::string &channel, const std::string &target,
+                     const Result &result);
     void NoteChannel(const std::string &name, const Result &result);
     void GiveUp(const std::string &id, Progress progress, const std::string &reason);
     void Wait(int64_t until);
@@ -52,6 +54,7 @@ private:
     std::function<bool()> shouldStop_;
     std::map<std::string, std::unique_ptr<Channel>> channels_; // as the settings are in this pass
     Progress health_;                                          // of the channels
+    std::map<std::string, std::string> refusals_;              // by target, the reason that was told last
     bool isForced_ = false;
     bool isAllDelivered_ = true;
     int64_t nextTry_ = -1;

@@ -16,6 +16,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr size_t kMaxSubjectBytes = 320;
+constexpr size_t kMaxReplyBytes = 250;
 constexpr size_t kMaxBodyBytes = size_t{256} << 10;
 
 bool IsAddress(const std::string &text) {
@@ -63,6 +64,8 @@ public:
             return {Outcome::Refused, "smtp_to: '" + SafeLine(recipient, 100) + "' is no address"};
         text_ = WriteMime(MakeMail(entry, recipient));
         read_ = 0;
+        reply_.clear();
+        isReplyComplete_ = true;
         Slist recipients;
         Append(recipients, "<" + recipient + ">");
         transfer_.Set(CURLOPT_MAIL_RCPT, recipients.get());
@@ -97,6 +100,8 @@ private:
             transfer_.Set(CURLOPT_PASSWORD, mail_.password);
         }
         transfer_.Set(CURLOPT_UPLOAD, 1L);
+        transfer_.Set(CURLOPT_HEADERFUNCTION, &MailChannel::ReadReply);
+        transfer_.Set(CURLOPT_HEADERDATA, this);
         transfer_.Set(CURLOPT_READFUNCTION, &MailChannel::ReadText);
         transfer_.Set(CURLOPT_READDATA, this);
         return "";
@@ -122,7 +127,25 @@ private:
         const long answer = transfer_.Code();
         const bool isAnswer = code == CURLE_SEND_ERROR || code == CURLE_WEIRD_SERVER_REPLY;
         const bool isRefusal = isAnswer && answer >= 400 && answer < 600 && answer != 421;
-        return {isRefusal ? Outcome::Refused : Outcome::Unreachable, transfer_.Reason(code)};
+        // The server's own words say more than libcurl's.
+        const bool isReply = reply_.starts_with(std::to_string(answer));
+        return {isRefusal ? Outcome::Refused : Outcome::Unreachable,
+                isReply ? SafeLine(reply_, kMaxReplyBytes) : transfer_.Reason(code)};
+    }
+
+    // Called by libcurl with each line of a reply (RFC 5321, section 4.2): "550-first", "550 last".
+    static size_t ReadReply(char *buffer, size_t size, size_t count, void *channel) {
+        auto *self = static_cast<MailChannel *>(channel);
+        std::string_view line(buffer, size * count);
+        line = line.substr(0, line.find_last_not_of("\r\n") + 1);
+        const bool isFailure = line.starts_with('4') || line.starts_with('5');
+        const bool isFirst = self->isReplyComplete_;
+        self->isReplyComplete_ = line.size() < 4 || line[3] != '-';
+        if (isFailure && isFirst)
+            self->reply_.clear();
+        if (isFailure && self->reply_.size() < kMaxReplyBytes)
+            self->reply_ += isFirst ? line : line.substr(std::min<size_t>(line.size(), 3));
+        return size * count;
     }
 
     static size_t ReadText(char *buffer, size_t size, size_t count, void *channel) {
@@ -139,6 +162,8 @@ private:
     std::string problem_;
     std::string text_;
     size_t read_ = 0;
+    std::string reply_; // the server's last one that was a failure, on one line
+    bool isReplyComplete_ = true;
 };
 
 } // namespace
