@@ -188,6 +188,15 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     EXPECT_TRUE(status.attention.empty());
     status.volumes = {{{"/x"}, 1000, 100}};
     EXPECT_TRUE(FindAttention(status).empty());
+    // A few messages may wait for their batch; many, or few for long, are stuck.
+    status.databases.front().last = status.time - 59;
+    status.syslogNg.destinations = {{"dst.sql", "d_db#0", "logs.db", 9, 4, 0, 999, 0, true}};
+    EXPECT_TRUE(FindAttention(status).empty());
+    status.databases.front().last = status.time - 61;
+    EXPECT_EQ(FindAttention(status).at(0),
+              "syslog-ng cannot write 999 messages for d_db#0 (logs.db); the newest record is 1 min old");
+    status.syslogNg.destinations.front().isStuck = false;
+    EXPECT_TRUE(FindAttention(status).empty());
     status.volumes.front().free = 99;
     status.syslogNg.destinations.front().dropped = 2;
     EXPECT_THAT(FindAttention(status),
@@ -258,6 +267,8 @@ TEST_F(Status, AsksSyslogNgForItsCountersInTime) {
         fs::remove(deep);
     }
     EXPECT_EQ(GatherSyslogNg("", deep, 200ms).state, State::Stopped);
+    const FakeSyslogNg syslogNg(deep, "dst.sql;d#0;x;a;written;4\ndst.sql;d#0;x;a;queued;3\n.\n");
+    EXPECT_TRUE(GatherSyslogNg("", deep, 200ms).destinations.at(0).isStuck);
 }
 
 // The names of all values: "databases[].rows", with NAME for names that are data themselves.

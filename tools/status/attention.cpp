@@ -27,6 +27,26 @@ void LookAtSyslogNg(const SyslogNgStatus &status, Lines &lines) {
     }
 }
 
+// Messages that wait and do not become records, with the time since the newest record.
+void LookAtQueues(const ServerStatus &status, Lines &lines) {
+    constexpr uint64_t kManyMessages = 1000;
+    constexpr int64_t kLongSec = 60;
+    const std::string &ofReceiver = status.receiver.told.database;
+    std::optional<int64_t> newest;
+    for (const DatabaseStatus &database : status.databases) {
+        if (ofReceiver.empty() ? database.name == "logs" : database.path == ofReceiver)
+            newest = database.last;
+    }
+    for (const SyslogNgCounters &destination : status.syslogNg.destinations) {
+        const bool isLong = !newest || status.time - *newest > kLongSec;
+        if (destination.isStuck && (isLong || destination.queued >= kManyMessages))
+            lines.push_back(
+                "syslog-ng cannot write " + Counted(destination.queued, "message") + " for " +
+                destination.id + " (" + destination.instance + ")" +
+                (newest ? "; the newest record is " + Duration(status.time - *newest) + " old" : ""));
+    }
+}
+
 void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
     using State = ReceiverStatus::State;
     const std::string pid = std::to_string(status.told.pid);
@@ -81,6 +101,7 @@ void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &l
 std::vector<std::string> FindAttention(const ServerStatus &status) {
     Lines lines;
     LookAtSyslogNg(status.syslogNg, lines);
+    LookAtQueues(status, lines);
     LookAtReceiver(status.receiver, status.time, lines);
     LookAtDatabases(status, lines);
     LookAtNotifications(status.notifications, status.time, lines);

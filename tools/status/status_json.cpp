@@ -49,6 +49,7 @@ Value ToJson(const SyslogNgStatus &status) {
         item["written"] = Count(destination.written);
         item["dropped"] = Count(destination.dropped);
         item["queued"] = Count(destination.queued);
+        item["stuck"] = destination.isStuck;
         item["memory_bytes"] = Count(destination.memory);
     }
     return json;

@@ -6,6 +6,7 @@
 #include <fstream>
 #include <map>
 #include <sstream>
+#include <thread>
 #include <tuple>
 
 #include "status/control_socket.h"
@@ -73,6 +74,44 @@ SyslogNgStatus::State StateOf(const ControlAnswer &answer, pid_t pid) {
     return isAbsent ? State::Stopped : State::Unknown;
 }
 
+using Destinations = std::vector<SyslogNgCounters>;
+
+// Takes the sources and destinations out of an answer.
+void ReadCounters(const std::string &text, SyslogNgStatus &status) {
+    status.sources.clear();
+    status.destinations.clear();
+    for (SyslogNgCounters &counters : ParseSyslogNgCounters(text))
+        (counters.driver == "source" ? status.sources : status.destinations).push_back(std::move(counters));
+}
+
+bool HasWritten(const SyslogNgCounters &now, const Destinations &before) {
+    const auto same = std::find_if(before.begin(), before.end(), [&](const SyslogNgCounters &other) {
+        return other.driver == now.driver && other.id == now.id && other.instance == now.instance;
+    });
+    return same == before.end() || now.written != same->written;
+}
+
+// Marks the destinations that stay stuck. The counters are then those of the last answer.
+void FindStuck(SyslogNgStatus &status, std::chrono::milliseconds timeout) {
+    constexpr std::chrono::milliseconds kPause{100};
+    constexpr int kTries = 15; // longer than a batch of the shipped configuration waits
+    const Destinations before = status.destinations;
+    for (int i = 0;; ++i) {
+        bool isAnyStuck = false;
+        for (SyslogNgCounters &destination : status.destinations) {
+            destination.isStuck = destination.queued > 0 && !HasWritten(destination, before);
+            isAnyStuck = isAnyStuck || destination.isStuck;
+        }
+        if (!isAnyStuck || i == kTries)
+            return;
+        std::this_thread::sleep_for(kPause);
+        const ControlAnswer answer = AskControlSocket(status.control, "STATS", timeout);
+        if (!answer.problem.empty() || answer.connectError != 0)
+            return;
+        ReadCounters(answer.text, status);
+    }
+}
+
 } // namespace
 
 std::vector<SyslogNgCounters> ParseSyslogNgCounters(const std::string &text) {
@@ -120,8 +159,8 @@ SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &contro
     status.state = StateOf(answer, status.pid);
     status.problem = answer.problem;
     status.since = status.pid != 0 ? ProcessStart(status.pid) : 0;
-    for (SyslogNgCounters &counters : ParseSyslogNgCounters(answer.text))
-        (counters.driver == "source" ? status.sources : status.destinations).push_back(std::move(counters));
+    ReadCounters(answer.text, status);
+    FindStuck(status, timeout);
     return status;
 }
 

@@ -20,7 +20,8 @@ struct SyslogNgCounters {
     uint64_t written = 0;
     uint64_t dropped = 0;
     uint64_t queued = 0;
-    uint64_t memory = 0; // bytes queued in memory
+    uint64_t memory = 0;  // bytes queued in memory
+    bool isStuck = false; // messages are queued, and none was written for longer than a batch may wait
 };
 
 // Reads the answer to "STATS" (syslog-ng-ctl(1)): the sources as a whole and the drivers of destinations, in
@@ -43,7 +44,8 @@ struct SyslogNgStatus {
 };
 
 // Asks the syslog-ng whose files are below `root`, in Debian's places, or the one with this control socket if
-// `control` is not empty. Without permission for the socket, the pid file shows whether it runs.
+// `control` is not empty. Without permission for the socket, the pid file shows whether it runs. While a
+// destination has messages queued it asks again, for a second and a half at most, until some were written.
 SyslogNgStatus GatherSyslogNg(const std::string &root, const std::string &control,
                               std::chrono::milliseconds timeout);
 
