@@ -9,9 +9,8 @@
 #include <filesystem>
 
 #include "support/log_database.h"
-#include "support/source_dir.h"
+#include "support/program_run.h"
 #include "support/temp_root.h"
-#include "tools/program_run.h"
 
 namespace kelo::test {
 namespace {
@@ -24,7 +23,7 @@ protected:
     ArchiveProgram() {
         fs::create_directories(root_.File("var/log/kelolog"));
         fs::create_directories(root_.File("usr/kelo/syslog"));
-        fs::copy(SourcePath("package/schema"), root_.File("usr/kelo/syslog/schema"));
+        fs::copy(KELO_SOURCE_DIR "/package/schema", root_.File("usr/kelo/syslog/schema"));
         CreateLogDatabase(source_);
         InsertSampleLogs(source_, 500);
     }

@@ -19,12 +19,11 @@
 #include "base/json.h"
 #include "base/text_encoding.h"
 #include "base/time_format.h"
-#include "program_run.h"
 #include "status/server_status.h"
 #include "status/status_json.h"
 #include "status/status_screen.h"
 #include "support/log_database.h"
-#include "support/source_dir.h"
+#include "support/program_run.h"
 #include "support/temp_root.h"
 
 namespace kelo::test {
@@ -294,7 +293,7 @@ TEST_F(Status, HasTheKeysThatAreDocumented) {
     std::set<std::string> keys;
     CollectKeys(ParseJson(StatusJson(Gather())), "", keys);
     std::set<std::string> documented;
-    const std::string page = ReadFile(SourcePath("docs/status.md"));
+    const std::string page = ReadFile(KELO_SOURCE_DIR "/docs/status.md");
     re2::StringPiece rest(page);
     for (std::string key; RE2::FindAndConsume(&rest, "\n\\| `([^`]+)` \\|", &key);)
         documented.insert(key);

@@ -1,13 +1,12 @@
 // kelosyslog db on real files.
 
-#include "program_run.h"
-#include "support/source_dir.h"
+#include "support/program_run.h"
 #include "support/test.h"
 
 namespace kelo::test {
 namespace {
 
-const std::string kArchive = SourcePath("package/schema/archive.sql");
+const std::string kArchive = KELO_SOURCE_DIR "/package/schema/archive.sql";
 
 class DbCommand : public testing::Test {
 protected:

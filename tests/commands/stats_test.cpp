@@ -2,8 +2,8 @@
 
 #include "base/errors.h"
 #include "print/statistics_table.h"
-#include "program_run.h"
 #include "read/eps_series.h"
+#include "support/program_run.h"
 #include "support/test.h"
 
 namespace kelo::test {

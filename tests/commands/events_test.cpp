@@ -1,7 +1,6 @@
 // Runs of "kelosyslog events" and "kelosyslog report". (The pages themselves are for the browser's test.)
 
-#include "program_run.h"
-#include "support/source_dir.h"
+#include "support/program_run.h"
 #include "support/test.h"
 
 namespace kelo::test {
@@ -11,7 +10,7 @@ class Events : public testing::Test {
 protected:
     Events() {
         fs::create_directories(root_.File("usr/kelo/syslog/schema"));
-        fs::copy_file(SourcePath("package/schema/kelosyslog.sql"),
+        fs::copy_file(KELO_SOURCE_DIR "/package/schema/kelosyslog.sql",
                       root_.File("usr/kelo/syslog/schema/kelosyslog.sql"));
     }
 

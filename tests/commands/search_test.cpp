@@ -2,7 +2,7 @@
 
 #include <thread>
 
-#include "program_run.h"
+#include "support/program_run.h"
 #include "support/test.h"
 
 namespace kelo::test {
