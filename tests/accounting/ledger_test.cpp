@@ -24,7 +24,7 @@ public:
         if (kind == kPlatformCall)
             PlatformCalls::FailFrom(first, times);
         else if (kind == kWriter)
-            Lock(path);
+            lock_.emplace(path);
         else if (kind != kNone)
             FileFaults::Start(static_cast<FileFaults::Kind>(kind - kWrite), first, times);
     }
@@ -36,14 +36,7 @@ public:
     Obstacle &operator=(const Obstacle &) = delete;
 
 private:
-    void Lock(const std::string &path) {
-        sqlite3 *db = nullptr;
-        EXPECT_EQ(sqlite3_open(path.c_str(), &db), SQLITE_OK);
-        writer_.reset(db);
-        EXPECT_EQ(sqlite3_exec(db, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
-    }
-
-    std::unique_ptr<sqlite3, decltype(&sqlite3_close)> writer_{nullptr, sqlite3_close};
+    std::optional<DatabaseLock> lock_;
 };
 
 class Ledger : public AccountingTest {

@@ -54,9 +54,7 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     const TempRoot root;
     const std::string path = root.File("logs.db");
     CreateSingleFile(path);
-    sqlite3 *locker = nullptr;
-    ASSERT_EQ(sqlite3_open(path.c_str(), &locker), SQLITE_OK);
-    sqlite3_exec(locker, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr);
+    DatabaseLock lock(path, "BEGIN EXCLUSIVE");
     int rows = 0;
     EXPECT_EQ(SyslogDBSelect(path, kFromHost3, nullptr, nullptr, CountRow, &rows, false), -1);
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), -1);
@@ -65,13 +63,12 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     EXPECT_EQ(waits.TakeCount(), 3);
     EXPECT_TRUE(waits.WaitsAtCall(1000)) << "it is asked every millisecond";
     // A writer does not keep readers out of a database with a write-ahead log.
-    sqlite3_exec(locker, "COMMIT; PRAGMA journal_mode = WAL; BEGIN IMMEDIATE", nullptr, nullptr, nullptr);
+    lock.Run("COMMIT; PRAGMA journal_mode = WAL; BEGIN IMMEDIATE");
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), 4);
     EXPECT_EQ(waits.TakeCount(), 0);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
     EXPECT_EQ(waits.TakeCount(), 1);
     ExpectNothingOpen();
-    sqlite3_close(locker);
     EXPECT_EQ(QueryText(path, "SELECT count(*) FROM logs"), "200");
 }
 

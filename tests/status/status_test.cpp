@@ -1,19 +1,10 @@
 // kelosyslog status over servers in every state.
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <json/json.h>
-#include <pty.h>
 #include <re2/re2.h>
-#include <sqlite3.h>
-#include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
-#include <sys/wait.h>
 
-#include <csignal>
-#include <filesystem>
-#include <set>
 #include <thread>
 
 #include "base/json.h"
@@ -22,16 +13,13 @@
 #include "status/server_status.h"
 #include "status/status_json.h"
 #include "status/status_screen.h"
-#include "support/log_database.h"
-#include "support/program_run.h"
-#include "support/temp_root.h"
+#include "support/program_test.h"
 
 namespace kelo::test {
 namespace {
 
 using namespace kelo::tool;
 using namespace std::chrono_literals;
-namespace fs = std::filesystem;
 
 constexpr const char *kCounters = "SourceName;SourceId;SourceInstance;State;Type;Number\n"
                                   "source;s_lines;;a;processed;7\n"
@@ -76,115 +64,83 @@ private:
     std::thread thread_;
 };
 
-// A process that looks like the receiver to others.
-class FakeReceiver {
-public:
-    FakeReceiver() : pid_(fork()) {
-        if (pid_ == 0) {
-            prctl(PR_SET_PDEATHSIG, SIGKILL);
-            prctl(PR_SET_NAME, "kelosyslog");
-            while (true)
-                pause();
-        }
-        const std::string comm = "/proc/" + std::to_string(pid_) + "/comm";
-        while (ReadFile(comm) != "kelosyslog\n")
-            std::this_thread::yield();
-    }
-    ~FakeReceiver() {
-        kill(pid_, SIGKILL);
-        waitpid(pid_, nullptr, 0);
-    }
-    pid_t Pid() const { return pid_; }
-
-private:
-    pid_t pid_;
-};
-
-class Status : public testing::Test {
+class Status : public ProgramTest {
 protected:
     Status() {
         CreateLogDatabase(logs_);
         InsertSampleLogs(logs_, 3);
-        CreateLogDatabase(root_.File("var/log/kelolog/.KELOACCOUNTDB"), "accinfo.sql");
-        RunSql(root_.File("var/log/kelolog/.KELOACCOUNTDB"),
+        CreateLogDatabase(accounting_, "accinfo.sql");
+        RunSql(accounting_,
                "INSERT INTO eps(stamp, device, eps) VALUES (1577836800, 'a', 60), (1577836830, 'b', 60);"
                "INSERT INTO histogram(device, count) VALUES ('a', 60), ('b\x1b[7m\xff', 180)");
-        CreateLogDatabase(root_.File("usr/kelo/etc/kelosyslog.db"), "kelosyslog.sql");
-        RunSql(root_.File("usr/kelo/etc/kelosyslog.db"),
+        CreateLogDatabase(events_, "kelosyslog.sql");
+        RunSql(events_,
                "INSERT INTO log(level, time, user, event) VALUES (2, 1577836800, 'root', 'line\nfeed')");
     }
     ServerStatus Gather() const { return GatherStatus({root_.Path(), "", 200ms}); }
-    void Tell(ReceiverState state) const { WriteReceiverState(root_.Path(), state); }
+    // Expects one line of attention that holds the text, or none for "".
+    void ExpectAttention(const std::string &named) const {
+        if (named.empty())
+            EXPECT_THAT(Gather().attention, testing::IsEmpty());
+        else
+            EXPECT_THAT(Gather().attention, ElementsAre(HasSubstr(named)));
+    }
 
-    struct Folders {
-        explicit Folders(const TempRoot &root) {
-            for (const char *name : {"var/log/kelolog/archive", "usr/kelo/etc", "etc",
-                                     "var/spool/kelonotify/new", "var/spool/kelonotify/failed"})
-                fs::create_directories(root.File(name));
-        }
-    };
-    TempRoot root_;
-    Folders folders_{root_};
-    const std::string logs_ = root_.File("var/log/kelolog/logs.db");
     const std::string control_ = root_.File("var/lib/syslog-ng/syslog-ng.ctl");
 };
 
 TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     const FakeSyslogNg syslogNg(control_, kCounters);
-    const FakeReceiver receiver;
+    ChildProgram receiver(root_.Path(), kProgram + std::string("parse")); // looks like one to others
+    receiver.Await(
+        [&] { return ReadFile("/proc/" + std::to_string(receiver.Pid()) + "/comm") == "kelosyslog\n"; });
+    ExpectAttention("");
     const int64_t now = std::time(nullptr);
-    EXPECT_EQ(Gather().attention, std::vector<std::string>());
-    const std::string corrupt = logs_ + ".corrupt", moved = logs_ + ".moved";
-    const std::string spool = root_.File("var/spool/kelonotify/");
-    const std::string saved = ReadFile(logs_);
-    ReceiverState state;
-    state.pid = receiver.Pid();
-    state.started = state.updated = now;
-    ReceiverState dead = state, other = state, silent = state, waits = state, ended = state;
-    dead.pid = 0x7ffffff;
-    other.started = 1000; // the number was that of another process
-    silent.updated = now - 120;
-    waits.waiting = "the disk is full";
-    ended.pid = dead.pid, ended.ended = now;
-    const std::string entry =
-        R"({"version":1,"id":"a","time":1,"tag":"T","channels":["mail"],"title":"","body":"","class":""})";
-    const struct {
-        std::function<void()> change;
-        std::string named; // what the one line of attention says; "" for none
-        std::function<void()> undo;
-    } cases[] = {
-        {[&] { Tell(state); }, "", {}},
-        {[&] { Tell(ended); }, "", {}},
-        {[&] { Tell(dead); }, "the receiver died: process 134217727", {}},
-        {[&] { Tell(other); }, "the receiver died", {}},
-        {[&] { Tell(silent); }, "told nothing of itself for 2 min", {}},
-        {[&] { Tell(waits); }, "the receiver waits: the disk is full", {}},
-        {[&] { WriteFile(root_.File("run/kelosyslog/receive.json"), "{"); }, "receive.json cannot be read",
-         [&] { fs::remove_all(root_.File("run")); }},
-        {[&] { fs::rename(logs_, moved); }, "logs.db: no such file", [&] { fs::rename(moved, logs_); }},
-        {[&] { WriteFile(corrupt, "12345"); }, "logs.db.corrupt (5 B)", [&] { fs::remove(corrupt); }},
-        {[&] { WriteFile(logs_, "no database" + saved); }, "database logs is damaged",
-         [&] { WriteFile(logs_, saved); }},
-        {[&] { WriteFile(logs_, ""); }, "the file is empty", [&] { WriteFile(logs_, saved); }},
-        {[&] { WriteFile(spool + "failed/x.json", "{}"); }, "given up: 1 notification ",
-         [&] { fs::remove(spool + "failed/x.json"); }},
-        {[&] { WriteFile(spool + "new/a.json", entry); }, "does kelonotify run?",
-         [&] { fs::remove(spool + "new/a.json"); }},
-        {[&] { WriteFile(root_.File("etc/keloinfo.conf"), "smtp_mail_enabled=\"yes\"\n"); }, "smtp_server",
-         [&] { fs::remove(root_.File("etc/keloinfo.conf")); }},
+    const int64_t dead = 0x7ffffff;
+    const int64_t pid = receiver.Pid();
+    const std::pair<ReceiverState, const char *> states[] = {
+        {{.pid = pid, .started = now, .updated = now}, ""},
+        {{.pid = dead, .started = now, .updated = now, .ended = now}, ""},
+        {{.pid = dead, .started = now, .updated = now}, "the receiver died: process 134217727"},
+        {{.pid = pid, .started = 1000, .updated = now},
+         "the receiver died"}, // another process has its number
+        {{.pid = pid, .started = now, .updated = now - 120}, "told nothing of itself for 2 min"},
+        {{.pid = pid, .started = now, .updated = now, .waiting = "the disk is full"},
+         "the receiver waits: the disk is full"},
     };
-    for (const auto &c : cases) {
-        c.change();
-        const std::vector<std::string> attention = Gather().attention;
-        ASSERT_EQ(attention.size(), c.named.empty() ? 0U : 1U)
-            << c.named << testing::PrintToString(attention);
-        for (const std::string &line : attention)
-            EXPECT_NE(line.find(c.named), std::string::npos) << line;
-        if (c.undo)
-            c.undo();
+    for (const auto &[state, named] : states) {
+        WriteReceiverState(root_.Path(), state);
+        ExpectAttention(named);
+    }
+    fs::remove_all(root_.File("run/kelosyslog/receive.json"));
+    const struct {
+        std::string file;
+        std::optional<std::string> content; // nothing: there is no such file
+        const char *named;
+    } files[] = {
+        {root_.File("run/kelosyslog/receive.json"), "{", "receive.json cannot be read"},
+        {logs_, {}, "logs.db: no such file"},
+        {logs_, "no database" + ReadFile(logs_), "database logs is damaged"},
+        {logs_, "", "the file is empty"},
+        {logs_ + ".corrupt", "12345", "logs.db.corrupt (5 B)"},
+        {spool_ + "failed/x.json", "{}", "given up: 1 notification "},
+        {spool_ + "new/a.json",
+         R"({"version":1,"id":"a","time":1,"tag":"T","channels":["mail"],"title":"","body":"","class":""})",
+         "does kelonotify run?"},
+        {root_.File("etc/keloinfo.conf"), "smtp_mail_enabled=\"yes\"\n", "smtp_server"},
+    };
+    for (const auto &[file, content, named] : files) {
+        const std::string before = ReadFile(file);
+        fs::remove(file);
+        if (content)
+            WriteFile(file, *content);
+        ExpectAttention(named);
+        fs::remove(file);
+        if (!before.empty())
+            WriteFile(file, before);
     }
     ServerStatus status = Gather();
-    EXPECT_TRUE(status.attention.empty());
+    EXPECT_THAT(status.attention, testing::IsEmpty());
     status.volumes = {{{"/x"}, 1000, 100}};
     EXPECT_TRUE(FindAttention(status).empty());
     // A few messages may wait for their batch; many, or few for long, are stuck.
@@ -199,14 +155,12 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     status.volumes.front().free = 99;
     status.syslogNg.destinations.front().dropped = 2;
     EXPECT_THAT(FindAttention(status),
-                testing::ElementsAre(testing::HasSubstr("dropped 2 messages for d_db#0"),
-                                     testing::HasSubstr("/x is nearly full")));
+                ElementsAre(HasSubstr("dropped 2 messages for d_db#0"), HasSubstr("/x is nearly full")));
 }
 
 TEST_F(Status, WaitsNeitherForAWriterNorForALock) {
     RunSql(logs_, "INSERT INTO logs(id, utcsec) VALUES (10000000, 1600000000)");
-    sqlite3 *writer = nullptr;
-    ASSERT_EQ(sqlite3_open(logs_.c_str(), &writer), SQLITE_OK);
+    DatabaseLock writer(logs_, "PRAGMA journal_mode");
     const struct {
         const char *lock;
         DatabaseStatus::State state;
@@ -215,8 +169,7 @@ TEST_F(Status, WaitsNeitherForAWriterNorForALock) {
         {"ROLLBACK; PRAGMA journal_mode=DELETE; BEGIN EXCLUSIVE", DatabaseStatus::State::Locked},
     };
     for (const auto &c : cases) {
-        ASSERT_EQ(sqlite3_exec(writer, c.lock, nullptr, nullptr, nullptr), SQLITE_OK)
-            << sqlite3_errmsg(writer);
+        writer.Run(c.lock);
         const auto start = std::chrono::steady_clock::now();
         const DatabaseStatus status = GatherDatabases(root_.Path(), {}).front();
         EXPECT_LT(std::chrono::steady_clock::now() - start, 3s);
@@ -227,7 +180,6 @@ TEST_F(Status, WaitsNeitherForAWriterNorForALock) {
             EXPECT_EQ(status.last, 1600000000);
         }
     }
-    sqlite3_close(writer);
 }
 
 TEST_F(Status, LeavesTheRowsOfAWriteAheadLogWhereTheyAre) {
@@ -286,10 +238,7 @@ void CollectKeys(const Json::Value &value, const std::string &name, std::set<std
 
 TEST_F(Status, HasTheKeysThatAreDocumented) {
     const FakeSyslogNg syslogNg(control_, kCounters);
-    ReceiverState state;
-    state.pid = 1;
-    state.incomplete["msg"] = 1;
-    Tell(state);
+    WriteReceiverState(root_.Path(), {.pid = 1, .incomplete = {{"msg", 1}}});
     std::set<std::string> keys;
     CollectKeys(ParseJson(StatusJson(Gather())), "", keys);
     std::set<std::string> documented;
@@ -318,48 +267,22 @@ TEST_F(Status, FitsTheScreenWhateverTheTextsHold) {
     EXPECT_EQ(count, 12U);
 }
 
-// Runs the program on a terminal until `seen` was seen, ends it, and returns all that it wrote and its
-// status.
-std::pair<std::string, int> RunOnTerminal(const std::string &root, bool byKey) {
-    int terminal = -1;
-    winsize size{24, 80, 0, 0};
-    const pid_t pid = forkpty(&terminal, nullptr, nullptr, &size);
-    if (pid == 0) {
-        execl(KELOSYSLOG_PROGRAM, "kelosyslog", "status", "--watch", "60", "--root", root.c_str(), nullptr);
-        _exit(127);
-    }
-    std::string out;
-    char buffer[4096];
-    for (bool isEnded = false;;) {
-        const ssize_t length = read(terminal, buffer, sizeof buffer); // fails when the program is gone
-        if (length <= 0)
-            break;
-        out.append(buffer, static_cast<size_t>(length));
-        if (!isEnded && out.find("\x1b[J") != std::string::npos) {
-            isEnded = true;
-            if (byKey)
-                WriteAll(terminal, "xq");
-            else
-                kill(pid, SIGTERM);
-        }
-    }
-    int status = 0;
-    waitpid(pid, &status, 0);
-    close(terminal);
-    return {out, WIFEXITED(status) ? WEXITSTATUS(status) : -1};
-}
-
 TEST_F(Status, WatchesOnATerminalAndLeavesItAsItWas) {
     for (const bool byKey : {true, false}) {
-        const auto [out, status] = RunOnTerminal(root_.Path(), byKey);
-        EXPECT_EQ(status, 1) << "no syslog-ng runs";
-        EXPECT_TRUE(out.starts_with("\x1b[?1049h")) << out;
-        EXPECT_TRUE(out.ends_with("\x1b[?1049l")) << out;
-        EXPECT_NE(out.find("syslog-ng is not running"), std::string::npos);
+        ChildProgram terminal(root_.Path(),
+                              "exec script -qec 'stty rows 24 cols 80; exec kelosyslog --root . "
+                              "status --watch 60' log");
+        ASSERT_TRUE(terminal.Await([&] { return terminal.Out().find("\x1b[J") != std::string::npos; }));
+        const std::string pid = std::to_string(terminal.Pid());
+        if (byKey)
+            terminal.Send("xq");
+        else
+            kill(std::stoi(ReadFile("/proc/" + pid + "/task/" + pid + "/children")), SIGTERM);
+        const ProgramResult result = terminal.AwaitEnd();
+        EXPECT_EQ(result.status, 1) << "no syslog-ng runs";
+        EXPECT_THAT(result.out, AllOf(StartsWith("\x1b[?1049h"), testing::EndsWith("\x1b[?1049l"),
+                                      HasSubstr("syslog-ng is not running")));
     }
-    const ProgramResult usage = RunTool({"status", "--watch", "0"});
-    EXPECT_EQ(usage.status, 2);
-    EXPECT_NE(usage.err.find("--watch: '0'"), std::string::npos) << usage.err;
 }
 
 } // namespace

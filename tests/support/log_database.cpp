@@ -1,8 +1,5 @@
 #include "support/log_database.h"
 
-#include <sqlite3.h>
-
-#include <memory>
 #include <stdexcept>
 
 #include "support/fault_pause.h"
@@ -12,7 +9,7 @@
 namespace kelo::test {
 namespace {
 
-using Database = std::unique_ptr<sqlite3, decltype(&sqlite3_close)>;
+using Database = std::unique_ptr<sqlite3, int (*)(sqlite3 *)>;
 using Statement = std::unique_ptr<sqlite3_stmt, decltype(&sqlite3_finalize)>;
 
 [[noreturn]] void Fail(sqlite3 *db, const std::string &what) {
@@ -118,6 +115,22 @@ void InsertSampleLogs(const std::string &path, int count) {
     for (int number = 0; number < count; ++number)
         logs.push_back(SampleLog(number));
     InsertLogs(path, logs);
+}
+
+DatabaseLock::DatabaseLock(const std::string &path, const std::string &sql) : db_(Open(path)) {
+    Run(sql);
+}
+
+void DatabaseLock::Run(const std::string &sql) {
+    test::Run(db_.get(), sql);
+}
+
+std::string DamagePages(const std::string &path) {
+    std::string content = ReadFile(path);
+    for (size_t page = 8192; page + 4096 < content.size(); page += 4096)
+        content.replace(page, 8, 8, '\xff');
+    WriteFile(path, content);
+    return content;
 }
 
 } // namespace kelo::test

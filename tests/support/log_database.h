@@ -1,5 +1,8 @@
 #pragma once
 
+#include <sqlite3.h>
+
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -31,5 +34,18 @@ _SYSLOG_LOG_DATA_tag SampleLog(int number);
 
 // The records SampleLog(0) to SampleLog(count - 1), appended.
 void InsertSampleLogs(const std::string &path, int count);
+
+// Keeps a database locked while it lives, by this statement.
+class DatabaseLock {
+public:
+    explicit DatabaseLock(const std::string &path, const std::string &sql = "BEGIN IMMEDIATE");
+    void Run(const std::string &sql);
+
+private:
+    std::unique_ptr<sqlite3, int (*)(sqlite3 *)> db_;
+};
+
+// Makes every page but the first two of a closed database no page. Returns the file's content then.
+std::string DamagePages(const std::string &path);
 
 } // namespace kelo::test
