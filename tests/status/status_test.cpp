@@ -242,7 +242,7 @@ TEST_F(Status, HasTheKeysThatAreDocumented) {
     std::set<std::string> keys;
     CollectKeys(ParseJson(StatusJson(Gather())), "", keys);
     std::set<std::string> documented;
-    const std::string page = ReadFile(KELO_SOURCE_DIR "/docs/status.md");
+    const std::string page = ReadFile(SourcePath("docs/status.md"));
     re2::StringPiece rest(page);
     for (std::string key; RE2::FindAndConsume(&rest, "\n\\| `([^`]+)` \\|", &key);)
         documented.insert(key);

@@ -10,10 +10,13 @@
 #include <thread>
 #include <utility>
 
+#include "support/source_dir.h"
+
 namespace kelo::test {
 
 std::string InFolder(const std::string &folder, const std::string &command) {
-    return "cd '" + folder + "' && PATH=" KELO_BIN_DIR ":$PATH TZ=UTC0 && export PATH TZ && " + command;
+    return "cd '" + folder + "' && PATH=" + ProgramFolder() + ":$PATH TZ=UTC0 && export PATH TZ && " +
+           command;
 }
 
 ChildProgram::ChildProgram(const std::string &folder, const std::string &command) {

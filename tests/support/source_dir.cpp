@@ -7,4 +7,8 @@ std::string SourcePath(const std::string &path) {
     return KELO_SOURCE_DIR "/" + path;
 }
 
+std::string ProgramFolder() {
+    return KELO_BIN_DIR;
+}
+
 } // namespace kelo::test

@@ -6,5 +6,7 @@ namespace kelo::test {
 
 // The path of a file of the project: SourcePath("package/schema/logs.sql").
 std::string SourcePath(const std::string &path);
+// The folder of the built programs.
+std::string ProgramFolder();
 
 } // namespace kelo::test
