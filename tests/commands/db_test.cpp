@@ -39,12 +39,12 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     const ProgramResult check = Run("db check -o json");
     EXPECT_EQ(check.status, 3);
     EXPECT_THAT(check.out + check.err, HasSubstr("malformed"));
-    EXPECT_EQ(ReadFile(logs_), content);
+    EXPECT_TRUE(ReadFile(logs_) == content);
 
     const ProgramResult quarantine = Run("db quarantine -y");
     EXPECT_EQ(quarantine.status, 3) << "syslog-ng could not be reloaded";
     EXPECT_THAT(quarantine.out, HasSubstr("reloaded  no"));
-    EXPECT_EQ(ReadFile(logs_ + ".corrupt"), content);
+    EXPECT_TRUE(ReadFile(logs_ + ".corrupt") == content);
     Expect("db limit 1000000 --db var/log/kelolog/logs.db.corrupt", 1);
     Expect("db limit 8 --db var/log/kelolog/logs.db.corrupt", 0);
     EXPECT_FALSE(fs::exists(logs_ + ".corrupt"));
