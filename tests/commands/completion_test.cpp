@@ -2,7 +2,7 @@
 
 #include <sstream>
 
-#include "support/test.h"
+#include "support/program_test.h"
 
 namespace kelo::test {
 namespace {
@@ -11,14 +11,13 @@ using Words = std::set<std::string>;
 
 // What bash offers for the last of `words`, which are to be quoted for the shell.
 Words Complete(const std::string &words) {
-    const TempRoot root;
-    const std::string command = "bash -c \". " KELO_COMPLETION "; COMP_WORDS=(kelosyslog " + words +
-                                "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
-                                "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\" >" +
-                                root.File("offered");
-    EXPECT_EQ(std::system(command.c_str()), 0);
+    const ProgramResult result = RunIn(
+        ProgramFolder(), "bash -c \". ../package/completion/kelosyslog; COMP_WORDS=(kelosyslog " + words +
+                             "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
+                             "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"");
+    EXPECT_EQ(result.status, 0) << result.err;
     Words offered;
-    std::istringstream lines(ReadFile(root.File("offered")));
+    std::istringstream lines(result.out);
     for (std::string line; std::getline(lines, line);)
         offered.insert(line);
     offered.erase("");
