@@ -69,7 +69,8 @@ TEST_F(EventLoopTest, ThrowsWhatAHandlerThrowsAndGoesOn) {
 
 // A second signal must not strike when the first one has ended the work.
 TEST_F(EventLoopTest, TakesSignalsFirstAndDiscardsWhatIsLeft) {
-    const EventSource busy = loop_.AddInput(null_.Get(), [] { FAIL() << "while a signal waits"; });
+    EXPECT_EQ(write(in_.Get(), "x", 1), 1);
+    const EventSource input = loop_.AddInput(out_.Get(), [] { FAIL() << "while a signal waits"; });
     {
         const EventSource term = loop_.AddSignal(SIGTERM, [&] { ++count_; });
         std::raise(SIGTERM);
@@ -80,6 +81,15 @@ TEST_F(EventLoopTest, TakesSignalsFirstAndDiscardsWhatIsLeft) {
     sigset_t blocked;
     sigprocmask(SIG_BLOCK, nullptr, &blocked);
     EXPECT_EQ(sigismember(&blocked, SIGTERM), 0);
+}
+
+TEST_F(EventLoopTest, DoesNotForgetTheTimeWhereAFileIsAlwaysReady) {
+    const EventSource busy = loop_.AddInput(null_.Get(), [] {});
+    loop_.Wait();
+    EventSource timer = loop_.AddTimer([&] { ++count_; });
+    timer.FireAt({});
+    loop_.Wait();
+    EXPECT_EQ(count_, 1);
 }
 
 } // namespace

@@ -101,7 +101,9 @@ EventSource EventLoop::AddInput(int file, Handler handler) {
         return source;
     }
     Require(sd_event_add_defer(loop_, &watch.source, EventSource::Watch::OnReady, &watch));
-    source.SetEnabled(true); // as often as it is looked at
+    // Of equal sources the one that became ready first has its turn, and this one always is.
+    Require(sd_event_source_set_priority(watch.source, SD_EVENT_PRIORITY_IDLE));
+    source.SetEnabled(true); // again and again
     return source;
 }
 
