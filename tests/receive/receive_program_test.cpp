@@ -16,19 +16,22 @@ protected:
     ChildProgram Start(const std::string &before = "") const {
         return {root_.Path(), before + kProgram + "receive -v --db var/log/kelolog/logs.db --notify-limit 3"};
     }
-    // "N" when the database holds messages 0 to N-1, each once.
-    std::string Rows(const std::string &path) const {
-        const char *sql = "SELECT count(DISTINCT msg)||iif(count(*)=count(DISTINCT msg),'','!') FROM logs";
+    // Empty while the database is missing or has no table yet.
+    static std::string Query(const std::string &path, const char *sql) {
         try {
             return fs::exists(path) ? QueryText(path, sql) : "";
-        } catch (const std::runtime_error &) { // has no table yet
+        } catch (const std::runtime_error &) {
             return "";
         }
+    }
+    // "N" when the database holds messages 0 to N-1, each once.
+    static std::string Rows(const std::string &path) {
+        return Query(path, "SELECT count(DISTINCT msg)||iif(count(*)=count(DISTINCT msg),'','!') FROM logs");
     }
     bool AwaitRows(ChildProgram &receiver, int rows) const {
         return receiver.Await([&] { return Rows(logs_) == std::to_string(rows); });
     }
-    std::string Counted() const { return QueryText(accounting_, "SELECT sum(count) FROM histogram"); }
+    std::string Counted() const { return Query(accounting_, "SELECT sum(count) FROM histogram"); }
     std::string Events(const std::string &pattern) const {
         return QueryText(events_, "SELECT count(*) FROM log WHERE event GLOB '" + pattern + "'");
     }
@@ -151,6 +154,7 @@ TEST_F(ReceiveProgram, TriesALockedEventLogOnce) {
         receiver.Send(LogLines(0, 10));
         EXPECT_TRUE(AwaitRows(receiver, 10));
     }
+    EXPECT_TRUE(receiver.Await([&] { return Counted() == "10"; })) << "flushed after a rest";
     EXPECT_EQ(Notifications("KELOSYSLOG_SEV_EXCEED"), 3);
     const std::string err = receiver.Err();
     EXPECT_EQ(err.find("Fail to add log"), err.rfind("Fail to add log")) << err;

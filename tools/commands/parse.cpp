@@ -80,7 +80,7 @@ public:
         output_.Write(text_);
         text_.clear();
     }
-    void Flush() override { output_.Flush(); }
+    void Flush() { output_.Flush(); }
     void Finish() {
         writer_->End(text_);
         output_.Write(text_);
@@ -117,17 +117,19 @@ public:
 
     void Print() {
         PrintSink sink(MakeParseLayout(options_.output), !options_.output.noPager);
-        ForEachInput([&](const Input &, LineReader &reader) { import_.Run(reader, sink); });
+        ForEachInput(
+            [&](const Input &, BlockReader &blocks, LineReader &lines) { Import(blocks, lines, sink); });
         sink.Finish();
     }
 
     void Store() {
         LogStore store(options_.db);
-        ForEachInput([&](const Input &input, LineReader &reader) {
+        ForEachInput([&](const Input &input, BlockReader &blocks, LineReader &lines) {
+            const std::string source = input.Source();
             if (options_.resume)
-                SkipStored(store, input, reader);
-            BatchSink sink(store, reader, input.Source());
-            import_.Run(reader, sink);
+                SkipStored(store.ProgressGet(source), blocks, lines);
+            BatchSink sink(store, blocks, lines, source);
+            Import(blocks, lines, sink);
         });
     }
 
@@ -164,10 +166,10 @@ private:
         for (const std::string &file : options_.files) {
             file_ = file;
             const Input input(file);
-            LineReader reader(input.Fd(), LogStream::kMaxLineBytes);
-            reader.OnProgress([this](uint64_t bytes) { bar_.Add(bytes); });
+            BlockReader blocks(input.Fd());
+            LineReader lines(LogStream::kMaxLineBytes);
             try {
-                work(input, reader);
+                work(input, blocks, lines);
             } catch (const std::system_error &error) {
                 throw UsageError(file + ": " + error.code().message());
             }
@@ -175,18 +177,36 @@ private:
         bar_.Clear();
     }
 
-    void SkipStored(LogStore &store, const Input &input, LineReader &reader) {
-        const std::optional<StoreProgress> stored = store.ProgressGet(input.Source());
+    // All lines of the input. Where it pauses nothing that was taken waits for more.
+    template <typename Sink>
+    void Import(BlockReader &blocks, LineReader &lines, Sink &sink) {
+        for (bool hasEnded = false; !hasEnded;) {
+            if (!blocks.HasInput())
+                sink.Flush();
+            const std::string_view bytes = blocks.Read();
+            bar_.Add(bytes.size());
+            hasEnded = bytes.empty();
+            if (hasEnded)
+                lines.End();
+            lines.Feed(bytes);
+            import_.Run(lines, sink);
+        }
+        sink.Flush();
+    }
+
+    void SkipStored(const std::optional<StoreProgress> &stored, BlockReader &blocks, LineReader &lines) {
         if (!stored)
             return;
-        reader.ReadHead(stored->head.size());
-        if (!reader.Head().starts_with(stored->head)) {
+        blocks.ReadHead(stored->head.size());
+        if (!blocks.Head().starts_with(stored->head)) {
             Say(file_ + ": begins differently than when it was stored, so it is read from its start");
             return;
         }
-        if (!reader.SkipTo(stored->offset, stored->lines))
+        if (!blocks.Skip(stored->offset))
             throw UsageError(file_ + ": shorter than the " + std::to_string(stored->offset) +
                              " bytes that were stored of it");
+        lines.StartAt(stored->offset, stored->lines);
+        bar_.Add(stored->offset);
     }
 
     void Report(uint64_t line, const std::string &reason) {

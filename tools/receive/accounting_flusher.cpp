@@ -82,6 +82,7 @@ bool AccountingFlusher::Flush() {
         syslog(LOG_NOTICE, "the accounting has been written");
     }
     isFailing_ = !isFlushed;
+    isIdle_ = isFlushed && manager_->CurrentEpsGet() == 0;
     return isFlushed;
 }
 

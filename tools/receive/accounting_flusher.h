@@ -18,10 +18,16 @@ public:
     AccountingFlusher();
 
     // The accounting database keeps a name up to its first NUL.
-    void Count(const std::string &host) { manager_->LogInc(host.c_str()); }
+    void Count(const std::string &host) {
+        isIdle_ = false;
+        manager_->LogInc(host.c_str());
+    }
 
-    // To be called about once a second. Closes the sample, and flushes when its time has come.
+    // To be called about once a second, unless idle. Closes the sample, and flushes when its time has come.
     void Tick(int64_t now);
+
+    // Whether all that was counted has been written, and no rules are to be loaded.
+    bool IsIdle() const { return isIdle_ && !mustReload_; }
 
     // Asks for the rules to be loaded anew, which takes a new manager: the present one must have written all
     // that it counted.
@@ -46,6 +52,7 @@ private:
     std::unique_ptr<AccountingManager> manager_;
     int64_t nextFlush_ = 0;
     bool isFailing_ = false;
+    bool isIdle_ = true;
     bool mustReload_ = false;
     bool isReloadPutOff_ = false;
 };

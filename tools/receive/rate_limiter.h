@@ -20,7 +20,10 @@ public:
     // them, in one notification, which has its place in the new minute.
     uint64_t TakeSuppressed(int64_t now);
 
-    // All matches that were counted and not told yet.
+    // Whether there are matches that were counted and not told yet.
+    bool HasSuppressed() const { return suppressed_ + toTell_ > 0; }
+
+    // All of them.
     uint64_t Drain();
 
 private:

@@ -1,6 +1,5 @@
 #include "receive/receiver.h"
 
-#include <poll.h>
 #include <syslog.h>
 #include <unistd.h>
 
@@ -12,6 +11,7 @@
 #include <filesystem>
 #include <numeric>
 #include <system_error>
+#include <thread>
 
 #include "kelosyslog/logger.h"
 #include "receive/complete_databases.h"
@@ -29,8 +29,8 @@ constexpr int64_t kHoldMs = 20;          // between looks at the clock while no 
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
 constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
 constexpr int64_t kLeastFinishMs = 2000; // of it, where waiting for the database has taken the time before
-constexpr int64_t kFinishRetryMs = 200;
-constexpr int64_t kFinishFlushMs = 2000; // between flushes that fail, of which each is reported
+constexpr std::chrono::milliseconds kFinishRetry{200};
+constexpr std::chrono::milliseconds kFinishFlush{2000}; // between flushes that fail and are reported
 
 std::string FolderOf(const ReceiverOptions &options) {
     if (options.database.empty())
@@ -43,7 +43,7 @@ std::string FolderOf(const ReceiverOptions &options) {
 Receiver::Receiver(ReceiverOptions options)
     : options_(std::move(options)), volume_(FolderOf(options_)),
       setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
-      rules_(options_.notifyLimit),
+      rules_(options_.notifyLimit), lines_(LogStream::kMaxLineBytes),
       import_([this](const LineReader &reader,
                      const std::string &reason) { setAside_.Add(reason, reader.Line()); },
               true) {
@@ -54,24 +54,63 @@ Receiver::Receiver(ReceiverOptions options)
     state_.database = writer_ ? writer_->Path() : "";
 }
 
+std::vector<EventSource> Receiver::AddSignals() {
+    const auto stop = [this] { stopTime_ = stopTime_.value_or(NowMs()); };
+    std::vector<EventSource> sources;
+    sources.push_back(loop_.AddSignal(SIGTERM, stop));
+    sources.push_back(loop_.AddSignal(SIGINT, stop));
+    sources.push_back(loop_.AddSignal(SIGHUP, [this] { Reload(); }));
+    return sources;
+}
+
 int64_t Receiver::NowMs() {
     return std::chrono::duration_cast<std::chrono::milliseconds>(Clock::now().time_since_epoch()).count();
 }
 
+void Receiver::FireAt(EventSource &timer, int64_t time) {
+    timer.FireAt(Clock::time_point(std::chrono::milliseconds(time)));
+}
+
 void Receiver::Run(int input) {
-    input_ = input;
     now_ = NowMs();
     stateTime_ = now_;
     CompleteDatabases(options_.root);
     Logger().LogAddServStart(kEventText);
-    LineReader reader(input, LogStream::kMaxLineBytes);
     try {
-        import_.Run(reader, *this);
+        ReceiveUntilEnd(input);
     } catch (const std::system_error &) {
         Finish();
         throw;
     }
     Finish();
+}
+
+void Receiver::ReceiveUntilEnd(int input) {
+    BlockReader blocks(input);
+    EventSource source = loop_.AddInput(input, [&] { Read(blocks); });
+    FireAt(secondTimer_, now_);
+    FireAt(stateTimer_, now_);
+    while (!hasInputEnded_) {
+        const bool mayRead = Advance();
+        if (!mayRead || !isReading_)
+            silentSince_ = now_;
+        isReading_ = mayRead;
+        if (HasEnded(blocks))
+            break;
+        source.SetEnabled(isReading_);
+        loop_.Wait();
+    }
+    lines_.End();
+    import_.Run(lines_, *this);
+}
+
+void Receiver::Read(BlockReader &input) {
+    now_ = NowMs();
+    silentSince_ = now_;
+    const std::string_view bytes = input.Read();
+    hasInputEnded_ = bytes.empty();
+    lines_.Feed(bytes);
+    import_.Run(lines_, *this);
 }
 
 void Receiver::Take(_SYSLOG_LOG_DATA_tag &log) {
@@ -81,74 +120,66 @@ void Receiver::Take(_SYSLOG_LOG_DATA_tag &log) {
         writer_->Take(log, now_);
 }
 
-bool Receiver::AwaitInput(const LineReader &) {
-    isInputReady_ = false;
-    for (;;) {
-        now_ = NowMs();
-        HandleSignals();
-        Tick();
-        const bool isStored = !writer_ || writer_->Advance(now_);
-        const bool mayRead = accounting_.MayCount() && isStored;
-        if (mayRead && isInputReady_)
-            return true;
-        if (HasEnded())
-            return false;
-        Wait(mayRead);
+// What is to be done after each event. Returns whether more may be read.
+bool Receiver::Advance() {
+    now_ = NowMs();
+    const bool isStored = !writer_ || writer_->Advance(now_);
+    if (writer_ && writer_->Reason() != state_.waiting)
+        TickState();
+    const bool mayCount = accounting_.MayCount();
+    if (isStored && !mayCount)
+        FireAt(writerTimer_, now_ + kHoldMs);
+    else if (writer_ && writer_->NextTime() != INT64_MAX)
+        FireAt(writerTimer_, writer_->NextTime());
+    if (!isTicking_ && !IsIdle()) {
+        isTicking_ = true;
+        FireAt(secondTimer_, now_ + kSecondMs);
     }
+    return isStored && mayCount;
 }
 
-// Until there is input, where that may be read, or a signal, or something to do.
-void Receiver::Wait(bool mayRead) {
-    int64_t next = std::min(nextSecond_, nextTick_);
-    if (writer_)
-        next = std::min(next, writer_->NextTime());
-    if (!mayRead && (!writer_ || writer_->Reason().empty()))
-        next = std::min(next, now_ + kHoldMs);
-    pollfd waiting[] = {{signals_.Fd(), POLLIN, 0}, {mayRead ? input_ : -1, POLLIN, 0}};
-    poll(waiting, 2, static_cast<int>(std::max<int64_t>(next - now_, 0)));
-    isInputReady_ = waiting[1].revents != 0;
-    if (isInputReady_ || !mayRead)
-        silentSince_ = NowMs();
-}
-
-bool Receiver::HasEnded() const {
+bool Receiver::HasEnded(const BlockReader &input) const {
     if (!stopTime_)
         return false;
-    return now_ - std::max(silentSince_, *stopTime_) >= kSilenceMs ||
+    // What came while something else took time has not been looked at.
+    return (now_ - std::max(silentSince_, *stopTime_) >= kSilenceMs && !input.HasInput()) ||
            (writer_ && !writer_->Reason().empty() && now_ - *stopTime_ >= kFinishMs);
 }
 
-void Receiver::HandleSignals() {
-    while (const std::optional<int> signal = signals_.Take()) {
-        if (*signal != SIGHUP) {
-            stopTime_ = stopTime_.value_or(now_);
-            continue;
-        }
-        syslog(LOG_INFO, "files are reopened and rules loaded anew");
-        if (writer_) {
-            writer_->Advance(now_, true);
-            writer_->Reopen();
-        }
-        setAside_.Reopen();
-        rules_.Reload();
-        accounting_.RequestReload();
+void Receiver::Reload() {
+    now_ = NowMs();
+    syslog(LOG_INFO, "files are reopened and rules loaded anew");
+    if (writer_) {
+        writer_->Advance(now_, true);
+        writer_->Reopen();
     }
+    setAside_.Reopen();
+    rules_.Reload();
+    accounting_.RequestReload();
 }
 
-void Receiver::Tick() {
-    if (now_ >= nextSecond_) {
-        nextSecond_ = now_ + kSecondMs;
-        accounting_.Tick(now_ / kSecondMs);
-        rules_.Tick(now_ / kSecondMs);
-        setAside_.Tick(now_ / kSecondMs);
-        Repair();
-    }
-    const bool isChanged = writer_ && writer_->Reason() != state_.waiting;
-    if (now_ < nextTick_ && !isChanged)
-        return;
-    nextTick_ = now_ + kBeatMs;
+// Whether there is nothing to do every second until something comes.
+bool Receiver::IsIdle() const {
+    return !stopTime_ && accounting_.IsIdle() && rules_.IsIdle() && !rules_.IsFailing() && setAside_.IsIdle();
+}
+
+void Receiver::TickSecond() {
+    now_ = NowMs();
+    const int64_t next = now_ + kSecondMs;
+    accounting_.Tick(now_ / kSecondMs);
+    rules_.Tick(now_ / kSecondMs);
+    setAside_.Tick(now_ / kSecondMs);
+    Repair();
+    isTicking_ = !IsIdle();
+    if (isTicking_)
+        FireAt(secondTimer_, next);
+}
+
+void Receiver::TickState() {
+    now_ = NowMs();
     volume_.Tick();
     WriteState();
+    FireAt(stateTimer_, now_ + kBeatMs);
 }
 
 void Receiver::Repair() {
@@ -193,7 +224,7 @@ void Receiver::Finish() {
     const int64_t deadline = std::max(stopTime_.value_or(now_) + kFinishMs, now_ + kLeastFinishMs);
     const auto isOver = [&] { return (now_ = NowMs()) >= deadline; };
     while (writer_ && !isOver() && !writer_->Advance(now_, true))
-        poll(nullptr, 0, kFinishRetryMs);
+        std::this_thread::sleep_for(kFinishRetry);
     if (writer_ && writer_->Waiting() > 0)
         syslog(LOG_ERR, "%zu logs are lost, and those not read yet: %s", writer_->Waiting(),
                writer_->Reason().c_str());
@@ -201,7 +232,7 @@ void Receiver::Finish() {
     while (!isFlushed && !isOver()) {
         if (accounting_.IsFailing())
             CompleteDatabases(options_.root);
-        poll(nullptr, 0, accounting_.IsFailing() ? kFinishFlushMs : kFinishRetryMs);
+        std::this_thread::sleep_for(accounting_.IsFailing() ? kFinishFlush : kFinishRetry);
         isFlushed = accounting_.Finish();
     }
     if (!isFlushed)

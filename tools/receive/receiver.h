@@ -4,14 +4,16 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <vector>
 
-#include "base/signal_source.h"
+#include "base/event_loop.h"
 #include "receive/accounting_flusher.h"
 #include "receive/disk_space_monitor.h"
 #include "receive/log_writer.h"
 #include "receive/receiver_state.h"
 #include "receive/rule_checker.h"
 #include "receive/set_aside_file.h"
+#include "store/block_reader.h"
 #include "store/log_import.h"
 
 namespace kelo::tool {
@@ -25,8 +27,9 @@ struct ReceiverOptions {
 
 // Receives log text from a pipe: counts the logs, checks them against the rules and stores them.
 //
-// Everything happens on the caller's thread, and whatever takes time before a read: while the database cannot
-// be written nothing is read, so that the sender waits and memory stays bounded.
+// Everything happens on the caller's thread, in the handlers of an event loop and between two events: what
+// takes time delays the next read. While the database cannot be written nothing is read, so that the sender
+// waits and memory stays bounded.
 class Receiver : private RecordSink {
 public:
     // Opens nothing but the signals. Throws std::system_error.
@@ -41,38 +44,46 @@ public:
 private:
     using Clock = std::chrono::steady_clock;
 
+    std::vector<EventSource> AddSignals();
+    void ReceiveUntilEnd(int input);
+    void Read(BlockReader &input);
     void Take(_SYSLOG_LOG_DATA_tag &log) override;
-    void Flush() override {}
-    bool AwaitInput(const LineReader &reader) override;
-
-    void Wait(bool mayRead);
-    bool HasEnded() const;
-    void HandleSignals();
-    void Tick();
+    bool Advance();
+    bool HasEnded(const BlockReader &input) const;
+    void Reload();
+    bool IsIdle() const;
+    void TickSecond();
     void Repair();
+    void TickState();
     void WriteState();
     void Finish();
     uint64_t Received() const;
     static int64_t NowMs();
+    static void FireAt(EventSource &timer, int64_t time);
 
     ReceiverOptions options_;
-    SignalSource signals_;
+    EventLoop loop_;
+    std::vector<EventSource> signals_ = AddSignals();
+    // They run what TickSecond, TickState and Advance do.
+    EventSource secondTimer_ = loop_.AddTimer([this] { TickSecond(); });
+    EventSource stateTimer_ = loop_.AddTimer([this] { TickState(); });
+    EventSource writerTimer_ = loop_.AddTimer([] {});
     DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
     RuleChecker rules_;
     AccountingFlusher accounting_;
     std::optional<LogWriter> writer_;
+    LineReader lines_;
     LogImport import_;
     ReceiverState state_;
     uint64_t receivedBefore_ = 0; // at the last update of the state
     int64_t stateTime_ = 0;
     bool isStateFailing_ = false;
-    int input_ = -1;
-    bool isInputReady_ = false;
+    bool isReading_ = false;
+    bool isTicking_ = true;
+    bool hasInputEnded_ = false;
     // Of the steady clock, in milliseconds.
     int64_t now_ = 0;
-    int64_t nextSecond_ = 0;
-    int64_t nextTick_ = 0;
     int64_t nextRepair_ = 0;
     int64_t silentSince_ = 0;
     std::optional<int64_t> stopTime_; // when the signal came

@@ -21,8 +21,11 @@ public:
 
     void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
 
-    // To be called about once a second: tells what was suppressed in a minute that is over.
+    // To be called about once a second, unless idle: tells what was suppressed in a minute that is over.
     void Tick(int64_t now);
+
+    // Whether no matches are left to report.
+    bool IsIdle() const { return !severity_.limit.HasSuppressed() && !keyword_.limit.HasSuppressed(); }
 
     // Tells what is left to tell.
     void Finish();

@@ -23,9 +23,12 @@ public:
 
     void Add(std::string_view reason, std::string_view line);
 
-    // Writes what was added. Tells the system log of it, at most once a minute; `now` is seconds of any clock
-    // that does not go back.
+    // To be called about once a second, unless idle. Writes what was added, and tells the system log of it,
+    // at most once a minute; `now` is seconds of any clock that does not go back.
     void Tick(int64_t now);
+
+    // Whether all that was added has been written and reported.
+    bool IsIdle() const { return unreported_ == 0 && buffer_.empty(); }
 
     // The same, without waiting for the minute.
     void Finish();

@@ -4,8 +4,8 @@
 
 namespace kelo::tool {
 
-BatchSink::BatchSink(LogStore &store, const LineReader &reader, std::string source)
-    : store_(store), reader_(reader) {
+BatchSink::BatchSink(LogStore &store, const BlockReader &input, const LineReader &reader, std::string source)
+    : store_(store), input_(input), reader_(reader) {
     progress_.source = std::move(source);
     progress_.offset = reader.EndOffset();
 }
@@ -24,7 +24,7 @@ void BatchSink::Flush() {
         return;
     progress_.offset = reader_.EndOffset();
     progress_.lines = reader_.Number();
-    progress_.head = reader_.Head().substr(0, std::min<uint64_t>(progress_.offset, LineReader::kHeadBytes));
+    progress_.head = input_.Head().substr(0, std::min<uint64_t>(progress_.offset, BlockReader::kHeadBytes));
     store_.Store(batch_.Records(), progress_);
     batch_.Clear();
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "store/block_reader.h"
 #include "store/log_import.h"
 #include "store/log_store.h"
 #include "store/record_batch.h"
@@ -10,16 +11,18 @@ namespace kelo::tool {
 // slowly the input comes.
 class BatchSink : public RecordSink {
 public:
-    // `store` and `reader`, whose records come, must outlive the sink. `source` is the name that the progress
-    // is stored under.
-    BatchSink(LogStore &store, const LineReader &reader, std::string source);
+    // `store`, and `input` and its `reader`, whose records come, must outlive the sink. `source` is the name
+    // that the progress is stored under.
+    BatchSink(LogStore &store, const BlockReader &input, const LineReader &reader, std::string source);
 
     void Take(_SYSLOG_LOG_DATA_tag &log) override;
     void LineDone() override;
-    void Flush() override;
+    // Stores what was taken. To be called when the input pauses or ends.
+    void Flush();
 
 private:
     LogStore &store_;
+    const BlockReader &input_;
     const LineReader &reader_;
     StoreProgress progress_;
     RecordBatch batch_;

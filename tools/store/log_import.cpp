@@ -21,7 +21,6 @@ const char *FirstEmptyField(const _SYSLOG_LOG_DATA_tag &log) {
 } // namespace
 
 void LogImport::Run(LineReader &reader, RecordSink &sink) {
-    reader.BeforeRead([&] { return sink.AwaitInput(reader); });
     while (reader.Next()) {
         if (reader.IsOverlong()) {
             ++counts_.overlong;
@@ -31,7 +30,6 @@ void LogImport::Run(LineReader &reader, RecordSink &sink) {
         }
         sink.LineDone();
     }
-    sink.Flush();
 }
 
 void LogImport::ImportLine(const LineReader &reader, RecordSink &sink) {

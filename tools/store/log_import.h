@@ -20,16 +20,6 @@ public:
 
     // A line has been dealt with, whether or not it gave a record.
     virtual void LineDone() {}
-
-    // The input pauses or ends: nothing that was taken may wait any longer.
-    virtual void Flush() = 0;
-
-    // Called before each read of the input, which it may delay; it ends the input by returning false.
-    virtual bool AwaitInput(const LineReader &reader) {
-        if (!reader.HasInput())
-            Flush();
-        return true;
-    }
 };
 
 // What became of the lines of an import. Empty lines are no lines.
@@ -50,7 +40,7 @@ public:
     LogImport(LineReport report, bool skipIncomplete)
         : report_(std::move(report)), skipIncomplete_(skipIncomplete) {}
 
-    // Imports all lines of one input. Throws what the reader and the sink throw.
+    // Imports the lines that the reader has. Throws what the sink throws.
     void Run(LineReader &reader, RecordSink &sink);
 
     const ImportCounts &Counts() const { return counts_; }
