@@ -6,34 +6,50 @@
 
 using kelo::tool::RateLimiter;
 
-TEST(RateLimiter, BoundsEveryMinuteAndTellsTheRest) {
+TEST(RateLimiter, BoundsEveryMinuteAndTellsTheRestOfEachRule) {
+    using Counts = RateLimiter::Counts;
     struct Step {
         int64_t now;
-        int matches;
-        int raised;
-        uint64_t told; // asked after the matches
+        std::string matches; // a letter for the rule of each
+        std::string raised;
+        Counts told; // asked after the matches
     };
     const struct {
         const char *what;
-        uint64_t perMinute;
         std::vector<Step> steps;
-        uint64_t rest;
+        Counts rest;
     } kCases[] = {
-        {"few matches", 3, {{0, 2, 2, 0}, {30, 1, 1, 0}, {60, 3, 3, 0}, {7200, 1, 1, 0}}, 0},
-        {"a flood", 3, {{5, 10, 3, 0}, {64, 5, 0, 0}, {65, 0, 0, 12}, {66, 5, 2, 0}, {124, 0, 0, 0}}, 3},
-        {"told after matches of the next minute", 3, {{0, 4, 3, 0}, {60, 5, 2, 1}, {120, 0, 0, 3}}, 0},
-        {"one a minute", 1, {{0, 3, 1, 0}, {60, 2, 0, 2}, {120, 2, 0, 2}, {180, 0, 0, 2}, {240, 1, 1, 0}}, 0},
-        {"a flood long ago", 2, {{-100, 5, 2, 0}, {1000, 0, 0, 3}, {1000, 4, 1, 0}}, 3},
+        {"few matches",
+         {{0, "aa", "aa", {}}, {30, "a", "a", {}}, {60, "aaa", "aaa", {}}, {7200, "a", "a", {}}},
+         {}},
+        {"a flood",
+         {{5, "aaaaaaaaaa", "aaa", {}},
+          {64, "aa", "", {}},
+          {65, "", "", {{"a", 9}}},
+          {66, "aaaaa", "aaa", {}},
+          {124, "", "", {}}},
+         {{"a", 2}}},
+        {"told after matches of the next minute",
+         {{0, "aaaa", "aaa", {}}, {60, "aaaa", "aaa", {{"a", 1}}}, {120, "", "", {{"a", 1}}}},
+         {}},
+        {"a rare rule beside a noisy one", {{0, "aaaaaab", "aaab", {}}, {60, "", "", {{"a", 3}}}}, {}},
+        {"many noisy rules: five in all, and one of each",
+         {{0, "aaaabbbbccd", "aaabbcd", {}}, {60, "", "", {{"a", 1}, {"b", 2}, {"c", 1}}}},
+         {}},
+        {"a flood long ago",
+         {{-100, "aaaaa", "aaa", {}}, {1000, "", "", {{"a", 2}}}, {1000, "aaaa", "aaa", {}}},
+         {{"a", 1}}},
     };
-    for (const auto &[what, perMinute, steps, rest] : kCases) {
-        RateLimiter limit(perMinute);
-        for (const auto &[now, matches, raised, told] : steps) {
-            int admitted = 0;
-            for (int i = 0; i < matches; ++i)
-                admitted += limit.Allow(now) ? 1 : 0;
-            EXPECT_EQ(admitted, raised) << what << " at " << now;
+    for (const auto &[what, steps, rest] : kCases) {
+        RateLimiter limit(3, 5);
+        for (const auto &[now, matches, expected, told] : steps) {
+            std::string raised;
+            for (const char rule : matches)
+                raised += limit.Allow(std::string(1, rule), now) ? std::string(1, rule) : "";
+            EXPECT_EQ(raised, expected) << what << " at " << now;
             EXPECT_EQ(limit.TakeSuppressed(now), told) << what << " at " << now;
         }
+        EXPECT_EQ(limit.HasSuppressed(), !rest.empty()) << what;
         EXPECT_EQ(limit.Drain(), rest) << what;
     }
 }

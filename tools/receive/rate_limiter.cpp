@@ -9,28 +9,33 @@ void RateLimiter::BeginMinute(int64_t now) {
         return;
     hasBegun_ = true;
     begin_ = now;
-    toTell_ += std::exchange(suppressed_, 0);
-    raised_ = toTell_ > 0 ? 1 : 0;
+    for (const auto &[rule, count] : std::exchange(suppressed_, {}))
+        toTell_[rule] += count;
+    raised_.clear();
+    raisedByAll_ = toTell_.empty() ? 0 : 1;
 }
 
-bool RateLimiter::Allow(int64_t now) {
+bool RateLimiter::Allow(const std::string &rule, int64_t now) {
     BeginMinute(now);
-    if (raised_ < perMinute_) {
-        ++raised_;
+    uint64_t &raised = raised_[rule];
+    if (raised == 0 || (raised < perRule_ && raisedByAll_ < forAll_)) {
+        ++raised;
+        ++raisedByAll_;
         return true;
     }
-    ++suppressed_;
+    ++suppressed_[rule];
     return false;
 }
 
-uint64_t RateLimiter::TakeSuppressed(int64_t now) {
-    if (suppressed_ > 0)
+RateLimiter::Counts RateLimiter::TakeSuppressed(int64_t now) {
+    if (!suppressed_.empty())
         BeginMinute(now);
-    return std::exchange(toTell_, 0);
+    return std::exchange(toTell_, {});
 }
 
-uint64_t RateLimiter::Drain() {
-    return std::exchange(toTell_, 0) + std::exchange(suppressed_, 0);
+RateLimiter::Counts RateLimiter::Drain() {
+    begin_ -= kMinuteSec; // the minute is over
+    return TakeSuppressed(begin_ + kMinuteSec);
 }
 
 } // namespace kelo::tool

@@ -1,42 +1,50 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
+#include <string>
 
 namespace kelo::tool {
 
-// Keeps a flood of matches from raising a flood of notifications.
+// Keeps floods of matches from raising floods of notifications, and a noisy rule from silencing a rare one.
 //
-// A minute begins with a match. In it so many matches raise a notification, the rest is counted; the first
-// notification of the next minute tells how many. Times are seconds of any clock that does not go back.
+// A minute begins with a match of any rule. In it each rule may raise so many notifications, and all together
+// a larger number, but for the first of each rule, which is always raised. The rest is counted by rule; one
+// notification of the next minute tells the numbers. Times are seconds of any clock that does not go back.
 class RateLimiter {
 public:
-    // `perMinute` is at least 1.
-    explicit RateLimiter(uint64_t perMinute) : perMinute_(perMinute) {}
+    using Counts = std::map<std::string, uint64_t>; // by rule
 
-    // Whether a match at `now` raises a notification. When not it is counted.
-    bool Allow(int64_t now);
+    // Notifications a minute; both are at least 1.
+    RateLimiter(uint64_t perRule, uint64_t forAll) : perRule_(perRule), forAll_(forAll) {}
 
-    // The matches counted in a minute that is over at `now`; 0 when there is nothing to tell. Who asks tells
-    // them, in one notification, which has its place in the new minute.
-    uint64_t TakeSuppressed(int64_t now);
+    // Whether a match of `rule` at `now` raises a notification. When not it is counted.
+    bool Allow(const std::string &rule, int64_t now);
+
+    // The matches counted in a minute that is over at `now`; empty when there is nothing to tell. Who asks
+    // tells them, in one notification, which has its place in the new minute.
+    Counts TakeSuppressed(int64_t now);
 
     // Whether there are matches that were counted and not told yet.
-    bool HasSuppressed() const { return suppressed_ + toTell_ > 0; }
+    bool HasSuppressed() const { return !suppressed_.empty() || !toTell_.empty(); }
 
     // All of them.
-    uint64_t Drain();
+    Counts Drain();
 
 private:
     void BeginMinute(int64_t now);
 
     static constexpr int64_t kMinuteSec = 60;
 
-    uint64_t perMinute_;
+    uint64_t perRule_;
+    uint64_t forAll_;
     bool hasBegun_ = false;
     int64_t begin_ = 0;
-    uint64_t raised_ = 0;     // in the minute
-    uint64_t suppressed_ = 0; // in the minute
-    uint64_t toTell_ = 0;     // of the minutes before
+    // In the minute.
+    Counts raised_;
+    Counts suppressed_;
+    uint64_t raisedByAll_ = 0;
+    Counts toTell_; // of the minutes before
 };
 
 } // namespace kelo::tool

@@ -22,7 +22,7 @@ struct ReceiverOptions {
     std::string root;          // of the system's files, absolute or empty
     std::string database;      // to store into; empty: logs are only counted and checked
     std::string setAside;      // file for the lines that give no log; empty: the default below the root
-    uint64_t notifyLimit = 10; // notifications a minute and kind of rule
+    uint64_t notifyLimit = 10; // notifications a minute for each rule
 };
 
 // Receives log text from a pipe: counts the logs, checks them against the rules and stores them.

@@ -10,6 +10,8 @@ namespace kelo::tool {
 namespace {
 
 constexpr int64_t kEventPauseSec = 60;
+// So many rules may raise all that one may; the others still raise one notification a minute each.
+constexpr uint64_t kRulesAtTheirLimit = 5;
 
 // The text, cut where a notification could not carry it: it takes fewer than 2048 bytes with its quotes and
 // backslashes escaped. No character of UTF-8 is cut in two.
@@ -28,65 +30,59 @@ std::string Content(const std::string &text) {
     return text.substr(0, length) + "...";
 }
 
-std::string MoreLogs(uint64_t count) {
-    return std::to_string(count) + " more within a minute, without a notification of their own";
-}
+constexpr const char *kTail = " more within a minute, without a notification of their own";
 
 } // namespace
 
 RuleChecker::RuleChecker(uint64_t notifyLimit)
-    : rules_(std::in_place), severity_{RateLimiter(notifyLimit), "", ""}, keyword_{RateLimiter(notifyLimit),
-                                                                                   "", ""} {}
+    : rules_(std::in_place), limit_(notifyLimit, kRulesAtTheirLimit * notifyLimit) {}
 
 void RuleChecker::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
     now_ = now;
-    if (rules_->CheckSev(log.prio)) {
-        const std::string severity = PriorTypeToStr(log.prio);
-        if (severity_.limit.Allow(now))
-            RaiseSeverity(log.host, severity, Content(log.msg));
-        else
-            Suppress(severity_, log.host, severity);
+    if (rules_->CheckSev(log.prio))
+        Handle({Kind::Severity, PriorTypeToStr(log.prio), log.host}, log.msg);
+    if (const std::string keyword = rules_->CheckKeyword(log.msg); !keyword.empty())
+        Handle({Kind::Keyword, keyword, log.host}, log.msg);
+}
+
+void RuleChecker::Handle(const Match &match, const std::string &message) {
+    const std::string rule = (match.kind == Kind::Severity ? "severity [" : "keyword [") + match.what + "]";
+    if (limit_.Allow(rule, now_)) {
+        Raise(match, Content(message));
+        return;
     }
-    if (const std::string keyword = rules_->CheckKeyword(log.msg); !keyword.empty()) {
-        if (keyword_.limit.Allow(now))
-            RaiseKeyword(log.host, keyword, Content(log.msg));
-        else
-            Suppress(keyword_, log.host, keyword);
-    }
+    lastSuppressed_.insert_or_assign(rule, match);
+    ++suppressed_;
 }
 
 void RuleChecker::Tick(int64_t now) {
     now_ = now;
-    Tell(severity_.limit.TakeSuppressed(now), keyword_.limit.TakeSuppressed(now));
+    Tell(limit_.TakeSuppressed(now));
 }
 
 void RuleChecker::Finish() {
-    Tell(severity_.limit.Drain(), keyword_.limit.Drain());
+    Tell(limit_.Drain());
 }
 
-void RuleChecker::Tell(uint64_t severities, uint64_t keywords) {
-    if (severities > 0)
-        RaiseSeverity(severity_.host, severity_.what, MoreLogs(severities));
-    if (keywords > 0)
-        RaiseKeyword(keyword_.host, keyword_.what, MoreLogs(keywords));
+// One notification, under the name of the first rule.
+void RuleChecker::Tell(const RateLimiter::Counts &counts) {
+    if (counts.empty())
+        return;
+    std::string content;
+    for (const auto &[rule, count] : counts)
+        content +=
+            (content.empty() ? "" : ", ") + std::to_string(count) + (counts.size() > 1 ? " of " + rule : "");
+    Raise(lastSuppressed_.at(counts.begin()->first), Content(content + kTail));
 }
 
-void RuleChecker::Suppress(Kind &kind, const std::string &host, const std::string &what) {
-    kind.host = host;
-    kind.what = what;
-    ++suppressed_;
-}
-
-void RuleChecker::RaiseSeverity(const std::string &host, const std::string &severity,
-                                const std::string &content) {
-    rules_->NotificationSendSev(host, severity, content);
-    AddEvent([&] { return Logger().LogAddNotifySev(severity, content); });
-}
-
-void RuleChecker::RaiseKeyword(const std::string &host, const std::string &keyword,
-                               const std::string &content) {
-    rules_->NotificationSendKeyword(host, keyword, content);
-    AddEvent([&] { return Logger().LogAddNotifyKw(keyword, content); });
+void RuleChecker::Raise(const Match &match, const std::string &content) {
+    if (match.kind == Kind::Severity) {
+        rules_->NotificationSendSev(match.host, match.what, content);
+        AddEvent([&] { return Logger().LogAddNotifySev(match.what, content); });
+    } else {
+        rules_->NotificationSendKeyword(match.host, match.what, content);
+        AddEvent([&] { return Logger().LogAddNotifyKw(match.what, content); });
+    }
 }
 
 // Each event that finds its database locked takes seconds, in which nothing is received.

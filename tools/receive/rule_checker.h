@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
 #include <optional>
 #include <string>
 
@@ -10,13 +11,14 @@
 namespace kelo::tool {
 
 // Checks logs against the severity and keyword rules. A match raises a notification and an event, a flood of
-// them a bounded number a minute for either kind of rule. A notification or event that fails is only reported
-// in the system log, by the library; after an event that failed a minute goes without events.
+// them a bounded number a minute for each rule (a keyword, or a severity) and for all (RateLimiter). A
+// notification or event that fails is only reported in the system log, by the library; after an event that
+// failed a minute goes without events.
 //
 // Times are seconds of any clock that does not go back.
 class RuleChecker {
 public:
-    // Loads the rules. `notifyLimit`: notifications a minute and kind of rule, at least 1.
+    // Loads the rules. `notifyLimit`: notifications a minute for each rule, at least 1.
     explicit RuleChecker(uint64_t notifyLimit);
 
     void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
@@ -25,7 +27,7 @@ public:
     void Tick(int64_t now);
 
     // Whether no matches are left to report.
-    bool IsIdle() const { return !severity_.limit.HasSuppressed() && !keyword_.limit.HasSuppressed(); }
+    bool IsIdle() const { return !limit_.HasSuppressed(); }
 
     // Tells what is left to tell.
     void Finish();
@@ -40,22 +42,22 @@ public:
     uint64_t Suppressed() const { return suppressed_; }
 
 private:
-    // One kind of rule. Of its last match that was suppressed: the sender, and the severity or keyword.
-    struct Kind {
-        RateLimiter limit;
+    enum class Kind { Severity, Keyword };
+    // What a record matched, and whose record it was.
+    struct Match {
+        Kind kind;
+        std::string what; // the severity or the keyword
         std::string host;
-        std::string what;
     };
-    void RaiseSeverity(const std::string &host, const std::string &severity, const std::string &content);
-    void RaiseKeyword(const std::string &host, const std::string &keyword, const std::string &content);
-    void Suppress(Kind &kind, const std::string &host, const std::string &what);
-    void Tell(uint64_t severities, uint64_t keywords);
+    void Handle(const Match &match, const std::string &message);
+    void Raise(const Match &match, const std::string &content);
+    void Tell(const RateLimiter::Counts &counts);
     template <typename Write>
     void AddEvent(Write write);
 
     std::optional<NotificationManager> rules_;
-    Kind severity_;
-    Kind keyword_;
+    RateLimiter limit_;
+    std::map<std::string, Match> lastSuppressed_; // by rule
     uint64_t suppressed_ = 0;
     int64_t now_ = 0;
     int64_t nextEvent_ = INT64_MIN; // after a failure, when the next event is tried
