@@ -102,6 +102,23 @@ TEST_F(ReceiveProgram, LoadsChangedRulesAndBoundsAFlood) {
     EXPECT_EQ(Counted(), "51");
 }
 
+TEST_F(ReceiveProgram, KeepsNotificationsUntilTheSpoolTakesThem) {
+    WriteRule(7);
+    fs::rename(spool_ + "new", spool_ + "away");
+    WriteFile(spool_ + "new", "");
+    ChildProgram receiver = Start();
+    receiver.Send(LogLines(0, 2));
+    ASSERT_TRUE(receiver.AwaitErr("into the spool"));
+    fs::remove(spool_ + "new");
+    fs::rename(spool_ + "away", spool_ + "new");
+    EXPECT_TRUE(receiver.Await([&] { return Notifications("KELOSYSLOG_SEV_EXCEED") == 2; }));
+    fs::remove_all(spool_ + "new");
+    WriteFile(spool_ + "new", "");
+    receiver.Send(LogLines(2, 1));
+    EXPECT_EQ(receiver.End().status, 0);
+    EXPECT_EQ(State().lostNotifications, 1U);
+}
+
 TEST_F(ReceiveProgram, WaitsForALockedDatabase) {
     ChildProgram receiver = Start();
     receiver.Send(LogLines(0, 10));

@@ -203,6 +203,7 @@ void Receiver::WriteState() {
     state_.rejected = counts.tooFewFields;
     state_.overlong = counts.overlong;
     state_.suppressed = rules_.Suppressed();
+    state_.lostNotifications = rules_.Lost();
     if (writer_) {
         state_.stored = writer_->Stored();
         state_.waiting = writer_->Reason();

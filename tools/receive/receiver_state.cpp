@@ -25,6 +25,7 @@ Json::Value ToJson(const ReceiverState &state) {
     root["stored"] = Json::UInt64{state.stored};
     root["database"] = state.database;
     root["suppressed"] = Json::UInt64{state.suppressed};
+    root["lost_notifications"] = Json::UInt64{state.lostNotifications};
     root["waiting"] = state.waiting;
     root["eps"] = state.eps;
     return root;
@@ -46,6 +47,7 @@ ReceiverState FromJson(const Json::Value &root) {
     state.stored = root["stored"].asUInt64();
     state.database = root["database"].asString();
     state.suppressed = root["suppressed"].asUInt64();
+    state.lostNotifications = root["lost_notifications"].asUInt64();
     state.waiting = root["waiting"].asString();
     state.eps = root["eps"].asDouble();
     return state;

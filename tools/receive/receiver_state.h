@@ -22,6 +22,7 @@ struct ReceiverState {
     uint64_t stored = 0;                        // rows, where it stores into a database itself
     std::string database;                       // the absolute path of that database, or empty
     uint64_t suppressed = 0;                    // matches of rules that raised no notification of their own
+    uint64_t lostNotifications = 0;             // of rules, given up
     std::string waiting;                        // why reading pauses; empty when it does not
     double eps = 0;                             // complete logs a second, between the last two updates
 

@@ -10,6 +10,9 @@ namespace kelo::tool {
 namespace {
 
 constexpr int64_t kEventPauseSec = 60;
+constexpr int64_t kNotifyPauseSec = 2;
+constexpr int64_t kNotifyGiveUpSec = 3600;
+constexpr size_t kMostWaiting = 100;
 // So many rules may raise all that one may; the others still raise one notification a minute each.
 constexpr uint64_t kRulesAtTheirLimit = 5;
 
@@ -57,11 +60,16 @@ void RuleChecker::Handle(const Match &match, const std::string &message) {
 
 void RuleChecker::Tick(int64_t now) {
     now_ = now;
+    if (now >= nextNotify_)
+        NotifyAgain();
     Tell(limit_.TakeSuppressed(now));
 }
 
 void RuleChecker::Finish() {
     Tell(limit_.Drain());
+    NotifyAgain();
+    while (!waiting_.empty())
+        GiveUpFirst();
 }
 
 // One notification, under the name of the first rule.
@@ -76,13 +84,40 @@ void RuleChecker::Tell(const RateLimiter::Counts &counts) {
 }
 
 void RuleChecker::Raise(const Match &match, const std::string &content) {
-    if (match.kind == Kind::Severity) {
-        rules_->NotificationSendSev(match.host, match.what, content);
-        AddEvent([&] { return Logger().LogAddNotifySev(match.what, content); });
-    } else {
-        rules_->NotificationSendKeyword(match.host, match.what, content);
-        AddEvent([&] { return Logger().LogAddNotifyKw(match.what, content); });
+    // Behind others that wait, so that they arrive in order.
+    if (!waiting_.empty() || !Notify(match, content)) {
+        if (waiting_.size() == kMostWaiting)
+            GiveUpFirst();
+        if (waiting_.empty())
+            nextNotify_ = now_ + kNotifyPauseSec;
+        waiting_.push_back({match, content, now_});
     }
+    if (match.kind == Kind::Severity)
+        AddEvent([&] { return Logger().LogAddNotifySev(match.what, content); });
+    else
+        AddEvent([&] { return Logger().LogAddNotifyKw(match.what, content); });
+}
+
+bool RuleChecker::Notify(const Match &match, const std::string &content) {
+    return (match.kind == Kind::Severity
+                ? rules_->NotificationSendSev(match.host, match.what, content)
+                : rules_->NotificationSendKeyword(match.host, match.what, content)) == 0;
+}
+
+void RuleChecker::NotifyAgain() {
+    while (!waiting_.empty() && Notify(waiting_.front().match, waiting_.front().content))
+        waiting_.pop_front();
+    while (!waiting_.empty() && now_ - waiting_.front().since >= kNotifyGiveUpSec)
+        GiveUpFirst();
+    nextNotify_ = now_ + kNotifyPauseSec;
+}
+
+void RuleChecker::GiveUpFirst() {
+    const Match &match = waiting_.front().match;
+    syslog(LOG_ERR, "A notification was given up, as it could not be put into the spool: %s from %s",
+           match.what.c_str(), match.host.c_str());
+    waiting_.pop_front();
+    ++lost_;
 }
 
 // Each event that finds its database locked takes seconds, in which nothing is received.

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <deque>
 #include <map>
 #include <optional>
 #include <string>
@@ -11,9 +12,11 @@
 namespace kelo::tool {
 
 // Checks logs against the severity and keyword rules. A match raises a notification and an event, a flood of
-// them a bounded number a minute for each rule (a keyword, or a severity) and for all (RateLimiter). A
-// notification or event that fails is only reported in the system log, by the library; after an event that
-// failed a minute goes without events.
+// them a bounded number a minute for each rule (a keyword, or a severity) and for all (RateLimiter).
+//
+// A notification that fails, for want of room in the spool, is tried again for an hour; a hundred wait at
+// most. An event that fails is only reported in the system log, by the library; a minute goes without events
+// then.
 //
 // Times are seconds of any clock that does not go back.
 class RuleChecker {
@@ -26,8 +29,8 @@ public:
     // To be called about once a second, unless idle: tells what was suppressed in a minute that is over.
     void Tick(int64_t now);
 
-    // Whether no matches are left to report.
-    bool IsIdle() const { return !limit_.HasSuppressed(); }
+    // Whether nothing is left to report.
+    bool IsIdle() const { return !limit_.HasSuppressed() && waiting_.empty(); }
 
     // Tells what is left to tell.
     void Finish();
@@ -41,6 +44,9 @@ public:
     // Matches that raised no notification of their own.
     uint64_t Suppressed() const { return suppressed_; }
 
+    // Notifications that were given up.
+    uint64_t Lost() const { return lost_; }
+
 private:
     enum class Kind { Severity, Keyword };
     // What a record matched, and whose record it was.
@@ -49,8 +55,16 @@ private:
         std::string what; // the severity or the keyword
         std::string host;
     };
+    struct Notification {
+        Match match;
+        std::string content;
+        int64_t since; // when it failed first
+    };
     void Handle(const Match &match, const std::string &message);
     void Raise(const Match &match, const std::string &content);
+    bool Notify(const Match &match, const std::string &content);
+    void NotifyAgain();
+    void GiveUpFirst();
     void Tell(const RateLimiter::Counts &counts);
     template <typename Write>
     void AddEvent(Write write);
@@ -59,6 +73,9 @@ private:
     RateLimiter limit_;
     std::map<std::string, Match> lastSuppressed_; // by rule
     uint64_t suppressed_ = 0;
+    std::deque<Notification> waiting_; // those that failed, oldest first
+    int64_t nextNotify_ = 0;           // when they are tried again
+    uint64_t lost_ = 0;
     int64_t now_ = 0;
     int64_t nextEvent_ = INT64_MIN; // after a failure, when the next event is tried
     uint64_t lostEvents_ = 0;

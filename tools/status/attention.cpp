@@ -57,6 +57,9 @@ void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
                         Duration(now - status.told.updated));
     else if (status.state == State::Unreadable)
         lines.push_back("cannot tell whether the receiver runs: " + status.path + " cannot be read");
+    if (status.told.lostNotifications > 0)
+        lines.push_back("the receiver gave up " + Counted(status.told.lostNotifications, "notification") +
+                        ", as the spool had no room");
     if ((status.state == State::Running || status.state == State::Silent) && !status.told.waiting.empty())
         lines.push_back("the receiver waits: " + status.told.waiting);
 }

@@ -73,6 +73,7 @@ Value ToJson(const ReceiverStatus &status) {
     json["stored"] = Count(told.stored);
     json["database"] = told.database;
     json["suppressed"] = Count(told.suppressed);
+    json["lost_notifications"] = Count(told.lostNotifications);
     json["waiting"] = told.waiting;
     return json;
 }
