@@ -7,14 +7,14 @@
 
 namespace kelo::tool {
 
-// What a shell offers for the value of an option or an argument is said where the option is declared:
+// The shell completion of the value of an option or an argument is declared with the option:
 //
 //     OfferWords(AddText(command, "--by", interval, "INTERVAL", "second, minute or hour"),
 //                {"second", "minute", "hour"});
 //
-// It checks nothing and does not show in help texts. Each function returns `option`.
+// It checks nothing and is not part of help texts. Each function returns `option`.
 
-// One of these words; with `after` only where it is the argument before.
+// One of these words; with `after` only if that is the argument before.
 CLI::Option *OfferWords(CLI::Option *option, const std::vector<std::string> &words,
                         const std::string &after = "");
 // Words separated by commas, of which each may be excluded by a leading '!'.

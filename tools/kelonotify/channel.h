@@ -18,18 +18,18 @@ enum class Outcome {
 
 struct Result {
     Outcome outcome = Outcome::Sent;
-    std::string reason = {}; // of a failure; holds nothing secret
+    std::string reason = {}; // of a failure; contains nothing secret
 };
 
-// A way to tell people. It is made for one pass, with the settings of that moment.
+// A channel of delivery. It is created for one pass, with the settings of that moment.
 class Channel {
 public:
     virtual ~Channel() = default;
 
-    // Whom it tells: the names under which the success of each is recorded. Never empty.
+    // Its targets: the names under which the success of each is recorded. Never empty.
     virtual std::vector<std::string> Targets() const = 0;
 
-    // Tells one of them. Returns within twice the time-out that the channel was made with.
+    // Delivers to one of them. Returns within twice the time-out that the channel was created with.
     virtual Result Send(const Entry &entry, const std::string &target) = 0;
 };
 

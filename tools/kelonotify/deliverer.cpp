@@ -18,8 +18,8 @@ bool IsChannel(const std::string &name) {
     return std::find(std::begin(kChannelNames), std::end(kChannelNames), name) != std::end(kChannelNames);
 }
 
-// Where the log server receives this line too, these words keep it from raising a notification of its own,
-// which would fail as well.
+// If the log server receives this line too, these words prevent a notification for it, which would fail as
+// well.
 const char *Words(const std::string &channel) {
     return channel == "mail" ? "Failed to send email." : "Failed to send notification.";
 }
@@ -90,7 +90,7 @@ void Deliverer::DeliverEntry(const Entry &entry) {
         left += targets.size();
     const bool isUntouched = progress.targets.empty() && progress.since == 0;
     if (left > 1 && isUntouched)
-        spool_.SaveProgress(entry.id, progress); // before anything is sent: can it be recorded?
+        spool_.SaveProgress(entry.id, progress); // before anything is sent: checks that it can be recorded
     for (const auto &[channel, targets] : open) {
         for (const std::string &target : targets) {
             if (shouldStop_() || !IsDue(channel, progress.targets[target]))
@@ -143,7 +143,7 @@ void Deliverer::SendOne(const Entry &entry, Progress &progress, const std::strin
     NoteChannel(channel, result);
 }
 
-// One line in the system log for each answer that a target gives, however many entries it refuses with it.
+// One line in the system log for each answer of a target, for any number of entries that it refuses.
 void Deliverer::NoteRefusal(const Entry &entry, const std::string &channel, const std::string &target,
                             const Result &result) {
     if (result.outcome == Outcome::Sent)
@@ -155,8 +155,8 @@ void Deliverer::NoteRefusal(const Entry &entry, const std::string &channel, cons
            entry.id.c_str(), result.reason.c_str());
 }
 
-// One line in the system log when a channel fails, and one when it works again; the attempts between stay
-// silent.
+// One line in the system log when a channel fails, and one when it works again; the attempts between them are
+// not logged.
 void Deliverer::NoteChannel(const std::string &name, const Result &result) {
     const auto known = health_.targets.find(name);
     if (result.outcome == Outcome::Unreachable) {

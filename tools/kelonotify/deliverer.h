@@ -15,19 +15,18 @@ struct DelivererOptions {
     int64_t giveUpAfterSec = 3 * 86400; // age of an entry
 };
 
-// Takes the entries of the spool to where they are to go. The caller holds the spool's lock.
+// Delivers the entries of the spool. The caller holds the spool's lock.
 //
-// A success is on the disk before the next delivery begins, so that nothing is delivered again afterwards:
-// only what the process was about when it was killed may be. An entry that goes to several targets is not
-// begun before its record was written once; a disk that cannot take records thus stops the delivery, and
-// does not repeat it.
+// A success is on the disk before the next delivery begins, so that a kill can repeat only the delivery in
+// progress. An entry with several targets is not begun before its record was written once; so a disk that
+// cannot take records stops the delivery instead of repeating it.
 class Deliverer {
 public:
     // `shouldStop` is asked between two deliveries.
     Deliverer(const Spool &spool, const Settings &settings, DelivererOptions options,
               std::function<bool()> shouldStop);
 
-    // One pass over the spool. Returns the seconds until something is to be tried again; -1 when nothing
+    // One pass over the spool. Returns the seconds until the next attempt; -1 when nothing
     // waits. Throws SpoolError.
     int64_t Pass();
 
@@ -54,7 +53,7 @@ private:
     std::function<bool()> shouldStop_;
     std::map<std::string, std::unique_ptr<Channel>> channels_; // as the settings are in this pass
     Progress health_;                                          // of the channels
-    std::map<std::string, std::string> refusals_;              // by target, the reason that was told last
+    std::map<std::string, std::string> refusals_;              // by target, the reason that was logged last
     bool isForced_ = false;
     bool isAllDelivered_ = true;
     int64_t nextTry_ = -1;

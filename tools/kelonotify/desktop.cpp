@@ -1,4 +1,4 @@
-// The desktop channel: the feed, and a pop-up where a session shows them.
+// The desktop channel: the feed, and a pop-up if there is a session.
 
 #include <systemd/sd-bus.h>
 

@@ -28,7 +28,7 @@ std::string Line(const Entry &entry) {
     return WriteJsonLine(line);
 }
 
-// A quote inside of a text is escaped, so this occurs in the line of the id alone.
+// A quote inside a text is escaped, so this occurs only in the line of the id.
 bool Holds(const std::string &content, const std::string &id) {
     return content.find("\"id\":\"" + id + "\"") != std::string::npos;
 }
@@ -44,7 +44,7 @@ Feed::Added Feed::Add(const Entry &entry) const {
     const std::optional<std::string> older = ReadWhole(olderPath);
     if (!older && errno != ENOENT)
         return Added::No;
-    const size_t whole = content ? content->rfind('\n') + 1 : 0; // 0 also where there is no line feed
+    const size_t whole = content ? content->rfind('\n') + 1 : 0; // 0 also without a line feed
     if ((content && Holds(content->substr(0, whole), entry.id)) || (older && Holds(*older, entry.id)))
         return Added::AlreadyThere;
     const bool isFull = whole > kMaxFeedBytes;

@@ -26,8 +26,8 @@ std::string NumberOf(const std::string &target) {
     return target.substr(target.find(':') + 1);
 }
 
-// The answers that blame the request itself. The others of 400 to 499 tell about access, load or time, which
-// hold for the next request too.
+// The answers that reject the request itself. The others of 400 to 499 concern access, load or time, which
+// apply to the next request too.
 bool IsRefusal(long code) {
     return code == 400 || code == 406 || code == 409 || code == 410 || code == 413 || code == 415 ||
            code == 422;

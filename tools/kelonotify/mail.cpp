@@ -76,7 +76,7 @@ public:
     }
 
 private:
-    // Returns what makes the settings useless.
+    // Returns the error in the settings.
     std::string SetUp() {
         const std::string security = mail_.security;
         const std::string server = mail_.server;
@@ -120,14 +120,14 @@ private:
         return mail;
     }
 
-    // An answer to this mail blames the mail or its recipient; anything else blames the server.
+    // An answer to this mail concerns the mail or its recipient; any other failure concerns the server.
     Result ResultOf(CURLcode code) const {
         if (code == CURLE_OK)
             return {};
         const long answer = transfer_.Code();
         const bool isAnswer = code == CURLE_SEND_ERROR || code == CURLE_WEIRD_SERVER_REPLY;
         const bool isRefusal = isAnswer && answer >= 400 && answer < 600 && answer != 421;
-        // The server's own words say more than libcurl's.
+        // The server's own words are more precise than libcurl's.
         const bool isReply = reply_.starts_with(std::to_string(answer));
         return {isRefusal ? Outcome::Refused : Outcome::Unreachable,
                 isReply ? SafeLine(reply_, kMaxReplyBytes) : transfer_.Reason(code)};

@@ -28,7 +28,7 @@ std::string Base64(std::string_view bytes) {
     return text;
 }
 
-// The length of the longest front of the text of at most `maxBytes` that ends with a whole character.
+// The length of the longest beginning of the text of at most `maxBytes` that ends with a whole character.
 size_t WholeCharacters(std::string_view text, size_t maxBytes) {
     if (text.size() <= maxBytes)
         return text.size();
@@ -87,7 +87,7 @@ std::string EncodeQuotedPrintable(std::string_view text) {
             continue;
         }
         const bool endsLine = i + 1 == text.size() || text[i + 1] == '\n';
-        // A soft line break may put any byte first on its line, where servers take a dot or "From" for
+        // A soft line break may put any byte first on its line, where servers interpret a dot or "From" as
         // theirs.
         const bool isAtRisk = byte == '.' || byte == 'F';
         const bool isBlank = byte == ' ' || byte == '\t';

@@ -6,8 +6,8 @@
 
 namespace kelo::tool {
 
-// What a mail consists of. Addresses have been checked: they hold nothing but printable ASCII without
-// blanks, brackets and commas.
+// The parts of a mail. Addresses have been checked: they consist of printable ASCII without blanks, brackets
+// and commas.
 struct Mail {
     std::string sender;
     std::string recipient;
@@ -17,12 +17,12 @@ struct Mail {
     int64_t time = 0;      // seconds since the epoch
 };
 
-// The mail as RFC 5322 and RFC 2045 want it: ASCII lines of at most 76 characters (but long addresses), each
-// ended by CR LF. The same mail always gives the same bytes.
+// The mail according to RFC 5322 and RFC 2045: ASCII lines of at most 76 characters (but long addresses),
+// each ended by CR LF. The same mail always gives the same bytes.
 std::string WriteMime(const Mail &mail);
 
-// The text as RFC 2047 words on folded lines where it cannot stand in a header as it is. `used` is how many
-// characters stand on the line before it.
+// The text, as RFC 2047 words on folded lines if it cannot be in a header unchanged. `used` is the number of
+// characters before it on the line.
 std::string EncodeHeader(std::string_view text, size_t used);
 
 // The text as quoted-printable (RFC 2045) with CR LF at the line ends. No line begins with a dot.

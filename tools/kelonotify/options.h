@@ -8,14 +8,14 @@
 
 namespace kelo::tool {
 
-// What the command line of kelonotify says.
+// The values of kelonotify's command line.
 struct NotifierOptions {
     std::string root;
     bool mustStay = false;
     DelivererOptions delivery;
 };
 
-// Declares the whole command line; `options` gets what it says.
+// Declares the whole command line; `options` receives the values.
 void DeclareCommandLine(CLI::App &app, NotifierOptions &options);
 
 } // namespace kelo::tool

@@ -33,7 +33,7 @@ Transfer::Transfer(const ChannelOptions &options, const char *protocols)
     Set(CURLOPT_SERVER_RESPONSE_TIMEOUT, options.timeoutSec);
     Set(CURLOPT_ERRORBUFFER, error_);
     Set(CURLOPT_WRITEFUNCTION, DropAnswer);
-    // Only what the settings say: no proxy of the environment, no password of a .netrc.
+    // Only the settings apply: no proxy of the environment, no password of a .netrc.
     Set(CURLOPT_PROXY, "");
     Set(CURLOPT_NETRC, static_cast<long>(CURL_NETRC_IGNORED));
     if (!caFile_.empty())

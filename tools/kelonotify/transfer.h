@@ -18,10 +18,10 @@ using Slist = std::unique_ptr<curl_slist, SlistFreer>;
 void Append(Slist &list, const std::string &text);
 
 // A libcurl handle for many transfers, which keeps its connections between them. No redirects, no protocols
-// but those of the caller, no output; every step is bounded by the time-out.
+// but those of the caller, no output; every step is limited by the time-out.
 class Transfer {
 public:
-    // `protocols` as CURLOPT_PROTOCOLS_STR wants it. Throws std::bad_alloc.
+    // `protocols` in the form of CURLOPT_PROTOCOLS_STR. Throws std::bad_alloc.
     Transfer(const ChannelOptions &options, const char *protocols);
 
     template <typename Value>
@@ -32,7 +32,7 @@ public:
     // Runs the transfer. `Code` is then the last response code, 0 for none.
     CURLcode Run();
     long Code() const;
-    // What went wrong, on one line.
+    // The error, on one line.
     std::string Reason(CURLcode code) const;
 
 private:

@@ -5,15 +5,15 @@
 
 namespace kelo::tool {
 
-// Tells when there is something to do, and when to stop. While an object lives, SIGTERM and SIGINT end
-// nothing by themselves.
+// Waits for work and for a request to stop. During the lifetime of an object SIGTERM and SIGINT do not end
+// the process.
 class Watcher {
 public:
     // Watches the folder. Throws SpoolError, and std::system_error as the other functions do.
     explicit Watcher(const std::string &folder);
 
     // Waits until a file appears in the folder, a signal asks to stop, or the seconds are over (below 0: no
-    // end). What appeared since the last wait ends it at once.
+    // limit). It returns immediately for a file that appeared since the last wait.
     void Wait(int64_t seconds);
 
     // Whether a signal asked to stop.

@@ -8,10 +8,10 @@
 namespace kelo::tool {
 namespace {
 
-// The manager wants six seconds between two questions, by its clock; seven of ours are that many at least.
+// The manager requires six seconds between two questions, by its clock; seven of ours are at least that many.
 constexpr int64_t kFlushSec = 7;
 // A flush that waits for a locked database takes seconds, and so does one of millions of devices. Nothing is
-// received meanwhile, so that it may take up to a tenth of the time.
+// received meanwhile, so it may take up to a tenth of the time.
 constexpr int64_t kPausePerFlush = 9;
 // One that keeps failing is reported every time.
 constexpr int64_t kFlushWhileFailingSec = 60;
@@ -86,7 +86,7 @@ bool AccountingFlusher::Flush() {
     return isFlushed;
 }
 
-// A manager that could not read what the present one has written would later write too low totals.
+// A manager that could not read the totals of the present one would later overwrite them with lower ones.
 void AccountingFlusher::Replace() {
     auto fresh = std::make_unique<AccountingManager>();
     if (Total(*fresh) < Total(*manager_))

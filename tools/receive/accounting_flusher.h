@@ -8,9 +8,9 @@
 
 namespace kelo::tool {
 
-// Counts logs, and asks for what the accounting wants done at times. While the accounting database cannot be
-// written, samples wait in memory: those of a day at most, then the oldest are given up. The totals of the
-// devices lose nothing by that.
+// Counts records, and closes samples and flushes at the right times. While the accounting database cannot be
+// written, samples wait in memory: those of a day at most, then the oldest are discarded. The totals of the
+// devices stay complete.
 //
 // Times are seconds of any clock that does not go back.
 class AccountingFlusher {
@@ -29,15 +29,16 @@ public:
     // Whether all that was counted has been written, and no rules are to be loaded.
     bool IsIdle() const { return isIdle_ && !mustReload_; }
 
-    // Asks for the rules to be loaded anew, which takes a new manager: the present one must have written all
-    // that it counted.
+    // Requests that the rules are reloaded, which needs a new manager: the present one must have written all
+    // its counts.
     void RequestReload();
 
-    // Carries the request out, if there is one. Returns false while no log may be counted for it: until the
-    // second has changed, so that the open sample can be closed. A flush that fails puts it off to the next.
+    // Executes the request, if there is one. Returns false while no record may be counted because of it:
+    // until the second has changed, so that the open sample can be closed. A failed flush postpones it to the
+    // next.
     bool MayCount();
 
-    // Closes the last sample and flushes. Returns false when it is to be called again: the second has not
+    // Closes the last sample and flushes. Returns false when it must be called again: the second has not
     // changed yet, or the flush failed, which is reported once.
     bool Finish();
 

@@ -27,7 +27,7 @@ void Complete(const std::string &path, const std::string &schema,
     const bool isComplete = HasTables(db, tables);
     db.DBDiscon();
     if (!isComplete)
-        db.DBCreate(); // whose statements leave alone what is there
+        db.DBCreate(); // its statements do not change existing tables
 }
 
 } // namespace

@@ -11,8 +11,8 @@
 namespace kelo::tool {
 namespace {
 
-// Below the first the volume counts as full, from the second on it does no longer: in between nothing
-// changes, so that a volume on the brink raises no series of events.
+// Below the first value the volume is full, from the second on it is not. Between them nothing changes, so
+// that a volume near the limit causes no series of events.
 constexpr uint64_t kFullBytes = 16 * 1024 * 1024;
 constexpr uint64_t kRoomBytes = 32 * 1024 * 1024;
 

@@ -4,19 +4,19 @@
 
 namespace kelo::tool {
 
-// Tells the administrator when the volume of a folder is full: one event and one notification each time it
-// becomes so. What cannot be told because the volume is full is told when there is room again.
+// Notifies the administrator when the volume of a folder is full: one event and one notification each time.
+// If they cannot be stored because the volume is full, they are sent when there is room again.
 class DiskSpaceMonitor {
 public:
     // `folder` is the absolute path that the notification names.
     explicit DiskSpaceMonitor(std::string folder) : folder_(std::move(folder)) {}
 
-    // Something could not be written for want of space.
+    // Something could not be written because there was no space.
     void NoteFull();
     // It could be written.
     void NoteWritten();
 
-    // Looks at the free space; to be called every few seconds.
+    // Checks the free space; call it every few seconds.
     void Tick();
 
 private:

@@ -26,7 +26,7 @@ bool IsFull(const SqliteError &error) {
            error.systemError == EFBIG;
 }
 
-// The inode of what has the name; 0 for nothing.
+// The inode of the file with the name; 0 for none.
 ino_t InodeOf(const std::string &path) {
     struct stat status {};
     return stat(path.c_str(), &status) == 0 ? status.st_ino : 0;
@@ -76,7 +76,7 @@ bool LogWriter::Write(int64_t now) {
     return true;
 }
 
-// What has the name of the database, and nothing that had it before.
+// The file that has the name of the database now.
 void LogWriter::Open() {
     if (store_ && store_->HasMoved()) {
         syslog(LOG_NOTICE, "%s was removed or renamed; storing goes on in what has its name", path_.c_str());
@@ -84,7 +84,7 @@ void LogWriter::Open() {
     }
     if (store_)
         return;
-    // A write-ahead log that was left alone would be taken for one of the fresh database.
+    // SQLite would use a write-ahead log that is left there for the fresh database.
     std::error_code isMissing;
     const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
     if (InodeOf(path_) == 0 && !isMissing && walBytes > 0)
@@ -105,12 +105,12 @@ void LogWriter::Pause(const SqliteError &error, int64_t now) {
     if (error.code == SQLITE_CORRUPT)
         retryTime_ = now + PutAside();
     else if (!isLocked)
-        store_.reset(); // whatever is wrong with it, the next try begins afresh
+        store_.reset(); // after any failure the next try starts again
 }
 
 // Returns after how many milliseconds to try again.
 int64_t LogWriter::PutAside() {
-    // Another program may have seen the damage first, and then what has the name now is sound.
+    // Another program may have detected the damage first, and then the file with this name is intact.
     const bool isAside = store_ && store_->HasMoved();
     const ino_t damaged = InodeOf(path_);
     store_.reset();

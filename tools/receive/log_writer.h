@@ -10,29 +10,30 @@
 
 namespace kelo::tool {
 
-// Stores logs into a log database, in batches: one is written when it is large enough or half a second old.
+// Stores records into a log database, in batches: one is written when it is large enough or half a second
+// old.
 //
-// A database that cannot be written (locked, on a full disk, without permission) is waited for: the batch is
-// kept and tried again, and the system log told once. One that is damaged is put aside as DBHandler does it,
-// and one that was removed or renamed is left; a fresh one takes its place.
+// If the database cannot be written (locked, on a full disk, without permission), the batch is kept and tried
+// again, and the system log gets one message. A damaged database is quarantined as DBHandler does it, and one
+// that was removed or renamed is given up; a fresh one replaces it.
 //
 // Times are milliseconds of any clock that does not go back.
 class LogWriter {
 public:
-    // Opens nothing yet. `volume`, which is told of a full disk, must outlive the writer.
+    // Opens nothing yet. `volume`, which is notified of a full disk, must outlive the writer.
     LogWriter(const std::string &path, DiskSpaceMonitor &volume);
 
-    // Takes the log, and may leave another's contents in it.
+    // Takes the record, and may leave the content of another in it.
     void Take(_SYSLOG_LOG_DATA_tag &log, int64_t now);
 
-    // Writes the batch when it is time, or at once where `isUrgent`. Returns false while the database cannot
-    // be written: no further logs should be taken then.
+    // Writes the batch when it is time, or immediately if `isUrgent`. Returns false while the database cannot
+    // be written: no further records should be taken then.
     bool Advance(int64_t now, bool isUrgent = false);
 
     // When Advance has something to do next.
     int64_t NextTime() const;
 
-    // Closes the database, to open what has its name when the next batch is written.
+    // Closes the database. The next batch is written to the file that has its name then.
     void Reopen() { store_.reset(); }
 
     size_t Waiting() const { return batch_.Size(); }
@@ -51,7 +52,7 @@ private:
     DiskSpaceMonitor &volume_;
     std::optional<LogStore> store_;
     RecordBatch batch_;
-    int64_t batchTime_ = 0; // of the batch's first log
+    int64_t batchTime_ = 0; // of the batch's first record
     uint64_t stored_ = 0;
     std::string reason_;
     int64_t retryTime_ = 0;

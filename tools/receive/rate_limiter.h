@@ -6,11 +6,11 @@
 
 namespace kelo::tool {
 
-// Keeps floods of matches from raising floods of notifications, and a noisy rule from silencing a rare one.
+// Prevents a flood of notifications after a flood of matches, and a noisy rule from silencing a rare one.
 //
-// A minute begins with a match of any rule. In it each rule may raise so many notifications, and all together
-// a larger number, but for the first of each rule, which is always raised. The rest is counted by rule; one
-// notification of the next minute tells the numbers. Times are seconds of any clock that does not go back.
+// A minute begins with a match of any rule. In it the notifications of each rule and of all rules together
+// are limited, but the first one of each rule is always sent. The rest is counted by rule; one notification
+// of the next minute gives the numbers. Times are seconds of any clock that does not go back.
 class RateLimiter {
 public:
     using Counts = std::map<std::string, uint64_t>; // by rule
@@ -18,14 +18,14 @@ public:
     // Notifications a minute; both are at least 1.
     RateLimiter(uint64_t perRule, uint64_t forAll) : perRule_(perRule), forAll_(forAll) {}
 
-    // Whether a match of `rule` at `now` raises a notification. When not it is counted.
+    // Whether a match of `rule` at `now` sends a notification. If not, it is counted.
     bool Allow(const std::string &rule, int64_t now);
 
-    // The matches counted in a minute that is over at `now`; empty when there is nothing to tell. Who asks
-    // tells them, in one notification, which has its place in the new minute.
+    // The matches counted in a minute that is over at `now`; empty for none. The caller reports them in one
+    // notification, which counts in the new minute.
     Counts TakeSuppressed(int64_t now);
 
-    // Whether there are matches that were counted and not told yet.
+    // Whether there are matches that were counted and not reported yet.
     bool HasSuppressed() const { return !suppressed_.empty() || !toTell_.empty(); }
 
     // All of them.

@@ -25,10 +25,10 @@ constexpr const char *kFolder = "/var/log/kelolog";
 constexpr int64_t kSecondMs = 1000;
 constexpr int64_t kBeatMs = 6000;
 constexpr int64_t kRepairMs = 60'000;
-constexpr int64_t kHoldMs = 20;          // between looks at the clock while no log may be counted
+constexpr int64_t kHoldMs = 20;          // between checks of the clock while no record may be counted
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
 constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
-constexpr int64_t kLeastFinishMs = 2000; // of it, where waiting for the database has taken the time before
+constexpr int64_t kLeastFinishMs = 2000; // of it, if waiting for the database has taken the time before
 constexpr std::chrono::milliseconds kFinishRetry{200};
 constexpr std::chrono::milliseconds kFinishFlush{2000}; // between flushes that fail and are reported
 
@@ -120,7 +120,7 @@ void Receiver::Take(_SYSLOG_LOG_DATA_tag &log) {
         writer_->Take(log, now_);
 }
 
-// What is to be done after each event. Returns whether more may be read.
+// The work after each event. Returns whether more may be read.
 bool Receiver::Advance() {
     now_ = NowMs();
     const bool isStored = !writer_ || writer_->Advance(now_);
@@ -141,7 +141,7 @@ bool Receiver::Advance() {
 bool Receiver::HasEnded(const BlockReader &input) const {
     if (!stopTime_)
         return false;
-    // What came while something else took time has not been looked at.
+    // Events that arrived during longer work have not been handled yet.
     return (now_ - std::max(silentSince_, *stopTime_) >= kSilenceMs && !input.HasInput()) ||
            (writer_ && !writer_->Reason().empty() && now_ - *stopTime_ >= kFinishMs);
 }
@@ -158,7 +158,7 @@ void Receiver::Reload() {
     accounting_.RequestReload();
 }
 
-// Whether there is nothing to do every second until something comes.
+// Whether there is no work every second until the next event.
 bool Receiver::IsIdle() const {
     return !stopTime_ && accounting_.IsIdle() && rules_.IsIdle() && !rules_.IsFailing() && setAside_.IsIdle();
 }

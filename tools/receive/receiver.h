@@ -20,25 +20,25 @@ namespace kelo::tool {
 
 struct ReceiverOptions {
     std::string root;          // of the system's files, absolute or empty
-    std::string database;      // to store into; empty: logs are only counted and checked
-    std::string setAside;      // file for the lines that give no log; empty: the default below the root
+    std::string database;      // to store into; empty: records are only counted and checked
+    std::string setAside;      // file for lines that are not valid records; empty: the default below the root
     uint64_t notifyLimit = 10; // notifications a minute for each rule
 };
 
-// Receives log text from a pipe: counts the logs, checks them against the rules and stores them.
+// Receives log text from a pipe: counts the records, checks them against the rules and stores them.
 //
-// Everything happens on the caller's thread, in the handlers of an event loop and between two events: what
-// takes time delays the next read. While the database cannot be written nothing is read, so that the sender
-// waits and memory stays bounded.
+// Everything runs on the caller's thread, in the handlers of an event loop and between two events: long work
+// delays the next read. While the database cannot be written nothing is read, so that the sender waits and
+// memory stays bounded.
 class Receiver : private RecordSink {
 public:
     // Opens nothing but the signals. Throws std::system_error.
     explicit Receiver(ReceiverOptions options);
 
     // Receives from the file descriptor until its end, or until SIGTERM or SIGINT has come and nothing more
-    // follows. What was read is stored and flushed then, as far as that succeeds within 20 seconds; the
-    // system log tells what is lost otherwise. SIGHUP reopens the files and loads the rules anew. Throws
-    // std::system_error when the input cannot be read, after doing the same.
+    // follows. The records are then stored and flushed, for up to 20 seconds; otherwise the system log
+    // reports what is lost. SIGHUP reopens the files and reloads the rules. Throws std::system_error when the
+    // input cannot be read, after doing the same.
     void Run(int input);
 
 private:
@@ -64,7 +64,7 @@ private:
     ReceiverOptions options_;
     EventLoop loop_;
     std::vector<EventSource> signals_ = AddSignals();
-    // They run what TickSecond, TickState and Advance do.
+    // They call TickSecond, TickState and Advance.
     EventSource secondTimer_ = loop_.AddTimer([this] { TickSecond(); });
     EventSource stateTimer_ = loop_.AddTimer([this] { TickState(); });
     EventSource writerTimer_ = loop_.AddTimer([] {});

@@ -7,7 +7,7 @@
 
 namespace kelo::tool {
 
-// What `kelosyslog receive` tells others of itself, in a file that it writes anew every few seconds and once
+// The state of `kelosyslog receive` for other programs, in a file that it rewrites every few seconds and once
 // more at its end. docs/receiving.md describes the file.
 struct ReceiverState {
     int64_t pid = 0;
@@ -15,16 +15,16 @@ struct ReceiverState {
     int64_t updated = 0;
     int64_t ended = 0; // 0 while it runs, and after a kill
 
-    uint64_t received = 0;                      // complete logs
+    uint64_t received = 0;                      // complete records
     std::map<std::string, uint64_t> incomplete; // set aside, by the mandatory field that was empty
     uint64_t rejected = 0;                      // set aside: too few fields
     uint64_t overlong = 0;                      // set aside: too long
-    uint64_t stored = 0;                        // rows, where it stores into a database itself
+    uint64_t stored = 0;                        // rows, if it stores into a database itself
     std::string database;                       // the absolute path of that database, or empty
-    uint64_t suppressed = 0;                    // matches of rules that raised no notification of their own
+    uint64_t suppressed = 0;                    // matches of rules without a notification of their own
     uint64_t lostNotifications = 0;             // of rules, given up
     std::string waiting;                        // why reading pauses; empty when it does not
-    double eps = 0;                             // complete logs a second, between the last two updates
+    double eps = 0;                             // complete records a second, between the last two updates
 
     bool operator==(const ReceiverState &) const = default;
 };
@@ -32,11 +32,12 @@ struct ReceiverState {
 // The file below `root`, which is an absolute path or empty.
 std::string ReceiverStatePath(const std::string &root);
 
-// Writes the file, whose folder is created where it is missing; a reader finds the old or the new one, whole.
+// Writes the file, creating its folder if it is missing; a reader finds the whole old or new file.
 // Returns false with errno set.
 bool WriteReceiverState(const std::string &root, const ReceiverState &state);
 
-// What the file says; nothing when it is missing, cannot be read, or is none that WriteReceiverState wrote.
+// The content of the file; nothing when it is missing, cannot be read, or was not written by
+// WriteReceiverState.
 std::optional<ReceiverState> ReadReceiverState(const std::string &root);
 
 } // namespace kelo::tool

@@ -13,11 +13,11 @@ constexpr int64_t kEventPauseSec = 60;
 constexpr int64_t kNotifyPauseSec = 2;
 constexpr int64_t kNotifyGiveUpSec = 3600;
 constexpr size_t kMostWaiting = 100;
-// So many rules may raise all that one may; the others still raise one notification a minute each.
+// This many rules may each use their whole limit; the others still get one notification a minute each.
 constexpr uint64_t kRulesAtTheirLimit = 5;
 
-// The text, cut where a notification could not carry it: it takes fewer than 2048 bytes with its quotes and
-// backslashes escaped. No character of UTF-8 is cut in two.
+// The text, cut to the limit of a notification: fewer than 2048 bytes with its quotes and backslashes
+// escaped. No UTF-8 character is split.
 std::string Content(const std::string &text) {
     constexpr size_t kMostBytes = 2000;
     size_t length = 0;
@@ -84,7 +84,7 @@ void RuleChecker::Tell(const RateLimiter::Counts &counts) {
 }
 
 void RuleChecker::Raise(const Match &match, const std::string &content) {
-    // Behind others that wait, so that they arrive in order.
+    // After others that wait, so that they arrive in order.
     if (!waiting_.empty() || !Notify(match, content)) {
         if (waiting_.size() == kMostWaiting)
             GiveUpFirst();
@@ -120,7 +120,7 @@ void RuleChecker::GiveUpFirst() {
     ++lost_;
 }
 
-// Each event that finds its database locked takes seconds, in which nothing is received.
+// An event with a locked database takes seconds, in which nothing is received.
 template <typename Write>
 void RuleChecker::AddEvent(Write write) {
     if (now_ < nextEvent_) {

@@ -11,12 +11,11 @@
 
 namespace kelo::tool {
 
-// Checks logs against the severity and keyword rules. A match raises a notification and an event, a flood of
-// them a bounded number a minute for each rule (a keyword, or a severity) and for all (RateLimiter).
+// Checks records against the severity and keyword rules. A match sends a notification and adds an event.
+// Their number a minute is limited for each rule (a keyword, or a severity) and for all (RateLimiter).
 //
-// A notification that fails, for want of room in the spool, is tried again for an hour; a hundred wait at
-// most. An event that fails is only reported in the system log, by the library; a minute goes without events
-// then.
+// A notification that fails because the spool has no room is tried again for an hour; at most a hundred wait.
+// A failed event is only reported in the system log, by the library; then no events are added for a minute.
 //
 // Times are seconds of any clock that does not go back.
 class RuleChecker {
@@ -26,22 +25,22 @@ public:
 
     void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
 
-    // To be called about once a second, unless idle: tells what was suppressed in a minute that is over.
+    // Call it about once a second, unless idle: reports what was suppressed in a minute that is over.
     void Tick(int64_t now);
 
     // Whether nothing is left to report.
     bool IsIdle() const { return !limit_.HasSuppressed() && waiting_.empty(); }
 
-    // Tells what is left to tell.
+    // Reports what was suppressed and is not reported yet.
     void Finish();
 
-    // Loads the rules anew.
+    // Reloads the rules.
     void Reload() { rules_.emplace(); }
 
     // Whether the last event failed.
     bool IsFailing() const { return lostEvents_ > 0; }
 
-    // Matches that raised no notification of their own.
+    // Matches without a notification of their own.
     uint64_t Suppressed() const { return suppressed_; }
 
     // Notifications that were given up.
@@ -49,7 +48,7 @@ public:
 
 private:
     enum class Kind { Severity, Keyword };
-    // What a record matched, and whose record it was.
+    // The match of a record, and the host of the record.
     struct Match {
         Kind kind;
         std::string what; // the severity or the keyword

@@ -74,7 +74,7 @@ bool SetAsideFile::Open() {
     return true;
 }
 
-// Opens the file, a fresh one where what is to be written would no longer fit.
+// Opens the file, or a fresh one if the text would no longer fit.
 bool SetAsideFile::MakeRoom() {
     if (!file_ && !Open())
         return false;
@@ -93,7 +93,7 @@ void SetAsideFile::Flush() {
     isFailing_ = !isWritten;
     if (isWritten) {
         size_ += static_cast<int64_t>(buffer_.size());
-    } else if (file_) { // the next line must not go on where a part of one ends
+    } else if (file_) { // the next line must not continue a partial one
         [[maybe_unused]] const int isCut = ftruncate(file_.Get(), size_);
         file_ = FileHandle();
     }

@@ -8,14 +8,14 @@
 
 namespace kelo::tool {
 
-// The file that keeps the lines which give no log: one line each, with the local time and the reason in
-// front, separated by tabs. Of a long line its beginning is kept.
+// The file for lines that are not valid records: one line each, after the local time and the reason,
+// separated by tabs. Only the beginning of a long line is kept.
 //
-// When the file is full it is renamed with ".1" behind its name, over an older one. That it cannot be written
-// is reported in the system log, once until it can again; the lines are then lost, and nothing else happens.
+// A full file is renamed to its name with ".1", over an older one. If the file cannot be written, this is
+// reported in the system log once; the lines are then lost, without further effect.
 class SetAsideFile {
 public:
-    // Opens nothing yet. The folder is created where it is missing.
+    // Opens nothing yet. A missing folder is created.
     explicit SetAsideFile(std::string path) : path_(std::move(path)) {}
     ~SetAsideFile() { Flush(); }
     SetAsideFile(const SetAsideFile &) = delete;
@@ -23,8 +23,8 @@ public:
 
     void Add(std::string_view reason, std::string_view line);
 
-    // To be called about once a second, unless idle. Writes what was added, and tells the system log of it,
-    // at most once a minute; `now` is seconds of any clock that does not go back.
+    // Call it about once a second, unless idle. Writes the added lines, and reports them in the system log at
+    // most once a minute; `now` is seconds of any clock that does not go back.
     void Tick(int64_t now);
 
     // Whether all that was added has been written and reported.
@@ -33,7 +33,7 @@ public:
     // The same, without waiting for the minute.
     void Finish();
 
-    // Goes on in a file of that name, which may be another one by now.
+    // Reopens the file by its name, which may be another file by now.
     void Reopen();
 
     static constexpr size_t kLineBytes = 8 * 1024; // kept of a line

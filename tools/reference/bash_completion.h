@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// The completion script: the template with the tables of what `app` knows.
+// The completion script: the template with the tables of the commands of `app`.
 //
 //     @options   ["kelosyslog count"]="--since --until ... --help", for each command
 //     @values    ["kelosyslog count --since"]="words now today ...", for each option that takes a value, and

@@ -55,7 +55,7 @@ std::string NameOf(const CLI::Option &option) {
 }
 
 std::string PlaceholderOf(const CLI::Option &option) {
-    // "[SECONDS]" says that it may be left out, "SECONDS:INT in [1 - 600]" what is checked.
+    // "[SECONDS]" means that it may be omitted, "SECONDS:INT in [1 - 600]" names its check.
     const std::string type = option.get_type_name();
     const size_t begin = type.starts_with('[') ? 1 : 0;
     return type.substr(begin, type.find_first_of(":]") - begin);

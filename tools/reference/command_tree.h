@@ -11,14 +11,14 @@ namespace kelo::tool {
 
 using OptionList = std::vector<const CLI::Option *>;
 
-// What a command declares, in that order: options with a long name, and arguments. --help is left out, except
-// of the program itself.
+// The declarations of a command, in order: options with a long name, and arguments. --help is omitted, except
+// for the program itself.
 OptionList OptionsOf(const CLI::App &app);
 OptionList ArgumentsOf(const CLI::App &app);
 
-// "--since"; of an argument its name in capitals.
+// "--since"; for an argument its name in capitals.
 std::string NameOf(const CLI::Option &option);
-// What stands for the value, such as "TIME"; "" where it has no name.
+// The placeholder of the value, such as "TIME"; "" if it has no name.
 std::string PlaceholderOf(const CLI::Option &option);
 // Whether it is an argument that may be repeated.
 bool TakesMany(const CLI::Option &option);
@@ -29,7 +29,7 @@ struct Command {
     std::string path;      // "db info"
 };
 
-// The commands of a program, and where each of their options is described:
+// The commands of a program, and the place where each of their options is described:
 //
 // - An option that two commands declare alike in a group of the same name is common to the program.
 // - One that two commands of a group of commands declare alike is described with that group.
@@ -39,7 +39,7 @@ public:
     // `app` stays the caller's.
     explicit CommandTree(const CLI::App &app);
 
-    // Each in front of those below it.
+    // Each one before its subcommands.
     const std::vector<Command> &Commands() const { return commands_; }
 
     // The common options by their groups, of which only what precedes " (" counts as the name.

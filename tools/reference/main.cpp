@@ -1,5 +1,5 @@
-// kelo_reference: makes the manual pages and the shell completion out of what the programs' command lines
-// declare, when they are built.
+// kelo_reference: generates the manual pages and the shell completion from the declared command lines of the
+// programs, at build time.
 //
 // usage: kelo_reference kelosyslog.1|kelonotify.8|completion TEMPLATE RESULT
 

@@ -36,7 +36,7 @@ std::string Heading(const CLI::Option &option) {
            (option.get_items_expected_min() == 0 ? " [" + RoffItalic(type) + "]" : " " + RoffItalic(type));
 }
 
-// The template without its blocks, which are looked up by what they are about.
+// The template without its blocks, which are looked up by their subject.
 class Template {
 public:
     explicit Template(const std::string &text) {
@@ -54,7 +54,7 @@ public:
 
     const std::string &Frame() const { return frame_; }
 
-    // The block about `subject`, or "". Each is taken once.
+    // The block about `subject`, or "". Each is used once.
     std::string Take(const std::string &subject) {
         const auto node = blocks_.extract(subject);
         return node ? node.mapped() : "";

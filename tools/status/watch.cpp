@@ -19,7 +19,7 @@ namespace {
 constexpr const char *kEnter = "\x1b[?1049h\x1b[?25l"; // the alternate screen, no cursor
 constexpr const char *kLeave = "\x1b[?25h\x1b[?1049l";
 
-// The terminal of the standard output while screens are drawn in place on it; nothing where they are not.
+// The terminal of the standard output while screens are drawn in place on it; nothing otherwise.
 class Terminal {
 public:
     explicit Terminal(bool mayDraw) : isOutput_(mayDraw && isatty(STDOUT_FILENO) == 1) {

@@ -19,8 +19,8 @@ struct WatchOptions {
 // Writes what `draw` returns to the standard output again and again, also when the terminal is resized,
 // until SIGINT, SIGTERM or SIGHUP comes, or "q" is typed at a screen that is drawn in place.
 //
-// Screens in place stand on the alternate screen, and the terminal is as it was afterwards, also when an
-// exception leaves. Throws OutputClosed when the reader goes away and OutputError.
+// Screens in place use the alternate screen, and the terminal is restored afterwards, also after an
+// exception. Throws OutputClosed when the reader has closed its end, and OutputError.
 void Watch(const WatchOptions &options, const DrawScreen &draw);
 
 } // namespace kelo::tool
