@@ -58,6 +58,7 @@
 //
 // A regex that RE2 refuses is reported to the system log (LOG_ERR, once per regex, with RE2's reason), and
 // its term matches no row, even when it excludes: a mistake never makes a deletion larger.
+// KELOKeywordError (errors.h) returns that report as a value.
 //
 // Rows: a text ends at its first NUL byte. Bytes of a row that are not UTF-8 are Latin-1 to a regex;
 // elsewhere only * and ? match them.

@@ -120,8 +120,8 @@ private:
 // database. The "-wal" and "-shm" files stay where they are. `connection` is not used and stays open: its
 // owner must disconnect, because a further statement on it would move the fresh database too.
 //
-// Returns 0, or -1: the notification could not be sent (the file keeps its name), the rename failed, or the
-// reload failed.
+// Returns 0, or -1: the notification could not be sent (the file keeps its name), the rename failed (with
+// errno set), or the reload failed.
 KELOSYSLOG_API int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, std::string dbPath);
 
 // Makes syslog-ng reopen its files: the package's own service if the package is enabled, else the

@@ -1,3 +1,4 @@
+#include "keloplatform/errors.h"
 #include "keloplatform/gensqlregexp.h"
 #include "platform/search_table.h"
 
@@ -76,6 +77,25 @@ TEST(Keyword, ReportsABrokenRegexOnceAndMatchesNothingByIt) {
     EXPECT_THAT(table.Matching("/" + std::string(200000, '(') + "/"), IsEmpty());
     ASSERT_EQ(log.Messages().size(), 1U);
     EXPECT_LT(log.Messages()[0].text.size(), 600U);
+}
+
+TEST(Keyword, ErrorIsTheFirstLineThatTheSystemLogGets) {
+    const std::string keywords[] = {"",
+                                    "/var/log",
+                                    "/a/ -\"(\"",
+                                    "x OR /(/",
+                                    "/]a/ /[a/",
+                                    "-/\x1b*/ a*b",
+                                    std::string("a\0/(/", 5),
+                                    "/" + std::string(1000, '(') + "/ /)/"};
+    for (const std::string &keyword : keywords) {
+        SyslogCapture log;
+        GenSQLRegexp(keyword, "msg");
+        const std::vector<std::string> lines = log.Texts();
+        log.Clear();
+        EXPECT_EQ(KELOKeywordError(keyword), lines.empty() ? "" : lines.front()) << keyword;
+        EXPECT_THAT(log.Texts(), IsEmpty());
+    }
 }
 
 std::string Repeated(const std::string &text, int count) {

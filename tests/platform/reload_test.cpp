@@ -7,6 +7,7 @@
 
 #include <thread>
 
+#include "keloplatform/errors.h"
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/root.h"
 #include "support/test.h"
@@ -120,6 +121,7 @@ TEST_F(Reload, SparesEveryOtherProcess) {
         log_.Clear();
         EXPECT_FALSE(KELOSystemdReload(c.service)) << c.content;
         EXPECT_THAT(log_.Texts(), ElementsAre(HasSubstr(c.reason)));
+        EXPECT_EQ(KELOErrorGet(), log_.Texts()[0]);
     }
     EXPECT_EQ(other.Stop(SIGTERM), SIGTERM);
 }
@@ -208,6 +210,7 @@ TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
         EXPECT_EQ(log_.Texts(), c.reason.empty()
                                     ? std::vector<std::string>()
                                     : std::vector{"cannot reload service syslog-ng: " + c.reason});
+        EXPECT_EQ(KELOErrorGet(), log_.Texts().empty() ? "" : log_.Texts()[0]);
         log_.Clear();
     }
     close(listener);

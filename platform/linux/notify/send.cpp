@@ -1,9 +1,8 @@
-#include <syslog.h>
-
 #include <cerrno>
 #include <cstring>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "files/refusal.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/channels.h"
@@ -37,6 +36,7 @@ const char *TextOf(const char *text) {
 
 int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDir, const char *filterFile,
                                             TORVSZHASH **hash, int) {
+    ClearFailure();
     const bool isSent = CatchBadAlloc(false, [&] {
         if (tag == nullptr || tag[0] == '\0') {
             errno = EINVAL;
@@ -48,6 +48,6 @@ int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDi
     });
     if (isSent)
         return 0;
-    syslog(LOG_ERR, "Cannot put notification \"%s\" into the spool: %m", TextOf(tag));
+    ReportFailure("Cannot put notification \"%s\" into the spool: %m", TextOf(tag));
     return -1;
 }

@@ -7,6 +7,7 @@
 #include <string_view>
 #include <vector>
 
+#include "keloplatform/errors.h"
 #include "search/keyword.h"
 #include "search/term_sql.h"
 #include "search/utf8.h"
@@ -53,15 +54,29 @@ class Generator {
 public:
     explicit Generator(std::string column) : column_(std::move(column)) {}
 
-    std::string Sql(const std::vector<Alternatives> &groups) {
+    std::string Sql(std::string keyword) {
+        // No SQL text can carry a NUL, and no searched text has one.
+        std::replace(keyword.begin(), keyword.end(), '\0', ' ');
+        const std::vector<Alternatives> groups = ParseKeyword(ToUtf8(keyword));
         if (std::all_of(groups.begin(), groups.end(), MatchesEveryText))
             return MatchAllSql(column_);
         std::vector<std::string> operands;
         operands.reserve(groups.size());
         for (const Alternatives &group : groups)
             operands.push_back(GroupSql(group));
-        ReportBroken();
         return Joined(std::move(operands), " AND ");
+    }
+
+    // One line for each broken regex of that keyword.
+    std::vector<std::string> Problems() const {
+        std::vector<std::string> problems;
+        std::set<std::string> known;
+        for (const auto &[regex, reason] : broken_) {
+            if (known.insert(regex).second)
+                problems.push_back("Broken regular expression [" + Printable(regex) +
+                                   "] in a search keyword matches nothing: " + Printable(reason));
+        }
+        return problems;
     }
 
 private:
@@ -77,18 +92,6 @@ private:
         return Joined(std::move(operands), " OR ");
     }
 
-    // A regex that stands several times in a keyword is reported once.
-    void ReportBroken() const {
-        std::set<std::string> reported;
-        for (const auto &[regex, reason] : broken_) {
-            if (!reported.insert(regex).second)
-                continue;
-            const std::string message = "Broken regular expression [" + Printable(regex) +
-                                        "] in a search keyword matches nothing: " + Printable(reason);
-            syslog(LOG_ERR, "%s", message.c_str());
-        }
-    }
-
     std::string column_;
     std::vector<BrokenRegex> broken_;
 };
@@ -97,8 +100,16 @@ private:
 } // namespace kelo::platform
 
 std::string GenSQLRegexp(std::string pattern, std::string column) {
-    using namespace kelo::platform;
-    // No SQL text can carry a NUL, and no searched text has one.
-    std::replace(pattern.begin(), pattern.end(), '\0', ' ');
-    return Generator(std::move(column)).Sql(ParseKeyword(ToUtf8(pattern)));
+    kelo::platform::Generator generator(std::move(column));
+    std::string sql = generator.Sql(std::move(pattern));
+    for (const std::string &problem : generator.Problems())
+        syslog(LOG_ERR, "%s", problem.c_str());
+    return sql;
+}
+
+std::string KELOKeywordError(const std::string &pattern) {
+    kelo::platform::Generator generator("text");
+    generator.Sql(pattern);
+    const std::vector<std::string> problems = generator.Problems();
+    return problems.empty() ? "" : problems.front();
 }

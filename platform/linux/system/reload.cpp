@@ -1,8 +1,8 @@
-#include <syslog.h>
 #include <systemd/sd-daemon.h>
 
 #include <new>
 
+#include "common/failure.h"
 #include "common/root.h"
 #include "keloplatform/kelosystem.h"
 #include "system/pid_file.h"
@@ -28,6 +28,7 @@ bool IsManagedBySystemd() {
 } // namespace
 
 bool KELOSystemdReload(const std::string &service) {
+    kelo::platform::ClearFailure();
     std::string problem = "not a service name";
     if (IsServiceName(service)) {
         problem = IsManagedBySystemd() ? kelo::platform::ReloadUnit(service + ".service")
@@ -35,6 +36,6 @@ bool KELOSystemdReload(const std::string &service) {
     }
     if (problem.empty())
         return true;
-    syslog(LOG_ERR, "cannot reload service %s: %s", service.c_str(), problem.c_str());
+    kelo::platform::ReportFailure("cannot reload service %s: %s", service.c_str(), problem.c_str());
     return false;
 }
