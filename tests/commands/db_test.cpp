@@ -41,6 +41,9 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     EXPECT_THAT(check.out + check.err, HasSubstr("malformed"));
     EXPECT_TRUE(ReadFile(logs_) == content);
 
+    fs::create_directories(logs_ + ".corrupt/x");
+    EXPECT_THAT(Run("db quarantine -y").err, HasSubstr("logs.db: Is a directory\n"));
+    fs::remove_all(logs_ + ".corrupt");
     const ProgramResult quarantine = Run("db quarantine -y");
     EXPECT_EQ(quarantine.status, 3) << "syslog-ng could not be reloaded";
     EXPECT_THAT(quarantine.out, HasSubstr("reloaded  no"));

@@ -64,6 +64,24 @@ TEST_F(Events, OfEveryKindCanBeAdded) {
               "1SYSTEMVolume space is not enough.");
 }
 
+TEST_F(Events, TellWhyTheyCannotBeAddedOrRead) {
+    const std::string folder = root_.File("usr/kelo/etc"), schema = root_.File("usr/kelo/syslog/schema");
+    const auto addError = [&] { return Run("events add volume-full").err; };
+    fs::remove_all(folder);
+    WriteFile(folder, "");
+    EXPECT_THAT(addError(), HasSubstr("usr/kelo/etc: Not a directory\n"));
+    fs::remove(folder);
+    fs::rename(schema, schema + ".away");
+    EXPECT_THAT(addError(), HasSubstr("kelosyslog.sql: No such file or directory\n"));
+    fs::remove(events_);
+    AddEvents();
+    RunSql(events_, "ALTER TABLE log RENAME TO logs");
+    EXPECT_THAT(addError(), HasSubstr("kelosyslog.db: no such table: log\n"));
+    Expect("events", 3);
+    WriteFile(events_, "SQLite format 3" + std::string(1000, '\0'));
+    EXPECT_THAT(addError(), HasSubstr("kelosyslog.db: file is not a database\n"));
+}
+
 TEST_F(Events, RecordWhoClearedALog) {
     CreateLogDatabase(logs_);
     Expect("events clear-log " + logs_ + " --yes --user ann", 0);

@@ -29,6 +29,9 @@ protected:
         RunSql(root_.File("narrow.db"),
                "CREATE TABLE logs(id INTEGER PRIMARY KEY); INSERT INTO logs VALUES(1)");
         RunSql(root_.File("other\x1b.db"), "CREATE TABLE x(y)");
+        CreateLogDatabase(root_.File("firm.db"), "archive.sql");
+        RunSql(root_.File("firm.db"),
+               "CREATE TRIGGER t BEFORE UPDATE ON db_info BEGIN SELECT RAISE(ABORT, 'never'); END");
         WriteFile(root_.File("text"), std::string(5000, 'x'));
         WriteFile(root_.File("empty"), "");
         WriteFile(root_.File("bad.sql"), "CREATE TABEL x (y);");
@@ -71,7 +74,7 @@ TEST_F(Refusals, NameTheWordOfAWrongCommandLine) {
         {"search --since 2021-02-30", 2, "--since: '2021-02-30'"},
         {"search -o xml", 2, "--output: 'xml'"},
         {"search --fields id,nose", 2, "--fields: unknown field 'nose'"},
-        {"search -g '/(/'", 2, "--grep: '/(/'"},
+        {"search -g 'a /(/'", 2, "--grep: 'a /(/': Broken regular expression [(] in a search keyword "},
         {"search -f -r", 2, "--follow"},
         {"search --table transfer_log -g x", 2, "--grep: table transfer_log"},
         {"count --log host08", 2, "'kelosyslog archive --list'"},
@@ -136,7 +139,10 @@ TEST_F(Refusals, NameTheFileThatCannotBeUsed) {
         {"report no/page.html", 4, "no/page.html"},
         {"stats eps --db narrow.db", 3, "narrow.db"},
         {"stats total --db narrow.db", 3, "narrow.db"},
-        {"db create --schema bad.sql --db text/a.db", 3, "text"},
+        {"db create --schema bad.sql --db text/a.db", 3, "text: Not a directory"},
+        {"db set-device x --db firm.db", 3, "firm.db: never"},
+        {"db limit 1 --db busy", 3, "busy: it is no regular file"},
+        {"db reopen", 3, "syslog-ng: no systemd, and no pid file "},
         {"db info --db none.db", 3, "none.db"},
         {"db check --db text", 3, "text"},
         {"db quarantine --yes --db none.db", 3, "none.db"},

@@ -13,8 +13,7 @@
 #include "base/text_encoding.h"
 #include "cli/program.h"
 #include "cli/progress_bar.h"
-#include "kelosyslog/logger.h"
-#include "read/log_message_capture.h"
+#include "read/event_log.h"
 
 namespace kelo::tool {
 namespace {
@@ -25,19 +24,6 @@ std::string NameOfThisMachine() {
     char name[HOST_NAME_MAX + 1] = {};
     gethostname(name, sizeof name - 1);
     return name;
-}
-
-// An event that cannot be written must not cost the archive.
-void AddEvent(int (Logger::*add)(std::string) const, const std::string &source) {
-    std::string reason;
-    {
-        const LogMessageCapture messages;
-        Logger logger;
-        if ((logger.*add)(source) == 0)
-            return;
-        reason = messages.FirstLine();
-    }
-    PrintMessage("warning: the server's event log does not record this: " + reason);
 }
 
 } // namespace
@@ -65,16 +51,24 @@ bool ArchiveRun::Archive() {
             PrintMessage("nothing archived: " + order_.source + " holds " + LogsOf(0, order_.host));
             return false;
         }
-        AddEvent(&Logger::LogAddArchStart, order_.source);
+        Record(&Logger::LogAddArchStart);
         Copy();
     } catch (const std::exception &) {
-        AddEvent(&Logger::LogAddArchFailed, order_.source);
+        Record(&Logger::LogAddArchFailed);
         if (StopSignals::Received() != 0)
             PrintMessage("interrupted; nothing archived");
         throw;
     }
-    AddEvent(&Logger::LogAddArchFinish, order_.source);
+    Record(&Logger::LogAddArchFinish);
     return true;
+}
+
+// An event that cannot be written must not cost the archive.
+void ArchiveRun::Record(int (Logger::*add)(std::string) const) const {
+    const std::string reason =
+        AddEvent(order_.root, [&](Logger &logger) { return (logger.*add)(order_.source); });
+    if (!reason.empty())
+        PrintMessage("warning: the server's event log does not record this: " + reason);
 }
 
 void ArchiveRun::Copy() {

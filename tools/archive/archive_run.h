@@ -5,6 +5,7 @@
 #include <string>
 
 #include "archive/archive_folder.h"
+#include "kelosyslog/logger.h"
 
 namespace kelo::tool {
 
@@ -19,6 +20,7 @@ public:
         std::string source; // absolute path
         std::string host;   // only its logs; "" for all
         bool isRemoving;
+        std::string root; // of the server's event log
     };
     // `report` gets lines about what was done.
     ArchiveRun(Order order, ArchiveFolder &folder, std::function<void(const std::string &)> report);
@@ -32,6 +34,7 @@ public:
 
 private:
     bool Archive();
+    void Record(int (Logger::*add)(std::string) const) const;
     void Copy();
     bool ResumeRemovals();
     uint64_t RemoveArchived(const std::string &name);

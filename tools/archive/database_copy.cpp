@@ -10,7 +10,7 @@
 #include "base/errors.h"
 #include "base/stop_signals.h"
 #include "kelosyslog/dbhandler.h"
-#include "read/log_message_capture.h"
+#include "read/failure_reason.h"
 #include "read/log_table.h"
 
 namespace kelo::tool {
@@ -118,16 +118,12 @@ bool WriteDescription(DBHandler &db, const std::string &device, DatabaseCopy &co
 
 void Describe(const std::string &device, DatabaseCopy &copy) {
     DBHandler db(copy.path, "");
-    std::string reason;
-    bool isWritten = false;
-    {
-        const LogMessageCapture messages;
-        isWritten = WriteDescription(db, device, copy);
-        reason = messages.FirstLine();
-        db.DBDiscon();
-    }
-    if (!isWritten)
-        throw DatabaseError(copy.path + ": cannot write its description: " + reason);
+    const bool isWritten = WriteDescription(db, device, copy);
+    db.DBDiscon();
+    if (isWritten)
+        return;
+    throw DatabaseError(copy.path + ": cannot write its description: " +
+                        WhyStatementFails(copy.path, "UPDATE db_info SET device = device WHERE id = 1"));
 }
 
 } // namespace

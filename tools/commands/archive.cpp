@@ -66,7 +66,7 @@ std::string Canonical(const std::string &path) {
 class ArchiveCommand {
 public:
     ArchiveCommand(const Options &options, const std::string &root)
-        : options_(options),
+        : options_(options), root_(root),
           folder_(options.to.empty() ? ArchiveFolderPath(root) : fs::absolute(options.to).string()) {
         folder_ = Canonical(folder_);
         RequireSense();
@@ -120,7 +120,7 @@ public:
         if (options_.isDryRun)
             return Preview(table.path);
         ArchiveFolder folder(folder_, options_.to.empty());
-        ArchiveRun run({table.path, options_.device, options_.isRemoving}, folder,
+        ArchiveRun run({table.path, options_.device, options_.isRemoving, root_}, folder,
                        [this](const std::string &text) { Print(text); });
         const bool hasDone = run.Run();
         retention_.spared = run.Made();
@@ -212,6 +212,7 @@ private:
     }
 
     const Options &options_;
+    std::string root_;
     std::string folder_;
     Retention retention_;
     std::exception_ptr outputFailure_;

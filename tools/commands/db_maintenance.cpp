@@ -4,6 +4,8 @@
 #include <unistd.h>
 
 #include <cctype>
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <limits>
 
@@ -12,8 +14,9 @@
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/db_commands.h"
+#include "keloplatform/errors.h"
 #include "kelosyslog/dbhandler.h"
-#include "read/log_message_capture.h"
+#include "read/failure_reason.h"
 #include "read/read_only_query.h"
 #include "store/logs_schema.h"
 
@@ -34,19 +37,6 @@ struct DeviceOptions : DbOptions {
 struct QuarantineOptions : DbOptions {
     bool isConfirmed = false;
 };
-
-// Runs `work` and throws DatabaseError with its first message to the system log when it returns false.
-template <typename Work>
-void Attempt(const std::string &failure, Work work) {
-    std::string reason;
-    {
-        const LogMessageCapture messages;
-        if (work())
-            return;
-        reason = messages.FirstLine();
-    }
-    throw DatabaseError(failure + (reason.empty() ? "" : ": " + reason));
-}
 
 // The library hands its paths to a shell: the database's between double quotes, the schema's bare.
 void RequirePlainPaths(const std::string &path, const std::string &schema) {
@@ -80,7 +70,8 @@ int Create(const CreateOptions &options) {
     RequirePlainPaths(path, schema);
     if (access(schema.c_str(), R_OK) != 0)
         throw UsageError("--schema: cannot read " + schema);
-    Attempt("cannot create " + path, [&] { return DBHandler(path, schema).DBCreate() == 0; });
+    if (DBHandler(path, schema).DBCreate() != 0)
+        throw DatabaseError("cannot create " + path + ": " + WhyNotCreated(path, schema));
     const auto mode = ReadOnlyQuery(options.Table()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
     KeyValues values;
     values.Add("created", path);
@@ -116,7 +107,8 @@ int Limit(const LimitOptions &options) {
     struct stat before {};
     if (stat(path.c_str(), &before) != 0)
         throw DatabaseError(DescribeDatabaseProblem(options.Table()));
-    Attempt("cannot examine " + path, [&] { return SyslogngWorkingDbCheck(path, limit) == 0; });
+    if (SyslogngWorkingDbCheck(path, limit) != 0)
+        throw DatabaseError("cannot examine " + path + ": it is no regular file");
     struct stat after {};
     const bool isRemoved = stat(path.c_str(), &after) != 0 || after.st_ino != before.st_ino;
     const bool isBeyond = before.st_size / 1024 > limit;
@@ -141,11 +133,11 @@ int SetDevice(const DeviceOptions &options) {
             throw DatabaseError(table.path + " has no row in a table db_info to write the device to");
     }
     DBHandler db(table.path, "");
-    Attempt("cannot change " + table.path, [&] {
-        const bool isDone = db.DBCon() == 0 && db.DBInfoDevSet(db.DBCmdEscape(options.device)) == 0;
-        db.DBDiscon();
-        return isDone;
-    });
+    const bool isDone = db.DBCon() == 0 && db.DBInfoDevSet(db.DBCmdEscape(options.device)) == 0;
+    db.DBDiscon();
+    if (!isDone)
+        throw DatabaseError("cannot change " + table.path + ": " +
+                            WhyStatementFails(table.path, "UPDATE db_info SET device = device WHERE id = 1"));
     KeyValues values;
     values.Add("path", table.path);
     values.Add("device", options.device);
@@ -171,11 +163,12 @@ int Quarantine(const QuarantineOptions &options) {
         struct stat after {};
         return stat(aside.c_str(), &after) == 0 && after.st_ino == before.st_ino;
     };
-    bool isReloaded = false;
-    Attempt("cannot move " + path, [&] {
-        isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
-        return isReloaded || isMoved();
-    });
+    const bool isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
+    const int moveError = errno;
+    const std::string unsent = KELOErrorGet(); // the notification that comes before
+    if (!isReloaded && !isMoved())
+        throw DatabaseError("cannot move " + path + ": " +
+                            (unsent.empty() ? std::strerror(moveError) : unsent));
     KeyValues values;
     values.Add("moved", path);
     values.Add("to", aside);
@@ -189,7 +182,8 @@ int Quarantine(const QuarantineOptions &options) {
 
 int Reopen(const DbOptions &options) {
     const OutputFormat format = options.Format();
-    Attempt("cannot make syslog-ng reopen its files", [] { return SyslogngHupSignalSend() == 0; });
+    if (SyslogngHupSignalSend() != 0)
+        throw DatabaseError(std::string("cannot make syslog-ng reopen its files: ") + KELOErrorGet());
     KeyValues values;
     values.AddBool("reloaded", true);
     Print(values, format);

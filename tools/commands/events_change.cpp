@@ -19,7 +19,6 @@
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/logger.h"
 #include "read/event_log.h"
-#include "read/log_message_capture.h"
 
 namespace kelo::tool {
 namespace {
@@ -79,11 +78,9 @@ int Add(const EventsOptions &options, const std::string &name, const Arguments &
         const std::string &root) {
     RefuseListOptions(options, "add", true);
     const Kind &kind = FindKind(name, arguments.size());
-    const LogMessageCapture messages;
-    Logger logger;
-    if (kind.add(logger, arguments) != 0)
-        throw DatabaseError("cannot add the event to " + EventDatabasePath("", root) + ": " +
-                            messages.FirstLine());
+    const std::string reason = AddEvent(root, [&](Logger &logger) { return kind.add(logger, arguments); });
+    if (!reason.empty())
+        throw DatabaseError("cannot add the event to " + EventDatabasePath("", root) + ": " + reason);
     return kExitFound;
 }
 

@@ -7,8 +7,9 @@
 #include <filesystem>
 
 #include "base/errors.h"
-#include "read/log_message_capture.h"
+#include "read/failure_reason.h"
 #include "read/log_table.h"
+#include "read/read_only_query.h"
 #include "read/severity_filter.h"
 #include "read/time_expression.h"
 
@@ -58,6 +59,17 @@ std::vector<int> ParseEventLevels(const std::vector<std::string> &values) {
     return levels;
 }
 
+// Whether there is an event behind the `offset` newest, or no answer.
+bool MayHaveEvents(const std::string &path, int offset) {
+    const ReadOnlyQuery database({path, "log"}, std::chrono::seconds(1));
+    try {
+        return database.FirstRow("SELECT id FROM log LIMIT 1 OFFSET " + std::to_string(offset), {"id"})
+            .has_value();
+    } catch (const SqliteError &) {
+        return true;
+    }
+}
+
 } // namespace
 
 std::string EventDatabasePath(const std::string &db, const std::string &root) {
@@ -71,11 +83,23 @@ void FailEventDatabase(const std::string &path, bool forWriting) {
 std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
     if (access(path.c_str(), R_OK) != 0) // the library would create a missing one
         FailEventDatabase(path);
-    const LogMessageCapture messages;
     std::list<Event> events = Logger().LogEnum(path, offset, limit);
-    if (events.empty() && !messages.FirstLine().empty())
+    // No events is also the answer to a failure.
+    if (events.empty() && MayHaveEvents(path, limit == 0 ? 0 : offset))
         FailEventDatabase(path);
     return events;
+}
+
+std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add) {
+    const std::string path = EventDatabasePath("", root);
+    const bool hasExisted = access(path.c_str(), F_OK) == 0;
+    Logger logger;
+    if (add(logger) == 0)
+        return "";
+    if (access(path.c_str(), F_OK) != 0)
+        return hasExisted ? "it was damaged and is " + path + ".corrupt now"
+                          : WhyNotCreated(path, root + "/usr/kelo/syslog/schema/kelosyslog.sql");
+    return WhyStatementFails(path, "INSERT INTO log VALUES (NULL, 0, 0, '', '')");
 }
 
 bool EventFilter::Matches(const Event &event) const {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <limits>
 #include <list>
 #include <string>
@@ -19,6 +20,10 @@ std::string EventDatabasePath(const std::string &db, const std::string &root);
 // The events of a database, newest first: `limit` of them after `offset`, or all from the first for a limit
 // of 0. Throws DatabaseError when it cannot be read; a missing one is not created.
 std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit = 0);
+
+// Adds an event, by an operation of the library, to the server's own event database below `root`. Returns "",
+// or why it cannot be added.
+std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add);
 
 // Throws DatabaseError that tells why the event database at `path` cannot be read, or changed.
 [[noreturn]] void FailEventDatabase(const std::string &path, bool forWriting = false);

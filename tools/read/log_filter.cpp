@@ -3,7 +3,7 @@
 #include <ctime>
 
 #include "base/errors.h"
-#include "read/log_message_capture.h"
+#include "keloplatform/errors.h"
 #include "read/severity_filter.h"
 #include "read/time_expression.h"
 
@@ -86,11 +86,10 @@ void AddFacilities(Conditions &conditions, const std::vector<std::string> &value
 void AddKeyword(Conditions &conditions, const std::string &keyword) {
     if (keyword.find_first_not_of(" \t\n") == std::string::npos)
         throw UsageError("--grep: empty keyword");
-    LogMessageCapture capture;
     LogSearchCondListGen("", "", "", "", keyword, "", "", conditions);
-    const std::string complaint = capture.FirstLine();
-    if (!complaint.empty())
-        throw UsageError("--grep: '" + keyword + "': " + complaint);
+    const std::string error = KELOKeywordError(keyword);
+    if (!error.empty())
+        throw UsageError("--grep: '" + keyword + "': " + error);
 }
 
 std::string LocalTimestamp(int64_t seconds) {
