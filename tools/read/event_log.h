@@ -21,8 +21,8 @@ std::string EventDatabasePath(const std::string &db, const std::string &root);
 // of 0. Throws DatabaseError when it cannot be read; a missing one is not created.
 std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit = 0);
 
-// Adds an event, by an operation of the library, to the server's own event database below `root`. Returns "",
-// or why it cannot be added.
+// Adds an event to the server's own event database below `root` with the library operation that `add` calls.
+// Returns "", or why that failed.
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add);
 
 // Throws DatabaseError that tells why the event database at `path` cannot be read, or changed.
