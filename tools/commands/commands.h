@@ -7,7 +7,7 @@ namespace kelo::tool {
 // Everything that the command line of kelosyslog knows.
 void DeclareCommandLine(Program &program);
 
-// The subcommands, each in the file of its name.
+// The subcommands, each in the file with its name.
 void AddSearch(Program &program);
 void AddCount(Program &program);
 void AddDelete(Program &program);

@@ -11,7 +11,7 @@
 
 namespace kelo::tool {
 
-// Options that several subcommands share. Each struct lives as long as the command line is used.
+// Options that several subcommands share. Each struct must outlive the use of the command line.
 
 // --db, --log and --table.
 void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable = true);
@@ -35,7 +35,7 @@ struct OutputOptions {
 // --output, --fields, --no-header, --utc, --color and --no-pager.
 void AddOutputOptions(CLI::App &command, OutputOptions &options);
 
-// What the options mean for a table of this kind. Throws UsageError.
+// The options for a table of this kind. Throws UsageError.
 RecordLayout MakeLayout(const OutputOptions &options, TableKind kind);
 
 // --output of the commands that print text or one JSON object.

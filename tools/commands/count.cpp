@@ -1,4 +1,4 @@
-// kelosyslog count: prints how many logs there are.
+// kelosyslog count: prints the number of records.
 
 #include <ctime>
 

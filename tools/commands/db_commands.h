@@ -7,7 +7,7 @@
 
 namespace kelo::tool {
 
-// What every command of "kelosyslog db" can be told.
+// The options of every command of "kelosyslog db".
 struct DbOptions {
     LogTableOptions table;
     std::string format = "text";
@@ -21,7 +21,7 @@ struct DbOptions {
 CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
                        const std::string &description, DbOptions &options, std::function<int()> run);
 
-// Commands that only look: info, check.
+// Commands that only read: info, check.
 void AddDbInspection(Program &program, CLI::App &db);
 // Commands that change a database: create, wal, limit, set-device, quarantine, reopen.
 void AddDbMaintenance(Program &program, CLI::App &db);

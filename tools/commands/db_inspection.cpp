@@ -31,7 +31,7 @@ void AddTime(KeyValues &values, const std::string &name, const std::string &utcs
         values.Add(name, TimeFormat(false).Iso(std::strtoll(utcsec.c_str(), nullptr, 10)));
 }
 
-// The time of the first log in one order of time; "" when there is none.
+// The time of the first record in one order of time; "" when there is none.
 std::string FirstTime(const ReadOnlyQuery &database, const char *direction) {
     const auto row = database.FirstRow(
         std::string("SELECT utcsec FROM logs ORDER BY utcsec ") + direction + " LIMIT 1", {"utcsec"});
@@ -83,8 +83,8 @@ uint64_t BytesRead() {
     return bytes;
 }
 
-// Shows how far a check has come, while the calling thread runs it. SQLite says nothing in the meantime, so
-// the bytes that were read are looked at: a check reads every page, and most of them a second time for the
+// Shows the progress of a check while the calling thread runs it. SQLite reports no progress, so it is
+// estimated from the bytes that were read: a check reads every page, and most of them a second time for the
 // rows.
 class CheckProgress {
 public:

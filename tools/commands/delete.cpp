@@ -1,4 +1,4 @@
-// kelosyslog delete: removes logs.
+// kelosyslog delete: removes records.
 
 #include <algorithm>
 #include <chrono>
@@ -27,7 +27,7 @@ constexpr const char *kFooter =
     "  kelosyslog delete --all --db /volume1/old.db\n\n"
     "Exit status: 0 deleted, 1 nothing matched or not confirmed, 2 usage, 3 database.";
 
-// How long one statement may keep other writers waiting, roughly.
+// The approximate time for which one statement may keep other writers waiting.
 constexpr std::chrono::milliseconds kStepTime{100};
 constexpr uint64_t kSmallestStep = 50;
 constexpr uint64_t kLargestStep = 5000; // records
@@ -45,8 +45,8 @@ std::string Logs(uint64_t count) {
     return std::to_string(count) + (count == 1 ? " matching log" : " matching logs");
 }
 
-// The condition that a record has one of these ids: SQLite then goes straight to the rows, whatever the
-// filter was, and holds the write lock for no longer than their removal takes.
+// The condition that a record has one of these ids: for any filter SQLite then finds the rows directly, and
+// holds the write lock only while it removes them.
 _SYSLOG_SQL_COND_tag HasId(const std::vector<uint64_t> &ids, size_t first, size_t count) {
     std::string list;
     for (size_t i = first; i < first + count; ++i)
@@ -60,7 +60,7 @@ public:
     Deletion(const LogTable &table, uint64_t total)
         : table_(table), total_(total), progress_(total, ProgressBar::Unit::Records) {}
 
-    // Throws DatabaseError and Interrupted, which tell how many were deleted before.
+    // Throws DatabaseError and Interrupted with the number of records that were deleted before.
     void Delete(const std::vector<uint64_t> &ids) {
         for (size_t next = 0; next < ids.size();) {
             if (StopSignals::Received() != 0) {

@@ -47,7 +47,7 @@ EventPage ParsePage(const EventsOptions &options) {
     return page;
 }
 
-// The library pages what is not filtered; of filtered events it takes all to find a page.
+// The library reads pages only without a filter; a page of filtered events needs all of them.
 std::list<Event> SelectedEvents(const std::string &path, const EventsOptions &options,
                                 const EventPage &page) {
     if (IsEmpty(options.filter)) {
@@ -106,7 +106,7 @@ int Count(const EventsOptions &options, const std::string &root) {
     return count > 0 ? kExitFound : kExitNothing;
 }
 
-// The library does not tell when the page could not be written in full, so its end is looked at.
+// The library does not report a page that could not be written in full, so its end is checked.
 void RequireWholePage(const AtomicFile &file) {
     std::string end(std::char_traits<char>::length(kPageEnd), '\0');
     std::ifstream page(file.Path());

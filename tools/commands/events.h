@@ -8,7 +8,7 @@
 
 namespace kelo::tool {
 
-// What the command line says about "kelosyslog events".
+// The command line of "kelosyslog events".
 struct EventsOptions {
     std::string db;
     LogFilter filter;
@@ -19,12 +19,12 @@ struct EventsOptions {
 };
 using SharedEventsOptions = std::shared_ptr<EventsOptions>;
 
-// Adds a subcommand below "events". Options that it does not have itself are those of "events". `action` goes
-// into `options` when the subcommand is chosen, so it must not own them.
+// Adds a subcommand below "events". It inherits the options of "events". `action` is stored
+// in `options` when the subcommand is chosen, so it must not own them.
 CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
                           const std::string &description, std::function<int()> action);
 
-// Throws UsageError where an option was given that only the listing understands, or with `withDb` --db.
+// Throws UsageError if an option was given that only the list accepts, or with `withDb` --db.
 void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb);
 
 // The subcommands that write: "add" and "clear-log".

@@ -15,7 +15,7 @@ using Clock = std::chrono::steady_clock;
 
 constexpr int kPollMs = 250;
 
-// Which file stands at a path; nothing when there is none.
+// The file at a path; nothing when there is none.
 struct FileIdentity {
     dev_t device;
     ino_t inode;
@@ -53,7 +53,7 @@ public:
         const bool isReplaced = current != file_;
         const uint64_t first = isReplaced ? 1 : lastId_ + 1;
         try {
-            // Logs that are not selected count as seen too, so that they are not read over and over.
+            // Records that are not selected count as seen too, so that they are not read again and again.
             const uint64_t newest = everything_.IdFromNewest(0);
             file_ = current;
             lastId_ = isReplaced ? newest : std::max(lastId_, newest);
@@ -83,7 +83,7 @@ uint64_t Follow(const LogReader &reader, const FollowOptions &options, const Log
     output.Flush();
     Clock::time_point lastNews = Clock::now();
     while (true) {
-        // Taken before the look, so that a log of the last second is not missed.
+        // Read before the query, so that no record of the last second is missed.
         const bool isOver = options.until && std::time(nullptr) > *options.until;
         const uint64_t news = follower.PrintNews();
         output.Flush();

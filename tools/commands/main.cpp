@@ -1,11 +1,11 @@
-// kelosyslog: searches and maintains the logs of a log server.
+// kelosyslog: searches and maintains the records of a log server.
 
 #include <csignal>
 
 #include "commands/commands.h"
 
 int main(int argc, char **argv) {
-    // A reader that goes away is noticed by the failing write.
+    // A reader that closes its end is detected by the failing write.
     std::signal(SIGPIPE, SIG_IGN);
 
     kelo::tool::Program program;

@@ -1,4 +1,4 @@
-// kelosyslog notify: shows and tests the ways notifications go, and the spool that they wait in.
+// kelosyslog notify: shows and tests the channels of notifications, and the spool.
 
 #include <algorithm>
 #include <cerrno>

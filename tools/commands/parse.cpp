@@ -1,4 +1,4 @@
-// kelosyslog parse: turns log text into records, printed or stored.
+// kelosyslog parse: converts log text to records, printed or stored.
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -55,9 +55,9 @@ public:
     }
 
     int Fd() const { return file_.Get(); }
-    // Bytes to be read; 0 when that is not known.
+    // Bytes to read; 0 when unknown.
     uint64_t Size() const { return S_ISREG(status_.st_mode) ? static_cast<uint64_t>(status_.st_size) : 0; }
-    // The name under which progress is kept: the same from every folder.
+    // The name under which progress is stored: the same from every folder.
     std::string Source() const {
         return name_ == kStandardInput ? name_ : std::filesystem::canonical(name_).string();
     }
@@ -68,7 +68,7 @@ private:
     struct stat status_ {};
 };
 
-// Prints records as they come.
+// Prints records one by one.
 class PrintSink : public RecordSink {
 public:
     PrintSink(RecordLayout layout, bool mayPage)
@@ -93,8 +93,7 @@ private:
     std::string text_;
 };
 
-// What is printed unless --fields asks for something else: what the text holds, and no row id, which it has
-// not.
+// The default fields: those of the text, without the row id, which it does not have.
 RecordLayout MakeParseLayout(const OutputOptions &options) {
     static constexpr RecordField kExtnum = {
         "extnum", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.extnum); }};
@@ -106,7 +105,7 @@ RecordLayout MakeParseLayout(const OutputOptions &options) {
     return layout;
 }
 
-// Reads the inputs one after the other and keeps the account of all of them.
+// Reads the inputs one after the other and keeps common counts.
 class ParseRun {
 public:
     explicit ParseRun(const Options &options)
@@ -133,7 +132,7 @@ public:
         });
     }
 
-    // The account on the standard error. Returns the ExitStatus.
+    // The counts on the standard error. Returns the ExitStatus.
     int Finish() {
         const ImportCounts &counts = import_.Counts();
         std::string text = std::to_string(counts.parsed) + " parsed";
@@ -149,7 +148,7 @@ public:
 
 private:
     // Finds unreadable files before anything is printed or stored. Returns the size of all inputs, 0 when it
-    // is not known or when a progress bar would stand among the logs on the terminal.
+    // is unknown or when a progress bar would be mixed with the records on the terminal.
     static uint64_t CheckInputs(const Options &options) {
         uint64_t total = 0;
         bool isKnown = !options.db.empty() || isatty(STDOUT_FILENO) == 0;

@@ -1,4 +1,4 @@
-// kelosyslog receive: counts, checks and stores the logs that syslog-ng hands over.
+// kelosyslog receive: counts, checks and stores the messages of syslog-ng.
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -35,7 +35,7 @@ struct Options {
 };
 
 // Held as long as the program runs: two receivers would overwrite each other's counts. After a restart of
-// syslog-ng the old one may still be storing, and is waited for.
+// syslog-ng the old one may still be storing; its end is awaited.
 FileHandle LockAgainstOthers(const std::string &root) {
     const std::filesystem::path path = root + "/run/kelosyslog/receive.lock";
     std::error_code ignored; // opening fails then, and says why
@@ -56,7 +56,7 @@ FileHandle LockAgainstOthers(const std::string &root) {
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
-    // A limit of the file size is a full disk like any other.
+    // A limit of the file size is handled like a full disk.
     std::signal(SIGXFSZ, SIG_IGN);
     openlog("kelosyslog", LOG_PID | (options.verbose ? LOG_PERROR : 0), LOG_DAEMON);
     const FileHandle lock = LockAgainstOthers(root);

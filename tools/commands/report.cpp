@@ -1,4 +1,4 @@
-// kelosyslog report: a page about the logs and events of a period.
+// kelosyslog report: a page about the records and events of a period.
 
 #include <unistd.h>
 
@@ -38,7 +38,7 @@ struct Options {
     bool inUtc = false;
 };
 
-// The figures as far as they can be read: a report is worth having without them.
+// The figures as far as they can be read: a report is useful without them.
 AccountingFigures ReadAccounting(const std::string &path, const Period &period, const TimeGrid &grid) {
     AccountingFigures figures;
     if (access(path.c_str(), F_OK) != 0)
@@ -57,7 +57,7 @@ AccountingFigures ReadAccounting(const std::string &path, const Period &period, 
     return figures;
 }
 
-// None where there is no event database, which a machine that only keeps archives does not have.
+// None without an event database, which a machine that only stores archives does not have.
 std::optional<std::list<Event>> ReadEventsOf(const std::string &path, bool isNamed, const Period &period) {
     if (!isNamed && access(path.c_str(), F_OK) != 0)
         return std::nullopt;
@@ -81,7 +81,7 @@ void ReadReport(const Options &options, const std::string &root, Report &report)
     const std::optional<Period> period = LogPeriod(table, since, until);
     const bool isWhole = !since && !until;
     report.period = period.value_or(Period{since.value_or(0), until.value_or(report.now)});
-    // Events go on after the last log.
+    // There may be events after the last record.
     if (!until)
         report.period.to = std::max(report.period.to, std::min(report.now, report.period.to + 86400));
     if (report.period.from > report.period.to)

@@ -16,7 +16,7 @@ struct RuleSet {
 
     const _SYSLOG_NOTIFY_RULES_tag *Find(const std::string &name) const;
     bool IsBroken(const std::string &name) const { return !broken.empty() && name == broken; }
-    // Throws DatabaseError when the loading ended early, for then a rule may exist that is not known.
+    // Throws DatabaseError when the loading ended early, because an unknown rule may then exist.
     void RequireReadable(const std::string &path) const;
 };
 
@@ -26,7 +26,8 @@ RuleSet LoadRules(const std::string &path);
 // "text" or "json". Throws UsageError for any other.
 bool IsJson(const std::string &format);
 
-// What the rule asks for: "severity err and worse", "500 logs a second and more", "message with disk full".
+// The condition of the rule: "severity err and worse", "500 logs a second and more", "message with disk
+// full".
 std::string DescribeRule(const _SYSLOG_NOTIFY_RULES_tag &rule);
 
 // Prints the rules; returns an ExitStatus.

@@ -25,7 +25,7 @@ bool Fires(const _SYSLOG_NOTIFY_RULES_tag &rule, const RuleTestOptions &options)
            options.text.find(rule.pattern) != std::string::npos;
 }
 
-// One line of the result: a rule, or what of a log it was, and what it fires for.
+// One line of the result: a rule, or the tested part of a record, and the match.
 void AppendLine(std::string &out, bool isJson, const std::string &name, const std::string &what) {
     if (!isJson) {
         out += EscapeForTerminal(name) + ": " + EscapeForTerminal(what) + "\n";
@@ -48,7 +48,7 @@ int Print(std::string text, bool isJson) {
     return isEmpty ? kExitNothing : kExitFound;
 }
 
-// Checks a log and sends what is to be sent. Returns how many notifications could not be sent.
+// Checks a record and sends its notifications. Returns the number that could not be sent.
 int CheckLog(NotificationManager &manager, const _SYSLOG_LOG_DATA_tag &log, const RuleTestOptions &options,
              bool isJson, std::string &out) {
     int failures = 0;

@@ -8,7 +8,7 @@
 
 namespace kelo::tool {
 
-// What the rules are tested against; nothing for the newest stored logs.
+// The test input of the rules; nothing for the newest stored records.
 struct RuleTestOptions {
     bool hasSeverity = false;
     _SYSLOG_DB_PRIORITY_tag severity = SYSLOG_PRIO_EMERG;
@@ -21,8 +21,8 @@ struct RuleTestOptions {
     std::string format = "text";
 };
 
-// Prints the rules that fire, or the stored logs that a rule fires for, and sends their notifications where
-// that is wanted. Returns an ExitStatus: kExitNothing when no rule fires.
+// Prints the rules that fire, or the stored records for which a rule fires, and sends their notifications if
+// requested. Returns an ExitStatus: kExitNothing when no rule fires.
 int TestRules(const RuleTestOptions &options, const std::string &path, const std::string &root);
 
 } // namespace kelo::tool

@@ -36,7 +36,7 @@ constexpr const char *kFooter =
     "  kelosyslog rules test --text 'disk full'\n\n"
     "Exit status: 0 done or a rule fires, 1 no rule, 2 usage, 3 file or database, 4 output.";
 
-constexpr uint64_t kMaxEps = 2147483647; // what the rule file gives back as it was stored
+constexpr uint64_t kMaxEps = 2147483647; // the largest number that the rule file gives back unchanged
 
 struct Options {
     std::string action;
@@ -87,7 +87,7 @@ void Write(const std::string &path, _SYSLOG_NOTIFY_RULES_tag rule) {
             (errno == EINVAL ? "the file cannot hold its name or keyword" : std::strerror(errno)));
 }
 
-// Throws UsageError where the change does not suit the rules that exist.
+// Throws UsageError if the change does not fit the existing rules.
 void RequireSuitable(const RuleSet &rules, const std::string &path, const Options &options) {
     if (options.action != "remove")
         rules.RequireReadable(path);
@@ -127,7 +127,7 @@ void Change(const std::string &path, const Options &options) {
     }
 }
 
-// A receiver that runs takes the changed rules over.
+// A running receiver loads the changed rules.
 void TellReceiver(const std::string &root) {
     const ReceiverStatus receiver = GatherReceiver(root, std::time(nullptr));
     if (receiver.state != ReceiverStatus::State::Running && receiver.state != ReceiverStatus::State::Silent)

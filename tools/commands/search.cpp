@@ -1,4 +1,4 @@
-// kelosyslog search: prints logs.
+// kelosyslog search: prints records.
 
 #include <ctime>
 

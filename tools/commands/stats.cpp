@@ -1,4 +1,4 @@
-// kelosyslog stats: what the accounting counted.
+// kelosyslog stats: the counts of the accounting.
 
 #include <langinfo.h>
 
@@ -51,7 +51,7 @@ struct Options {
     bool inUtc = false;
 };
 
-// What is printed, and the column that a plot draws.
+// The printed table, and the column for a plot.
 struct Answer {
     StatisticsTable table;
     size_t bar;
@@ -114,7 +114,7 @@ EpsSeries ReadSeries(const std::string &path, const Options &options) {
     return series;
 }
 
-// In a plot the intervals without logs show as well: each one of a short gap, and a long one as one line.
+// A plot also shows the intervals without records: each one of a short gap, and a long gap as one line.
 void AddGap(StatisticsTable &table, int64_t from, int64_t to, const EpsSeries &series,
             const TimeFormat &time) {
     constexpr int64_t kLongest = 5;

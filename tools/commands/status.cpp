@@ -1,4 +1,4 @@
-// kelosyslog status: tells whether the log server is well.
+// kelosyslog status: checks the health of the log server.
 
 #include <unistd.h>
 
@@ -70,7 +70,7 @@ int Run(const Options &options, const std::string &root) {
     return result;
 }
 
-// "--watch" goes with and without a number.
+// "--watch" is allowed with and without a number.
 void AddWatch(CLI::App &command, Options &options) {
     const auto take = [&options](const CLI::results_t &results) {
         options.mustWatch = true;

@@ -30,7 +30,7 @@ struct Options {
     bool noHeader = false;
 };
 
-// The columns of table "logs", which is the only one that is asked.
+// The columns of table "logs", which is the only one used.
 std::vector<std::string> AttributeNames() {
     std::vector<std::string> names;
     for (int32_t i = SYSLOG_ATTRI_ID; i <= SYSLOG_ATTRI_MSG; ++i)

@@ -23,7 +23,7 @@ void RequireHistogram(const std::string &path) {
 std::optional<StampRange> StoredStamps(const std::string &path, const StampRange &range) {
     const std::string where =
         " FROM eps WHERE stamp BETWEEN " + std::to_string(range.first) + " AND " + std::to_string(range.last);
-    // Each of the two has an end of the index to itself.
+    // Each of the two uses one end of the index.
     const std::string sql = "SELECT (SELECT min(stamp)" + where + ") AS first, (SELECT max(stamp)" + where +
                             ") AS last, (SELECT device || eps FROM eps LIMIT 1) AS probe";
     const auto ends = ReadOnlyQuery({path, "eps"}).FirstRow(sql, {"first", "last"});

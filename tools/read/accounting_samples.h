@@ -10,8 +10,8 @@ namespace kelo::tool {
 // opened.
 std::string AccountingPath(const std::string &db, const std::string &root);
 
-// Throws DatabaseError, with what can be told about the reason, unless the database has a histogram that can
-// be read. The library's getters answer a failure as if there were no rows.
+// Throws DatabaseError, with the reason if it is known, unless the database has a readable
+// histogram. The library's getters answer a failure as if there were no rows.
 void RequireHistogram(const std::string &path);
 
 struct StampRange {

@@ -60,7 +60,7 @@ void ReadEps(const std::string &path, int64_t since, int64_t until, const EpsHan
     for (int64_t from = stored->first; from <= stored->last; from += kDay) {
         const int64_t to = std::min(stored->last, from + kDay - 1);
         const auto samples = SyslogDBEpsGet(path, static_cast<int>(from), static_cast<int>(to));
-        // No samples is also the answer to a failure.
+        // A failure also gives no samples.
         if (samples.empty() && StoredStamps(path, {from, to}))
             throw DatabaseError(DescribeDatabaseProblem({path, "eps"}));
         for (const auto &[stamp, sample] : samples)

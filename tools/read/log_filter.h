@@ -11,8 +11,8 @@
 
 namespace kelo::tool {
 
-// Which logs a command is about, as the user wrote it. Values of one option are alternatives, the options
-// together narrow the filter.
+// The records that a command selects, as the user wrote it. Values of one option are alternatives; all
+// options together must match.
 struct LogFilter {
     std::string since = {}; // "" for no bound
     std::string until = {};
@@ -28,11 +28,11 @@ bool IsEmpty(const LogFilter &filter);
 // The last second that --until includes, if it was given: a day alone ends before it begins.
 std::optional<int64_t> LastSecond(const LogFilter &filter, int64_t now);
 
-// The conditions that select these logs in a table of this kind, to be ANDed; none for an empty filter.
+// The conditions for these records in a table of this kind, to combine with AND; none for an empty filter.
 //
-// A host, program or facility that holds '*' or '?' is a pattern. What is excluded leaves rows without a
-// value in. Table "logs" is bounded by its `utcsec`; the others, which have none, by their `ldate` and
-// `ltime`, which are taken as local time.
+// A host, program or facility with '*' or '?' is a pattern. An exclusion keeps rows without a value. Table
+// "logs" is limited by its `utcsec`; the others, which have none, by their `ldate` and `ltime`, which are
+// read as local time.
 //
 // Throws UsageError for a value that cannot be read, a broken regular expression, and an option whose column
 // the table does not have.

@@ -14,14 +14,14 @@ using Log = _SYSLOG_LOG_DATA_tag;
 
 // Rows of one statement, some 3 MB, and the ids that it starts with.
 constexpr uint64_t kChunkRows = 10000;
-// The largest page that is kept in memory.
+// The largest page that is stored in memory.
 constexpr uint64_t kPageRows = kChunkRows;
 // Ids that one statement looks at, at most: of sparse ids, such as those made from a time.
 constexpr uint64_t kLargestSpan = uint64_t{1} << 60;
 // A count comes as an int; no range of this many ids can exceed it.
 constexpr uint64_t kCountableIds = std::numeric_limits<int32_t>::max();
 
-// Carries the handler's exception over the library, and remembers where the walk stands.
+// Carries the handler's exception through the library, and the position of the scan.
 struct RowVisitor {
     const LogHandler &handle;
     uint64_t maxRows;
@@ -78,7 +78,7 @@ uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
     if (range.first > range.last)
         return 0;
     const uint64_t id = Select(range, isFirst, {1, 0}, [](const Log &) {}).lastId;
-    if (id != 0 && (id < range.first || id > range.last)) // a walk from one to the next would never end
+    if (id != 0 && (id < range.first || id > range.last)) // a scan from one to the next would never end
         throw DatabaseError("cannot read " + table_.path + ": the ids of table " + table_.name +
                             " are no row numbers");
     return id;
@@ -139,7 +139,7 @@ uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandle
 }
 
 uint64_t LogReader::CountWith(Conditions conditions) const {
-    // Always true, and not the text for which the library would answer with the largest id.
+    // Always true, and not the text for which the library would return the largest id.
     conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}});
     const int count = SyslogDBSelectCountByTable(table_.path, table_.name, conditions, nullptr, nullptr);
     if (count < 0)

@@ -34,7 +34,7 @@ TableKind KindOf(const std::string &table) {
                      "' is no log table; tables are logs, general_log, connection_log, transfer_log");
 }
 
-// The header at the front of a file; the number of bytes that were there, or -1 with errno set.
+// The header of a file; the number of bytes that were read, or -1 with errno set.
 ssize_t ReadHeader(const std::string &path, Header &header) {
     // Not blocking: the path may name a pipe.
     const FileHandle file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));

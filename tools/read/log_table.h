@@ -19,7 +19,7 @@ struct LogTable {
     TableKind kind = TableKind::Logs;
 };
 
-// What the options --db, --log, --table and --root say; "" for an option that was not given.
+// The values of --db, --log, --table and --root; "" for an option that was not given.
 struct LogTableOptions {
     std::string db;
     std::string log;
@@ -27,7 +27,7 @@ struct LogTableOptions {
 };
 
 // The table to read: a file by its path (relative to the working folder), or a fixed log by its name, whose
-// path stands below `root`: "logs" for the working log, which is the default, and the names of the transfer
+// path is below `root`: "logs" for the working log, which is the default, and the names of the transfer
 // logs, or else an archive in the folder of the archives by its file name, with or without ".db". Nothing is
 // opened. Throws UsageError for an unknown log or table.
 LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root);
@@ -39,7 +39,7 @@ std::string ArchiveFolderPath(const std::string &root);
 std::vector<std::string> LogNames();
 std::string KnownLogNames();
 
-// One line that names the path and what can be told from outside about why it cannot be read (or changed,
+// One line with the path and the visible reason why it cannot be read (or changed,
 // with `forWriting`): missing, a folder, no permission, empty, not a database, cut short.
 std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting = false);
 

@@ -14,12 +14,12 @@ struct DBConnect_tag;
 
 namespace kelo::tool {
 
-// A connection that only tells what is wrong: unlike a DBHandler it creates no file and puts none aside.
+// A connection that only reports errors: unlike a DBHandler it creates no file and quarantines none.
 class ReadOnlyQuery {
 public:
     // Throws DatabaseError when the file cannot be opened.
     explicit ReadOnlyQuery(LogTable table);
-    // For who is in a hurry: a statement fails that waits for a lock, or works, for longer than `timeout`
+    // With a time limit: a statement fails that waits for a lock, or works, for longer than `timeout`
     // (SQLITE_BUSY, SQLITE_INTERRUPT), and closing leaves the rows of a write-ahead log to others.
     ReadOnlyQuery(LogTable table, std::chrono::milliseconds timeout);
     ReadOnlyQuery(const ReadOnlyQuery &) = delete;

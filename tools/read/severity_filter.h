@@ -7,7 +7,7 @@
 
 namespace kelo::tool {
 
-// The values of an option that names alternatives, split into those to find and those to leave out.
+// The values of an option with alternatives, split into those to find and those to exclude.
 struct IncludeExclude {
     std::vector<std::string> included;
     std::vector<std::string> excluded; // without their '!'
@@ -17,22 +17,23 @@ struct IncludeExclude {
 // value and for more values than one statement can hold.
 IncludeExclude SplitValues(const std::string &option, const std::vector<std::string> &values);
 
-// The severities that --priority selects. With nothing included all are, but those excluded.
+// The severities that --priority selects. If none is included, all but the excluded ones are.
 struct SeverityFilter {
     std::vector<_SYSLOG_DB_PRIORITY_tag> included;
     std::vector<_SYSLOG_DB_PRIORITY_tag> excluded;
 };
 
 // Reads levels: names ("err", also "error", "warn", "panic"), numbers 0 to 7, and ranges "warning..emerg" in
-// either direction. A single included level stands for itself and everything more severe; a level that is one
-// of several, excluded or a bound of a range stands for itself. Throws UsageError.
+// either direction. A single included level means itself and everything more severe; a level that is one of
+// several, excluded or a bound of a range means itself. Throws UsageError.
 SeverityFilter ParseSeverities(const std::vector<std::string> &values);
 
 // The names of all severities, the most severe first, and of all facilities in the order of their numbers.
 std::vector<std::string> SeverityNames();
 std::vector<std::string> FacilityNames();
 
-// The name of a facility for its number ("16" gives "local0"); anything else is already a name and stays.
+// The name of a facility for its number ("16" gives "local0"); any other text is already a name and is
+// returned unchanged.
 std::string FacilityName(const std::string &value);
 
 } // namespace kelo::tool

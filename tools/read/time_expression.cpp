@@ -13,7 +13,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr int64_t kDaySec = 24 * 60 * 60;
-// Far beyond any log, and small enough that no sum of two overflows.
+// Far beyond any record, and small enough that no sum of two overflows.
 constexpr int64_t kLargestSec = int64_t{1} << 40;
 
 struct Unit {
@@ -232,7 +232,7 @@ std::optional<Moment> ParseEpoch(std::string_view text) {
     Scanner scanner(text);
     const bool isMarked = scanner.Take("@");
     const bool isNegative = isMarked && scanner.Take("-");
-    // Fewer digits without the mark are rather a mistyped date.
+    // Fewer digits without the mark are probably a mistyped date.
     const std::optional<int64_t> seconds = scanner.TakeNumber(isMarked ? 1 : 9, 13);
     if (!seconds || !scanner.AtEnd())
         return std::nullopt;

@@ -5,13 +5,13 @@
 
 namespace kelo::tool {
 
-// A moment that a user named.
+// A point in time that a user gave.
 struct Moment {
     int64_t seconds = 0;    // since the epoch
     bool isDayOnly = false; // a date or "today" without a time of day; `seconds` is the day's begin
 };
 
-// Reads a moment as users write it, `now` (seconds since the epoch) being the present:
+// Reads a point in time in the form of a command line; `now` is the present in seconds since the epoch:
 //
 //     2020-01-02, 2020/01/02               a day's begin in the time zone of the process (TZ)
 //     2020-01-02 10:11, 2020-01-02T10:11:12    with a time; "Z" or " UTC" at the end makes it UTC
