@@ -8,10 +8,10 @@
 //     if (const std::string keyword = manager.CheckKeyword(log.msg); !keyword.empty())
 //         manager.NotificationSendKeyword(log.host, keyword, log);
 //
-// A notification goes to the appliance's notification service (keloplatform/kelonotify.h), which tells the
-// administrator. An `int` result is 0 for success and -1 for failure; failures are written to the system log
-// unless stated otherwise. Fixed paths are below the root of kelosyslog/root.h. Where memory runs out,
-// operations throw std::bad_alloc, but for those that state another result.
+// Notifications go to the appliance's notification service (keloplatform/kelonotify.h), which delivers them
+// to the administrator. An `int` result is 0 for success and -1 for failure; failures are written to the
+// system log unless stated otherwise. Fixed paths are under the root of kelosyslog/root.h. When memory runs
+// out, operations throw std::bad_alloc unless they state another result.
 
 #include <cstdint>
 #include <list>

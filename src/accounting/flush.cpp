@@ -34,7 +34,7 @@ void ReportFailedStatement(const std::string &sql) {
     Debuger::MSG(0, "Fail to execute SQL command: " + sql);
 }
 
-// The database of one flush. Whatever happened, the transaction is ended and the connection closed.
+// The database of one flush. In every case the transaction is ended and the connection closed.
 //
 // Without a transaction, because its BEGIN failed, every row is stored by itself.
 class FlushDatabase {

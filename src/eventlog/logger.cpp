@@ -40,7 +40,7 @@ int Logger::LogAdd(std::string dbPath, int level, std::string user, std::string 
     kelo::EventDatabase db(dbPath);
     if (!db.Connect())
         return -1;
-    const bool isOpen = db->DBTranStart() == 0; // else the insert stands alone
+    const bool isOpen = db->DBTranStart() == 0; // else the insert is its own transaction
     const std::string sql = InsertStatement(level, user, event);
     if (db->DBExecute(sql) < 0) {
         // Disconnecting ends the transaction.
@@ -48,7 +48,7 @@ int Logger::LogAdd(std::string dbPath, int level, std::string user, std::string 
         return -1;
     }
     if (db->DBTranEnd() < 0 && isOpen)
-        return -1; // a full disk, for one: disconnecting rolls back
+        return -1; // for example a full disk: disconnecting rolls back
     if (LogRotation(dbPath) < 0)
         Debuger::MSG(0, "Fail to rotate log database");
     return 0;

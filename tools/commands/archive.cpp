@@ -1,4 +1,4 @@
-// kelosyslog archive: copies a log database into an archive, and keeps the archives.
+// kelosyslog archive: copies a log database into an archive, and maintains the archives.
 
 #include <csignal>
 #include <ctime>
@@ -55,14 +55,14 @@ struct Options {
     bool inUtc = false;
 };
 
-// The path without links; as it is where that cannot be told, for whoever opens it to say why.
+// The path without links; unchanged if it cannot be resolved, so that opening it reports the reason.
 std::string Canonical(const std::string &path) {
     std::error_code error;
     const fs::path canonical = fs::weakly_canonical(path, error);
     return error ? path : canonical.string();
 }
 
-// The command as the options say, with the folder that it works in.
+// The command with its options and its folder.
 class ArchiveCommand {
 public:
     ArchiveCommand(const Options &options, const std::string &root)
@@ -133,7 +133,7 @@ public:
             throw UsageError(table.path + " is in the folder of the archives already");
     }
 
-    // Asks, where something is to be removed.
+    // Asks for confirmation if something will be removed.
     bool MayMake(const LogTable &table) const { return MayRemove(PlannedRemovals(table.path)); }
 
 private:
@@ -159,7 +159,7 @@ private:
             throw UsageError("--output: goes with --list only");
     }
 
-    // What cannot be told must not keep from doing the rest.
+    // A failed message must not prevent the rest of the work.
     void Print(const std::string &text) {
         try {
             Output output(false);
@@ -236,7 +236,7 @@ int Run(const Options &options, const std::string &root) {
         const StopSignals signals;
         return command.Make(table);
     } catch (const Interrupted &interruption) {
-        // Ends as the signal would have ended it.
+        // Ends the process with the signal.
         std::raise(interruption.signal);
         return kExitSystem;
     }

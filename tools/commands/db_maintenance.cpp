@@ -38,7 +38,7 @@ struct QuarantineOptions : DbOptions {
     bool isConfirmed = false;
 };
 
-// The library hands its paths to a shell: the database's between double quotes, the schema's bare.
+// The library passes its paths to a shell: the database's between double quotes, the schema's without.
 void RequirePlainPaths(const std::string &path, const std::string &schema) {
     if (path.find_first_of("\"$`\\\n") != std::string::npos)
         throw UsageError("db create: '" + path +

@@ -89,7 +89,7 @@ std::string CurrentUser() {
     return entry != nullptr ? entry->pw_name : std::to_string(getuid());
 }
 
-// A typing error must not remove a file that is no log database.
+// A typing error must not remove a file that is not a log database.
 void RequireDatabase(const std::string &path) {
     struct stat status {};
     if (stat(path.c_str(), &status) != 0)
@@ -121,7 +121,7 @@ int ClearLog(const EventsOptions &options, const ClearOptions &clear, const std:
     Logger().LogClear(path, user);
     if (access(path.c_str(), F_OK) == 0)
         throw DatabaseError("cannot delete " + path);
-    // The writer of the working log goes on into the deleted file until it is told.
+    // The writer of the working log continues to write into the deleted file until it is reloaded.
     if (path == root + "/var/log/kelolog/logs.db" && SyslogngHupSignalSend() != 0)
         PrintMessage("syslog-ng was not told and may go on writing to the deleted file; see the system log");
     const std::string events = EventDatabasePath("", root);

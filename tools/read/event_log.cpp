@@ -59,7 +59,7 @@ std::vector<int> ParseEventLevels(const std::vector<std::string> &values) {
     return levels;
 }
 
-// Whether there is an event behind the `offset` newest, or no answer.
+// Whether there is an event after the `offset` newest, or no answer.
 bool MayHaveEvents(const std::string &path, int offset) {
     const ReadOnlyQuery database({path, "log"}, std::chrono::seconds(1));
     try {
@@ -84,7 +84,7 @@ std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
     if (access(path.c_str(), R_OK) != 0) // the library would create a missing one
         FailEventDatabase(path);
     std::list<Event> events = Logger().LogEnum(path, offset, limit);
-    // No events is also the answer to a failure.
+    // A failure also gives no events.
     if (events.empty() && MayHaveEvents(path, limit == 0 ? 0 : offset))
         FailEventDatabase(path);
     return events;

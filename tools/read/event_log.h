@@ -14,7 +14,7 @@ namespace kelo::tool {
 
 using Event = _SSYSLOG_LOG_LOG_tag;
 
-// The server's own event database below `root`, or `db` where that is not empty, as an absolute path.
+// The server's own event database below `root`, or `db` if that is not empty, as an absolute path.
 std::string EventDatabasePath(const std::string &db, const std::string &root);
 
 // The events of a database, newest first: `limit` of them after `offset`, or all from the first for a limit
@@ -22,13 +22,13 @@ std::string EventDatabasePath(const std::string &db, const std::string &root);
 std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit = 0);
 
 // Adds an event to the server's own event database below `root` with the library operation that `add` calls.
-// Returns "", or why that failed.
+// Returns "", or the reason of the failure.
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add);
 
-// Throws DatabaseError that tells why the event database at `path` cannot be read, or changed.
+// Throws DatabaseError with the reason why the event database at `path` cannot be read, or changed.
 [[noreturn]] void FailEventDatabase(const std::string &path, bool forWriting = false);
 
-// Which events a command is about; both ends included.
+// The events that a command selects; both ends included.
 struct EventFilter {
     int64_t since = std::numeric_limits<int64_t>::min(); // seconds since the epoch
     int64_t until = std::numeric_limits<int64_t>::max();
@@ -37,12 +37,12 @@ struct EventFilter {
     bool Matches(const Event &event) const;
 };
 
-// Reads --since, --until and --priority of `filter`, the only ones that events know. Levels are
+// Reads --since, --until and --priority of `filter`, the only ones that apply to events. Levels are
 // "information" (or info), "warning" (warn), "error" (err) or 0 to 2: a single one means it and all worse,
 // several mean each. Throws UsageError.
 EventFilter ParseEventFilter(const LogFilter &filter, int64_t now);
 
-// The name of an event's level, or its number where it has no name.
+// The name of an event's level, or its number if it has no name.
 std::string EventLevelName(int level);
 
 } // namespace kelo::tool

@@ -13,7 +13,7 @@
 namespace kelo::tool {
 namespace {
 
-constexpr int kTimeoutMs = 1000; // whoever asks has waited for a lock before
+constexpr int kTimeoutMs = 1000; // the caller has already waited for a lock
 
 struct Closer {
     void operator()(DBConnect_tag *connection) const { KELODBClose(connection); }

@@ -1,12 +1,13 @@
 #pragma once
 
-// Finds out why an operation of the library failed when its result does not say: tries again what it needs.
+// Finds the reason of a failed operation of the library if its result does not give it, by trying the steps
+// again.
 
 #include <string>
 
 namespace kelo::tool {
 
-// Why the statement `sql` failed on the existing database at `path`: SQLite's message where it fails again. A
+// Why the statement `sql` failed on the existing database at `path`: SQLite's message if it fails again. A
 // change is rolled back.
 std::string WhyStatementFails(const std::string &path, const std::string &sql);
 

@@ -2,7 +2,7 @@
 
 namespace kelo::platform {
 
-// Forgets the calling thread's last failure. The functions that KELOErrorGet is about call it first.
+// Clears the calling thread's last failure. The functions that KELOErrorGet describes call it first.
 void ClearFailure();
 
 // Writes a line to the system log (LOG_ERR; `format` as for syslog(3), "%m" included) and keeps it for

@@ -5,7 +5,7 @@
 namespace kelo::platform {
 namespace {
 
-// FNV-1a: column names are a few bytes long. The bit that tells letter case is left out.
+// FNV-1a: column names are a few bytes long. The bit of the letter case is ignored.
 size_t HashOf(const char *name) {
     uint32_t hash = 2166136261U;
     for (; *name != '\0'; ++name)

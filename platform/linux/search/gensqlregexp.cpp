@@ -15,12 +15,12 @@
 namespace kelo::platform {
 namespace {
 
-// SQLite takes expressions of a depth up to 1000, and a chain is as deep as it is long: more operands than
+// SQLite accepts expressions of a depth up to 1000, and a chain is as deep as it is long: more operands than
 // this become a tree.
 constexpr size_t kMaxChain = 100;
 constexpr size_t kMaxReportedBytes = 200;
 
-// Free text as it may stand in a log: bounded, with control bytes made visible.
+// Free text for a log line: shortened, with control bytes made visible.
 std::string Printable(std::string_view text) {
     constexpr char kHexDigits[] = "0123456789abcdef";
     std::string printable;
@@ -34,7 +34,7 @@ std::string Printable(std::string_view text) {
     return text.size() > kMaxReportedBytes ? printable + "..." : printable;
 }
 
-// The operands joined into one that can stand beside any operator; `operands` is not empty.
+// The operands joined into one that can be used with any operator; `operands` is not empty.
 std::string Joined(std::vector<std::string> operands, const char *separator) {
     while (operands.size() > 1) {
         std::vector<std::string> joined;
@@ -67,7 +67,7 @@ public:
         return Joined(std::move(operands), " AND ");
     }
 
-    // One line for each broken regex of that keyword.
+    // One line for each invalid regex of that keyword.
     std::vector<std::string> Problems() const {
         std::vector<std::string> problems;
         std::set<std::string> known;

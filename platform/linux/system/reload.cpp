@@ -20,7 +20,7 @@ bool IsServiceName(const std::string &service) {
            service.find('\0') == std::string::npos;
 }
 
-// What stands under a root of its own is no service of this machine.
+// A process under another root is not a service of this machine.
 bool IsManagedBySystemd() {
     return kelo::platform::RootedPath("/") == "/" && sd_booted() > 0;
 }
