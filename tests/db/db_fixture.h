@@ -42,7 +42,7 @@ protected:
     }
 
     const std::string path_ = root_.File("logs.db");
-    DBHandler db_{path_, SourcePath("package/schema/archive.sql")};
+    DBHandler db_{path_, BuildPath("package/schema/archive.sql")};
 };
 
 // What a report and a message of other priority look like.

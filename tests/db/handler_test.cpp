@@ -7,7 +7,7 @@
 namespace kelo::test {
 namespace {
 
-const std::string kSchema = SourcePath("package/schema/archive.sql");
+const std::string kSchema = BuildPath("package/schema/archive.sql");
 
 using DBHandlerTest = DbTest;
 

@@ -24,7 +24,7 @@ protected:
     std::string Query(const std::string &sql) const { return QueryText(db_, sql); }
     std::string Rows() const { return Query("SELECT count(*) FROM log"); }
 
-    const std::string schema_ = ReadFile(SourcePath("package/schema/kelosyslog.sql"));
+    const std::string schema_ = ReadFile(BuildPath("package/schema/kelosyslog.sql"));
     const std::string db_ = root_.File("usr/kelo/etc/kelosyslog.db");
     Logger logger_;
 };

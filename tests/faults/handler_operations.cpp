@@ -12,7 +12,7 @@
 namespace kelo::test {
 namespace {
 
-const std::string kSchema = SourcePath("package/schema/archive.sql");
+const std::string kSchema = BuildPath("package/schema/archive.sql");
 
 // A handler whose owner disconnects on every way out, as the handler asks for.
 struct Connected {

@@ -55,7 +55,7 @@ std::string QueryText(const std::string &path, const std::string &sql) {
 }
 
 void CreateLogDatabase(const std::string &path, const std::string &schema) {
-    const std::string sql = ReadFile(SourcePath("package/schema/") + schema);
+    const std::string sql = ReadFile(BuildPath("package/schema/") + schema);
     if (sql.empty())
         throw std::runtime_error("no schema " + schema);
     RunSql(path, "PRAGMA journal_mode=WAL;" + sql);

@@ -13,7 +13,7 @@ ProgramTest::ProgramTest() {
     for (const char *folder : {"usr/kelo/syslog", "usr/kelo/etc", "var/log/kelolog", "etc/kelosyslog",
                                "var/spool/kelonotify/new", "var/spool/kelonotify/failed"})
         fs::create_directories(root_.File(folder));
-    fs::create_symlink(SourcePath("package/schema"), root_.File("usr/kelo/syslog/schema"));
+    fs::create_symlink(BuildPath("package/schema"), root_.File("usr/kelo/syslog/schema"));
 }
 
 void ProgramTest::Expect(const std::string &words, int status, const std::optional<std::string> &out) const {

@@ -7,6 +7,10 @@ std::string SourcePath(const std::string &path) {
     return KELO_SOURCE_DIR "/" + path;
 }
 
+std::string BuildPath(const std::string &path) {
+    return KELO_BIN_DIR "/../" + path;
+}
+
 std::string ProgramFolder() {
     return KELO_BIN_DIR;
 }

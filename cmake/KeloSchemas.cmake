@@ -1,0 +1,10 @@
+# The schemas as they are installed, in KELO_SCHEMA_FILES. That of an archive is made of logs.sql, without its comments.
+set(schemas ${PROJECT_SOURCE_DIR}/package/schema)
+set(made ${PROJECT_BINARY_DIR}/package/schema)
+foreach(schema accinfo kelosyslog logs)
+    configure_file(${schemas}/${schema}.sql ${made}/${schema}.sql COPYONLY)
+endforeach()
+file(READ ${schemas}/logs.sql KELO_LOGS_SCHEMA)
+string(REGEX REPLACE "--[^\n]*\n" "" KELO_LOGS_SCHEMA "${KELO_LOGS_SCHEMA}")
+configure_file(${schemas}/archive.sql.in ${made}/archive.sql @ONLY)
+set(KELO_SCHEMA_FILES ${made}/accinfo.sql ${made}/archive.sql ${made}/kelosyslog.sql ${made}/logs.sql)
