@@ -53,11 +53,11 @@ _SYSLOG_DB_ATTRI_tag LogAttriType(std::string name) {
 
 _SYSLOG_DB_PRIORITY_tag PriorStrToType(const char *word) {
     if (word != nullptr) {
-        for (int32_t prio = SYSLOG_PRIO_EMERG; prio <= SYSLOG_PRIO_DEBUG; ++prio) {
+        for (int32_t severity = SYSLOG_PRIO_EMERG; severity <= SYSLOG_PRIO_DEBUG; ++severity) {
             // Called for every row of a search; most words differ in their first letter.
-            const char *name = g_MappingSyslogPrior[prio];
+            const char *name = g_MappingSyslogPrior[severity];
             if (word[0] == name[0] && std::strcmp(word, name) == 0)
-                return static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+                return static_cast<_SYSLOG_DB_PRIORITY_tag>(severity);
         }
     }
     return SYSLOG_PRIO_DEBUG;

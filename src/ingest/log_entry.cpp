@@ -35,7 +35,7 @@ int64_t ToNumber(std::string_view text) {
     return number;
 }
 
-_SYSLOG_DB_PRIORITY_tag ToPriority(std::string_view text) {
+_SYSLOG_DB_PRIORITY_tag ToSeverity(std::string_view text) {
     char word[16] = {}; // longer than any severity word: a longer text equals none of them
     std::memcpy(word, text.data(), std::min(text.size(), sizeof word - 1));
     return PriorStrToType(word);
@@ -75,11 +75,11 @@ private:
     const char *end_;
 };
 
-bool TakePriority(FieldReader &fields, _SYSLOG_DB_PRIORITY_tag &priority) {
+bool TakeSeverity(FieldReader &fields, _SYSLOG_DB_PRIORITY_tag &severity) {
     std::string_view field;
     if (!fields.Take(field))
         return false;
-    priority = ToPriority(field);
+    severity = ToSeverity(field);
     return true;
 }
 
@@ -95,7 +95,7 @@ bool TakeNumber(FieldReader &fields, int64_t &number) {
 
 bool ParseLogEntry(std::string_view line, _SYSLOG_LOG_DATA_tag &record) {
     FieldReader fields(line);
-    const bool complete = fields.TakeText(record.fac) && TakePriority(fields, record.prio) &&
+    const bool complete = fields.TakeText(record.fac) && TakeSeverity(fields, record.prio) &&
                           fields.TakeText(record.ldate) && fields.TakeText(record.ltime) &&
                           TakeNumber(fields, record.utcsec) && TakeNumber(fields, record.extnum) &&
                           fields.TakeText(record.tzoffset) && fields.TakeText(record.host) &&

@@ -34,10 +34,10 @@ struct Kind {
 
 _SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text) {
     std::string names;
-    for (int32_t level = SYSLOG_PRIO_EMERG; level <= SYSLOG_PRIO_DEBUG; ++level) {
-        if (text == g_MappingSyslogPrior[level])
-            return static_cast<_SYSLOG_DB_PRIORITY_tag>(level);
-        names += std::string(level == 0 ? "" : ", ") + g_MappingSyslogPrior[level];
+    for (int32_t severity = SYSLOG_PRIO_EMERG; severity <= SYSLOG_PRIO_DEBUG; ++severity) {
+        if (text == g_MappingSyslogPrior[severity])
+            return static_cast<_SYSLOG_DB_PRIORITY_tag>(severity);
+        names += std::string(severity == 0 ? "" : ", ") + g_MappingSyslogPrior[severity];
     }
     throw UsageError("severity: '" + text + "' is no severity; severities are " + names);
 }

@@ -18,7 +18,7 @@ constexpr unsigned kSystem = Bit(TableKind::System);
 constexpr unsigned kTransfer = Bit(TableKind::Transfer);
 constexpr unsigned kAll = kLogs | kSystem | kTransfer;
 
-std::string LevelOf(const Log &log) {
+std::string SeverityOf(const Log &log) {
     return g_MappingSyslogPrior[log.prio];
 }
 
@@ -30,8 +30,8 @@ constexpr std::array<RecordField, 21> kFields = {{
     {"tzoffset", false, kLogs, 0, [](const Log &log) { return log.tzoffset; }},
     {"ldate", false, kAll, 0, [](const Log &log) { return log.ldate; }},
     {"ltime", false, kAll, 0, [](const Log &log) { return log.ltime; }},
-    {"prio", false, kLogs, kLogs, LevelOf},
-    {"llevel", false, kSystem, kSystem, LevelOf},
+    {"prio", false, kLogs, kLogs, SeverityOf},
+    {"llevel", false, kSystem, kSystem, SeverityOf},
     {"fac", false, kLogs, 0, [](const Log &log) { return log.fac; }},
     {"tag", false, kLogs, 0, [](const Log &log) { return log.tag; }},
     {"host", false, kAll, kAll, [](const Log &log) { return log.host; }},

@@ -28,9 +28,9 @@ _SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text, const std::string
         return SYSLOG_PRIO_WARNING;
     if (text == "panic")
         return SYSLOG_PRIO_EMERG;
-    for (int32_t prio = SYSLOG_PRIO_EMERG; prio <= SYSLOG_PRIO_DEBUG; ++prio) {
-        if (text == g_MappingSyslogPrior[prio])
-            return static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+    for (int32_t severity = SYSLOG_PRIO_EMERG; severity <= SYSLOG_PRIO_DEBUG; ++severity) {
+        if (text == g_MappingSyslogPrior[severity])
+            return static_cast<_SYSLOG_DB_PRIORITY_tag>(severity);
     }
     throw UsageError(
         std::string(kOption) + ": '" + whole +
@@ -39,8 +39,8 @@ _SYSLOG_DB_PRIORITY_tag ParseSeverity(const std::string &text, const std::string
 }
 
 void AddRange(std::vector<_SYSLOG_DB_PRIORITY_tag> &severities, int32_t from, int32_t to) {
-    for (int32_t prio = std::min(from, to); prio <= std::max(from, to); ++prio) {
-        const auto severity = static_cast<_SYSLOG_DB_PRIORITY_tag>(prio);
+    for (int32_t number = std::min(from, to); number <= std::max(from, to); ++number) {
+        const auto severity = static_cast<_SYSLOG_DB_PRIORITY_tag>(number);
         if (std::find(severities.begin(), severities.end(), severity) == severities.end())
             severities.push_back(severity);
     }

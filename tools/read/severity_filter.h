@@ -23,9 +23,9 @@ struct SeverityFilter {
     std::vector<_SYSLOG_DB_PRIORITY_tag> excluded;
 };
 
-// Reads levels: names ("err", also "error", "warn", "panic"), numbers 0 to 7, and ranges "warning..emerg" in
-// either direction. A single included level means itself and everything more severe; a level that is one of
-// several, excluded or a bound of a range means itself. Throws UsageError.
+// Reads severities: names ("err", also "error", "warn", "panic"), numbers 0 to 7, and ranges "warning..emerg"
+// in either direction. A single included severity means itself and everything more severe; one of several, an
+// excluded one and the bound of a range mean themselves only. Throws UsageError.
 SeverityFilter ParseSeverities(const std::vector<std::string> &values);
 
 // The names of all severities, the most severe first, and of all facilities in the order of their numbers.
