@@ -1,4 +1,4 @@
-// Counts received logs by device and second, and writes the counts on a beat.
+// Counts received records by device and second, and writes the counts regularly.
 
 #include <kelosyslog/accounting.h>
 #include <kelosyslog/debuger.h>
@@ -30,7 +30,7 @@ int main(int argc, char **argv) {
     {
         AccountingManager accounting; // loads what an earlier one stored: here nothing
         std::cout << "due at the first question: " << accounting.isNeed2Flush() << "\n";
-        for (const char *device : {"nas", "nas", "web1", "nas"}) // one call for each received log
+        for (const char *device : {"nas", "nas", "web1", "nas"}) // one call per received record
             accounting.LogInc(device);
         Print(accounting);
         ++now;
@@ -52,5 +52,5 @@ int main(int argc, char **argv) {
             std::cout << " " << device << "=" << count;
         std::cout << "\n";
     }
-    Print(AccountingManager()); // the histogram goes on where it was stored
+    Print(AccountingManager()); // the histogram continues from the stored one
 }

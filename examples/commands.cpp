@@ -1,4 +1,4 @@
-// Commands as JSON objects, one behind the other, as they come through a pipe or a socket.
+// Commands as JSON objects, one after the other, as they arrive through a pipe or a socket.
 
 #include <json/value.h>
 #include <kelosyslog/cmdparser.h>
@@ -16,11 +16,11 @@ int main() {
     std::cout << "  " << commands[0]["cmd"].asString() << "\n";
     std::cout << "  " << commands[1]["cmd"].asString() << " " << commands[1]["ids"].size() << " ids\n";
 
-    // What was understood before the mistake is appended to what was there.
+    // The values before the error are appended to the existing ones.
     text = R"({"cmd":"status"}{"cmd":)";
     std::cout << parser.CmdParse(text, commands) << ": " << commands.size() << " commands\n";
 
-    // The text is cut behind every closing brace: a command is a flat object.
+    // The text is split after every closing brace: a command is a flat object.
     text = R"({"cmd":{"nested":1}})";
     std::cout << parser.CmdParse(text, commands) << ": " << commands.size() << " commands\n";
 }

@@ -1,4 +1,4 @@
-// Conditions made by hand: comparisons, wildcards, alternatives, and an expression of one's own.
+// Conditions made by hand: comparisons, wildcards, alternatives, and an SQL expression.
 
 #include <kelosyslog/dbhandler.h>
 #include <kelosyslog/dbutil.h>
@@ -32,7 +32,7 @@ int main(int argc, char **argv) {
     db.DBDiscon();
 
     Show(path, "since 20", {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_GE, "20", {}}});
-    // '*' and '?' are the wildcards; '%', '_' and quotes in a value stand for themselves.
+    // '*' and '?' are the wildcards; '%', '_' and quotes in a value are literal.
     Show(path, "100% and more", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "100%*", {}}});
     Show(path, "with a quote", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*'*", {}}});
 
@@ -41,7 +41,7 @@ int main(int argc, char **argv) {
     either.alternatives.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*files*", {}});
     Show(path, "either", {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_GE, "20", {}}, either});
 
-    // A raw value goes into the statement as it is: never let a user type it.
+    // A raw value goes into the statement unchanged: never take it from a user.
     Show(path, "raw", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "length(msg) = 9", {}}});
     Show(path, "bad raw", {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "length(", {}}});
 }

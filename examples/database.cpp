@@ -6,7 +6,7 @@
 
 #include <iostream>
 
-// Receives the result, which stays the handler's own: copy what is to outlive the call.
+// Receives the result, which stays the handler's own: copy what you need after the call.
 int PrintRows(DBResult_tag *result, void *context) {
     auto &count = *static_cast<int *>(context);
     for (unsigned int row = 0; KELODBFetchRow(result, &row) == 0; ++count)
@@ -21,10 +21,10 @@ int main(int argc, char **argv) {
     openlog("example", LOG_PERROR, LOG_USER);
     const std::string root = argv[1];
     DBHandler db(root + "/var/log/kelolog/archive.db", root + "/usr/kelo/syslog/schema/archive.sql");
-    if (db.DBCon() != 0) // creates the folders, the file and its tables where they are missing
+    if (db.DBCon() != 0) // creates missing folders, the file and its tables
         return 1;
 
-    const std::string text = db.DBCmdEscape("it's done"); // fit to stand between single quotes
+    const std::string text = db.DBCmdEscape("it's done"); // for use between single quotes
     db.DBTranStart();
     std::cout << "in transaction: " << db.isInTran() << "\n";
     db.DBExecute("INSERT INTO logs (host, utcsec, msg) VALUES ('nas', 1577931072, '" + text + "')");
@@ -35,7 +35,7 @@ int main(int argc, char **argv) {
     db.DBExecute("SELECT host, msg FROM logs ORDER BY id", PrintRows, &count);
     std::cout << count << " rows, from " << db.DBInfoStartStrGet() << "\n";
 
-    // The row that describes an archive is written by whoever makes the archive.
+    // The program that creates an archive writes the row that describes it.
     db.DBInfoStartSet(static_cast<unsigned long long>(db.DBLogStartTimeGet()));
     db.DBInfoEndSet(static_cast<unsigned long long>(db.DBLogEndTimeGet()));
     db.DBInfoDevSet("nas");

@@ -1,4 +1,4 @@
-// What a handler answers and reports: a wrong statement, a use out of order, and a damaged database.
+// Results and reports of a handler: a wrong statement, a use out of order, and a damaged database.
 
 #include <keloplatform/root.h>
 #include <kelosyslog/dbhandler.h>
@@ -25,16 +25,16 @@ int main(int argc, char **argv) {
     std::cout << "end without a start: " << db.DBTranEnd() << "\n";
     db.DBDiscon();
 
-    // A disk that wrote nonsense: everything behind the first page.
+    // A faulty disk: everything after the first page is overwritten.
     const auto size = std::filesystem::file_size(path);
     std::fstream file(path, std::ios::in | std::ios::out | std::ios::binary);
     file.seekp(4096);
     file << std::string(size - 4096, '\xff') << std::flush;
 
-    std::cout << "open it again: " << db.DBCon() << "\n"; // only a statement notices the damage
+    std::cout << "open it again: " << db.DBCon() << "\n"; // only a statement detects the damage
     std::cout << "select: " << db.DBExecute("SELECT * FROM logs", nullptr, nullptr) << "\n";
     std::cout << "put aside: " << std::filesystem::exists(path + ".corrupt") << "\n";
-    db.DBDiscon(); // this connection still has the damaged file: end it before going on
+    db.DBDiscon(); // this connection still has the damaged file: close it first
 
     std::cout << "a fresh one: " << db.DBCon() << ", logs: " << db.DBLogCountGet() << "\n";
     db.DBDiscon();

@@ -35,7 +35,7 @@ int main(int argc, char **argv) {
                   << event.event << "\n";
 
     std::cout << "page: " << logger.LogHtmlGen(path, "unused", root + "/events.html") << "\n";
-    std::cout << std::ifstream(root + "/events.html").rdbuf(); // markup in an event goes out as it is
+    std::cout << std::ifstream(root + "/events.html").rdbuf(); // markup in an event is not escaped
     std::cout << "removed: " << logger.LogHtmlRemove(root + "/events.html") << ", once more: ";
     std::cout << logger.LogHtmlRemove(root + "/events.html") << "\n";
     std::cout << "a relative path: " << logger.LogCount("events.db") << "\n";

@@ -1,4 +1,4 @@
-// Log text turned into records: lines that are complete, incomplete and none at all.
+// Converts log text to records: lines that are complete, incomplete and invalid.
 
 #include <kelosyslog/debuger.h>
 #include <kelosyslog/logparser.h>
@@ -15,7 +15,7 @@ int main() {
         "this line has too few fields\n";
 
     LogParser parser;
-    parser.LogAdd(text); // always 0: a line that is none is reported and skipped
+    parser.LogAdd(text); // always 0: an invalid line is reported and skipped
     std::cout << parser.LogGetCount() << " records\n";
     for (_SYSLOG_LOG_DATA_tag &log : parser.LogListTake()) // moved out: the parser's list is empty now
         if (parser.isValidLog(log))
@@ -25,7 +25,7 @@ int main() {
     parser.PartialLogDump();  // goes to the debug channel, which is silent
     Debuger::ThresholdSet(2); // until the program asks for it
     parser.PartialLogDump();
-    parser.PartialLogSet("local0 info 2020/01/02 10:11:15 1577931075 0 "); // in front of what is added next
+    parser.PartialLogSet("local0 info 2020/01/02 10:11:15 1577931075 0 "); // prefixed to the next text
     std::string rest = "+08:00 nas ::1 cron 86 put together";
     parser.LogAdd(rest);
     parser.LogDump();

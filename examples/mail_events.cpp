@@ -1,4 +1,4 @@
-// Events that go to the administrator without a rule, through the real service of plain Linux to its spool.
+// Notifications without a rule, sent through the real service of plain Linux to its spool.
 
 #include <keloplatform/root.h>
 #include <keloplatform/torvc.h>
@@ -31,13 +31,13 @@ int main(int argc, char **argv) {
     std::cout << "severity: " << SyslogMailSeverityExceeded("crit", "disk failed") << "\n";
     std::cout << "no share: " << SyslogMailShareRemove(nullptr) << "\n";
 
-    // A tag and placeholders of one's own: the map stays the caller's.
+    // Another tag with its placeholders: the map stays the caller's.
     TORVSZHASH *values = TORVCSzHashAlloc(1);
     TORVCSzHashSetValue(&values, "%SHARED_FOLDER%", "backup");
     std::cout << "own values: " << SyslogMailSend("KELOSYSLOG_VOL_FULL", &values) << "\n";
     TORVCSzHashFree(values);
 
-    // On the disk for kelonotify, which delivers them; no call waited for a network.
+    // They are on the disk for kelonotify, which delivers them; no call waited for a network.
     int spooled = 0;
     for (const fs::directory_entry &entry : fs::recursive_directory_iterator(root + "/var/spool/kelonotify"))
         spooled += entry.is_regular_file() && entry.file_size() > 0;

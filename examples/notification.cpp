@@ -1,4 +1,4 @@
-// Sends notifications, and takes the place of the appliance's notification service to show them.
+// Sends notifications, and replaces the appliance's notification service to show them.
 
 #include <keloplatform/kelonotify.h>
 #include <keloplatform/torvc.h>
@@ -8,7 +8,7 @@
 
 #include <iostream>
 
-// A program that defines a platform function itself replaces it, also for the calls out of libkelosyslog.
+// A program that defines a platform function itself replaces it, also for calls from libkelosyslog.
 int KELOSysNotifySendNotificationCustomized(const char *tag, const char *, const char *, TORVSZHASH **hash,
                                             int) {
     std::cout << "  " << tag;
@@ -29,7 +29,7 @@ int main(int argc, char **argv) {
         return 2;
     openlog("example", LOG_PERROR, LOG_USER);
 
-    NotificationManager manager; // there is no rule file: every check answers no, sending works
+    NotificationManager manager; // there is no rule file: every check fails, sending works
     _SYSLOG_LOG_DATA_tag log;
     log.host = "nas";
     log.prio = SYSLOG_PRIO_CRIT;
@@ -38,7 +38,7 @@ int main(int argc, char **argv) {
     Print("rate", manager.NotificationSendEps(700));
     Print("volume", manager.NotificationSendVolFull("logs"));
 
-    // A log about a failed notification raises no other, with result 0; one that is too long is refused.
+    // A record about a failed notification causes no other, with result 0; one that is too long is refused.
     Print("loop", manager.NotificationSendKeyword("nas", "mail", "Failed to send email."));
     Print("long", manager.NotificationSendKeyword("nas", "x", std::string(2048, 'x')));
 }

@@ -1,4 +1,4 @@
-// The log entry, the words for its parts, and a row of a database turned into an entry.
+// The record, the words for its parts, and a row of a database converted to a record.
 
 #include <keloplatform/kelodb.h>
 #include <kelosyslog/dbhandler.h>

@@ -1,4 +1,4 @@
-// The rules that say which logs the administrator wants to hear of: written, read back and checked.
+// The rules that decide on notifications: written, read back and checked.
 
 #include <kelosyslog/notification.h>
 #include <kelosyslog/root.h>
@@ -32,5 +32,5 @@ int main(int argc, char **argv) {
               << ", err: " << manager.CheckSev(SYSLOG_PRIO_ERR) << ", 499: " << manager.CheckEps(499)
               << ", 500: " << manager.CheckEps(500) << "\n";
     std::cout << "[" << manager.CheckKeyword("nas: disk full on /volume1") << "] ["
-              << manager.CheckKeyword("Disk Full") << "]\n"; // byte by byte: case counts
+              << manager.CheckKeyword("Disk Full") << "]\n"; // byte by byte: case-sensitive
 }

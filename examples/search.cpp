@@ -1,4 +1,4 @@
-// Fills in a search form, pages through what it finds, counts it and deletes it.
+// Fills in a search form, pages through the matching records, counts them and deletes them.
 
 #include <kelosyslog/dbhandler.h>
 #include <kelosyslog/dbutil.h>
@@ -10,7 +10,7 @@ int PrintLog(_SYSLOG_LOG_DATA_tag &log, void *context) {
     std::cout << "  " << log.id << " " << log.ldate << " " << log.host << " " << PriorTypeToStr(log.prio)
               << ": " << log.msg << "\n";
     int &wanted = *static_cast<int *>(context);
-    return --wanted == 0 ? 1 : 0; // non-zero ends the walk
+    return --wanted == 0 ? 1 : 0; // non-zero ends the scan
 }
 
 int main(int argc, char **argv) {
@@ -33,7 +33,7 @@ int main(int argc, char **argv) {
                  " ('web2', 'err',  'kern', 'smartd', '2020/01/05', 'full disk'),     "
                  " ('web2', 'err',  'kern', 'smartd', '2020/01/06', 'disk is full')   ");
     db.DBExecute("UPDATE logs SET llevel = prio"); // both hold the word; the form compares llevel
-    db.DBDiscon(); // searching needs no handler: every call opens and closes a connection of its own
+    db.DBDiscon(); // searching needs no handler: every call opens and closes its own connection
 
     std::list<_SYSLOG_SQL_COND_tag> form; // host, severity, facility, program, keyword, first and last day
     LogSearchCondListGen("nas,web2", "err", "kern", "smartd", "disk full", "2020/01/01", "2020/01/05", form);

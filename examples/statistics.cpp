@@ -1,4 +1,4 @@
-// Reads what the accounting stored, and the distinct values of a column.
+// Reads the counts of the accounting, and the distinct values of a column.
 
 #include <kelosyslog/dbhandler.h>
 #include <kelosyslog/dbutil.h>
@@ -23,7 +23,7 @@ int main(int argc, char **argv) {
 
     std::cout << "all devices: " << SyslogDBHistTotalGet(accounting)
               << ", web1: " << SyslogDBHistGetSingle(accounting, "web1") << "\n";
-    for (const auto &[device, count] : SyslogDBHistGet(accounting, 2)) // the two with the most logs, by name
+    for (const auto &[device, count] : SyslogDBHistGet(accounting, 2)) // the two busiest, by name
         std::cout << "  " << device << " " << count << "\n";
     for (const auto &[stamp, sample] : SyslogDBEpsGet(accounting, 1577931072, 1577931073)) {
         std::cout << stamp << ": " << sample.eps << " logs";
@@ -42,7 +42,7 @@ int main(int argc, char **argv) {
     SyslogDBAttriValueGet(logs, "host", nullptr, hosts);
     for (const std::string &host : hosts)
         std::cout << "host " << host << "\n";
-    std::map<uint64_t, std::string> programs; // a database without keys numbers its names as they come
+    std::map<uint64_t, std::string> programs; // a database without keys numbers its names in their order
     SyslogDBExtkeyMapGet(logs, SYSLOG_EXTKEY_PROG, programs);
     for (const auto &[key, program] : programs)
         std::cout << "program " << key << " " << program << "\n";

@@ -1,4 +1,4 @@
-// A stream that arrives in pieces cut anywhere, with a bound on the length of a line.
+// A stream that arrives in pieces of any size, with a limit for the length of a line.
 
 #include <kelosyslog/debuger.h>
 #include <kelosyslog/logparser.h>

@@ -1,4 +1,4 @@
-// Splitting, numbers, quoting, a file read from its end, and the debug channel.
+// Splitting, numbers, quoting, reading a file from its end, and the debug channel.
 
 #include <kelosyslog/debuger.h>
 #include <kelosyslog/utils.h>

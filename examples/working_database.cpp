@@ -1,4 +1,4 @@
-// Looks after the database that syslog-ng appends to: write-ahead logging, and a bound on its size.
+// Maintains the database that syslog-ng appends to: write-ahead logging, and a limit of its size.
 
 #include <keloplatform/root.h>
 #include <kelosyslog/dbhandler.h>
@@ -22,7 +22,7 @@ int main(int argc, char **argv) {
     std::cout << "below a limit of 1 MiB: " << SyslogngWorkingDbCheck(path, 1024)
               << ", still there: " << std::filesystem::exists(path) << "\n";
     // A file that is larger than its limit is deleted. syslog-ng is then asked to start a new one; here none
-    // runs, so the log tells of a failure, which does not change the result.
+    // runs, so the log reports a failure, which does not change the result.
     std::cout << "above a limit of 4 KiB: " << SyslogngWorkingDbCheck(path, 4)
               << ", still there: " << std::filesystem::exists(path) << "\n";
 
