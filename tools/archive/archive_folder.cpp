@@ -64,7 +64,7 @@ std::vector<std::string> ArchiveFolder::Names() const {
     return names;
 }
 
-// Temporary files, and notes whose archive never got its name or is gone.
+// Temporary files, and notes whose archive never got its name or was removed.
 void ArchiveFolder::RemoveLeftovers() const {
     for (const std::string &name : Names()) {
         const bool isNote = name.starts_with(kRemoval);
@@ -105,7 +105,7 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
     struct stat status {};
     if (!file || stat(like.c_str(), &status) != 0)
         Fail(path, errno);
-    // Only root can give files away; for others the archive stays theirs, and their group's where it is the
+    // Only root can give files away; for others the archive stays theirs, and their group's if it is the
     // same.
     const bool hasGroup = fchown(file.Get(), status.st_uid, status.st_gid) == 0 ||
                           fchown(file.Get(), static_cast<uid_t>(-1), status.st_gid) == 0;
@@ -138,7 +138,7 @@ std::vector<std::string> ArchiveFolder::PendingRemovals(const std::string &sourc
         if (!name.starts_with(kRemoval))
             continue;
         const std::optional<std::string> content = ReadWhole(path_ + "/" + name);
-        if (!content && errno == EACCES) // whoever went on would archive these logs twice
+        if (!content && errno == EACCES) // the next run would archive these records twice
             Fail(path_ + "/" + name, errno);
         if (content == source)
             archives.push_back(name.substr(std::strlen(kRemoval)));

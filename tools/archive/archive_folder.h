@@ -7,8 +7,8 @@
 
 namespace kelo::tool {
 
-// The folder of the archives, while one run works in it: no second run gets it, and what a killed one left is
-// removed. Temporary files have names of their own and go with the object.
+// The folder of the archives during one run: no second run can use it, and the files of a killed run are
+// removed. Temporary files have unique names and are removed with the object.
 //
 // All functions throw OutputError, which names the folder or the file and the cause.
 class ArchiveFolder {
@@ -22,11 +22,11 @@ public:
 
     const std::string &Path() const { return path_; }
 
-    // Creates an empty temporary file that only its owner may read, and returns its path.
+    // Creates an empty temporary file that only its owner can read, and returns its path.
     std::string NewTemporary();
     void RemoveTemporary(const std::string &path) const;
 
-    // A name for an archive that is not taken. It stays free while the object lives.
+    // A free name for an archive. It stays free during the lifetime of the object.
     std::string FreeName(const std::string &device, const std::string &firstDate,
                          const std::string &lastDate) const;
 
@@ -34,8 +34,8 @@ public:
     // renames it to `name`. Returns its path.
     std::string Publish(const std::string &temporary, const std::string &name, const std::string &like) const;
 
-    // The archives whose logs are to be removed from the database at `source`: the note is written before the
-    // archive gets its name and goes when the removal is complete.
+    // The archives whose records must still be removed from the database at `source`: the note is written
+    // before the archive gets its name and removed when the removal is complete.
     void NoteRemoval(const std::string &name, const std::string &source) const;
     void ForgetRemoval(const std::string &name) const;
     std::vector<std::string> PendingRemovals(const std::string &source) const;

@@ -20,7 +20,7 @@ std::string SafeDeviceName(const std::string &device) {
         byte = MayStay(byte) ? byte : '_';
     if (name.empty())
         return "_";
-    if (name.front() == '.' || name.front() == '-') // hidden, or taken for an option
+    if (name.front() == '.' || name.front() == '-') // hidden, or read as an option
         name.front() = '_';
     return name;
 }

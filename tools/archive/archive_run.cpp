@@ -63,7 +63,7 @@ bool ArchiveRun::Archive() {
     return true;
 }
 
-// An event that cannot be written must not cost the archive.
+// A failed event must not prevent the archive.
 void ArchiveRun::Record(int (Logger::*add)(std::string) const) const {
     const std::string reason =
         AddEvent(order_.root, [&](Logger &logger) { return (logger.*add)(order_.source); });
@@ -83,7 +83,7 @@ void ArchiveRun::Copy() {
             archive.path + " (" + FormatSize(fs::file_size(archive.path, unknown)) + ")\n");
 }
 
-// Removes what earlier runs archived and could not remove. Returns whether there was any of that.
+// Removes records that earlier runs archived and did not remove. Returns whether there were any.
 bool ArchiveRun::ResumeRemovals() {
     uint64_t removed = 0;
     for (const std::string &name : folder_.PendingRemovals(order_.source))

@@ -12,24 +12,24 @@ namespace kelo::tool {
 // "1 log", "5 logs of nas1".
 std::string LogsOf(uint64_t count, const std::string &host);
 
-// One run of "kelosyslog archive": copies a database, records that in the server's event log, and removes
-// what was copied where that is wanted.
+// One run of "kelosyslog archive": copies a database, records that in the server's event log, and removes the
+// copied records if requested.
 class ArchiveRun {
 public:
     struct Order {
         std::string source; // absolute path
-        std::string host;   // only its logs; "" for all
+        std::string host;   // only its records; "" for all
         bool isRemoving;
         std::string root; // of the server's event log
     };
-    // `report` gets lines about what was done.
+    // `report` gets lines about the results.
     ArchiveRun(Order order, ArchiveFolder &folder, std::function<void(const std::string &)> report);
 
     // Returns whether there was anything to do. Throws DatabaseError, OutputError and Interrupted; an event
     // that cannot be written is only a warning.
     bool Run();
 
-    // Name of the archive that was made; "" for none.
+    // Name of the created archive; "" for none.
     const std::string &Made() const { return made_; }
 
 private:

@@ -4,7 +4,7 @@
 
 namespace kelo::tool {
 
-// Databases to be archived come from anywhere, and the user may break off the work.
+// A source database may have any content, and the user may interrupt the work.
 inline constexpr SqliteOptions kToRead{
     .mode = SqliteMode::kRead, .heedsStopSignals = true, .trustsSchema = false};
 inline constexpr SqliteOptions kToWrite{

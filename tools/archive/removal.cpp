@@ -20,13 +20,13 @@ constexpr int kLockTimeoutMs = 30'000;
 constexpr int64_t kFirstRowLimit = 10'000;
 constexpr int64_t kLeastRowLimit = 100;
 constexpr int64_t kMostRowLimit = 100'000;
-// How long others wait for one transaction. SQLite's writers ask again every 50 ms at this age of a lock, so
-// the pause lets each of them in.
+// The time that others wait for one transaction. SQLite's writers try again every 50 ms at this age of a
+// lock, so each of them gets the lock in the pause.
 constexpr milliseconds kTransactionTime{100};
 constexpr milliseconds kPause{60};
 constexpr int kRowsPerLook = 100;
 constexpr off_t kLargestWal = off_t{32} << 20;
-// A checkpoint that waits for readers keeps writers waiting with it.
+// A checkpoint that waits for readers blocks writers too.
 constexpr int kCheckpointTimeoutMs = 200;
 
 constexpr const char *kRows = "SELECT id, utcsec, host, prog, msg FROM logs WHERE id >= ?1 ORDER BY id";
@@ -93,11 +93,11 @@ uint64_t Removal::RemoveRows() {
     return count;
 }
 
-// Every commit copies what it can of the log into the file, but only a log that nobody uses begins anew.
+// Every commit copies what it can of the log into the file, but only an unused log is restarted.
 void Removal::BoundWriteAheadLog() {
     if (SizeOf(source_.Name() + "-wal") <= kLargestWal)
         return;
-    // Most of it first, without keeping writers out.
+    // First most of it, without blocking writers.
     source_.Checkpoint(false);
     source_.SetBusyTimeout(kCheckpointTimeoutMs);
     source_.Checkpoint(true);

@@ -7,26 +7,26 @@
 
 namespace kelo::tool {
 
-// An archive of a folder, as its name and its row of db_info tell.
+// An archive of a folder, described by its name and its row of db_info.
 struct Archive {
     std::string name;
     std::string device;
-    int64_t first = 0; // time of the oldest log, seconds since the epoch
-    int64_t last = 0;  // of the newest; 0 or less where that is unknown
+    int64_t first = 0; // time of the oldest record, seconds since the epoch
+    int64_t last = 0;  // of the newest; 0 or less if unknown
     uint64_t logs = 0;
     uint64_t bytes = 0;
 };
 
-// The archives of a folder, those with the oldest last log first; none when there is no such folder. Files
-// of other names and without a readable row of db_info are none. Throws OutputError when the folder cannot
-// be read.
+// The archives of a folder, those with the oldest last record first; none when there is no such folder. Files
+// with other names or without a readable row of db_info are ignored. Throws OutputError when the folder
+// cannot be read.
 std::vector<Archive> ListArchives(const std::string &folder);
 
-// What is to be kept.
+// The archives to keep.
 struct Retention {
-    std::optional<int64_t> since;  // archives whose last log is of this second or later, or of no known time
-    std::optional<uint64_t> bytes; // and of these the newest that take no more in all
-    std::string spared;            // name of an archive that is kept in any case
+    std::optional<int64_t> since;  // archives whose last record has this second or later, or no known time
+    std::optional<uint64_t> bytes; // and of these the newest up to this size in all
+    std::string spared;            // name of an archive that is always kept
 };
 
 // The archives that a retention does not keep, oldest first. `archives` is sorted as ListArchives does.

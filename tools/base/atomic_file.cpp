@@ -52,7 +52,7 @@ void AtomicFile::Commit() {
     if (fchmod(file_.Get(), ModeOf(target_)) != 0 || !SyncAndRename(file_, path_, target_))
         Fail(std::strerror(errno));
     path_.clear();
-    SyncFolderOf(target_); // where that fails, the file is complete nevertheless
+    SyncFolderOf(target_); // if that fails, the file is complete nevertheless
 }
 
 void AtomicFile::Fail(const std::string &reason) const {

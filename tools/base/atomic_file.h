@@ -7,10 +7,10 @@
 
 namespace kelo::tool {
 
-// Files that are there whole or not at all, also after a crash, and names that last.
+// Files that are complete or missing, also after a crash, and durable names.
 
-// A file that is written beside its target and takes the target's name only when it is complete and on the
-// disk. Until then, and whenever something fails, the target stays what it was.
+// A temporary file in the folder of its target that gets the target's name when it is complete and on the
+// disk. Until then, and after any failure, the target does not change.
 //
 //     AtomicFile file("report.html");
 //     file.Write(text);
@@ -26,7 +26,7 @@ public:
     AtomicFile(const AtomicFile &) = delete;
     AtomicFile &operator=(const AtomicFile &) = delete;
 
-    // Where the temporary file stands, for others that write it by its name.
+    // The path of the temporary file, for code that writes it by its name.
     const std::string &Path() const { return path_; }
 
     void Write(std::string_view text);
@@ -54,10 +54,10 @@ bool RenameDurably(const std::string &from, const std::string &to);
 // Renames unless the new name is taken (EEXIST). Syncs nothing.
 bool RenameToFreeName(const std::string &from, const std::string &to);
 
-// Removes a file, and syncs its folder. One that is missing is removed.
+// Removes a file, and syncs its folder. A missing file is a success.
 bool RemoveDurably(const std::string &path);
 
-// Makes the names in the folder of `path` survive a loss of power.
+// Makes the names in the folder of `path` durable.
 bool SyncFolderOf(const std::string &path);
 
 } // namespace kelo::tool

@@ -4,7 +4,7 @@
 
 namespace kelo::tool {
 
-// The command line cannot be carried out. The text names the option and the value.
+// The command line is wrong. The text names the option and the value.
 struct UsageError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
@@ -14,12 +14,12 @@ struct DatabaseError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// The standard output cannot take what is to be written.
+// The standard output cannot be written.
 struct OutputError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// The reader of the standard output went away. That is its right, and no error.
+// The reader of the standard output has closed its end, which is not an error.
 struct OutputClosed : std::exception {};
 
 } // namespace kelo::tool

@@ -33,10 +33,10 @@ std::optional<std::string> ReadWhole(const std::string &path);
 // Writes all of `content`.
 bool WriteAll(int fd, std::string_view content);
 
-// A file that only its owner may read, and that goes with the object.
+// A file that only its owner can read and that is removed with the object.
 class TemporaryFile {
 public:
-    // `pattern` is the path, ending in "XXXXXX", which becomes what is free.
+    // `pattern` is the path, ending in "XXXXXX", which is replaced to get a free name.
     TemporaryFile(std::string pattern, std::string_view content);
     ~TemporaryFile();
     TemporaryFile(const TemporaryFile &) = delete;

@@ -7,7 +7,7 @@ namespace kelo::tool {
 
 Json::Value ParseJson(const std::string &text) {
     Json::CharReaderBuilder builder;
-    builder["stackLimit"] = 20; // the reader throws beyond it, where it would recurse
+    builder["stackLimit"] = 20; // the reader throws beyond it instead of recursing
     builder["collectComments"] = false;
     builder["failIfExtra"] = true;
     const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());

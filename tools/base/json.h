@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// The object that the text holds. Throws std::runtime_error when it holds none or is nested deeply.
+// The object in the text. Throws std::runtime_error when there is none or it is nested deeply.
 Json::Value ParseJson(const std::string &text);
 
 // The value on one line that ends in a line feed.

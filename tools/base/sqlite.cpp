@@ -63,8 +63,8 @@ void SqliteConnection::SetBusyTimeout(int timeoutMs) {
         sqlite3_busy_timeout(db_.get(), timeoutMs);
 }
 
-// Asks for a lock every millisecond: with growing pauses, as SQLite makes them by itself, it would hardly
-// ever meet the short moment between two transactions of a busy writer.
+// Asks for a lock every millisecond: with the growing pauses of SQLite's own handler it would hardly ever hit
+// the short moment between two transactions of a busy writer.
 int SqliteConnection::WaitForLock(void *connection, int calls) {
     if (StopSignals::Received() != 0 ||
         calls >= static_cast<SqliteConnection *>(connection)->options_.busyTimeoutMs)
@@ -90,7 +90,7 @@ void SqliteConnection::Fail(int status) const {
 }
 
 void SqliteConnection::Run(const std::string &sql) {
-    errno = 0; // what an earlier operation left there is no reason for a failure of this one
+    errno = 0; // the value of an earlier operation is not the reason of this failure
     const int status = sqlite3_exec(db_.get(), sql.c_str(), nullptr, nullptr, nullptr);
     if (status != SQLITE_OK)
         Fail(status);
@@ -204,7 +204,7 @@ SqliteTransaction::SqliteTransaction(SqliteConnection &connection) : connection_
 }
 
 SqliteTransaction::~SqliteTransaction() {
-    if (isOpen_) // SQLite may have undone it already
+    if (isOpen_) // SQLite may have rolled it back already
         sqlite3_exec(connection_.Get(), "ROLLBACK", nullptr, nullptr, nullptr);
 }
 

@@ -1,7 +1,7 @@
 #pragma once
 
-// Plain SQLite, for what the library has no operation for: a connection, a statement and a transaction that
-// end with their scope.
+// Plain SQLite, where the library has no operation: a connection, a statement and a transaction that end with
+// their scope.
 //
 //     SqliteConnection database("/volume1/logs.db", {.mode = SqliteMode::kWrite});
 //     SqliteTransaction transaction(database);
@@ -10,7 +10,7 @@
 //     remove.Run();
 //     transaction.Commit();
 //
-// All functions throw SqliteError. One thread at a time uses a connection with what belongs to it.
+// All functions throw SqliteError. One thread at a time uses a connection and its objects.
 
 #include <cstdint>
 #include <memory>
@@ -24,7 +24,7 @@ struct sqlite3_stmt;
 
 namespace kelo::tool {
 
-// What SQLite said of a database. The text names the path and the cause.
+// An error of SQLite. The text names the path and the cause.
 struct SqliteError : DatabaseError {
     SqliteError(const std::string &text, int code, int systemError)
         : DatabaseError(text), code(code), systemError(systemError) {}
@@ -34,23 +34,24 @@ struct SqliteError : DatabaseError {
 
 enum class SqliteMode {
     kRead,
-    kWrite, // a file of which only reading is permitted is opened for reading
-    kCreate // the same, and a file that is missing is created
+    kWrite, // a read-only file is opened for reading
+    kCreate // the same, and a missing file is created
 };
 
 struct SqliteOptions {
     SqliteMode mode = SqliteMode::kRead;
     // How long a statement waits for a locked database.
     int busyTimeoutMs = 10'000;
-    // Whatever runs ends early, and throws Interrupted, when one of StopSignals came.
+    // A running operation ends early, and throws Interrupted, after one of StopSignals.
     bool heedsStopSignals = false;
-    // Without it the schema that the file holds does nothing but store.
+    // Without it the schema of the file can only store: its triggers and views call no functions with
+    // effects.
     bool trustsSchema = true;
 };
 
 class SqliteConnection {
 public:
-    // Opens the file at the absolute `path`. Errors call it `name`, where one is given.
+    // Opens the file at the absolute `path`. Errors use `name`, if one is given.
     SqliteConnection(const std::string &path, const SqliteOptions &options, std::string name = "");
     SqliteConnection(const SqliteConnection &) = delete;
     SqliteConnection &operator=(const SqliteConnection &) = delete;
@@ -69,13 +70,13 @@ public:
     uint64_t Changes() const;
 
     // Copies the write-ahead log into the file as far as possible; empties it if nobody uses it and
-    // `mustEmpty` says so. Without effect, and without an error, where others are in the way.
+    // `mustEmpty` says so. Without effect, and without an error, if others prevent it.
     void Checkpoint(bool mustEmpty);
     // Whether the file was removed or renamed since it was opened.
     bool HasMoved() const;
 
     const std::string &Name() const { return name_; }
-    // For operations that have no function here.
+    // For operations without a function here.
     sqlite3 *Get() const { return db_.get(); }
     // Throws for SQLite's result `status`, with the words of the last error.
     [[noreturn]] void Fail(int status) const;
@@ -100,12 +101,12 @@ public:
     void Bind(int index, std::string_view text);
     void Bind(int index, int64_t number);
     void BindBlob(int index, std::string_view bytes);
-    // The value that `row` has in `column`, with its type.
+    // The value in `column` of `row`, with its type.
     void BindColumn(int index, const SqliteStatement &row, int column);
 
-    // Goes to the next row; returns whether there is one.
+    // Advances to the next row; returns whether there is one.
     bool Step();
-    // Runs to the end, drops the rows, and is ready for other values, also when it throws.
+    // Runs to the end and drops the rows. It can then be run with other values, also after an exception.
     void Run();
 
     // Of the row. NULL is 0 and "". A text ends at its first NUL.
@@ -123,7 +124,7 @@ private:
     std::unique_ptr<sqlite3_stmt, Finalize> statement_;
 };
 
-// Keeps other writers out from its construction on. What was not committed when it ends is undone.
+// Locks other writers out from its construction on. What was not committed at its end is rolled back.
 class SqliteTransaction {
 public:
     explicit SqliteTransaction(SqliteConnection &connection);
@@ -138,7 +139,7 @@ private:
     bool isOpen_ = true;
 };
 
-// Removes a database with what SQLite puts beside it, as far as it is there.
+// Removes a database with its existing companion files.
 void RemoveDatabase(const std::string &path);
 
 } // namespace kelo::tool

@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// Writes moments in the time zone of the process (TZ), or in UTC.
+// Formats times in the time zone of the process (TZ), or in UTC.
 class TimeFormat {
 public:
     explicit TimeFormat(bool inUtc) : inUtc_(inUtc) {}

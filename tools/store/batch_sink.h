@@ -7,17 +7,17 @@
 
 namespace kelo::tool {
 
-// Stores records in batches of one transaction each. Between batches the database is not locked, however
-// slowly the input comes.
+// Stores records in batches of one transaction each. Between batches the database is not locked, even if the
+// input is slow.
 class BatchSink : public RecordSink {
 public:
-    // `store`, and `input` and its `reader`, whose records come, must outlive the sink. `source` is the name
-    // that the progress is stored under.
+    // `store`, `input` and its `reader` must outlive the sink. `source` is the name under which the progress
+    // is stored.
     BatchSink(LogStore &store, const BlockReader &input, const LineReader &reader, std::string source);
 
     void Take(_SYSLOG_LOG_DATA_tag &log) override;
     void LineDone() override;
-    // Stores what was taken. To be called when the input pauses or ends.
+    // Stores the taken records. Call it when the input pauses or ends.
     void Flush();
 
 private:

@@ -20,15 +20,15 @@ public:
     // The next bytes, valid until the next call of a function; none at the end of the input.
     std::string_view Read();
 
-    // What the input begins with: all that has been read, up to kHeadBytes.
+    // The beginning of the input: all that has been read, up to kHeadBytes.
     static constexpr size_t kHeadBytes = 4096;
     const std::string &Head() const { return head_; }
 
-    // Reads ahead until Head() has `wanted` bytes, at most kHeadBytes, or the input ends. To be called before
+    // Reads ahead until Head() has `wanted` bytes, at most kHeadBytes, or the input ends. Call it before
     // Read.
     void ReadHead(size_t wanted);
 
-    // Leaves out the next bytes, by seeking where the input allows it. Returns false when it is shorter.
+    // Skips the next bytes, by seeking if the input allows it. Returns false when it is shorter.
     bool Skip(uint64_t bytes);
 
 private:
@@ -37,7 +37,7 @@ private:
 
     int file_;
     std::vector<char> buffer_;
-    std::string_view ahead_; // of the buffer: what was read and is still to be returned
+    std::string_view ahead_; // of the buffer: the bytes that were read and not returned yet
     std::string head_;
 };
 

@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// Cuts text into lines, as it comes, in memory that is bounded by the longest line allowed:
+// Splits text into lines, piece by piece, in memory limited by the longest line allowed:
 //
 //     reader.Feed(bytes);            // or End(), after the last ones
 //     while (reader.Next())
@@ -16,16 +16,16 @@ public:
     // `maxLineBytes` does not include the line feed.
     explicit LineReader(size_t maxLineBytes) : maxLineBytes_(maxLineBytes) {}
 
-    // The text begins behind `offset` bytes of its input, which end the line number `lines`.
+    // The text begins after `offset` bytes of its input, which end the line number `lines`.
     void StartAt(uint64_t offset, uint64_t lines);
 
-    // The text goes on with these bytes, which must stay until Next has returned false.
+    // The text continues with these bytes, which must stay until Next has returned false.
     void Feed(std::string_view bytes) { rest_ = bytes; }
 
     // The text has ended. Its last line needs no line feed.
     void End() { hasEnded_ = true; }
 
-    // Advances to the next line that is complete. Returns false when there is none.
+    // Advances to the next complete line. Returns false when there is none.
     bool Next();
 
     // The current line, without its line feed; of an overlong one the first kOverlongHeadBytes. Valid until
@@ -35,7 +35,7 @@ public:
     bool IsOverlong() const { return isOverlong_; }
     // Its number, from 1.
     uint64_t Number() const { return number_; }
-    // The offset behind its line feed.
+    // The offset after its line feed.
     uint64_t EndOffset() const { return offset_; }
 
 private:

@@ -10,19 +10,19 @@
 
 namespace kelo::tool {
 
-// Where the records of an import go.
+// The destination of the records of an import.
 class RecordSink {
 public:
     virtual ~RecordSink() = default;
 
-    // Takes a record, and may leave another's contents in `log`.
+    // Takes a record, and may leave the content of another in `log`.
     virtual void Take(_SYSLOG_LOG_DATA_tag &log) = 0;
 
-    // A line has been dealt with, whether or not it gave a record.
+    // A line has been processed, with or without a record.
     virtual void LineDone() {}
 };
 
-// What became of the lines of an import. Empty lines are no lines.
+// The results of the lines of an import. Empty lines are ignored.
 struct ImportCounts {
     uint64_t parsed = 0;
     uint64_t tooFewFields = 0;
@@ -30,10 +30,10 @@ struct ImportCounts {
     std::map<std::string, uint64_t> incomplete; // parsed, by the first mandatory field that is empty
 };
 
-// Turns the lines of an input into records: as LogParser does, but with an account of every line.
+// Converts the lines of an input to records as LogParser does, but with a result for every line.
 class LogImport {
 public:
-    // Told of the reader's current line when it was rejected or is incomplete, and why.
+    // Called for the reader's current line if it was rejected or is incomplete, with the reason.
     using LineReport = std::function<void(const LineReader &reader, const std::string &reason)>;
 
     // With `skipIncomplete`, records with an empty mandatory field do not reach the sink.
@@ -53,7 +53,7 @@ private:
     bool skipIncomplete_;
     ImportCounts counts_;
     LogParser parser_;
-    // Used again for every line, so that their memory is.
+    // Reused for every line, with their memory.
     std::string line_;
     _SYSLOG_LOG_DATA_tag log_;
 };

@@ -14,8 +14,8 @@ namespace kelo::tool {
 
 // How far a source of records has been stored.
 struct StoreProgress {
-    std::string source;  // what names it: an absolute path, "-" for standard input
-    std::string head;    // its first bytes, by which another content under the same name is told apart
+    std::string source;  // its name: an absolute path, "-" for standard input
+    std::string head;    // its first bytes, which distinguish another content of the same name
     uint64_t offset = 0; // bytes whose records are stored: whole lines
     uint64_t lines = 0;  // lines within them
     bool operator==(const StoreProgress &) const = default;
@@ -24,12 +24,12 @@ struct StoreProgress {
 struct LogStoreOptions {
     int busyTimeoutMs = 10'000; // how long to wait for another writer
     // Without it a commit is on the disk only with the next checkpoint: after a loss of power the last ones
-    // may be missing, and the database is sound.
+    // may be missing, and the database is intact.
     bool mustSyncCommits = true;
 };
 
 // An open log database, used by one thread at a time. Batches are transactions: after a failure, a kill or a
-// loss of power the database holds whole batches, each with the progress that belongs to it.
+// loss of power the database has whole batches, each with its progress.
 class LogStore {
 public:
     // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
@@ -49,8 +49,8 @@ public:
     // The same, and `progress` in the same transaction.
     void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs, const StoreProgress &progress);
 
-    // Whether the file was removed or renamed since it was opened. What is stored no longer is where it is
-    // looked for then.
+    // Whether the file was removed or renamed since it was opened. Records that are stored then are not found
+    // at the path.
     bool HasMoved() const { return db_.HasMoved(); }
 
     const std::string &Path() const { return path_; }

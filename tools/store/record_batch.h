@@ -8,15 +8,15 @@
 
 namespace kelo::tool {
 
-// Records that are stored together. Their memory serves the next batch, except that of long texts, which
-// would pile up in it.
+// Records that are stored together. The next batch reuses their memory, except that of long texts, which
+// would accumulate.
 class RecordBatch {
 public:
-    // From here on a batch is large enough to be stored.
+    // From this size on a batch is stored.
     static constexpr size_t kFullRows = 5000;
     static constexpr size_t kFullBytes = 4 * 1024 * 1024;
 
-    // Takes the record, and may leave another's contents in `log`.
+    // Takes the record, and may leave the content of another in `log`.
     void Take(_SYSLOG_LOG_DATA_tag &log);
 
     std::span<const _SYSLOG_LOG_DATA_tag> Records() const { return {records_.data(), rows_}; }
@@ -29,7 +29,7 @@ private:
     static constexpr size_t kLongTextBytes = 8 * 1024;
 
     std::vector<_SYSLOG_LOG_DATA_tag> records_;
-    size_t rows_ = 0; // of the batch; what lies behind waits for use
+    size_t rows_ = 0; // of the batch; the others are free for use
     size_t bytes_ = 0;
     bool hasLongText_ = false;
 };
