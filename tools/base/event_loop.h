@@ -1,6 +1,7 @@
 #pragma once
 
 #include <chrono>
+#include <cstdint>
 #include <exception>
 #include <functional>
 #include <memory>
@@ -9,8 +10,8 @@ struct sd_event;
 
 namespace kelo::tool {
 
-// What an EventLoop waits for, for as long as the object lives. It must go before its loop, and not while its
-// own handler runs.
+// What an EventLoop waits for, as long as the object lives. Destroy it before its loop, and not in its own
+// handler.
 class EventSource {
 public:
     // Waits for nothing.
@@ -19,7 +20,7 @@ public:
     EventSource &operator=(EventSource &&) noexcept;
     ~EventSource();
 
-    // While a source is off its handler does not run, and what comes waits for it to be on again.
+    // While a source is disabled its handler does not run; what comes waits until it is enabled again.
     void SetEnabled(bool isEnabled);
 
     // For a timer: runs the handler once at this time, which replaces the one set before; at once when it has
@@ -45,24 +46,23 @@ public:
     EventLoop(const EventLoop &) = delete;
     EventLoop &operator=(const EventLoop &) = delete;
 
-    // There is something to read, or the input has ended. Regular files and devices that nobody can wait for
-    // are always ready.
+    // The input can be read, or has ended. Regular files and /dev/null are always ready.
     EventSource AddInput(int file, Handler handler);
 
-    // The other end of an output has gone. Never for an output that has no other end or is not open.
+    // The other end of an output was closed. Never happens to a file without another end or that is not open.
     EventSource AddHangUp(int file, Handler handler);
 
-    // A time has come; none until EventSource::FireAt.
+    // The time of EventSource::FireAt has come.
     EventSource AddTimer(Handler handler);
 
     // The signal has come. It does nothing else in the process while the source lives; one that came and was
     // not handled by then is discarded. A signal has one source at a time.
     EventSource AddSignal(int signal, Handler handler);
 
-    // Waits for an event and handles it. Throws what its handler throws. May return without any.
+    // Waits for an event and handles it; may also return without one. Throws what the handler throws.
     void Wait();
 
-    // Handles an event that has come. Returns false where there was none. Throws what its handler throws.
+    // Handles an event that has come. Returns false if there was none. Throws what the handler throws.
     bool Poll();
 
 private:

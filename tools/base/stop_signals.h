@@ -13,14 +13,14 @@ struct Interrupted : std::exception {
     int signal;
 };
 
-// For work that does not wait for events, and asks now and then whether it is to stop: while the object
-// lives, INT, TERM and HUP do nothing by themselves. One that is ignored stays so, for example HUP under
-// nohup. One object at a time.
+// For work without an event loop that checks now and then whether to stop: while the object lives, INT, TERM
+// and HUP have no other effect. A signal that is ignored stays ignored, for example HUP under nohup. One
+// object at a time.
 class StopSignals {
 public:
     // Throws std::system_error.
     StopSignals();
-    // The signals do again what they did before.
+    // Restores the effect of the signals.
     ~StopSignals();
     StopSignals(const StopSignals &) = delete;
     StopSignals &operator=(const StopSignals &) = delete;

@@ -20,13 +20,14 @@ public:
     // The accounting database keeps a name up to its first NUL.
     void Count(const std::string &host) {
         isIdle_ = false;
-        manager_->LogInc(host.c_str());
+        const char *name = host.c_str();
+        manager_->LogInc(name);
     }
 
-    // To be called about once a second, unless idle. Closes the sample, and flushes when its time has come.
+    // Call it about once a second, unless idle. Closes the sample, and flushes when its time has come.
     void Tick(int64_t now);
 
-    // Whether all that was counted has been written, and no rules are to be loaded.
+    // Whether all counts have been written, and no reload is requested.
     bool IsIdle() const { return isIdle_ && !mustReload_; }
 
     // Requests that the rules are reloaded, which needs a new manager: the present one must have written all
