@@ -1,12 +1,78 @@
-#include "accounting/accounting_fixture.h"
+#include "kelosyslog/accounting.h"
 
-using namespace kelo::test;
+#include "notify/notify_fixture.h"
+#include "support/doubles.h"
+#include "support/short_lock_waits.h"
 
+namespace {
+
+// What replaces the machine for the whole program.
+struct Machine {
+    time_t now = 1000;
+    std::function<void()> beforeStep; // called before every step of an SQLite statement
+};
+Machine machine;
+
+} // namespace
+
+extern "C" {
+
+time_t time(time_t *seconds) noexcept {
+    if (seconds != nullptr)
+        *seconds = machine.now;
+    return machine.now;
+}
+
+int sqlite3_step(sqlite3_stmt *statement) {
+    if (machine.beforeStep)
+        machine.beforeStep();
+    return kelo::test::Real<&sqlite3_step>("sqlite3_step")(statement);
+}
+
+} // extern "C"
+
+namespace kelo::test {
 namespace {
 
 using Names = std::vector<std::string>;
 
-using Accounting = AccountingTest;
+const std::string kRows = "1000 a 1;1001 a 1;1001 b'c 1";
+const std::string kCounts = "a 2;b'c 1;d 1";
+
+// An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
+// a clock that stands still until a test moves it.
+class Accounting : public NotifyTest {
+protected:
+    Accounting() {
+        machine = {};
+        CreateLogDatabase(path_, "accinfo.sql");
+        CreateLogDatabase(events_, "kelosyslog.sql");
+        WriteRules("");
+    }
+    ~Accounting() override { machine = {}; }
+
+    // The rows of table "eps" in the order of their insertion: "stamp device eps;..."
+    std::string Samples() const {
+        return RunSql(path_, "SELECT group_concat(stamp || ' ' || device || ' ' || eps, ';') FROM (SELECT * "
+                             "FROM eps ORDER BY id)");
+    }
+    // The rows of table "histogram": "device count;..." in byte order.
+    std::string Histogram() const {
+        return RunSql(path_, "SELECT group_concat(device || ' ' || count, ';') FROM (SELECT * FROM histogram "
+                             "ORDER BY device)");
+    }
+    // Three sample rows that wait for a flush, and a log in the open sample.
+    static void CountLogs(AccountingManager &accounting) {
+        for (const auto &[second, device] : {std::pair(1000, "a"), {1000, "a"}, {1000, "b'c"}, {1001, "d"}}) {
+            machine.now = second;
+            accounting.LogInc(device);
+        }
+    }
+
+    ShortLockWaits waits_;
+    const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
+    const std::string events_ = root_.File("usr/kelo/etc/kelosyslog.db");
+};
 
 TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
     const struct {
@@ -56,17 +122,10 @@ TEST_F(Accounting, AsksForAFlushOnABeatAboveFiveSeconds) {
 // A statement is a C string: what follows a NUL in a name is not stored, and of names that are the same up to
 // there the last one counts.
 TEST_F(Accounting, KeepsNamesAndCountsAcrossRestarts) {
-    const Names devices = {"zeta",
-                           "O'Brien",
-                           "",
-                           "\xff\xfe",
-                           "%q%s%n",
-                           std::string(10000, 'x'),
-                           "new\nline",
-                           std::string("nul\0one", 7),
-                           std::string("nul\0two", 7)};
-    const Names stored = {"",     "%q%s%n",  "O'Brien", "new\nline", "nul", std::string(10000, 'x'),
-                          "zeta", "\xff\xfe"};
+    const std::string longName(10000, 'x');
+    const Names devices = {"zeta",          "O'Brien",      "", "\xff\xfe", "%q%s%n", longName, "new\nline",
+                           {"nul\0one", 7}, {"nul\0two", 7}};
+    const Names stored = {"", "%q%s%n", "O'Brien", "new\nline", "nul", longName, "zeta", "\xff\xfe"};
     for (int start = 1; start <= 3; ++start) {
         AccountingManager accounting;
         Names names;
@@ -80,34 +139,124 @@ TEST_F(Accounting, KeepsNamesAndCountsAcrossRestarts) {
             accounting.LogInc(device);
     }
     EXPECT_EQ(SyslogDBHistGet(path_, 0).at("zeta"), 3u);
-    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_THAT(TakeTexts(), IsEmpty());
+}
+
+TEST_F(Accounting, CountsManyDevicesExactly) {
+    AccountingManager accounting;
+    std::map<std::string, uint64_t> counted;
+    for (uint64_t log = 0; log < 20000; ++log) {
+        const std::string device = "device " + std::to_string(log % 3 == 0 ? log % 7 : log * 7919 % 2000);
+        ++counted[device];
+        machine.now += log % 5000 == 0;
+        accounting.LogInc(device);
+    }
+    ++machine.now;
+    accounting.CurEpsUpdate();
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+    EXPECT_EQ(SyslogDBHistGet(path_, 0), counted);
+    EXPECT_EQ(RunSql(path_, "SELECT sum(eps) FROM eps"), "20000");
+    EXPECT_EQ(accounting.TotalCountGet(), 20000);
 }
 
 TEST_F(Accounting, NotifiesWhenASampleReachesARule) {
     WriteRules(RuleText("R", 1, "", "3", ""));
-    const std::string events = root_.File("usr/kelo/etc/kelosyslog.db");
     AccountingManager accounting;
     const auto countSecond = [&](int logs) {
         ++machine.now;
         for (int i = 0; i < logs; ++i)
             accounting.LogInc("a");
     };
-    countSecond(1); // joins the next sample
-    countSecond(2);
-    EXPECT_THAT(NotifyCalls::Sent(), IsEmpty());
-    countSecond(3);
-    EXPECT_THAT(NotifyCalls::Sent(), IsEmpty());
-    NotifyCalls::AnswerWith(-1);
+    for (const int logs : {1, 2, 3}) { // the first one joins the next sample
+        countSecond(logs);
+        EXPECT_THAT(PlatformCalls::Sent(), IsEmpty());
+    }
+    PlatformCalls::answers.notification = -1;
     countSecond(4);
-    ASSERT_EQ(NotifyCalls::Sent().size(), 1u);
-    EXPECT_EQ(NotifyCalls::Sent()[0].values.at("%EPS%"), "3");
-    EXPECT_THAT(Messages(), Contains("Fail to send syslog notification"));
-    EXPECT_EQ(QueryText(events, "SELECT count(*) FROM log"), "1");
-    NotifyCalls::AnswerWith(0);
+    ASSERT_EQ(PlatformCalls::Sent().size(), 1u);
+    EXPECT_EQ(PlatformCalls::Sent()[0].values.at("%EPS%"), "3");
+    EXPECT_THAT(TakeTexts(), Contains("Fail to send syslog notification"));
+    EXPECT_EQ(RunSql(events_, "SELECT count(*) FROM log"), "1");
+    PlatformCalls::answers.notification = 0;
     countSecond(1);
-    EXPECT_THAT(Messages(), IsEmpty());
-    EXPECT_EQ(QueryText(events, "SELECT count(*) FROM log"), "2");
-    EXPECT_EQ(accounting.CurrentEpsGet(), 1);
+    EXPECT_THAT(TakeTexts(), IsEmpty());
+    EXPECT_EQ(RunSql(events_, "SELECT count(*) FROM log"), "2");
+}
+
+TEST_F(Accounting, GivesUpTheOldestSamplesAboveABound) {
+    AccountingManager accounting;
+    CountLogs(accounting);
+    EXPECT_EQ(accounting.SamplesDrop(2, 3), 0U);
+    EXPECT_EQ(accounting.SamplesDrop(2, 2), 1U);
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+    EXPECT_EQ("1000 a 1;" + Samples(), kRows);
+    EXPECT_EQ(Histogram(), kCounts);
+}
+
+TEST_F(Accounting, KeepsItsSamplesWhileAnotherWriterHasTheDatabase) {
+    AccountingManager accounting;
+    CountLogs(accounting);
+    {
+        const DatabaseLock lock(path_);
+        EXPECT_EQ(accounting.AccoutingFlush2DB(), -1);
+    }
+    EXPECT_GT(waits_.TakeCount(), 0);
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+    EXPECT_EQ(Samples(), kRows);
+    EXPECT_EQ(Histogram(), kCounts);
+    PlatformCalls::Reset();
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+    EXPECT_THAT(PlatformCalls::Recorded(), IsEmpty()) << "without samples there is nothing to do";
+}
+
+TEST_F(Accounting, TrimsOldSamplesOfALargeFile) {
+    // Within a day, with room for a slow machine.
+    const std::string stamp = RunSql(path_, "SELECT strftime('%s', 'now') - 24*60*60 + 600");
+    const std::string trim = "DELETE FROM eps WHERE stamp < strftime('%s', 'now') - 24*60*60;";
+    const std::string recent = stamp + " new 1";
+    const std::string all = "999 old 1;" + recent + ";" + kRows;
+    const struct {
+        int filler; // bytes
+        bool fails;
+        std::string samples;
+    } cases[] = {{5000000, false, all}, {5300000, true, all}, {5300000, false, recent}};
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.filler + c.fails);
+        RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
+        AccountingManager accounting;
+        CountLogs(accounting);
+        RunSql(path_, "INSERT INTO eps VALUES(NULL, 999, 'old', 1), (NULL, " + stamp + ", 'new', 1);" +
+                          "CREATE TABLE filler AS SELECT zeroblob(" + std::to_string(c.filler) + ")");
+        PlatformCalls::FailFrom(c.fails ? 9 : 1000, 1);
+        EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+        RunSql(path_, "DROP TABLE filler; VACUUM");
+        EXPECT_EQ(Samples(), c.samples);
+        EXPECT_EQ(TakeTexts(), c.fails ? Names{"Fail to execute SQL command: " + trim} : Names());
+    }
+}
+
+TEST_F(Accounting, FlushesAllOrNothingWhenTheProcessIsKilled) {
+    int step = 1;
+    for (int status = -1; status != 0; ++step) {
+        RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
+        const pid_t child = fork();
+        if (child == 0) { // it dies before this step of SQLite
+            AccountingManager accounting;
+            CountLogs(accounting);
+            machine.beforeStep = [&step] {
+                if (--step == 0)
+                    raise(SIGKILL);
+            };
+            _exit(accounting.AccoutingFlush2DB() == 0 ? 0 : 1);
+        }
+        waitpid(child, &status, 0);
+        ASSERT_TRUE(status == 0 || WIFSIGNALED(status)) << status;
+        EXPECT_EQ(RunSql(path_, "PRAGMA integrity_check"), "ok");
+        EXPECT_EQ(Samples(), status == 0 ? kRows : "") << step;
+        EXPECT_EQ(Histogram(), status == 0 ? kCounts : "") << step;
+    }
+    EXPECT_GT(step, 8) << "not every statement was met";
 }
 
 } // namespace
+} // namespace kelo::test

@@ -12,7 +12,7 @@ protected:
         InsertSampleLogs(logs_, 500);
     }
     std::string Left() const {
-        return QueryText(logs_, "SELECT count(*) || ' ' || sum(host = 'host07') FROM logs");
+        return RunSql(logs_, "SELECT count(*) || ' ' || sum(host = 'host07') FROM logs");
     }
 
     const std::string name_ = "host07_2020-01-01_2020-01-01";
@@ -25,7 +25,7 @@ TEST_F(ArchiveProgram, ArchivesListsSearchesAndPrunes) {
     EXPECT_EQ(Left(), "490 0");
     Expect("archive", 0);
     Expect("archive --device none", 1);
-    EXPECT_EQ(QueryText(events_, "SELECT group_concat(substr(event, length(event) - 8), ',') FROM log"),
+    EXPECT_EQ(RunSql(events_, "SELECT group_concat(substr(event, length(event) - 8), ',') FROM log"),
               " archive.,archived., archive.,archived.")
         << "without logs there is no event";
 

@@ -109,7 +109,7 @@ protected:
                             "count(DISTINCT msg) AS found FROM (" +
                             all + ")");
         const std::string expected = std::to_string(written) + " " + std::to_string(written);
-        const std::string found = QueryText(source_, "SELECT found FROM account");
+        const std::string found = RunSql(source_, "SELECT found FROM account");
         return found == expected ? "" : found + " instead of " + expected;
     }
 
@@ -123,16 +123,16 @@ TEST_F(ArchiveTest, CopiesAPrefixAndRemovesExactlyThatBesideAWriter) {
     writer.Await(10'000);
     const DatabaseCopy ofHost = Make("host1", true);
     Removal(source_, ofHost.path).Run();
-    EXPECT_EQ(QueryText(ofHost.path, "SELECT group_concat(DISTINCT host) FROM logs"), "host1");
+    EXPECT_EQ(RunSql(ofHost.path, "SELECT group_concat(DISTINCT host) FROM logs"), "host1");
     writer.Await(10'000);
     const DatabaseCopy whole = Make("", true);
     EXPECT_THAT(Left(), testing::SizeIs(4)) << "two archives and the notes of their removals";
-    EXPECT_EQ(QueryText(whole.path, "PRAGMA integrity_check"), "ok");
+    EXPECT_EQ(RunSql(whole.path, "PRAGMA integrity_check"), "ok");
     const std::string all = "(SELECT id FROM logs UNION SELECT id FROM h.logs)";
     RunSql(whole.path, "ATTACH '" + ofHost.path +
                            "' AS h; CREATE TABLE prefix AS SELECT count(*) = max(id) AS whole FROM " + all);
-    EXPECT_EQ(QueryText(whole.path, "SELECT whole FROM prefix"), "1");
-    EXPECT_EQ(QueryText(whole.path, "SELECT start_time || end_time || log_count || device FROM db_info"),
+    EXPECT_EQ(RunSql(whole.path, "SELECT whole FROM prefix"), "1");
+    EXPECT_EQ(RunSql(whole.path, "SELECT start_time || end_time || log_count || device FROM db_info"),
               "16000000011600000100" + std::to_string(whole.logs) + "it's me");
     Removal removal(source_, whole.path);
     removal.Run();
@@ -165,7 +165,7 @@ TEST_F(ArchiveTest, LeavesRowsThatTookTheIdsOfRemovedOnes) {
     Removal removal(source_, archive.path);
     removal.Run();
     EXPECT_EQ(removal.Removed(), 3U);
-    EXPECT_EQ(QueryText(source_, "SELECT group_concat(DISTINCT msg) || count(*) FROM logs"), "another15");
+    EXPECT_EQ(RunSql(source_, "SELECT group_concat(DISTINCT msg) || count(*) FROM logs"), "another15");
 }
 
 // Every write fails once, as on a full disk or with an error.
@@ -183,14 +183,13 @@ TEST_F(ArchiveTest, LeavesNothingWhenAWriteFails) {
                 EXPECT_NE(std::string(error.what()).find(root_.Path()), std::string::npos) << error.what();
             }
             const bool hasFailed = FileFaults::Stop();
-            EXPECT_EQ(QueryText(source_, "SELECT count(*) FROM logs"), "151");
+            EXPECT_EQ(RunSql(source_, "SELECT count(*) FROM logs"), "151");
             if (!isMade) {
                 ASSERT_THAT(Left(), testing::IsEmpty()) << first;
                 continue;
             }
             for (const Archive &archive : ListArchives(folder_))
-                EXPECT_EQ(QueryText(folder_ + "/" + archive.name, "SELECT count(*) FROM logs"), "151")
-                    << first;
+                EXPECT_EQ(RunSql(folder_ + "/" + archive.name, "SELECT count(*) FROM logs"), "151") << first;
             EXPECT_FALSE(FileFaults::IsUnsynced(folder_ + "/" + ListArchives(folder_).at(0).name));
             for (const std::string &name : Left())
                 fs::remove(folder_ + "/" + name);

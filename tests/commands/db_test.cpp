@@ -22,7 +22,7 @@ TEST_F(DbCommand, CreatesDescribesAndNamesADatabase) {
         EXPECT_THAT(info, HasSubstr(fact));
     Expect("db create", 0);
     Expect("db set-device x", 3); // it has no db_info
-    EXPECT_EQ(QueryText(logs_, "SELECT count(*) FROM logs"), "0");
+    EXPECT_EQ(RunSql(logs_, "SELECT count(*) FROM logs"), "0");
 }
 
 TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {

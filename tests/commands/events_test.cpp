@@ -51,7 +51,7 @@ TEST_F(Events, OfEveryKindCanBeAdded) {
           "keyword 'a\\' 'b\nc'", "archive-start 6", "archive-finish 7", "archive-failed 8",
           "log-cleared /9%d.db ann", "volume-full"})
         Expect(std::string("events add ") + kind, 0);
-    EXPECT_EQ(QueryText(events_, "SELECT group_concat(level || user || event, char(10)) FROM log"),
+    EXPECT_EQ(RunSql(events_, "SELECT group_concat(level || user || event, char(10)) FROM log"),
               "0SYSTEMServer was started [1.0].\n"
               "0SYSTEMServer was stopped [%s%n].\n"
               "0SYSTEMEvent detection: EPS is larger than [18446744073709551615].\n"
@@ -86,7 +86,7 @@ TEST_F(Events, RecordWhoClearedALog) {
     CreateLogDatabase(logs_);
     Expect("events clear-log " + logs_ + " --yes --user ann", 0);
     EXPECT_FALSE(fs::exists(logs_));
-    EXPECT_EQ(QueryText(events_, "SELECT event FROM log"), logs_ + " was cleared by ann");
+    EXPECT_EQ(RunSql(events_, "SELECT event FROM log"), logs_ + " was cleared by ann");
 }
 
 TEST_F(Events, AndLogsBecomeAReportThatReplacesAFileOnlyWhenItIsWhole) {

@@ -9,14 +9,14 @@ class Parse : public ProgramTest {
 protected:
     void Write(const std::string &content) const { WriteFile(root_.File("in"), content); }
     int Rows() const {
-        return fs::exists(db_) ? std::atoi(QueryText(db_, "SELECT count(*) FROM logs").c_str()) : 0;
+        return fs::exists(db_) ? std::atoi(RunSql(db_, "SELECT count(*) FROM logs").c_str()) : 0;
     }
     // Expects "message 0" to "message COUNT-1" once each and in order in a sound database.
     void ExpectMessages(int count) const {
         const std::string total = std::to_string(count);
-        EXPECT_EQ(QueryText(db_, "SELECT count(*) || ' ' || sum(msg = 'message ' || (id - 1)) FROM logs"),
+        EXPECT_EQ(RunSql(db_, "SELECT count(*) || ' ' || sum(msg = 'message ' || (id - 1)) FROM logs"),
                   total + " " + total);
-        EXPECT_EQ(QueryText(db_, "PRAGMA integrity_check"), "ok");
+        EXPECT_EQ(RunSql(db_, "PRAGMA integrity_check"), "ok");
     }
 
     const std::string db_ = root_.File("logs.db");
@@ -38,8 +38,8 @@ TEST_F(Parse, AccountsForEveryLine) {
         "rejected (too long)\n");
     Expect("parse --db logs.db --skip-incomplete in - <in", 0);
     EXPECT_EQ(Rows(), 6);
-    EXPECT_EQ(QueryText(db_, "SELECT host||ip||fac||prio||llevel||tag||utcsec||tzoffset||ldate||ltime||prog||"
-                             "hex(msg) FROM logs WHERE id=2"),
+    EXPECT_EQ(RunSql(db_, "SELECT host||ip||fac||prio||llevel||tag||utcsec||tzoffset||ldate||ltime||prog||"
+                          "hex(msg) FROM logs WHERE id=2"),
               "nas127.0.0.1local0infoinfotag100+08:002020/01/0210:11:12progFF00");
 }
 

@@ -163,7 +163,7 @@ TEST_F(Refusals, NameTheFileThatCannotBeUsed) {
         {"parse -o csv in >/dev/full", 4, "No space left on device"},
     });
     close(busy);
-    EXPECT_THAT(QueryText(events_, "SELECT event FROM log ORDER BY id DESC"), testing::EndsWith("archived."))
+    EXPECT_THAT(RunSql(events_, "SELECT event FROM log ORDER BY id DESC"), testing::EndsWith("archived."))
         << "failed ones are recorded";
 }
 

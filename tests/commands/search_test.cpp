@@ -39,7 +39,7 @@ TEST_F(Search, DeletesOnlyWhatWasConfirmed) {
     Expect("delete -p debug..debug", 2);
     Expect("count", 0, "25000\n");
     Expect("delete -p debug..debug --yes", 0, "deleted" + debug);
-    EXPECT_EQ(QueryText(logs_, "SELECT count(*) || ' ' || sum(llevel = 'debug') FROM logs"), "21875 0");
+    EXPECT_EQ(RunSql(logs_, "SELECT count(*) || ' ' || sum(llevel = 'debug') FROM logs"), "21875 0");
     Expect("delete -p debug..debug --yes", 1);
     Expect("delete --all --yes", 0);
     Expect("count", 1);

@@ -49,13 +49,13 @@ TEST(Readfileinreverse, GivesLinesFromTheLast) {
 }
 
 TEST(Readfileinreverse, ReportsAStreamThatCannotSeek) {
-    const SyslogCapture capture;
+    SyslogCapture capture;
     int ends[2];
     ASSERT_EQ(pipe(ends), 0);
     ReadReversed(fdopen(ends[0], "r"), 0, 3, -1);
     close(ends[1]);
-    EXPECT_EQ(capture.Messages().at(0).priority, LOG_ERR);
-    EXPECT_THAT(capture.Texts(), ElementsAre(MatchesRegex("utils:[0-9]+ fseek failed\\. Illegal seek")));
+    EXPECT_THAT(capture.Take(),
+                ElementsAre(Pair(LOG_ERR, MatchesRegex("utils:[0-9]+ fseek failed\\. Illegal seek"))));
 }
 
 } // namespace

@@ -1,9 +1,6 @@
 #pragma once
 
 #include "kelosyslog/dbhandler.h"
-#include "support/notify_calls.h"
-#include "support/source_dir.h"
-#include "support/system_calls.h"
 #include "support/test.h"
 
 namespace kelo::test {
@@ -11,10 +8,6 @@ namespace kelo::test {
 // A handler on a file below a root of its own. The file is there only where a test creates it.
 class DbTest : public LibraryTest {
 protected:
-    DbTest() {
-        NotifyCalls::Reset();
-        SystemCalls::Reset();
-    }
     ~DbTest() override { db_.DBDiscon(); }
 
     // An archive with `logs` sample logs, and the handler connected to it.
@@ -23,22 +16,6 @@ protected:
         InsertSampleLogs(path_, logs);
         ASSERT_EQ(db_.DBCon(), 0);
         PlatformCalls::Reset();
-    }
-
-    // The messages since the last call.
-    std::vector<SyslogMessage> Messages() {
-        const std::vector<SyslogMessage> messages = log_.Messages();
-        log_.Clear();
-        return messages;
-    }
-    // "function argument" of the calls of these functions, in order.
-    static std::vector<std::string> Calls(const std::set<std::string> &functions) {
-        std::vector<std::string> calls;
-        for (const PlatformCall &call : PlatformCalls::Recorded()) {
-            if (functions.contains(call.function))
-                calls.push_back(call.function + " " + call.text);
-        }
-        return calls;
     }
 
     const std::string path_ = root_.File("logs.db");

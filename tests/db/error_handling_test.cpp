@@ -1,7 +1,6 @@
-#include <dlfcn.h>
-
 #include "db/db_fixture.h"
 #include "kelosyslog/notification.h"
+#include "support/doubles.h"
 
 namespace {
 
@@ -10,8 +9,7 @@ int injectedCode = 0; // 0 for SQLite's own
 } // namespace
 
 extern "C" int sqlite3_errcode(sqlite3 *db) {
-    static const auto real =
-        reinterpret_cast<decltype(&sqlite3_errcode)>(dlsym(RTLD_NEXT, "sqlite3_errcode"));
+    static const auto real = kelo::test::Real<&sqlite3_errcode>("sqlite3_errcode");
     return injectedCode != 0 ? injectedCode : real(db);
 }
 
@@ -47,15 +45,15 @@ TEST_F(DBErrorHandle, ChoosesThePriorityByTheErrorCode) {
         RunSql(path_, c.hasLogs ? "CREATE TABLE IF NOT EXISTS logs (id)" : "DROP TABLE IF EXISTS logs");
         injectedCode = c.code;
         EXPECT_EQ(db_.DBExecute(sql), -1);
-        const auto messages = Messages();
+        const auto messages = log_.Take();
         ASSERT_EQ(messages.size(), 1u);
-        EXPECT_EQ(messages[0].priority, c.isError ? Error("").priority : Info("").priority);
-        EXPECT_EQ(WithoutLine(messages[0].text), "Fail to execute SQL command: " + sql +
-                                                     ", error code is : " + std::to_string(c.code) +
-                                                     ", error cause: no such table: gone");
+        EXPECT_EQ(messages[0].first, c.isError ? Error("").first : Info("").first);
+        EXPECT_EQ(WithoutLine(messages[0].second), "Fail to execute SQL command: " + sql +
+                                                       ", error code is : " + std::to_string(c.code) +
+                                                       ", error cause: no such table: gone");
     }
     EXPECT_TRUE(fs::exists(path_));
-    EXPECT_THAT(NotifyCalls::Sent(), IsEmpty());
+    EXPECT_THAT(PlatformCalls::Sent(), IsEmpty());
 }
 
 TEST_F(DBErrorHandle, EndsWhenItsOwnQuestionFails) {
@@ -63,18 +61,18 @@ TEST_F(DBErrorHandle, EndsWhenItsOwnQuestionFails) {
     injectedCode = SQLITE_ERROR;
     PlatformCalls::FailFrom(1);
     EXPECT_EQ(db_.DBExecute("SELECT 1"), -1);
-    const auto messages = Messages();
+    const auto messages = log_.Take();
     ASSERT_EQ(messages.size(), 3u); // the question, its report, the statement
-    EXPECT_EQ(messages[2].priority, Error("").priority);
-    EXPECT_EQ(WithoutLine(messages[2].text).rfind("Fail to execute SQL command: SELECT 1,", 0), 0u);
-    EXPECT_EQ(PlatformCalls::Statements().size(), 2u);
+    EXPECT_EQ(messages[2].first, Error("").first);
+    EXPECT_EQ(WithoutLine(messages[2].second).rfind("Fail to execute SQL command: SELECT 1,", 0), 0u);
+    EXPECT_EQ(PlatformCalls::Texts().size(), 2u);
 }
 
 TEST_F(DBErrorHandle, EndsTheQuarantineWhenTheFileCannotBeRenamed) {
     WriteFile(path_, "damaged");
     fs::create_directory(path_ + ".corrupt");
     EXPECT_EQ(DBErrorHandle_SQLITE_CORRUPT(nullptr, path_), -1);
-    EXPECT_THAT(Calls({"KELOSystemdReload"}), IsEmpty());
+    EXPECT_THAT(PlatformCalls::Texts({"KELOSystemdReload"}), IsEmpty());
 }
 
 } // namespace

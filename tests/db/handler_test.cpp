@@ -2,7 +2,6 @@
 
 #include "db/db_fixture.h"
 #include "keloplatform/kelodb.h"
-#include "support/source_dir.h"
 
 namespace kelo::test {
 namespace {
@@ -18,8 +17,8 @@ TEST_F(DBHandlerTest, LeavesAUsableFileWhenTheDiskTakesNoMore) {
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &tight), 0);
     EXPECT_EQ(db_.DBCon(), -1);
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &before), 0);
-    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to create database: " + path_ + "," + kSchema),
-                                        Error("Fail to create database: " + path_)));
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to create database: " + path_ + "," + kSchema),
+                                         Error("Fail to create database: " + path_)));
     ASSERT_EQ(db_.DBCon(), 0);
     EXPECT_EQ(db_.DBExecute("CREATE TABLE IF NOT EXISTS logs (id)"), 0);
 }
@@ -28,12 +27,12 @@ TEST_F(DBHandlerTest, ConnectsOnceAtATimeAndAgainAfterwards) {
     Connect();
     EXPECT_EQ(db_.DBCon(), -1);
     EXPECT_TRUE(db_.isConnected());
-    EXPECT_THAT(Messages(), ElementsAre(Error("Connection is already existed")));
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("Connection is already existed")));
     EXPECT_EQ(db_.DBDiscon(), 0);
     EXPECT_FALSE(db_.isConnected());
     EXPECT_EQ(db_.DBDiscon(), 0);
     EXPECT_EQ(db_.DBCon(), 0);
-    EXPECT_THAT(Calls({"KELOFSMkdirP", "TORVCExec"}), IsEmpty());
+    EXPECT_THAT(PlatformCalls::Texts({"KELOFSMkdirP", "TORVCExec"}), IsEmpty());
 }
 
 TEST_F(DBHandlerTest, HandsTheResultToTheCallbackWhateverItReturns) {
@@ -43,9 +42,9 @@ TEST_F(DBHandlerTest, HandsTheResultToTheCallbackWhateverItReturns) {
     };
     std::vector<int> rows;
     EXPECT_EQ(db_.DBExecute("SELECT 1", keep, &rows), -1);
-    EXPECT_THAT(Messages(), ElementsAre(Error("DB is not connected")));
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("DB is not connected")));
     EXPECT_EQ(db_.DBExecute("SELECT 1"), -1);
-    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_THAT(log_.Take(), IsEmpty());
     Connect(3);
     EXPECT_EQ(db_.DBExecute("SELECT * FROM logs", keep, &rows), 0);
     EXPECT_EQ(db_.DBExecute("DELETE FROM logs WHERE id = 1", keep, &rows), 0);
@@ -86,12 +85,12 @@ TEST_F(DBHandlerTest, KeepsTheStateOfItsTransaction) {
         PlatformCalls::FailFrom(step.fails ? 1 : 1000, 1);
         EXPECT_EQ((db_.*step.run)(), step.result);
         EXPECT_EQ(db_.isInTran(), step.flag);
-        const auto messages = Messages();
+        const auto messages = log_.Take();
         EXPECT_EQ(messages,
                   step.message.empty() ? decltype(messages)() : decltype(messages){Error(step.message)});
     }
-    EXPECT_THAT(PlatformCalls::Statements(), ElementsAre("BEGIN;", "BEGIN;", "END;", "ROLLBACK;", "END;",
-                                                         "BEGIN;", "ROLLBACK;", "BEGIN;"));
+    EXPECT_THAT(PlatformCalls::Texts(), ElementsAre("BEGIN;", "BEGIN;", "END;", "ROLLBACK;", "END;", "BEGIN;",
+                                                    "ROLLBACK;", "BEGIN;"));
     db_.DBDiscon();
     EXPECT_EQ(db_.isInTran(), 1) << "only the three operations change it";
 }
@@ -99,10 +98,10 @@ TEST_F(DBHandlerTest, KeepsTheStateOfItsTransaction) {
 TEST_F(DBHandlerTest, EscapesChecksTablesAndCheckpoints) {
     Connect();
     EXPECT_EQ(db_.DBCmdEscape(std::string("a\0b", 3)), "");
-    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to escapse string")));
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to escapse string")));
     EXPECT_FALSE(db_.DBcheckTableExist("it's"));
-    EXPECT_EQ(Messages().back(), Error("Fail to execute SQL command : SELECT count(*) as count_result FROM "
-                                       "sqlite_master WHERE type='table' AND name='it's'"));
+    EXPECT_EQ(log_.Take().back(), Error("Fail to execute SQL command : SELECT count(*) as count_result FROM "
+                                        "sqlite_master WHERE type='table' AND name='it's'"));
 
     InsertLogsIntoWal(path_, {SampleLog(1)});
     EXPECT_EQ(db_.DBWalCheckpoint(false), 0);
@@ -110,12 +109,12 @@ TEST_F(DBHandlerTest, EscapesChecksTablesAndCheckpoints) {
     PlatformCalls::FailFrom(1, 1);
     EXPECT_EQ(db_.DBWalCheckpoint(true), -1);
     EXPECT_TRUE(fs::exists(path_ + "-wal"));
-    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to force WAL checkpoint(FULL)")));
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to force WAL checkpoint(FULL)")));
     for (int i = 0; i < 2; ++i) // the second time there is nothing to remove
         EXPECT_EQ(db_.DBWalCheckpoint(true), 0);
     EXPECT_FALSE(fs::exists(path_ + "-wal") || fs::exists(path_ + "-shm"));
     db_.DBDiscon();
-    EXPECT_EQ(QueryText(path_, "SELECT count(*) FROM logs"), "1");
+    EXPECT_EQ(RunSql(path_, "SELECT count(*) FROM logs"), "1");
     EXPECT_EQ(db_.DBWalCheckpoint(false), -1);
 }
 

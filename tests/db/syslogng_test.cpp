@@ -6,19 +6,18 @@ namespace {
 using Syslogng = DbTest;
 
 TEST_F(Syslogng, HangsUpThePackagesServiceWhereThePackageIsEnabled) {
-    SystemCalls::AnswerReloadWith(false);
+    PlatformCalls::answers.reload = false;
     EXPECT_EQ(SyslogngHupSignalSend(), -1);
-    EXPECT_THAT(Messages(), ElementsAre(Error("Fail to send HUP signal to syslog-ng")));
-    Write("/var/packages/Quillbay/enabled", "");
-    SystemCalls::AnswerReloadWith(true);
+    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to send HUP signal to syslog-ng")));
+    WriteFile(root_.File("var/packages/Quillbay/enabled"), "");
+    PlatformCalls::answers.reload = true;
     EXPECT_EQ(SyslogngHupSignalSend(), 0);
-    EXPECT_THAT(Calls({"KELOSystemdReload"}),
-                ElementsAre("KELOSystemdReload syslog-ng", "KELOSystemdReload pkg-Quillbay-syslog"));
-    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_THAT(PlatformCalls::Texts({"KELOSystemdReload"}), ElementsAre("syslog-ng", "pkg-Quillbay-syslog"));
+    EXPECT_THAT(log_.Take(), IsEmpty());
 }
 
 TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {
-    SystemCalls::AnswerReloadWith(false); // is ignored
+    PlatformCalls::answers.reload = false; // is ignored
     const struct {
         uintmax_t bytes;
         int32_t limit;
@@ -40,7 +39,7 @@ TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {
             EXPECT_EQ(SyslogngWorkingDbCheck(path_, c.limit), 0);
             EXPECT_EQ(fs::exists(fs::symlink_status(path_)), c.isKept);
             EXPECT_TRUE(!isLink || fs::exists(target)) << "only the link goes";
-            EXPECT_EQ(Calls({"KELOSystemdReload"}).size(), c.isKept ? 0u : 1u);
+            EXPECT_EQ(PlatformCalls::Texts({"KELOSystemdReload"}).size(), c.isKept ? 0u : 1u);
         }
     }
     EXPECT_TRUE(fs::exists(path_ + "-wal"));

@@ -27,13 +27,13 @@ TEST_F(Enumeration, GivesPagesNewestFirstAndNothingWhereItFails) {
     };
     for (const auto &[offset, limit, ids] : cases)
         EXPECT_EQ(Ids(offset, limit), ids) << limit << " after " << offset;
-    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_THAT(TakeTexts(), IsEmpty());
     EXPECT_EQ(Ids(0, -1), "");
-    EXPECT_THAT(Messages(), ElementsAre("Fail to execute SQL command SELECT * FROM log ORDER BY time DESC "
-                                        "LIMIT 18446744073709551615 OFFSET 0"));
+    EXPECT_THAT(TakeTexts(), ElementsAre("Fail to execute SQL command SELECT * FROM log ORDER BY time DESC "
+                                         "LIMIT 18446744073709551615 OFFSET 0"));
     PlatformCalls::FailFrom(1, 1);
     EXPECT_EQ(Ids(0, 0), "");
-    EXPECT_THAT(Messages(), ElementsAre("Fail to open db: " + db_, "Fail to connect db"));
+    EXPECT_THAT(TakeTexts(), ElementsAre("Fail to open db: " + db_, "Fail to connect db"));
     PlatformCalls::FailFrom(5, 1);
     EXPECT_EQ(Ids(0, 0), "6 5 ") << "the rows up to one that cannot be fetched";
 }

@@ -1,7 +1,6 @@
 #pragma once
 
 #include "kelosyslog/logger.h"
-#include "support/source_dir.h"
 #include "support/test.h"
 
 namespace kelo::test {
@@ -11,7 +10,7 @@ using Lines = std::vector<std::string>;
 // A root with the shipped schema in it.
 class EventTest : public LibraryTest {
 protected:
-    EventTest() { Write("/usr/kelo/syslog/schema/kelosyslog.sql", schema_); }
+    EventTest() { WriteFile(root_.File("usr/kelo/syslog/schema/kelosyslog.sql"), schema_); }
 
     // Creates the server's database with `rows` events at the times 1000, 1001, 1002, ...
     void CreateEvents(int rows) const {
@@ -21,7 +20,7 @@ protected:
                         std::to_string(rows) +
                         ") INSERT INTO log SELECT NULL, 0, 1000 + i, 'SYSTEM', 'event ' || i FROM n");
     }
-    std::string Query(const std::string &sql) const { return QueryText(db_, sql); }
+    std::string Query(const std::string &sql) const { return RunSql(db_, sql); }
     std::string Rows() const { return Query("SELECT count(*) FROM log"); }
 
     const std::string schema_ = ReadFile(BuildPath("package/schema/kelosyslog.sql"));

@@ -42,14 +42,14 @@ TEST_F(LoggerTest, ReportsEachFailingStepAndKeepsTheEventOnceItIsIn) {
         std::vector<testing::Matcher<std::string>> expected;
         for (const std::string &message : messages)
             expected.push_back(StartsWith(message));
-        EXPECT_THAT(Messages(), testing::ElementsAreArray(expected)) << step;
+        EXPECT_THAT(TakeTexts(), testing::ElementsAreArray(expected)) << step;
         rows += result == 0;
         EXPECT_EQ(Rows(), std::to_string(rows)) << step;
-        EXPECT_EQ(PlatformCalls::OpenConnections(), 0) << step;
+        EXPECT_EQ(PlatformCalls::OpenHandles(), 0) << step;
     }
     PlatformCalls::FailFrom(1, 1);
     EXPECT_EQ(logger_.LogAddVolFull(), -1);
-    EXPECT_EQ(Messages().back(), "Fail to add log");
+    EXPECT_EQ(TakeTexts().back(), "Fail to add log");
 }
 
 TEST_F(LoggerTest, RotatesAbove19999RowsAndRemovesOnlyEventsWithoutATime) {
@@ -60,19 +60,19 @@ TEST_F(LoggerTest, RotatesAbove19999RowsAndRemovesOnlyEventsWithoutATime) {
     for (const auto &[rows, rotates] : cases) {
         PlatformCalls::Reset();
         EXPECT_EQ(logger_.LogAdd(db_, 0, "SYSTEM", "new"), 0);
-        EXPECT_EQ(testing::Value(PlatformCalls::Statements(), Contains("VACUUM")), rotates) << rows;
+        EXPECT_EQ(testing::Value(PlatformCalls::Texts(), Contains("VACUUM")), rotates) << rows;
         EXPECT_EQ(Rows(), rows);
     }
     EXPECT_EQ(Query("PRAGMA freelist_count"), "0");
-    EXPECT_THAT(Messages(), IsEmpty());
+    EXPECT_THAT(TakeTexts(), IsEmpty());
 }
 
 TEST_F(LoggerTest, AnswersZeroToAClearingWithoutItsEvent) {
     CreateEvents(1);
     PlatformCalls::FailFrom(1, 1);
     EXPECT_EQ(logger_.LogClear(root_.File("none.db"), "ann"), 0);
-    EXPECT_THAT(Messages(), ElementsAre("Fail to open db: " + db_, "Fail to connect db", "Fail to add log",
-                                        "logger:638 Fail to add log [Log was cleared.]"));
+    EXPECT_THAT(TakeTexts(), ElementsAre("Fail to open db: " + db_, "Fail to connect db", "Fail to add log",
+                                         "logger:638 Fail to add log [Log was cleared.]"));
 }
 
 // Adds events "0", "1", ... until `count` are in, and writes each number to `acknowledged` once it is.

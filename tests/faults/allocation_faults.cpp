@@ -1,9 +1,9 @@
 #include "faults/allocation_faults.h"
 
 #include <cerrno>
-#include <cstdlib>
+#include <cstddef>
 
-#include "support/fault_pause.h"
+#include "support/doubles.h"
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 #define KELO_OWN_ALLOCATOR 0
@@ -13,62 +13,34 @@
 #define KELO_OWN_ALLOCATOR 1
 #endif
 
-namespace kelo::test {
+using kelo::test::FaultPause;
+
 namespace {
 
-struct State {
-    int failFirst = 0;
-    int failTimes = 0; // 0 while nothing is to fail
-    int count = 0;
-    bool hasFailed = false;
-    int liveBlocks = 0;
-};
-constinit thread_local State state;
+constinit thread_local kelo::test::NthCall failing;
+constinit thread_local int liveBlocks = 0;
 
 } // namespace
+
+namespace kelo::test {
 
 bool AllocationFaults::IsSupported() {
     return KELO_OWN_ALLOCATOR;
 }
-
 void AllocationFaults::Start(int first, int times) {
-    state = {first, times, 0, false, state.liveBlocks};
+    failing = {first, times};
 }
-
 bool AllocationFaults::Stop() {
-    state.failTimes = 0;
-    return state.hasFailed;
+    failing.times = 0;
+    return failing.hasFailed;
 }
-
 int AllocationFaults::LiveBlocks() {
-    return state.liveBlocks;
+    return liveBlocks;
 }
 
 } // namespace kelo::test
 
 #if KELO_OWN_ALLOCATOR
-using namespace kelo::test;
-
-namespace {
-
-// Counts an allocation; whether it must fail.
-bool MustFail() {
-    if (state.failTimes == 0 || FaultPause::IsActive())
-        return false;
-    const int past = ++state.count - state.failFirst;
-    if (past < 0 || past >= state.failTimes)
-        return false;
-    state.hasFailed = true;
-    errno = ENOMEM;
-    return true;
-}
-
-void *Counted(void *block) {
-    state.liveBlocks += block != nullptr && !FaultPause::IsActive();
-    return block;
-}
-
-} // namespace
 
 extern "C" {
 
@@ -77,6 +49,18 @@ void *__libc_calloc(size_t count, size_t size);
 void *__libc_realloc(void *block, size_t size);
 void *__libc_memalign(size_t alignment, size_t size);
 void __libc_free(void *block);
+
+static bool MustFail() {
+    const bool fails = !FaultPause::IsActive() && failing.MustFail();
+    if (fails)
+        errno = ENOMEM;
+    return fails;
+}
+
+static void *Counted(void *block) {
+    liveBlocks += block != nullptr && !FaultPause::IsActive();
+    return block;
+}
 
 void *malloc(size_t size) {
     return MustFail() ? nullptr : Counted(__libc_malloc(size));
@@ -98,7 +82,7 @@ void *aligned_alloc(size_t alignment, size_t size) {
 }
 
 void free(void *block) {
-    state.liveBlocks -= block != nullptr && !FaultPause::IsActive();
+    liveBlocks -= block != nullptr && !FaultPause::IsActive();
     __libc_free(block);
 }
 

@@ -5,9 +5,7 @@
 
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/dbutil.h"
-#include "support/notify_calls.h"
 #include "support/short_lock_waits.h"
-#include "support/system_calls.h"
 #include "support/test.h"
 
 namespace kelo::test {
@@ -18,19 +16,6 @@ const std::list<_SYSLOG_SQL_COND_tag> kFromHost3 = {{SYSLOG_ATTRI_HOST, SYSLOG_O
 int CountRow(_SYSLOG_LOG_DATA_tag &, void *context) {
     ++*static_cast<int *>(context);
     return 0;
-}
-
-std::string RandomBytes(size_t count) {
-    std::mt19937 random(1);
-    std::string bytes(count, '\0');
-    for (char &byte : bytes)
-        byte = static_cast<char>(random());
-    return bytes;
-}
-
-void ExpectNothingOpen() {
-    EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
-    EXPECT_EQ(PlatformCalls::OpenResults(), 0);
 }
 
 // A database in one file, without a write-ahead log.
@@ -46,7 +31,7 @@ TEST(BadDatabase, IsNotFoundByAPathThatOnlyBeginsWithItsName) {
     const std::string path = root.File("logs.db") + std::string("\0.old", 5);
     EXPECT_EQ(SyslogDBSelectCount(path, {}, nullptr, nullptr), -1);
     EXPECT_EQ(SyslogDBDelete(path, {}), -1);
-    EXPECT_EQ(QueryText(root.File("logs.db"), "SELECT count(*) FROM logs"), "200");
+    EXPECT_EQ(RunSql(root.File("logs.db"), "SELECT count(*) FROM logs"), "200");
 }
 
 TEST(LockedDatabase, FailsAfterWaiting) {
@@ -68,8 +53,8 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     EXPECT_EQ(waits.TakeCount(), 0);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
     EXPECT_EQ(waits.TakeCount(), 1);
-    ExpectNothingOpen();
-    EXPECT_EQ(QueryText(path, "SELECT count(*) FROM logs"), "200");
+    EXPECT_EQ(PlatformCalls::OpenHandles(), 0);
+    EXPECT_EQ(RunSql(path, "SELECT count(*) FROM logs"), "200");
 }
 
 // Flips bits, overwrites, swaps and cuts: where it hits is up to `random`.
@@ -89,7 +74,8 @@ std::string Damaged(std::string content, std::mt19937 &random) {
             content[below(600)] = static_cast<char>(random());
         break;
     case 2: // the header of a page, where its cells are listed
-        content.replace(page(), 16, RandomBytes(16));
+        for (size_t at = page(), end = at + 16; at < end; ++at)
+            content[at] = static_cast<char>(random());
         break;
     case 3:
         content.replace(page(), kPage, content.substr(page(), kPage));
@@ -106,7 +92,7 @@ bool HandleErrors(const std::string &path) {
     if (db.DBCon() != 0)
         return false;
     _ARCH_DB_INFO_tag info;
-    const size_t quarantines = NotifyCalls::Sent().size();
+    const size_t quarantines = PlatformCalls::Sent().size();
     const int64_t count = db.DBLogCountGet();
     const int status = db.DBExecute("SELECT * FROM logs ORDER BY msg") |
                        db.DBExecute("UPDATE logs SET msg = 'x' WHERE id % 7 = 0") | db.DBTranStart() |
@@ -114,14 +100,13 @@ bool HandleErrors(const std::string &path) {
     db.DBInfoGet(info);
     db.DBLogStartTimeGet();
     db.DBDiscon();
-    EXPECT_EQ(fs::exists(path), NotifyCalls::Sent().size() == quarantines);
+    EXPECT_EQ(fs::exists(path), PlatformCalls::Sent().size() == quarantines);
     return count >= 0 && status == 0;
 }
 
 TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
     const ShortLockWaits waits;
-    NotifyCalls::Reset();
-    SystemCalls::Reset();
+    PlatformCalls::Start();
     const TempRoot root;
     const std::string path = root.File("logs.db");
     CreateSingleFile(path);
@@ -150,7 +135,7 @@ TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
         const bool isHandled = HandleErrors(path);
         failures += select == -1 || deletion == -1 || !isHandled;
         EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(1));
-        ExpectNothingOpen();
+        EXPECT_EQ(PlatformCalls::OpenHandles(), 0);
         for (const auto &file : fs::directory_iterator(root.Path()))
             ASSERT_TRUE(file.path().string().starts_with(path)) << file;
     }

@@ -7,42 +7,38 @@
 #include <cstdio>
 #include <set>
 
-#include "support/fault_pause.h"
-#include "support/real_function.h"
+#include "support/doubles.h"
 
 namespace kelo::test {
 namespace {
 
 struct State {
     FileFaults::Kind kind = FileFaults::Kind::kWrite;
-    int failFirst = 0;
-    int failTimes = 0; // 0 while nothing is to fail
-    int count = 0;
-    bool hasFailed = false;
+    NthCall failing;
     std::set<ino_t> unsynced;
 };
 State state;
 
 bool MustFail(bool isRead) {
-    if (state.failTimes == 0 || isRead != (state.kind == FileFaults::Kind::kRead))
+    if (isRead != (state.kind == FileFaults::Kind::kRead) || !state.failing.MustFail())
         return false;
-    const int past = ++state.count - state.failFirst;
-    if (past < 0 || past >= state.failTimes)
-        return false;
-    state.hasFailed = true;
     errno = state.kind == FileFaults::Kind::kFull ? ENOSPC : EIO;
     return true;
+}
+
+ino_t Inode(int fd) {
+    struct stat file {};
+    fstat(fd, &file);
+    return file.st_ino;
 }
 
 // How much of `size` bytes is written at once; the file then has to be synced.
 size_t Share(int fd, size_t size) {
     // SQLite makes room for shared memory by single bytes, which need not reach the disk.
-    if (state.failTimes == 0 || size <= 1)
+    if (state.failing.times == 0 || size <= 1)
         return size;
     const FaultPause pause;
-    struct stat file;
-    if (fstat(fd, &file) == 0)
-        state.unsynced.insert(file.st_ino);
+    state.unsynced.insert(Inode(fd));
     return size / 2;
 }
 
@@ -50,21 +46,19 @@ int Sync(int fd) {
     if (MustFail(false))
         return -1;
     const FaultPause pause;
-    struct stat file;
-    if (fstat(fd, &file) == 0)
-        state.unsynced.erase(file.st_ino);
+    state.unsynced.erase(Inode(fd));
     return 0;
 }
 
 } // namespace
 
 void FileFaults::Start(Kind kind, int first, int times) {
-    state = {kind, first, times, 0, false, {}};
+    state = {kind, {first, times}, {}};
 }
 
 bool FileFaults::Stop() {
-    state.failTimes = 0;
-    return state.hasFailed;
+    state.failing.times = 0;
+    return state.failing.hasFailed;
 }
 
 bool FileFaults::HasUnsynced() {
@@ -80,31 +74,27 @@ bool FileFaults::IsUnsynced(const std::string &path) {
 
 using namespace kelo::test;
 
+#define KELO_OR_FAIL(isRead, name, ...) (MustFail(isRead) ? -1 : Real<&name>(#name)(__VA_ARGS__))
+
 extern "C" {
 
 ssize_t read(int fd, void *data, size_t size) {
-    static const auto real = Real<&read>("read");
-    return MustFail(true) ? -1 : real(fd, data, size);
+    return KELO_OR_FAIL(true, read, fd, data, size);
 }
 ssize_t pread64(int fd, void *data, size_t size, off64_t offset) {
-    static const auto real = Real<&pread64>("pread64");
-    return MustFail(true) ? -1 : real(fd, data, size, offset);
+    return KELO_OR_FAIL(true, pread64, fd, data, size, offset);
 }
 ssize_t write(int fd, const void *data, size_t size) {
-    static const auto real = Real<&write>("write");
-    return MustFail(false) ? -1 : real(fd, data, Share(fd, size));
+    return KELO_OR_FAIL(false, write, fd, data, Share(fd, size));
 }
 ssize_t pwrite64(int fd, const void *data, size_t size, off64_t offset) {
-    static const auto real = Real<&pwrite64>("pwrite64");
-    return MustFail(false) ? -1 : real(fd, data, Share(fd, size), offset);
+    return KELO_OR_FAIL(false, pwrite64, fd, data, Share(fd, size), offset);
 }
 int ftruncate64(int fd, off64_t size) noexcept {
-    static const auto real = Real<&ftruncate64>("ftruncate64");
-    return MustFail(false) ? -1 : real(fd, size);
+    return KELO_OR_FAIL(false, ftruncate64, fd, size);
 }
 int fchmod(int fd, mode_t mode) noexcept {
-    static const auto real = Real<&fchmod>("fchmod");
-    return MustFail(false) ? -1 : real(fd, mode);
+    return KELO_OR_FAIL(false, fchmod, fd, mode);
 }
 int fsync(int fd) {
     return Sync(fd);
@@ -113,11 +103,7 @@ int fdatasync(int fd) {
     return Sync(fd);
 }
 int renameat(int oldFolder, const char *oldName, int newFolder, const char *newName) noexcept {
-    static const auto real = Real<&renameat>("renameat");
-    if (MustFail(false))
-        return -1;
-    Share(newFolder, 2);
-    return real(oldFolder, oldName, newFolder, newName);
+    return KELO_OR_FAIL(false, renameat, oldFolder, oldName, (Share(newFolder, 2), newFolder), newName);
 }
 
 } // extern "C"

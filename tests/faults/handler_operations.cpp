@@ -3,11 +3,6 @@
 #include "faults/operations.h"
 #include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
-#include "kelosyslog/root.h"
-#include "support/fault_pause.h"
-#include "support/notify_calls.h"
-#include "support/source_dir.h"
-#include "support/system_calls.h"
 
 namespace kelo::test {
 namespace {
@@ -16,8 +11,8 @@ const std::string kSchema = BuildPath("package/schema/archive.sql");
 
 // A handler whose owner disconnects on every way out, as the handler asks for.
 struct Connected {
-    explicit Connected(const Fixture &ground)
-        : db(ground.root.File("logs.db"), kSchema), status(db.DBCon()) {}
+    explicit Connected(const Fixture &fixture)
+        : db(fixture.root.File("logs.db"), kSchema), status(db.DBCon()) {}
     ~Connected() { db.DBDiscon(); }
     Connected(const Connected &) = delete;
     Connected &operator=(const Connected &) = delete;
@@ -26,25 +21,22 @@ struct Connected {
     int status;
 };
 
-void SetUpArchive(Fixture &ground) {
-    NotifyCalls::Reset();
-    SystemCalls::Reset();
-    SyslogRootSet(ground.root.Path());
-    CreateLogDatabase(ground.root.File("logs.db"), "archive.sql");
-    InsertSampleLogs(ground.root.File("logs.db"), 10);
+void SetUpArchive(Fixture &fixture) {
+    CreateLogDatabase(fixture.root.File("logs.db"), "archive.sql");
+    InsertSampleLogs(fixture.root.File("logs.db"), 10);
 }
 
 // Where the database is. SQLite takes some failing reads for damage, which puts it aside.
-std::string SoundDatabase(const Fixture &ground, const Outcome &outcome) {
-    const std::string path = ground.root.File("logs.db");
+std::string SoundDatabase(const Fixture &fixture, const Outcome &outcome) {
+    const std::string path = fixture.root.File("logs.db");
     const std::string found = outcome.fault == "read" && !fs::exists(path) ? path + ".corrupt" : path;
     EXPECT_TRUE(fs::exists(found));
-    EXPECT_EQ(QueryText(found, "PRAGMA integrity_check"), "ok");
+    EXPECT_EQ(RunSql(found, "PRAGMA integrity_check"), "ok");
     return found;
 }
 
-int Change(Fixture &ground) {
-    Connected connected(ground);
+int Change(Fixture &fixture) {
+    Connected connected(fixture);
     DBHandler &db = connected.db;
     if (connected.status != 0 || db.DBTranStart() != 0)
         return -1;
@@ -57,9 +49,9 @@ int Change(Fixture &ground) {
     return db.DBWalCheckpoint(false);
 }
 
-void CheckChange(const Fixture &ground, const Outcome &outcome) {
+void CheckChange(const Fixture &fixture, const Outcome &outcome) {
     const std::string row =
-        QueryText(SoundDatabase(ground, outcome), "SELECT device || start_time FROM db_info");
+        RunSql(SoundDatabase(fixture, outcome), "SELECT device || start_time FROM db_info");
     if (outcome.IsDone())
         EXPECT_EQ(row, "it's7");
     else
@@ -67,19 +59,13 @@ void CheckChange(const Fixture &ground, const Outcome &outcome) {
     EXPECT_TRUE(outcome.IsDone() || outcome.outOfMemory || !outcome.messages.empty());
 }
 
-void SetUpNothing(Fixture &ground) {
-    NotifyCalls::Reset();
-    SystemCalls::Reset();
-    SyslogRootSet(ground.root.Path());
-}
-
-int Create(Fixture &ground) {
-    return DBHandler(ground.root.File("logs.db"), kSchema).DBCreate();
+int Create(Fixture &fixture) {
+    return DBHandler(fixture.root.File("logs.db"), kSchema).DBCreate();
 }
 
 // Without write-ahead logging it is done too, and says so.
-void CheckCreation(const Fixture &ground, const Outcome &outcome) {
-    const std::string path = ground.root.File("logs.db");
+void CheckCreation(const Fixture &fixture, const Outcome &outcome) {
+    const std::string path = fixture.root.File("logs.db");
     const auto hasLine = [&](const std::string &text) {
         return testing::Value(outcome.messages, Contains(HasSubstr(text)));
     };
@@ -87,35 +73,30 @@ void CheckCreation(const Fixture &ground, const Outcome &outcome) {
         EXPECT_TRUE(outcome.outOfMemory || hasLine("Fail to create"));
         return;
     }
-    EXPECT_EQ(QueryText(path, "SELECT count(*) FROM db_info"), "1");
-    EXPECT_EQ(QueryText(path, "PRAGMA journal_mode"), hasLine("Fail to set jounal mode") ? "delete" : "wal");
+    EXPECT_EQ(RunSql(path, "SELECT count(*) FROM db_info"), "1");
+    EXPECT_EQ(RunSql(path, "PRAGMA journal_mode"), hasLine("Fail to set jounal mode") ? "delete" : "wal");
 }
 
-void SetUpDamaged(Fixture &ground) {
-    SetUpNothing(ground);
-    WriteFile(ground.root.File("logs.db"), "damaged");
-    WriteFile(ground.root.File("logs.db-wal"), "companion");
-    WriteFile(ground.root.File("logs.db.corrupt"), "an older one");
+void SetUpDamaged(Fixture &fixture) {
+    WriteFile(fixture.root.File("logs.db"), "damaged");
+    WriteFile(fixture.root.File("logs.db-wal"), "companion");
+    WriteFile(fixture.root.File("logs.db.corrupt"), "an older one");
+    PlatformCalls::answers.onReload = [&] { EXPECT_FALSE(fs::exists(fixture.root.File("logs.db"))); };
 }
 
-int Quarantine(Fixture &ground) {
-    {
-        const FaultPause pause;
-        NotifyCalls::Reset();
-        SystemCalls::OnReload([&] { EXPECT_FALSE(fs::exists(ground.root.File("logs.db"))); });
-    }
-    return DBErrorHandle_SQLITE_CORRUPT(nullptr, ground.root.File("logs.db"));
+int Quarantine(Fixture &fixture) {
+    return DBErrorHandle_SQLITE_CORRUPT(nullptr, fixture.root.File("logs.db"));
 }
 
 // The file is moved once, only after the notification was sent, and never lost.
-void CheckQuarantine(const Fixture &ground, const Outcome &outcome) {
-    const bool isMoved = ReadFile(ground.root.File("logs.db.corrupt")) == "damaged";
-    EXPECT_TRUE(fs::exists(ground.root.File("logs.db-wal"))) << "the companions stay";
-    EXPECT_NE(fs::exists(ground.root.File("logs.db")), isMoved);
+void CheckQuarantine(const Fixture &fixture, const Outcome &outcome) {
+    const bool isMoved = ReadFile(fixture.root.File("logs.db.corrupt")) == "damaged";
+    EXPECT_TRUE(fs::exists(fixture.root.File("logs.db-wal"))) << "the companions stay";
+    EXPECT_NE(fs::exists(fixture.root.File("logs.db")), isMoved);
     EXPECT_TRUE(isMoved || !outcome.IsDone());
-    EXPECT_TRUE(!isMoved || NotifyCalls::Sent().size() == 1);
+    EXPECT_TRUE(!isMoved || PlatformCalls::Sent().size() == 1);
     if (outcome.fault.empty()) {
-        EXPECT_EQ(NotifyCalls::Sent().at(0).values.at("%DBPATH%"), ground.root.File("logs.db"));
+        EXPECT_EQ(PlatformCalls::Sent().at(0).values.at("%DBPATH%"), fixture.root.File("logs.db"));
     }
     const auto isTold = [&](const std::string &text) {
         return testing::Value(outcome.messages, Contains(HasSubstr(text)));
@@ -125,7 +106,6 @@ void CheckQuarantine(const Fixture &ground, const Outcome &outcome) {
     } else if (outcome.fault == "KELOSystemdReload") {
         EXPECT_TRUE(isMoved && !outcome.IsDone() && isTold("Fail to send HUP signal to syslog-ng"));
     }
-    EXPECT_EQ(NotifyCalls::OpenHandles(), 0);
 }
 
 } // namespace
@@ -133,7 +113,7 @@ void CheckQuarantine(const Fixture &ground, const Outcome &outcome) {
 std::vector<Operation> HandlerOperations() {
     return {
         {"HandlerChanges", true, SetUpArchive, Change, CheckChange, false},
-        {"HandlerCreates", false, SetUpNothing, Create, CheckCreation, false},
+        {"HandlerCreates", false, [](Fixture &) {}, Create, CheckCreation, false},
         {"HandlerQuarantines", false, SetUpDamaged, Quarantine, CheckQuarantine, false},
     };
 }

@@ -3,12 +3,15 @@
 #include <list>
 
 #include "kelosyslog/dbutil.h"
+#include "support/doubles.h"
 #include "support/test.h"
 
 namespace kelo::test {
 
-// What an operation works on. The files under `root` are put back before every run.
+// What an operation works on. The files under the root are put back before every run.
 struct Fixture {
+    Fixture();
+
     TempRoot root;
     std::string database; // checked for integrity after every run; "" when the operation has none
     std::list<_SYSLOG_SQL_COND_tag> conditions;

@@ -29,7 +29,7 @@ TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
         std::vector<Json::Value> commands(3);
         EXPECT_EQ(CmdParser().CmdParse(input, commands), parses) << text;
         EXPECT_EQ(commands.size(), 3 + values) << text;
-        EXPECT_EQ(log.Messages().size(), parses ? 0U : 1U) << text;
+        EXPECT_EQ(log.Take().size(), parses ? 0U : 1U) << text;
         EXPECT_EQ(input, text);
     }
 }
@@ -42,7 +42,6 @@ TEST(CmdParse, FailsCleanlyOnDeepNesting) {
             text += opening;
         std::vector<Json::Value> commands;
         EXPECT_FALSE(CmdParser().CmdParse(text, commands));
-        ASSERT_EQ(log.Texts().size(), 1U);
-        EXPECT_THAT(log.Texts()[0], testing::StartsWith("Error: parsing error, reason = "));
+        EXPECT_THAT(log.TakeTexts(), ElementsAre(StartsWith("Error: parsing error, reason = ")));
     }
 }

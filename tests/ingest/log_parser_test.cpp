@@ -74,18 +74,40 @@ TEST(ParseSingleEntry, KeepsTheFieldsTakenWhenTheLineEndsEarly) {
         EXPECT_EQ(LogParser().ParseSingleEntry(line, log), -1) << line;
 }
 
-TEST(isValidLog, NamesARecordIncompleteOnceWhicheverFieldIsEmpty) {
+TEST(isValidLog, NamesARecordIncompleteWhicheverOfItsFieldsIsEmpty) {
     using Field = std::string _SYSLOG_LOG_DATA_tag::*;
-    LogParser parser;
+    constexpr Field kFields[] = {&_SYSLOG_LOG_DATA_tag::host,  &_SYSLOG_LOG_DATA_tag::ip,
+                                 &_SYSLOG_LOG_DATA_tag::ldate, &_SYSLOG_LOG_DATA_tag::ltime,
+                                 &_SYSLOG_LOG_DATA_tag::prog,  &_SYSLOG_LOG_DATA_tag::msg};
     SyslogCapture log;
-    _SYSLOG_LOG_DATA_tag bare;
-    for (const Field field :
-         {&_SYSLOG_LOG_DATA_tag::host, &_SYSLOG_LOG_DATA_tag::ip, &_SYSLOG_LOG_DATA_tag::ldate,
-          &_SYSLOG_LOG_DATA_tag::ltime, &_SYSLOG_LOG_DATA_tag::prog, &_SYSLOG_LOG_DATA_tag::msg}) {
-        EXPECT_EQ(parser.isValidLog(bare), 0);
-        bare.*field = "set";
+    _SYSLOG_LOG_DATA_tag record;
+    for (const Field field : kFields)
+        record.*field = "set";
+    EXPECT_EQ(LogParser().isValidLog(record), 1) << "the other fields do not matter";
+    for (const Field field : kFields) {
+        _SYSLOG_LOG_DATA_tag bare = record;
+        (bare.*field).clear();
+        EXPECT_EQ(LogParser().isValidLog(bare), 0);
     }
-    EXPECT_EQ(parser.isValidLog(bare), 1) << "the other fields do not matter";
-    EXPECT_THAT(log.Texts(), testing::Each("Invalid log!!!!!!!!!!!!! (Attention Please)"));
-    EXPECT_EQ(log.Texts().size(), 6U);
+    EXPECT_EQ(log.TakeTexts(), std::vector<std::string>(6, "Invalid log!!!!!!!!!!!!! (Attention Please)"));
+}
+
+TEST(LogStream, DropsOverlongLinesAsAWhole) {
+    const std::string entry = "f info d t 1 2 z h i p t ";
+    const std::string text = entry + std::string(20, 'a') + "\n" + entry + std::string(21, 'b') + "\n" +
+                             entry + "c\n" + entry + std::string(500, 'd');
+    for (const size_t cut : {size_t{1}, size_t{44}, size_t{45}, size_t{46}, size_t{90}, text.size()}) {
+        SyslogCapture log;
+        LogParser parser;
+        LogStream stream(parser, entry.size() + 20);
+        for (size_t at = 0; at < text.size(); at += cut)
+            stream.Add(std::string_view(text).substr(at, cut));
+        stream.Finish();
+        EXPECT_EQ(stream.OverlongCount(), 2U) << cut;
+        const std::list<_SYSLOG_LOG_DATA_tag> records = parser.LogListGet();
+        ASSERT_EQ(records.size(), 2U) << cut;
+        EXPECT_EQ(records.front().msg, std::string(20, 'a'));
+        EXPECT_EQ(records.back().msg, "c");
+        EXPECT_THAT(log.Take(), testing::SizeIs(2));
+    }
 }

@@ -1,26 +1,17 @@
 #pragma once
 
 #include "kelosyslog/notification.h"
-#include "support/notify_calls.h"
 #include "support/test.h"
 
 namespace kelo::test {
 
-// Captures notifications, and checks at the end that no map is left.
+// A root with a rule file and settings.
 class NotifyTest : public LibraryTest {
 protected:
-    NotifyTest() { NotifyCalls::Reset(); }
-    ~NotifyTest() override { EXPECT_EQ(NotifyCalls::OpenHandles(), 0); }
+    void WriteRules(const std::string &content) { WriteFile(rules_, content); }
+    void WriteSettings(const std::string &content) { WriteFile(root_.File("etc/keloinfo.conf"), content); }
 
-    std::string RulePath() const { return root_.File("etc/kelosyslog/notify.conf"); }
-    void WriteRules(const std::string &content) { Write("/etc/kelosyslog/notify.conf", content); }
-    void WriteSettings(const std::string &content) { Write("/etc/keloinfo.conf", content); }
-
-    // A call of the service as the library makes it under this root.
-    SentNotification Sent(const std::string &tag, std::map<std::string, std::string> values) const {
-        return {tag, root_.File("usr/kelo/keloman/webman/modules/Quillbay/texts/"),
-                root_.File("etc/kelosyslog/notify.filter"), std::move(values)};
-    }
+    const std::string rules_ = root_.File("etc/kelosyslog/notify.conf");
 };
 
 // Lines of an enabled rule's section.

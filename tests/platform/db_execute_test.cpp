@@ -11,7 +11,7 @@ protected:
                      "INSERT INTO logs VALUES(1,'a','x'),(2,'b','y;z'),(3,'c','--')");
         connection = ConnectTo(path);
     }
-    std::string Count() const { return QueryText(path, "SELECT count(*) FROM logs"); }
+    std::string Count() const { return RunSql(path, "SELECT count(*) FROM logs"); }
 
     TempRoot root;
     const std::string path = root.File("logs.db");
@@ -30,7 +30,7 @@ TEST_F(Executing, RefusesASecondStatementBeforeAnythingRuns) {
         EXPECT_EQ(SelectLimit(connection, sql, 1, 0, {}).status, -1) << sql;
     }
     EXPECT_EQ(Count(), "3");
-    EXPECT_EQ(QueryText(path, "PRAGMA user_version"), "0");
+    EXPECT_EQ(RunSql(path, "PRAGMA user_version"), "0");
 }
 
 TEST_F(Executing, TakesOneStatementWithWhateverBlanksAndCommentsAroundIt) {
@@ -132,7 +132,7 @@ TEST_F(Executing, InsertsTheSameByARepeatedFormAsSQLite) {
         EXPECT_EQ(outcome.error, sqlite3_errmsg(db)) << sql;
     }
     const std::string rows = "SELECT group_concat(id || quote(a) || quote(b)) FROM t";
-    EXPECT_EQ(QueryText(path, rows), QueryText(twin, rows));
+    EXPECT_EQ(RunSql(path, rows), RunSql(twin, rows));
     RunSql(path, "DROP TABLE t");
     EXPECT_EQ(Execute(connection, inserts.back()).error, "no such table: t");
 }

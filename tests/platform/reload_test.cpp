@@ -60,17 +60,14 @@ private:
 
 class Reload : public testing::Test {
 protected:
-    Reload() { KELORootSet(root_.Path().c_str()); }
+    Reload() {
+        KELORootSet(root_.Path().c_str());
+        PlatformCalls::answers.reload.reset();
+    }
     ~Reload() override {
         KELORootSet("");
         isBooted = 0;
     }
-    void WritePidFile(const std::string &path, const std::string &content) const {
-        const std::string file = root_.Path() + path;
-        std::filesystem::create_directories(std::filesystem::path(file).parent_path());
-        WriteFile(file, content);
-    }
-
     TempRoot root_;
     SyslogCapture log_;
 };
@@ -88,11 +85,11 @@ TEST_F(Reload, HangsUpTheProgramThatAPidFileNames) {
     isBooted = 1; // has no effect under a root
     for (const auto &c : cases) {
         Daemon daemon(std::string(c.service).starts_with("pkg") ? "syslog-ng" : c.service);
-        WritePidFile(c.file, std::to_string(daemon.Pid()) + "\n");
+        WriteFile(root_.Path() + c.file, std::to_string(daemon.Pid()) + "\n");
         EXPECT_TRUE(KELOSystemdReload(c.service)) << c.file;
         EXPECT_EQ(daemon.Stop(), SIGHUP);
     }
-    EXPECT_THAT(log_.Texts(), IsEmpty());
+    EXPECT_THAT(log_.TakeTexts(), IsEmpty());
 }
 
 TEST_F(Reload, SparesEveryOtherProcess) {
@@ -117,11 +114,11 @@ TEST_F(Reload, SparesEveryOtherProcess) {
         {"", "1", "not a service name"},
     };
     for (const auto &c : cases) {
-        WritePidFile("/run/syslog-ng.pid", c.content);
-        log_.Clear();
+        WriteFile(root_.Path() + "/run/syslog-ng.pid", c.content);
         EXPECT_FALSE(KELOSystemdReload(c.service)) << c.content;
-        EXPECT_THAT(log_.Texts(), ElementsAre(HasSubstr(c.reason)));
-        EXPECT_EQ(KELOErrorGet(), log_.Texts()[0]);
+        const std::vector<std::string> texts = log_.TakeTexts();
+        EXPECT_THAT(texts, ElementsAre(HasSubstr(c.reason)));
+        EXPECT_EQ(KELOErrorGet(), texts.at(0));
     }
     EXPECT_EQ(other.Stop(SIGTERM), SIGTERM);
 }
@@ -207,17 +204,15 @@ TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
         EXPECT_EQ(KELOSystemdReload("syslog-ng"), c.reason.empty());
         server.join();
         EXPECT_EQ(systemd.reloads, c.reloads);
-        EXPECT_EQ(log_.Texts(), c.reason.empty()
-                                    ? std::vector<std::string>()
-                                    : std::vector{"cannot reload service syslog-ng: " + c.reason});
-        EXPECT_EQ(KELOErrorGet(), log_.Texts().empty() ? "" : log_.Texts()[0]);
-        log_.Clear();
+        const std::string text = c.reason.empty() ? "" : "cannot reload service syslog-ng: " + c.reason;
+        EXPECT_EQ(KELOErrorGet(), text);
+        EXPECT_EQ(log_.TakeTexts(), std::vector<std::string>(text.empty() ? 0 : 1, text));
     }
     close(listener);
     setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("no bus")).c_str(), 1);
     EXPECT_FALSE(KELOSystemdReload("syslog-ng"));
     unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
-    EXPECT_THAT(log_.Texts(), ElementsAre(HasSubstr("No such file")));
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre(HasSubstr("No such file")));
 }
 
 } // namespace

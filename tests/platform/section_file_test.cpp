@@ -58,7 +58,7 @@ TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     for (const auto &c : cases) {
         SyslogCapture log;
         EXPECT_EQ(Set(path, c.section, c.newName, {{c.key, c.value}}, c.format), -1) << c.message;
-        EXPECT_THAT(log.Texts(), ElementsAre(AllOf(StartsWith(path + ": "), HasSubstr(c.message))));
+        EXPECT_THAT(log.TakeTexts(), ElementsAre(AllOf(StartsWith(path + ": "), HasSubstr(c.message))));
     }
     EXPECT_EQ(ReadFile(path), content);
 }
@@ -95,13 +95,12 @@ TEST(SectionFile, ReadsWhatPeopleWrite) {
                     "[R1] ; again\na=\"third\"\n[ R2 ]\nopen=\"1\nfine=1\n[]\na=1\n[R3");
     SyslogCapture log;
     EXPECT_THAT(Names(path), ElementsAre("R1", " R2 "));
-    EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr(path + ":11: not a section header")));
+    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr(path + ":11: not a section header")));
     EXPECT_EQ(Get(path, "R1", "a"), "plain text # all of it");
     EXPECT_EQ(Get(path, "R1", "b"), "x");
     EXPECT_EQ(Get(path, "R9", "a"), "(none)");
-    log.Clear();
     EXPECT_EQ(Get(path, " R2 ", "fine"), "(failed)");
-    EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr(path + ":9: ")));
+    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr(path + ":9: ")));
 }
 
 TEST(SectionFile, AnswersForEveryKindOfFile) {
@@ -153,9 +152,9 @@ TEST(SectionFile, KeepsModeOwnerAndLinksWhenItIsReplaced) {
     EXPECT_FALSE(std::filesystem::exists(root.File("real/.notify.conf.new")));
 
     std::filesystem::remove(real);
-    const SyslogCapture log;
+    SyslogCapture log;
     EXPECT_EQ(Set(link, "R", "R", {{"key", "1"}}), -1);
-    EXPECT_THAT(log.Texts(), ElementsAre(HasSubstr("symbolic link to nothing")));
+    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr("symbolic link to nothing")));
 }
 
 TEST(SectionFile, TwoWritersOfDifferentSectionsLoseNothing) {

@@ -189,7 +189,7 @@ TEST_F(Differential, SearchesFindWhatANaiveFilterFinds) {
         ASSERT_EQ(SyslogDBDelete(path_, conditions), 0);
         deleted += all.size();
         std::erase_if(rows_, [&](const Row &row) { return MeetsAll(row, conditions); });
-        ASSERT_EQ(QueryText(path_, "SELECT count(*) FROM logs"), std::to_string(rows_.size()))
+        ASSERT_EQ(RunSql(path_, "SELECT count(*) FROM logs"), std::to_string(rows_.size()))
             << TakeStatement();
     }
     EXPECT_GT(found, 10000u);

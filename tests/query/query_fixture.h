@@ -18,7 +18,7 @@ protected:
     }
     // The SQL text of the only statement since the last call of this function.
     static std::string TakeStatement() {
-        const std::vector<std::string> statements = PlatformCalls::Statements();
+        const std::vector<std::string> statements = PlatformCalls::Texts();
         PlatformCalls::Reset();
         return statements.size() == 1 ? statements[0] : std::to_string(statements.size()) + " statements";
     }

@@ -48,13 +48,12 @@ TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
                                         order ? &*order : nullptr, nullptr, nullptr, false),
                   -1);
         const std::string message = "fail to execute database command (" + call.text + ")";
-        EXPECT_THAT(log_.Messages(), ElementsAre(SyslogMessage{LOG_ERR, message}));
+        EXPECT_THAT(log_.Take(), ElementsAre(SyslogMessage{LOG_ERR, message}));
         const PlatformCall &made = PlatformCalls::Recorded().back();
         EXPECT_EQ(made.function, call.function);
         EXPECT_EQ(made.limit, call.limit);
         EXPECT_EQ(made.offset, call.offset);
         EXPECT_EQ(TakeStatement(), call.text);
-        log_.Clear();
     }
 }
 
@@ -74,7 +73,6 @@ TEST_F(SyslogDBSelectTest, StopsWhereTheCallbackOrTheConversionEnds) {
 
 TEST_F(SyslogDBSelectTest, RejectsAPathBeforeAnythingIsOpened) {
     for (const std::string path : {"", "logs.db", "file:/logs.db"}) {
-        log_.Clear();
         std::list<std::string> values;
         std::map<uint64_t, std::string> names;
         EXPECT_EQ(SyslogDBSelect(path, {kHost}, nullptr, nullptr, nullptr, nullptr, false), -1);
@@ -87,12 +85,12 @@ TEST_F(SyslogDBSelectTest, RejectsAPathBeforeAnythingIsOpened) {
         EXPECT_THAT(SyslogDBEpsGet(path, 0, 1), IsEmpty());
         EXPECT_EQ(SyslogDBAttriValueGet(path, "nothing", nullptr, values), -1);
         EXPECT_EQ(SyslogDBExtkeyLookupByName(path, SYSLOG_EXTKEY_FAC, "kern"), 0u);
-        EXPECT_EQ(PlatformCalls::Count(), 0);
+        EXPECT_EQ(PlatformCalls::Recorded().size(), 0);
         const auto at = [](int line) {
             return "dbutil:" + std::to_string(line) + " Invalid syslog db path!";
         };
         const std::string version = at(863) + " [" + path + "]";
-        EXPECT_THAT(log_.Texts(),
+        EXPECT_THAT(log_.TakeTexts(),
                     ElementsAre(at(472), at(581), at(661), version, at(1061), at(1102), at(1144), at(992),
                                 at(705), version, at(897), "dbutil:966 Fail to get foreign key map"));
     }
@@ -122,7 +120,7 @@ TEST_F(SyslogDBSelectCountTest, TellsAMissingRowFromSeveral) {
     EXPECT_EQ(SyslogDBSelectCount(path_, {kHost}, &second, nullptr), -1);
     EXPECT_EQ(SyslogDBSelectCountByTable(path_, "logs GROUP BY host", {}, nullptr, nullptr), -2);
     EXPECT_EQ(SyslogDBSelectCountByTable(path_, "nothing", {}, nullptr, nullptr), -1);
-    EXPECT_THAT(log_.Messages(), IsEmpty());
+    EXPECT_THAT(log_.Take(), IsEmpty());
 }
 
 } // namespace

@@ -32,7 +32,7 @@ TEST_F(Statistics, ReadTheHistogram) {
     EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram WHERE device = 'a'b'");
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "a''b"), 5u);
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "nothing"), 0u);
-    EXPECT_THAT(log_.Messages(), IsEmpty());
+    EXPECT_THAT(log_.Take(), IsEmpty());
 }
 
 TEST_F(Statistics, SumASampleButKeepTheFirstRowOfADevice) {
@@ -67,16 +67,16 @@ TEST_F(Lookup, ListsTheValuesOfAnAttribute) {
     EXPECT_EQ(PlatformCalls::Recorded()[1].offset, 2u);
     EXPECT_THAT(values, ElementsAre("before", "", "a", "b", "c", "b"));
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "event", nullptr, values), -1);
-    EXPECT_THAT(log_.Messages(), IsEmpty());
+    EXPECT_THAT(log_.Take(), IsEmpty());
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "host, msg", nullptr, values), -1);
-    EXPECT_THAT(log_.Texts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
 }
 
 TEST_F(Lookup, NumbersTheNamesOfADatabaseWithoutKeyTables) {
     RunSql(path_, "INSERT INTO logs(fac) VALUES('user'), ('auth'), ('user'), (NULL)");
     std::map<uint64_t, std::string> names = {{1, "kept"}};
     EXPECT_EQ(SyslogDBExtkeyMapGet(path_, SYSLOG_EXTKEY_FAC, names), 0);
-    EXPECT_THAT(PlatformCalls::Statements(),
+    EXPECT_THAT(PlatformCalls::Texts(),
                 ElementsAre("SELECT * FROM db_info", "SELECT DISTINCT fac FROM logs"));
     EXPECT_THAT(names, ElementsAre(Pair(0, "user"), Pair(1, "kept"), Pair(2, "")));
     EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, SYSLOG_EXTKEY_FAC, "auth"), 1u);
@@ -94,7 +94,7 @@ TEST_F(Lookup, ReadsTheKeyTablesOfTheFirstGeneration) {
     RunSql(path_, "CREATE TABLE db_info(x)");
     EXPECT_EQ(SyslogDBVersionGet(path_), 1);
     EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, SYSLOG_EXTKEY_HOST, "x"), 0u);
-    EXPECT_THAT(log_.Texts(), ElementsAre("dbutil:966 Fail to get foreign key map"));
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre("dbutil:966 Fail to get foreign key map"));
     for (const auto &[type, kind] : kinds) {
         RunSql(path_, "CREATE TABLE " + kind + "s(" + kind + "_id, " + kind + "_name)");
         RunSql(path_, "INSERT INTO " + kind + "s VALUES(9, 'x'), (5, 'x'), (5, 'y'), (7, NULL)");

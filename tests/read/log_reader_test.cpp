@@ -58,7 +58,7 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
     }
     PlatformCalls::Reset();
     EXPECT_EQ(reader.Count(), newestFirst.size());
-    EXPECT_LT(PlatformCalls::Statements().size(), 20U); // gaps are not searched bit by bit
+    EXPECT_LT(PlatformCalls::Texts().size(), 20U); // gaps are not searched bit by bit
     const LogReader onHost(table_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "a", {}}});
     EXPECT_EQ(onHost.Count(), newestFirst.size() - 1);
     EXPECT_EQ(onHost.IdFromNewest(1), newestFirst[2]);

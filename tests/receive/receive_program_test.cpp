@@ -19,7 +19,7 @@ protected:
     // Empty while the database is missing or has no table yet.
     static std::string Query(const std::string &path, const char *sql) {
         try {
-            return fs::exists(path) ? QueryText(path, sql) : "";
+            return fs::exists(path) ? RunSql(path, sql) : "";
         } catch (const std::runtime_error &) {
             return "";
         }
@@ -33,7 +33,7 @@ protected:
     }
     std::string Counted() const { return Query(accounting_, "SELECT sum(count) FROM histogram"); }
     std::string Events(const std::string &pattern) const {
-        return QueryText(events_, "SELECT count(*) FROM log WHERE event GLOB '" + pattern + "'");
+        return RunSql(events_, "SELECT count(*) FROM log WHERE event GLOB '" + pattern + "'");
     }
     ptrdiff_t Notifications(const std::string &tag) const {
         ptrdiff_t count = 0;
@@ -62,7 +62,7 @@ TEST_F(ReceiveProgram, StoresCountsAndSetsAside) {
     EXPECT_EQ(receiver.End().status, 0);
     EXPECT_EQ(Rows(logs_), "6001");
     EXPECT_EQ(Counted(), "6001");
-    EXPECT_EQ(QueryText(logs_, "SELECT hex(msg) FROM logs WHERE id=3001"), "FF2725735C0009");
+    EXPECT_EQ(RunSql(logs_, "SELECT hex(msg) FROM logs WHERE id=3001"), "FF2725735C0009");
     const ReceiverState state = State();
     EXPECT_EQ(state.received, 6001U);
     EXPECT_EQ(state.stored, 6001U);

@@ -1,57 +1,45 @@
 #include "support/log_database.h"
 
+#include <filesystem>
+#include <optional>
 #include <stdexcept>
 
-#include "support/fault_pause.h"
+#include "support/doubles.h"
 #include "support/source_dir.h"
 #include "support/temp_root.h"
 
 namespace kelo::test {
 namespace {
 
-using Database = std::unique_ptr<sqlite3, int (*)(sqlite3 *)>;
-using Statement = std::unique_ptr<sqlite3_stmt, decltype(&sqlite3_finalize)>;
-
-[[noreturn]] void Fail(sqlite3 *db, const std::string &what) {
-    throw std::runtime_error(what + ": " + sqlite3_errmsg(db));
-}
-
-Database Open(const std::string &path) {
-    sqlite3 *db = nullptr;
-    const int status = sqlite3_open(path.c_str(), &db);
-    Database owner(db, sqlite3_close);
-    if (status != SQLITE_OK)
-        Fail(db, path);
-    const FaultPause pause; // a wait of the test's own
-    sqlite3_busy_timeout(db, 10000);
-    return owner;
-}
-
-void Run(sqlite3 *db, const std::string &sql) {
-    if (sqlite3_exec(db, sql.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK)
-        Fail(db, sql);
-}
-
-Statement Prepare(sqlite3 *db, const std::string &sql) {
-    sqlite3_stmt *statement = nullptr;
-    if (sqlite3_prepare_v2(db, sql.c_str(), -1, &statement, nullptr) != SQLITE_OK)
-        Fail(db, sql);
-    return Statement(statement, sqlite3_finalize);
+std::string Quoted(const std::string &text) {
+    const std::unique_ptr<char, decltype(&sqlite3_free)> quoted(sqlite3_mprintf("%Q", text.c_str()),
+                                                                sqlite3_free);
+    return quoted.get();
 }
 
 } // namespace
 
-void RunSql(const std::string &path, const std::string &sql) {
-    Run(Open(path).get(), sql);
+TestDatabase::TestDatabase(const std::string &path) : db_(nullptr, sqlite3_close) {
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path());
+    sqlite3 *db = nullptr;
+    const int status = sqlite3_open(path.c_str(), &db);
+    db_.reset(db);
+    if (status != SQLITE_OK)
+        throw std::runtime_error(path + ": " + sqlite3_errmsg(db));
+    const FaultPause pause; // a wait of the test's own
+    sqlite3_busy_timeout(db, 10000);
 }
 
-std::string QueryText(const std::string &path, const std::string &sql) {
-    const Database db = Open(path);
-    const Statement statement = Prepare(db.get(), sql);
-    if (sqlite3_step(statement.get()) != SQLITE_ROW)
-        return "";
-    const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement.get(), 0));
-    return text != nullptr ? text : "";
+std::string TestDatabase::Run(const std::string &sql) {
+    std::optional<std::string> first;
+    const auto take = [](void *to, int, char **values, char **) {
+        auto &text = *static_cast<std::optional<std::string> *>(to);
+        text = text.value_or(values[0] != nullptr ? values[0] : "");
+        return 0;
+    };
+    if (sqlite3_exec(db_.get(), sql.c_str(), take, &first, nullptr) != SQLITE_OK)
+        throw std::runtime_error(sql + ": " + sqlite3_errmsg(db_.get()));
+    return first.value_or("");
 }
 
 void CreateLogDatabase(const std::string &path, const std::string &schema) {
@@ -62,32 +50,27 @@ void CreateLogDatabase(const std::string &path, const std::string &schema) {
 }
 
 void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs) {
-    const Database db = Open(path);
-    Run(db.get(), "BEGIN IMMEDIATE");
-    const Statement statement = Prepare(
-        db.get(), "INSERT INTO logs(host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec,id) "
-                  "VALUES(?1,?2,?3,?4,?4,?5,?6,?7,?8,?9,?10,?11,nullif(?12,0))");
+    TestDatabase db(path);
+    db.Run("BEGIN IMMEDIATE");
     for (const _SYSLOG_LOG_DATA_tag &log : logs) {
-        int index = 0;
-        for (const std::string &text : {log.host, log.ip, log.fac, PriorTypeToStr(log.prio), log.tag,
-                                        log.tzoffset, log.ldate, log.ltime, log.prog, log.msg})
-            sqlite3_bind_text(statement.get(), ++index, text.data(), static_cast<int>(text.size()),
-                              SQLITE_TRANSIENT);
-        sqlite3_bind_int64(statement.get(), ++index, log.utcsec);
-        sqlite3_bind_int64(statement.get(), ++index, static_cast<sqlite3_int64>(log.id));
-        if (sqlite3_step(statement.get()) != SQLITE_DONE)
-            Fail(db.get(), "insert");
-        sqlite3_reset(statement.get());
+        std::string values;
+        for (const std::string &text :
+             {log.host, log.ip, log.fac, PriorTypeToStr(log.prio), PriorTypeToStr(log.prio), log.tag,
+              log.tzoffset, log.ldate, log.ltime, log.prog, log.msg})
+            values += Quoted(text) + ",";
+        db.Run(
+            "INSERT INTO logs(host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec,id) VALUES(" +
+            values + std::to_string(log.utcsec) + ",nullif(" + std::to_string(log.id) + ",0))");
     }
-    Run(db.get(), "COMMIT");
+    db.Run("COMMIT");
 }
 
 void InsertLogsIntoWal(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag> &logs) {
-    // The last connection that closes empties the log, unless this is switched off.
-    const Database last = Open(path);
-    Run(last.get(), "SELECT count(*) FROM sqlite_schema");
+    // The last connection that closes empties the log, unless it is told not to.
+    TestDatabase last(path);
+    last.Run("SELECT count(*) FROM sqlite_schema");
     InsertLogs(path, logs);
-    sqlite3_db_config(last.get(), SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
+    sqlite3_db_config(last.Get(), SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
 }
 
 _SYSLOG_LOG_DATA_tag SampleLog(int number) {
@@ -115,14 +98,6 @@ void InsertSampleLogs(const std::string &path, int count) {
     for (int number = 0; number < count; ++number)
         logs.push_back(SampleLog(number));
     InsertLogs(path, logs);
-}
-
-DatabaseLock::DatabaseLock(const std::string &path, const std::string &sql) : db_(Open(path)) {
-    Run(sql);
-}
-
-void DatabaseLock::Run(const std::string &sql) {
-    test::Run(db_.get(), sql);
 }
 
 std::string DamagePages(const std::string &path) {

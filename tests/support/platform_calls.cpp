@@ -1,151 +1,207 @@
 #include "support/platform_calls.h"
 
+#include <atomic>
 #include <mutex>
 
 #include "keloplatform/kelodb.h"
-#include "support/fault_pause.h"
-#include "support/real_function.h"
+#include "keloplatform/kelonotify.h"
+#include "keloplatform/kelosystem.h"
+#include "keloplatform/torvc.h"
+#include "support/doubles.h"
 
 namespace kelo::test {
 namespace {
 
-std::mutex callMutex;
+// In the real library: what it calls of its own functions is no call into the platform.
+using PlatformVisit = Stay<struct Platform>;
 
-// Lives while the real library works: what it calls of its own functions is no call into the platform.
-class PlatformVisit {
-public:
-    PlatformVisit() { ++depth_; }
-    ~PlatformVisit() { --depth_; }
-    PlatformVisit(const PlatformVisit &) = delete;
-    PlatformVisit &operator=(const PlatformVisit &) = delete;
-    static bool IsActive() { return depth_ > 0; }
-
-private:
-    static inline thread_local int depth_ = 0;
+struct State {
+    std::vector<PlatformCall> recorded;
+    std::vector<SentNotification> sent;
+    NthCall failing;
+    std::string failedFunction;
 };
+State state;
+std::mutex mutex;
+std::atomic<int> openHandles;
+std::map<const TORVSZHASH *, std::map<std::string, std::string>> hashes;
 
-// Calls the platform library's own function behind one of ours.
-template <auto *Function, typename... Arguments>
-auto CallReal(const char *name, Arguments... arguments) {
-    static const auto real = Real<Function>(name);
-    const PlatformVisit visit;
-    return real(arguments...);
+std::string TextOf(const char *text) {
+    return text != nullptr ? text : "";
+}
+std::string TextOf(const std::string &text) {
+    return text;
 }
 
-int CountedResult(int status, DBResult_tag **result) {
-    if (status >= 0 && result != nullptr && *result != nullptr)
-        PlatformCalls::CountResult(1);
+// Records a call, and says whether it has to fail.
+template <typename Text>
+bool MustFail(const char *function, const Text &text, unsigned int limit = 0, unsigned int offset = 0) {
+    if (PlatformVisit::IsActive())
+        return false;
+    const FaultPause pause;
+    const std::lock_guard lock(mutex);
+    state.recorded.push_back({function, TextOf(text), limit, offset});
+    const bool fails = state.failing.MustFail();
+    if (fails && state.failedFunction.empty())
+        state.failedFunction = function;
+    return fails;
+}
+
+void CountHandle(const void *handle, int change) {
+    if (handle != nullptr && !PlatformVisit::IsActive())
+        openHandles += change;
+}
+
+template <auto *Function, typename... Arguments>
+auto CallReal(const char *name, const Arguments &...arguments) {
+    const PlatformVisit visit;
+    return Real<Function>(name)(arguments...);
+}
+
+template <typename Handle>
+Handle *Opened(Handle *handle) {
+    CountHandle(handle, 1);
+    return handle;
+}
+
+int WithResult(int status, DBResult_tag **result) {
+    if (status >= 0 && result != nullptr)
+        CountHandle(*result, 1);
     return status;
 }
 
 } // namespace
 
 void PlatformCalls::Reset() {
-    recorded_.clear();
-    failFirst_ = 0;
-    failedFunction_.clear();
+    state = {};
 }
-
-void PlatformCalls::FailFrom(int first, int times) {
-    failFirst_ = int64_t{Count()} + first;
-    failTimes_ = times;
-    failedFunction_.clear();
+void PlatformCalls::Start() {
+    Reset();
+    answers = {};
 }
-
-bool PlatformCalls::MustFail(const char *function, const char *text, unsigned int limit,
-                             unsigned int offset) {
-    if (PlatformVisit::IsActive())
-        return false;
-    const FaultPause pause;
-    const std::lock_guard lock(callMutex);
-    recorded_.push_back({function, text != nullptr ? text : "", limit, offset});
-    const bool fails = failFirst_ > 0 && Count() >= failFirst_ && Count() - failFirst_ < failTimes_;
-    if (fails && failedFunction_.empty())
-        failedFunction_ = function;
-    return fails;
+const std::vector<PlatformCall> &PlatformCalls::Recorded() {
+    return state.recorded;
 }
-
-void PlatformCalls::CountConnection(int change) {
-    if (!PlatformVisit::IsActive())
-        openConnections_ += change;
-}
-
-void PlatformCalls::CountResult(int change) {
-    if (!PlatformVisit::IsActive())
-        openResults_ += change;
-}
-
-std::vector<std::string> PlatformCalls::Statements() {
-    std::vector<std::string> statements;
-    for (const PlatformCall &call : recorded_) {
-        if (call.function == "KELODBExecute" || call.function == "KELODBSelectLimit")
-            statements.push_back(call.text);
+std::vector<std::string> PlatformCalls::Texts(const std::set<std::string> &functions) {
+    std::vector<std::string> texts;
+    for (const PlatformCall &call : state.recorded) {
+        if (functions.contains(call.function))
+            texts.push_back(call.text);
     }
-    return statements;
+    return texts;
+}
+const std::vector<SentNotification> &PlatformCalls::Sent() {
+    return state.sent;
+}
+int PlatformCalls::OpenHandles() {
+    return openHandles;
+}
+void PlatformCalls::FailFrom(int first, int times) {
+    state.failing = {first, times};
+    state.failedFunction.clear();
+}
+std::string PlatformCalls::FailedFunction() {
+    return state.failedFunction;
 }
 
 } // namespace kelo::test
 
 using namespace kelo::test;
 
-#define KELO_CALL_REAL(function, ...) CallReal<&function>(#function, __VA_ARGS__)
+#define KELO_REAL(name, ...) CallReal<&name>(#name, __VA_ARGS__)
+#define KELO_UNPACK(...) __VA_ARGS__
+// A function that fails with `failure` when it has to. `text` is recorded; `after` takes the real one's
+// answer.
+#define KELO_DOUBLE(Type, name, parameters, arguments, text, failure, after)                                 \
+    Type name parameters {                                                                                   \
+        return MustFail(#name, text) ? failure : after(KELO_REAL(name, KELO_UNPACK arguments));              \
+    }
+
+bool KELOSystemdReload(const std::string &service) {
+    if (MustFail("KELOSystemdReload", service))
+        return false;
+    if (PlatformCalls::answers.onReload)
+        PlatformCalls::answers.onReload();
+    const auto answer = PlatformCalls::answers.reload;
+    constexpr char kMangled[] = "_Z17KELOSystemdReloadRKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE";
+    return answer ? *answer : CallReal<&KELOSystemdReload>(kMangled, service);
+}
 
 extern "C" {
 
-DBConnect_tag *KELODBConnect(const char *host, const char *user, const char *password, const char *path) {
-    if (PlatformCalls::MustFail("KELODBConnect", path))
-        return nullptr;
-    DBConnect_tag *connection = KELO_CALL_REAL(KELODBConnect, host, user, password, path);
-    PlatformCalls::CountConnection(connection != nullptr ? 1 : 0);
-    return connection;
-}
+KELO_DOUBLE(DBConnect_tag *, KELODBConnect,
+            (const char *host, const char *user, const char *password, const char *path),
+            (host, user, password, path), path, nullptr, Opened)
+KELO_DOUBLE(int, KELODBFetchRow, (DBResult_tag * result, unsigned int *row), (result, row), "", -1, )
+KELO_DOUBLE(int, KELODBExecute, (DBConnect_tag * connection, const char *sql, DBResult_tag **result),
+            (connection, sql, result), sql, -1, [result](int status) { return WithResult(status, result); })
+KELO_DOUBLE(int, KELODBEscapeStringEX,
+            (DBConnect_tag * connection, char *out, size_t outSize, const char *in, size_t inLen),
+            (connection, out, outSize, in, inLen), in, -1, )
+KELO_DOUBLE(int, KELODBEscapeStringEX2,
+            (DBConnect_tag * connection, char *out, size_t outSize, const char *in, size_t inLen),
+            (connection, out, outSize, in, inLen), in, -1, )
+KELO_DOUBLE(int, KELODBEscapeBackslashEX2,
+            (DBConnect_tag * connection, char *out, size_t outSize, const char *in),
+            (connection, out, outSize, in), in, -1, )
+KELO_DOUBLE(TORVSZHASH *, TORVCSzHashAlloc, (size_t size), (size), "", nullptr, Opened)
+KELO_DOUBLE(int, TORVCExec,
+            (const char *program, const char *arg1, const char *arg2, const char *arg3, const char *arg4),
+            (program, arg1, arg2, arg3, arg4), program, -1, )
+KELO_DOUBLE(int, KELOFSMkdirP, (const char *folder, int zero, int one, int uid, int gid, unsigned int mode),
+            (folder, zero, one, uid, gid, mode), folder, -1, )
 
-int KELODBClose(DBConnect_tag *connection) {
-    PlatformCalls::CountConnection(connection != nullptr ? -1 : 0);
-    return KELO_CALL_REAL(KELODBClose, connection);
-}
-
-int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **result) {
-    if (PlatformCalls::MustFail("KELODBExecute", sql))
-        return -1;
-    return CountedResult(KELO_CALL_REAL(KELODBExecute, connection, sql, result), result);
+KELOSMSCONF *KELOSmsConfGet() {
+    return MustFail("KELOSmsConfGet", "") ? nullptr : CallReal<&KELOSmsConfGet>("KELOSmsConfGet");
 }
 
 int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit, unsigned int offset,
                       DBResult_tag **result) {
-    if (PlatformCalls::MustFail("KELODBSelectLimit", sql, limit, offset))
+    if (MustFail("KELODBSelectLimit", sql, limit, offset))
         return -1;
-    return CountedResult(KELO_CALL_REAL(KELODBSelectLimit, connection, sql, limit, offset, result), result);
+    return WithResult(KELO_REAL(KELODBSelectLimit, connection, sql, limit, offset, result), result);
 }
 
-int KELODBFetchRow(DBResult_tag *result, unsigned int *row) {
-    if (PlatformCalls::MustFail("KELODBFetchRow", nullptr))
+int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, const char *value) {
+    if (MustFail("TORVCSzHashSetValue", key))
         return -1;
-    return KELO_CALL_REAL(KELODBFetchRow, result, row);
+    const int status = KELO_REAL(TORVCSzHashSetValue, hash, key, value);
+    const FaultPause pause;
+    if (status >= 0)
+        hashes[*hash][key] = value;
+    return status;
+}
+
+int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDir, const char *filterFile,
+                                            TORVSZHASH **hash, int zero) {
+    if (MustFail("KELOSysNotifySendNotificationCustomized", tag))
+        return -1;
+    const FaultPause pause;
+    state.sent.push_back({tag, textsDir, filterFile, {}});
+    if (hash != nullptr && *hash != nullptr)
+        state.sent.back().values = hashes[*hash];
+    const auto answer = PlatformCalls::answers.notification;
+    return answer ? *answer
+                  : KELO_REAL(KELOSysNotifySendNotificationCustomized, tag, textsDir, filterFile, hash, zero);
+}
+
+int KELODBClose(DBConnect_tag *connection) {
+    CountHandle(connection, -1);
+    return KELO_REAL(KELODBClose, connection);
 }
 
 void KELODBFreeResult(DBResult_tag *result) {
-    PlatformCalls::CountResult(result != nullptr ? -1 : 0);
-    KELO_CALL_REAL(KELODBFreeResult, result);
+    CountHandle(result, -1);
+    KELO_REAL(KELODBFreeResult, result);
 }
 
-int KELODBEscapeStringEX(DBConnect_tag *connection, char *out, size_t outSize, const char *in, size_t inLen) {
-    if (PlatformCalls::MustFail("KELODBEscapeStringEX", in))
-        return -1;
-    return KELO_CALL_REAL(KELODBEscapeStringEX, connection, out, outSize, in, inLen);
-}
-
-int KELODBEscapeStringEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in,
-                          size_t inLen) {
-    if (PlatformCalls::MustFail("KELODBEscapeStringEX2", in))
-        return -1;
-    return KELO_CALL_REAL(KELODBEscapeStringEX2, connection, out, outSize, in, inLen);
-}
-
-int KELODBEscapeBackslashEX2(DBConnect_tag *connection, char *out, size_t outSize, const char *in) {
-    if (PlatformCalls::MustFail("KELODBEscapeBackslashEX2", in))
-        return -1;
-    return KELO_CALL_REAL(KELODBEscapeBackslashEX2, connection, out, outSize, in);
+void TORVCSzHashFree(TORVSZHASH *hash) {
+    CountHandle(hash, -1);
+    {
+        const FaultPause pause;
+        hashes.erase(hash);
+    }
+    KELO_REAL(TORVCSzHashFree, hash);
 }
 
 } // extern "C"

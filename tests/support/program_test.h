@@ -1,7 +1,6 @@
 #pragma once
 
 #include "support/child_program.h"
-#include "support/source_dir.h"
 #include "support/test.h"
 
 namespace kelo::test {

@@ -4,7 +4,7 @@
 
 #include <utility>
 
-#include "support/real_function.h"
+#include "support/doubles.h"
 
 namespace kelo::test {
 namespace {

@@ -8,69 +8,61 @@
 #include <cstdlib>
 #include <mutex>
 
-#include "support/fault_pause.h"
+#include "support/doubles.h"
 
 namespace kelo::test {
 namespace {
 
-SyslogCapture *active = nullptr;
-std::mutex activeMutex; // messages may come from any thread
+bool isActive = false;
+std::vector<SyslogMessage> messages;
+std::mutex mutex; // messages may come from any thread
 
 // Formats as vsyslog does; %m works because glibc's printf family knows it.
 void Capture(int priority, const char *format, va_list arguments) {
     const int savedErrno = errno;
     const FaultPause pause;
+    const std::lock_guard lock(mutex);
     char *text = nullptr;
-    if (vasprintf(&text, format, arguments) >= 0)
-        SyslogCapture::Receive(priority, text);
+    if (isActive && vasprintf(&text, format, arguments) >= 0)
+        messages.emplace_back(priority, text);
     std::free(text);
     errno = savedErrno;
 }
 
 } // namespace
 
-std::ostream &operator<<(std::ostream &out, const SyslogMessage &message) {
-    return out << "<" << message.priority << "> " << message.text;
-}
-
 SyslogCapture::SyslogCapture() {
-    const std::lock_guard lock(activeMutex);
-    active = this;
+    Take();
+    isActive = true;
 }
 SyslogCapture::~SyslogCapture() {
-    const std::lock_guard lock(activeMutex);
-    active = nullptr;
-}
-void SyslogCapture::Receive(int priority, const std::string &text) {
-    const std::lock_guard lock(activeMutex);
-    if (active != nullptr)
-        active->messages_.push_back({priority, text});
+    isActive = false;
 }
 
-std::vector<std::string> SyslogCapture::Texts() const {
+std::vector<SyslogMessage> SyslogCapture::Take() {
+    const std::lock_guard lock(mutex);
+    return std::exchange(messages, {});
+}
+
+std::vector<std::string> SyslogCapture::TakeTexts() {
     std::vector<std::string> texts;
-    for (const SyslogMessage &message : messages_)
-        texts.push_back(message.text);
+    for (const auto &[priority, text] : Take())
+        texts.push_back(text);
     return texts;
 }
 
 } // namespace kelo::test
 
 // Fortified builds call the _chk form.
-extern "C" {
-
-void syslog(int priority, const char *format, ...) {
-    va_list arguments;
-    va_start(arguments, format);
-    kelo::test::Capture(priority, format, arguments);
+#define KELO_CAPTURE                                                                                         \
+    va_list arguments;                                                                                       \
+    va_start(arguments, format);                                                                             \
+    kelo::test::Capture(priority, format, arguments);                                                        \
     va_end(arguments);
-}
 
-void __syslog_chk(int priority, int, const char *format, ...) {
-    va_list arguments;
-    va_start(arguments, format);
-    kelo::test::Capture(priority, format, arguments);
-    va_end(arguments);
+extern "C" void syslog(int priority, const char *format, ...) {
+    KELO_CAPTURE
 }
-
-} // extern "C"
+extern "C" void __syslog_chk(int priority, int, const char *format, ...) {
+    KELO_CAPTURE
+}

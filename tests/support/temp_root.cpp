@@ -26,6 +26,7 @@ std::string ReadFile(const std::string &path) {
 }
 
 void WriteFile(const std::string &path, const std::string &content) {
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path());
     std::ofstream file(path, std::ios::binary | std::ios::trunc);
     file << content;
     if (!file.flush())

@@ -21,7 +21,7 @@ private:
 
 // The whole content of a file; "" when it cannot be read.
 std::string ReadFile(const std::string &path);
-// Creates or replaces a file. Throws std::runtime_error when it cannot.
+// Creates or replaces a file, with its folders. Throws when it cannot.
 void WriteFile(const std::string &path, const std::string &content);
 
 } // namespace kelo::test

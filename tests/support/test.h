@@ -29,6 +29,7 @@
 
 #include "support/log_database.h"
 #include "support/platform_calls.h"
+#include "support/source_dir.h"
 #include "support/syslog_capture.h"
 #include "support/temp_root.h"
 
@@ -46,10 +47,8 @@ protected:
     LibraryTest();
     ~LibraryTest() override;
 
-    // Writes a file under the root, with its folders.
-    void Write(const std::string &path, const std::string &content) const;
-    // The system log so far, without what the database handler adds about failed statements; then forgotten.
-    std::vector<std::string> Messages();
+    // The system log since the last call, without what the database handler adds about failed statements.
+    std::vector<std::string> TakeTexts();
 
     TempRoot root_;
     SyslogCapture log_;
