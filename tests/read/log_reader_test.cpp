@@ -20,7 +20,7 @@ protected:
         const uint64_t count = reader.ReadPage(
             page, oldestFirst, [&](const _SYSLOG_LOG_DATA_tag &log) { ids.push_back(log.id); },
             [&] {
-                EXPECT_EQ(PlatformCalls::OpenConnections(), 0);
+                EXPECT_EQ(PlatformCalls::OpenHandles(), 0);
                 told = ids.size();
             });
         EXPECT_EQ(told, ids.size());
