@@ -15,7 +15,7 @@ struct ProgramResult {
     std::string err;
 };
 
-// The command line, for a shell that stands in the folder and finds the programs of this build by their
+// The command line, for a shell that runs in the folder and finds the programs of this build by their
 // names.
 std::string InFolder(const std::string &folder, const std::string &command);
 

@@ -69,7 +69,7 @@ public:
     // Rows that the last INSERT, UPDATE or DELETE changed.
     uint64_t Changes() const;
 
-    // Copies the write-ahead log into the file as far as possible; empties it if nobody uses it and
+    // Copies the write-ahead log into the file as far as possible; empties it if it is unused and
     // `mustEmpty` says so. Without effect, and without an error, if others prevent it.
     void Checkpoint(bool mustEmpty);
     // Whether the file was removed or renamed since it was opened.

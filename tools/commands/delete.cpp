@@ -149,7 +149,7 @@ int Run(const Options &options, const std::string &root) {
         stopSignal = interruption.signal;
     }
     if (stopSignal != 0)
-        std::raise(stopSignal); // whoever waits sees what ended the program
+        std::raise(stopSignal); // the parent process sees the signal
     return kExitFound;
 }
 

@@ -17,7 +17,7 @@ struct FollowOptions {
 
 // Hands the logs that are there and then every new one to `format`, calls `print` once the database is
 // closed, and flushes `output` after each batch. Returns their number when the bounds of `options` end it;
-// OutputClosed ends it when nobody reads any more.
+// OutputClosed ends it when the reader has closed its end.
 //
 // When another file takes the place of the database (a quarantine, a rotation), it goes on with the first log
 // of the new one; while there is no file it waits.

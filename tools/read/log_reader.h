@@ -39,8 +39,8 @@ struct Page {
 // than its range whichever index SQLite chooses. The ranges grow while they hold few rows, so that ids may be
 // far apart.
 //
-// No database is open while a ChunkHandler runs: a reader that prints slowly keeps nobody from removing the
-// file or emptying its write-ahead log.
+// No database is open while a ChunkHandler runs: a reader that prints slowly does not prevent others from
+// removing the file or emptying its write-ahead log.
 //
 // Every function throws DatabaseError when the database cannot be read, and lets the exceptions of a handler
 // pass.
