@@ -1,5 +1,9 @@
 #include "base/text_encoding.h"
 
+#include <utf8.h>
+#include <utf8/unchecked.h>
+
+#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 
@@ -7,35 +11,47 @@ namespace kelo::tool {
 namespace {
 
 struct Character {
-    uint32_t code = 0;
-    size_t length = 1;
-    bool isValid = false; // else one byte that belongs to no UTF-8 sequence
+    uint32_t code;
+    bool isValid; // else one byte that belongs to no UTF-8 sequence
 };
 
-// Decodes the character at the front of a text that is not empty. Overlong forms, surrogates and values above
-// U+10FFFF are invalid.
-Character Decode(std::string_view text) {
-    const auto byte = [&](size_t i) { return static_cast<uint8_t>(text[i]); };
-    const uint8_t lead = byte(0);
-    if (lead < 0x80)
-        return {lead, 1, true};
-    const size_t length = lead >= 0xc2 && lead <= 0xdf ? 2 : lead >= 0xe0 && lead <= 0xef ? 3 : 4;
-    if (lead < 0xc2 || lead > 0xf4 || text.size() < length)
-        return {lead, 1, false};
-    uint32_t code = lead & (0x7fU >> length);
-    for (size_t i = 1; i < length; ++i) {
-        if ((byte(i) & 0xc0) != 0x80)
-            return {lead, 1, false};
-        code = code << 6 | (byte(i) & 0x3fU);
+// Takes the character at the front of what lies between `at` and `end`. Up to `checked` that is known to be
+// UTF-8.
+Character TakeCharacter(const char *&at, const char *end, const char *&checked) {
+    const auto byte = static_cast<uint8_t>(*at);
+    if (byte >= 0x80 && at >= checked)
+        checked = utf8::find_invalid(at, end);
+    if (byte >= 0x80 && at < checked)
+        return {utf8::unchecked::next(at), true};
+    ++at;
+    return {byte, byte < 0x80};
+}
+
+// Appends the text: the characters that `isPlain` accepts as they are, the rest as `escape` appends it.
+template <typename IsPlain, typename Escape>
+void AppendEscaped(std::string &out, std::string_view text, IsPlain isPlain, Escape escape) {
+    const char *at = text.data();
+    const char *const end = at + text.size();
+    const char *plain = at; // where the plain characters before `at` begin
+    const char *checked = at;
+    while (at != end) {
+        const char *const start = at;
+        const Character character = TakeCharacter(at, end, checked);
+        if (character.isValid && isPlain(character.code))
+            continue;
+        out.append(plain, start);
+        escape(character);
+        plain = at;
     }
-    const bool isOverlong = (length == 3 && code < 0x800) || (length == 4 && code < 0x10000);
-    if (isOverlong || (code >= 0xd800 && code <= 0xdfff) || code > 0x10ffff)
-        return {lead, 1, false};
-    return {code, length, true};
+    out.append(plain, end);
 }
 
 bool IsControl(uint32_t code) {
     return code < 0x20 || (code >= 0x7f && code < 0xa0);
+}
+
+bool BeginsCharacter(char byte) {
+    return (static_cast<uint8_t>(byte) & 0xc0) != 0x80;
 }
 
 bool TurnsDirection(uint32_t code) {
@@ -81,46 +97,64 @@ void AppendCsvField(std::string &out, std::string_view text) {
 std::string EscapeForTerminal(std::string_view text) {
     std::string out;
     out.reserve(text.size());
-    while (!text.empty()) {
-        const Character character = Decode(text);
-        const bool isSafe =
-            character.isValid && !IsControl(character.code) && !TurnsDirection(character.code);
-        if (isSafe)
-            out.append(text, 0, character.length);
-        else if (const char escape = ShortEscape(character.code); escape != 0)
+    const auto isPlain = [](uint32_t code) { return !IsControl(code) && !TurnsDirection(code); };
+    AppendEscaped(out, text, isPlain, [&](Character character) {
+        if (const char escape = ShortEscape(character.code); escape != 0)
             (out += '\\') += escape;
         else
             AppendEscape(out, character.isValid && character.code > 0x7f ? "\\u%04x" : "\\x%02x",
                          character.code);
-        text.remove_prefix(character.length);
-    }
+    });
     return out;
 }
 
 size_t CharacterCount(std::string_view text) {
-    size_t count = 0;
-    for (const char byte : text)
-        count += (static_cast<uint8_t>(byte) & 0xc0) != 0x80;
-    return count;
+    return static_cast<size_t>(std::count_if(text.begin(), text.end(), BeginsCharacter));
+}
+
+size_t FirstCharacters(std::string_view text, size_t count) {
+    size_t length = 0;
+    while (length < text.size() && !(BeginsCharacter(text[length]) && count-- == 0))
+        ++length;
+    return length;
+}
+
+size_t WholeCharacters(std::string_view text, size_t maxBytes) {
+    if (text.size() <= maxBytes)
+        return text.size();
+    size_t length = maxBytes;
+    while (length > 0 && !BeginsCharacter(text[length]))
+        --length;
+    return length;
 }
 
 void AppendJsonString(std::string &out, std::string_view text) {
+    const auto isPlain = [](uint32_t code) { return code != '"' && code != '\\' && !IsControl(code); };
     out += '"';
-    while (!text.empty()) {
-        const Character character = Decode(text);
+    AppendEscaped(out, text, isPlain, [&](Character character) {
         if (!character.isValid)
             out += "\xef\xbf\xbd";
         else if (character.code == '"' || character.code == '\\')
             (out += '\\') += static_cast<char>(character.code);
         else if (const char escape = ShortEscape(character.code); escape != 0)
             (out += '\\') += escape;
-        else if (IsControl(character.code))
-            AppendEscape(out, "\\u%04x", character.code);
         else
-            out.append(text, 0, character.length);
-        text.remove_prefix(character.length);
-    }
+            AppendEscape(out, "\\u%04x", character.code);
+    });
     out += '"';
+}
+
+std::string EscapeMarkup(std::string_view text, std::string_view characters) {
+    constexpr std::string_view kSpecials = "&<>\"'";
+    constexpr const char *kEntities[] = {"&amp;", "&lt;", "&gt;", "&quot;", "&apos;"};
+    std::string out;
+    for (const char byte : text) {
+        if (characters.find(byte) == std::string_view::npos)
+            out += byte;
+        else
+            out += kEntities[kSpecials.find(byte)];
+    }
+    return out;
 }
 
 void AppendCsvLine(std::string &out, const std::vector<std::string> &fields) {

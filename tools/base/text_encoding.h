@@ -16,9 +16,18 @@ std::string EscapeForTerminal(std::string_view text);
 // Number of characters of a text that is UTF-8, which is the number of its columns for most scripts.
 size_t CharacterCount(std::string_view text);
 
+// Length in bytes of the first `count` characters of a text that is UTF-8.
+size_t FirstCharacters(std::string_view text, size_t count);
+
+// Length in bytes of the whole characters within the first `maxBytes` of a text that is UTF-8.
+size_t WholeCharacters(std::string_view text, size_t maxBytes);
+
 // Appends the text as a JSON string with its quotes: control characters are escaped, and each byte that is no
 // UTF-8 becomes U+FFFD.
 void AppendJsonString(std::string &out, std::string_view text);
+
+// The text with those of the characters & < > " ' as entities that are in `characters`.
+std::string EscapeMarkup(std::string_view text, std::string_view characters);
 
 // Appends a record of RFC 4180 with its line end: fields stand between double quotes where they need them,
 // and their bytes are unchanged.

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <memory>
 
+#include "base/text_encoding.h"
 #include "kelonotify/channel.h"
 #include "kelonotify/feed.h"
 #include "kelonotify/safe_text.h"
@@ -23,22 +24,6 @@ struct MessageFreer {
 };
 using Message = std::unique_ptr<sd_bus_message, MessageFreer>;
 
-// Notification servers read the body as markup.
-std::string Escaped(const std::string &text) {
-    std::string escaped;
-    for (const char byte : text) {
-        if (byte == '<')
-            escaped += "&lt;";
-        else if (byte == '>')
-            escaped += "&gt;";
-        else if (byte == '&')
-            escaped += "&amp;";
-        else
-            escaped += byte;
-    }
-    return escaped;
-}
-
 // Best effort: the feed has the notification, and most machines have no session.
 void PopUp(const Entry &entry, long timeoutSec) {
     sd_bus *opened = nullptr;
@@ -52,7 +37,8 @@ void PopUp(const Entry &entry, long timeoutSec) {
         return;
     const Message call(created);
     const std::string title = SafeLine(entry.title, kMaxBytes);
-    const std::string body = Escaped(SafeLines(entry.body, kMaxBytes));
+    // Notification servers read the body as markup.
+    const std::string body = EscapeMarkup(SafeLines(entry.body, kMaxBytes), "&<>");
     // Name, identifier to replace, icon, title, body, actions, hints, time of display in ms (the server's).
     if (sd_bus_message_append(call.get(), "susssasa{sv}i", "kelosyslog", 0U, "", title.c_str(), body.c_str(),
                               0, 0, -1) < 0)

@@ -4,6 +4,8 @@
 #include <cstdio>
 #include <ctime>
 
+#include "base/text_encoding.h"
+
 namespace kelo::tool {
 namespace {
 
@@ -26,16 +28,6 @@ std::string Base64(std::string_view bytes) {
             text += k <= count ? kDigits[group >> (18 - 6 * k) & 63] : '=';
     }
     return text;
-}
-
-// The length of the longest beginning of the text of at most `maxBytes` that ends with a whole character.
-size_t WholeCharacters(std::string_view text, size_t maxBytes) {
-    if (text.size() <= maxBytes)
-        return text.size();
-    size_t end = maxBytes;
-    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
-        --end;
-    return end > 0 ? end : maxBytes;
 }
 
 std::string Date(int64_t seconds) {
@@ -66,7 +58,9 @@ std::string EncodeHeader(std::string_view text, size_t used) {
     std::string words;
     while (!text.empty()) {
         const size_t room = kMaxLine - 1 - std::min<size_t>(used, 30) - kBegin.size() - kEnd.size();
-        const size_t length = WholeCharacters(text, room / 4 * 3);
+        const size_t mostBytes = room / 4 * 3;
+        const size_t whole = WholeCharacters(text, mostBytes);
+        const size_t length = whole > 0 ? whole : mostBytes;
         words.append(words.empty() ? "" : "\r\n ")
             .append(kBegin)
             .append(Base64(text.substr(0, length)))

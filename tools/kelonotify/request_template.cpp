@@ -23,22 +23,12 @@ std::string UrlEncoded(std::string_view value) {
     return encoded;
 }
 
-std::string XmlEncoded(std::string_view value) {
-    std::string encoded;
-    for (const char byte : value) {
-        const size_t special = std::string_view("&<>\"'").find(byte);
-        constexpr const char *kEntities[] = {"&amp;", "&lt;", "&gt;", "&quot;", "&apos;"};
-        encoded += special != std::string_view::npos ? kEntities[special] : std::string(1, byte);
-    }
-    return encoded;
-}
-
 std::string Encoded(const std::string &value, Encoding encoding) {
     switch (encoding) {
     case Encoding::Url:
         return UrlEncoded(value);
     case Encoding::Xml:
-        return XmlEncoded(value);
+        return EscapeMarkup(value, "&<>\"'");
     case Encoding::Json: {
         std::string text;
         AppendJsonString(text, value);

@@ -11,10 +11,8 @@ std::string Cut(std::string text, size_t maxBytes) {
     constexpr std::string_view kCut = "...";
     if (text.size() <= maxBytes)
         return text;
-    size_t end = maxBytes - kCut.size();
-    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
-        --end;
-    return text.substr(0, end).append(kCut);
+    text.resize(WholeCharacters(text, maxBytes - kCut.size()));
+    return text.append(kCut);
 }
 
 } // namespace

@@ -4,6 +4,7 @@
 
 #include <utility>
 
+#include "base/text_encoding.h"
 #include "kelosyslog/logger.h"
 
 namespace kelo::tool {
@@ -28,9 +29,7 @@ std::string Content(const std::string &text) {
     }
     if (length == text.size())
         return text;
-    while (length > 0 && (static_cast<unsigned char>(text[length]) & 0xc0U) == 0x80)
-        --length;
-    return text.substr(0, length) + "...";
+    return text.substr(0, WholeCharacters(text, length)) + "...";
 }
 
 constexpr const char *kTail = " more within a minute, without a notification of their own";

@@ -28,10 +28,7 @@ std::string CellText(const std::string &text) {
     std::string visible = EscapeForTerminal(text);
     if (visible.size() <= kLongestText)
         return visible;
-    size_t end = kLongestText;
-    while (end > 0 && (static_cast<unsigned char>(visible[end]) & 0xc0) == 0x80)
-        --end;
-    return visible.substr(0, end) + " \u2026";
+    return visible.substr(0, WholeCharacters(visible, kLongestText)) + " \u2026";
 }
 
 std::string Formatted(const char *format, double number) {

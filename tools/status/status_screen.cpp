@@ -206,23 +206,12 @@ void AddVolumes(Lines &lines, const std::vector<VolumeStatus> &volumes) {
     }
 }
 
-// The first so many characters of the text.
-size_t BytesOf(const std::string &text, size_t characters) {
-    size_t at = 0;
-    for (; at < text.size() && characters > 0; --characters) {
-        do
-            ++at;
-        while (at < text.size() && (static_cast<unsigned char>(text[at]) & 0xc0) == 0x80);
-    }
-    return at;
-}
-
 // A point that needs attention, in as many lines as necessary.
 void AddPoint(Lines &lines, const std::string &point, size_t width) {
     std::string rest = "! " + EscapeForTerminal(point);
     constexpr size_t kLeast = 20;
     while (width >= kLeast && CharacterCount(rest) > width) {
-        const size_t room = BytesOf(rest, width);
+        const size_t room = FirstCharacters(rest, width);
         const size_t blank = rest.rfind(' ', room);
         const size_t end = blank == std::string::npos || blank < 3 ? room : blank;
         lines.push_back({rest.substr(0, end), kBad});
@@ -244,7 +233,7 @@ void AddHead(Lines &lines, const ServerStatus &status, size_t width) {
 std::string Fit(const std::string &text, size_t width) {
     if (width == 0 || CharacterCount(text) <= width)
         return text;
-    return text.substr(0, BytesOf(text, width - 1)) + ">";
+    return text.substr(0, FirstCharacters(text, width - 1)) + ">";
 }
 
 } // namespace

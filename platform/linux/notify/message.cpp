@@ -4,7 +4,7 @@
 
 #include "files/refusal.h"
 #include "files/section_cache.h"
-#include "text/utf8.h"
+#include "text/plain_text.h"
 
 namespace kelo::platform {
 namespace {

@@ -11,8 +11,8 @@
 
 #include "common/root.h"
 #include "common/unique_fd.h"
+#include "common/utf8.h"
 #include "files/replace_file.h"
-#include "text/utf8.h"
 
 namespace kelo::platform {
 namespace {

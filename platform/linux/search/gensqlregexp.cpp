@@ -7,10 +7,10 @@
 #include <string_view>
 #include <vector>
 
+#include "common/utf8.h"
 #include "keloplatform/errors.h"
 #include "search/keyword.h"
 #include "search/term_sql.h"
-#include "search/utf8.h"
 
 namespace kelo::platform {
 namespace {

@@ -6,7 +6,7 @@
 #include <exception>
 #include <string_view>
 
-#include "search/utf8.h"
+#include "common/utf8.h"
 
 namespace kelo::platform {
 namespace {
