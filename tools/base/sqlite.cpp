@@ -37,8 +37,9 @@ void SqliteConnection::Close::operator()(sqlite3 *db) const {
     sqlite3_close(db);
 }
 
-SqliteConnection::SqliteConnection(const std::string &path, const SqliteOptions &options, std::string name)
-    : name_(name.empty() ? path : std::move(name)), options_(options) {
+SqliteConnection::SqliteConnection(const std::string &path, const SqliteOptions &options,
+                                   const std::string &name)
+    : name_(name.empty() ? path : name), options_(options) {
     sqlite3 *db = nullptr;
     const int status =
         sqlite3_open_v2(path.c_str(), &db, FlagsOf(options.mode) | SQLITE_OPEN_NOMUTEX, nullptr);

@@ -52,7 +52,7 @@ struct SqliteOptions {
 class SqliteConnection {
 public:
     // Opens the file at the absolute `path`. Errors use `name`, if one is given.
-    SqliteConnection(const std::string &path, const SqliteOptions &options, std::string name = "");
+    SqliteConnection(const std::string &path, const SqliteOptions &options, const std::string &name = "");
     SqliteConnection(const SqliteConnection &) = delete;
     SqliteConnection &operator=(const SqliteConnection &) = delete;
 
