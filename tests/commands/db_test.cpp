@@ -29,6 +29,8 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     CreateLogDatabase(logs_);
     InsertSampleLogs(logs_, 500);
     Expect("db check", 0);
+    Expect("db quarantine -y", 1);
+    EXPECT_TRUE(fs::exists(logs_)) << "a sound database stays";
     RunSql(logs_, "PRAGMA ignore_check_constraints = ON; CREATE TABLE c (x CHECK (x > 0)); "
                   "INSERT INTO c VALUES (0)");
     const ProgramResult unsound = Run("db check");

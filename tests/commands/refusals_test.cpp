@@ -95,7 +95,7 @@ TEST_F(Refusals, NameTheWordOfAWrongCommandLine) {
         {"db create --schema '/tmp/a b.sql' --db a.db", 2, "/tmp/a b.sql"},
         {"db limit -1", 2, "-1"},
         {"db limit 2147483648", 2, "2147483648"},
-        {"db quarantine", 2, "--yes"},
+        {"db quarantine --force", 2, "--yes"},
         {"db info -o csv", 2, "csv"},
         {"report page.html -S today -U yesterday", 2, "--since"},
         {"events clear-log var/log/kelolog/logs.db", 2, "--yes"},

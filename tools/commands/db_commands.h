@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "commands/common_options.h"
 #include "print/key_values.h"
@@ -20,6 +21,10 @@ struct DbOptions {
 // Adds a command of "kelosyslog db" with these options.
 CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
                        const std::string &description, DbOptions &options, std::function<int()> run);
+
+// What a check of the whole database finds, a line each; empty for a sound one. Throws DatabaseError: a
+// SqliteError where SQLite cannot go on, for example with the code of a damaged file.
+std::vector<std::string> FindProblems(const LogTable &table);
 
 // Commands that only read: info, check.
 void AddDbInspection(Program &program, CLI::App &db);

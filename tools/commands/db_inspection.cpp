@@ -111,21 +111,10 @@ private:
     std::jthread watcher_; // ends first
 };
 
-std::vector<std::string> Problems(const LogTable &table) {
-    const ReadOnlyQuery database(table);
-    // Opening succeeds with any file: this reads its head.
-    database.FirstRow("PRAGMA schema_version", {});
-    const CheckProgress progress(SizeOf(table.path) + SizeOf(table.path + "-wal"));
-    std::vector<std::string> lines = database.Column("PRAGMA integrity_check", "integrity_check");
-    if (lines == std::vector<std::string>{"ok"})
-        lines.clear();
-    return lines;
-}
-
 int Check(const DbOptions &options) {
     const OutputFormat format = options.Format();
     const LogTable table = options.Table();
-    const std::vector<std::string> problems = Problems(table);
+    const std::vector<std::string> problems = FindProblems(table);
     KeyValues values;
     values.Add("path", table.path);
     values.AddBool("sound", problems.empty());
@@ -135,6 +124,17 @@ int Check(const DbOptions &options) {
 }
 
 } // namespace
+
+std::vector<std::string> FindProblems(const LogTable &table) {
+    const ReadOnlyQuery database(table);
+    // Opening succeeds with any file: this reads its head.
+    database.FirstRow("PRAGMA schema_version", {});
+    const CheckProgress progress(SizeOf(table.path) + SizeOf(table.path + "-wal"));
+    std::vector<std::string> lines = database.Column("PRAGMA integrity_check", "integrity_check");
+    if (lines == std::vector<std::string>{"ok"})
+        lines.clear();
+    return lines;
+}
 
 void AddDbInspection(Program &program, CLI::App &db) {
     auto infoOptions = std::make_shared<DbOptions>();

@@ -1,5 +1,6 @@
 // kelosyslog db create, wal, limit, set-device, quarantine, reopen.
 
+#include <sqlite3.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -11,6 +12,7 @@
 
 #include "base/errors.h"
 #include "base/files.h"
+#include "base/sqlite.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/db_commands.h"
@@ -36,6 +38,7 @@ struct DeviceOptions : DbOptions {
 };
 struct QuarantineOptions : DbOptions {
     bool isConfirmed = false;
+    bool isForced = false;
 };
 
 // The library passes its paths to a shell: the database's between double quotes, the schema's without.
@@ -145,12 +148,26 @@ int SetDevice(const DeviceOptions &options) {
     return kExitFound;
 }
 
+bool IsSound(const LogTable &table) {
+    try {
+        return FindProblems(table).empty();
+    } catch (const SqliteError &error) {
+        if (error.code == SQLITE_CORRUPT || error.code == SQLITE_NOTADB)
+            return false;
+        throw;
+    }
+}
+
 int Quarantine(const QuarantineOptions &options) {
     const OutputFormat format = options.Format();
     const std::string path = options.Table().path;
     const std::string aside = path + ".corrupt";
     if (!fs::is_regular_file(path))
         throw DatabaseError(DescribeDatabaseProblem(options.Table()));
+    if (!options.isForced && IsSound(options.Table())) {
+        PrintMessage(path + " is sound; nothing moved (--force moves it nevertheless)");
+        return kExitNothing;
+    }
     const std::string action =
         "move " + path + " to " + aside + (fs::exists(aside) ? ", which replaces an older one" : "");
     if (!options.isConfirmed && !Confirm("db quarantine", action)) {
@@ -222,9 +239,11 @@ void AddDbMaintenance(Program &program, CLI::App &db) {
             "device", device->device, "", "Name of the device")
         ->required();
     auto quarantine = std::make_shared<QuarantineOptions>();
-    Add(program, db, "quarantine", "Put a damaged database aside; syslog-ng begins a new one", quarantine,
-        Quarantine)
-        ->add_flag("-y,--yes", quarantine->isConfirmed, "Do not ask");
+    CLI::App *command =
+        Add(program, db, "quarantine", "Put a damaged database aside; syslog-ng begins a new one", quarantine,
+            Quarantine);
+    command->add_flag("-y,--yes", quarantine->isConfirmed, "Do not ask");
+    command->add_flag("--force", quarantine->isForced, "Do not check that it is damaged");
     auto reopen = std::make_shared<DbOptions>();
     AddDbCommand(program, db, "reopen", "Make syslog-ng reopen its files", *reopen,
                  [reopen] { return Reopen(*reopen); });
