@@ -1,42 +1,105 @@
-// Any keyword gives SQL that SQLite prepares and runs, and that means the same in every position.
+// Any keyword gives SQL that SQLite prepares and runs, and that means the same wherever it stands. One that
+// is written from known terms finds what a naive matcher finds.
 
+#include <fuzzer/FuzzedDataProvider.h>
 #include <unistd.h>
 
-#include <cstddef>
-#include <cstdint>
+#include <algorithm>
+#include <vector>
 
 #include "keloplatform/gensqlregexp.h"
 #include "keloplatform/kelodb.h"
 #include "quiet.h"
+#include "support/naive_match.h"
 
 namespace {
 
-// A connection to a few rows in a file that has no name any more.
+using Texts = std::vector<std::string>;
+
+const Texts kTexts = {"",
+                      "disk full",
+                      "Wörter 100%_[x]",
+                      "a\xff"
+                      "b\xe9",
+                      "it's /a\\b\"c*?",
+                      "a",
+                      "aab",
+                      "ABab",
+                      "[^a]b",
+                      "a-b",
+                      "b/a",
+                      "%a_",
+                      "\"b'"};
+constexpr char kAlphabet[] = "aabbAB%_[]^'\"\\-/*?\1\1\2"; // the last two are any text and any character
+
+std::string Quoted(const std::string &text) {
+    std::string quoted;
+    for (const char byte : text)
+        quoted += byte == '\'' ? "''" : std::string(1, byte);
+    return "'" + quoted + "'";
+}
+
+// A connection to the texts and a NULL in a file that has no name any more.
 DBConnect_tag *Rows() {
     const char *folder = std::getenv("TMPDIR");
     std::string path = std::string(folder != nullptr && folder[0] == '/' ? folder : "/tmp") + "/fuzz-XXXXXX";
     const int file = mkstemp(path.data());
     DBConnect_tag *rows = file >= 0 ? KELODBConnect(nullptr, nullptr, nullptr, path.c_str()) : nullptr;
     close(file);
-    for (const char *sql : {"CREATE TABLE logs(msg TEXT)",
-                            "INSERT INTO logs VALUES (NULL), (''), ('disk full'), ('Wörter 100%_[x]'), "
-                            "(CAST(x'61ff62e9' AS TEXT)), ('it''s /a\\b\"c*?')"}) {
-        if (KELODBExecute(rows, sql, nullptr) != 0)
+    std::string insert = "INSERT INTO logs VALUES (NULL)";
+    for (const std::string &text : kTexts)
+        insert += ", (" + Quoted(text) + ")";
+    for (const std::string &sql : {std::string("CREATE TABLE logs(msg TEXT)"), insert}) {
+        if (KELODBExecute(rows, sql.c_str(), nullptr) != 0)
             Fail("no table", path);
     }
     unlink(path.c_str());
     return rows;
 }
 
-int CountWhere(const std::string &condition) {
+// The texts of the rows that meet the condition; NULL as "NULL".
+Texts Where(const std::string &condition) {
     static DBConnect_tag *const rows = Rows();
-    const std::string sql = "SELECT 1 FROM logs WHERE " + condition;
+    const std::string sql = "SELECT ifnull(msg, 'NULL') AS msg FROM logs WHERE " + condition;
     DBResult_tag *result = nullptr;
     if (KELODBExecute(rows, sql.c_str(), &result) != 0)
         Fail(KELODBErrorGet(rows), sql);
-    const int count = KELODBNumRows(result);
+    Texts found;
+    for (unsigned int row = 0; KELODBFetchRow(result, &row) >= 0;)
+        found.push_back(KELODBFetchField(result, row, "msg"));
     KELODBFreeResult(result);
-    return count;
+    return found;
+}
+
+bool Contains(const std::string &text, const std::string &term) {
+    const bool folds = kelo::test::LowerAscii(term) == term;
+    return kelo::test::NaiveMatch(folds ? kelo::test::LowerAscii(text) : text, "\1" + term + "\1", '\1',
+                                  '\2');
+}
+
+std::string Written(const std::string &term) {
+    std::string text;
+    for (const char character : term) {
+        if (std::string_view("*?\"\\-/").find(character) != std::string_view::npos)
+            text += '\\';
+        text += character == '\1' ? '*' : character == '\2' ? '?' : character;
+    }
+    return text;
+}
+
+void CompareWithNaiveMatcher(FuzzedDataProvider &input) {
+    Texts expected = kTexts;
+    std::string keyword;
+    for (int terms = input.ConsumeIntegralInRange(1, 3); terms > 0; --terms) {
+        std::string term;
+        for (int length = input.ConsumeIntegralInRange(1, 4); length > 0; --length)
+            term += kAlphabet[input.ConsumeIntegralInRange<size_t>(0, sizeof kAlphabet - 2)];
+        const bool isExcluded = input.ConsumeBool();
+        keyword += (isExcluded ? " -" : " ") + Written(term);
+        std::erase_if(expected, [&](const std::string &text) { return Contains(text, term) == isExcluded; });
+    }
+    if (Where("msg IS NOT NULL AND (" + GenSQLRegexp(keyword, "msg") + ")") != expected)
+        Fail("another result than the naive matcher's", keyword);
 }
 
 } // namespace
@@ -44,10 +107,12 @@ int CountWhere(const std::string &condition) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     const std::string keyword(reinterpret_cast<const char *>(data), size);
     const std::string sql = GenSQLRegexp(keyword, "msg");
-    const int found = CountWhere("(" + sql + ")");
-    if (CountWhere("1 AND " + sql + " AND 1") != found || CountWhere("0 OR " + sql) != found)
+    const Texts found = Where("(" + sql + ")");
+    if (Where("1 AND " + sql + " AND 1") != found || Where("0 OR " + sql) != found)
         Fail("no operand", sql);
     if (GenSQLRegexp(" " + keyword, "msg") != sql)
         Fail("a leading blank changes it", sql);
+    FuzzedDataProvider input(data, size);
+    CompareWithNaiveMatcher(input);
     return 0;
 }

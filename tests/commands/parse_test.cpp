@@ -50,7 +50,7 @@ TEST_F(Parse, StoresWholeBatchesWhenKilledAndResumes) {
         ChildProgram child(root_.Path(), kProgram + std::string("parse --db logs.db --resume <in"));
         ASSERT_TRUE(child.Await([&] { return Rows() >= rows; })) << "ended before it could be killed";
         kill(child.Pid(), SIGKILL);
-        EXPECT_EQ(child.AwaitEnd().status, -1);
+        EXPECT_EQ(child.AwaitEnd().status, -SIGKILL);
         EXPECT_EQ(Rows() % kBatchRows, 0);
         ExpectMessages(Rows());
     }

@@ -40,6 +40,13 @@ protected:
         fs::create_directory(root_.File("busy"));
     }
 
+    static std::string TooMany() {
+        std::string values;
+        for (int i = 0; i < 500; ++i)
+            values += ",a";
+        return values;
+    }
+
     // Every file's content, without what SQLite keeps beside a database and what is to record failures.
     std::map<std::string, std::string> Files() const {
         std::map<std::string, std::string> files;
@@ -75,6 +82,17 @@ TEST_F(Refusals, NameTheWordOfAWrongCommandLine) {
         {"search -o xml", 2, "--output: 'xml'"},
         {"search --fields id,nose", 2, "--fields: unknown field 'nose'"},
         {"search -g 'a /(/'", 2, "--grep: 'a /(/': Broken regular expression [(] in a search keyword "},
+        {"search -g ' \t'", 2, "--grep"},
+        {"search -H a,,b", 2, "--host"},
+        {"search -H '!'", 2, "--host"},
+        {"search -H a" + TooMany(), 2, "--host"},
+        {"search -p 8", 2, "'8'"},
+        {"search -p errr", 2, "'errr'"},
+        {"search -p err..", 2, "'err..'"},
+        {"search -p ..err", 2, "'..err'"},
+        {"search -p err...info", 2, "'err...info'"},
+        {"search -p '!'", 2, "--priority"},
+        {"search --table general_log --facility kern", 2, "--facility"},
         {"search -f -r", 2, "--follow"},
         {"search --table transfer_log -g x", 2, "--grep: table transfer_log"},
         {"count --log host08", 2, "'kelosyslog archive --list'"},

@@ -32,6 +32,73 @@ TEST_F(Search, PrintsTheNewestLogsOldestFirstAndTellsMatchFromNoMatch) {
     Expect("search --help", 0);
 }
 
+TEST_F(Search, SelectsByEveryOption) {
+    RunSql(logs_, R"(INSERT INTO logs(id, host, prog, fac, llevel, utcsec, msg) VALUES
+        (1, 'host01', 'p0', 'local0', 'emerg', 1577836800, 'a FAILED b'),
+        (2, 'host02', 'p1', 'kern', 'alert', 1577836801, 'failed'),
+        (3, 'host03', 'p0', 'local7', 'crit', 1577836802, 'x y'), (4, 'host12', 'p1', 'local0', 'err', 1577836803, ''),
+        (5, 'host1', 'p2', 'user', 'warning', 1577836804, 'y x'), (6, 'na[s]*''', 'p2', 'auth', 'notice', 1577836805, '*'),
+        (7, 'nas', 'p2', 'local0', 'info', 1577836806, 'disk'), (8, 'b', 'p2', 'local0', 'debug', 1577836807, 'disk'),
+        (9, NULL, NULL, NULL, NULL, NULL, NULL), (10, 'b', 'p3', 'local0', '7', 1577836809, 'x');
+        CREATE TABLE general_log(id INTEGER PRIMARY KEY, host, llevel, prog, ldate, ltime, luser, msg);
+        INSERT INTO general_log(id, llevel, ldate, ltime, msg) VALUES (1, 'err', '2019/12/31', '23:59:59', 'a'),
+        (2, 'info', '2020/01/01', '00:00:00', 'b'), (3, 'err', '2020/01/01', '10:00:00', 'c'),
+        (4, 'err', '2020/01/02', '00:00:00', 'd'))");
+    std::string many = "-H b";
+    for (int i = 0; i < 499; ++i)
+        many += ",a";
+    const std::pair<std::string, std::string> cases[] = {
+        {"-H host01,host02 -H host03", "1 2 3 "},
+        {"-H 'host1*,!host?2'", "5 "},
+        {"-H \"!na[s]?'\"", "1 2 3 4 5 7 8 9 10 "},
+        {many, "8 10 "},
+        {"-t '!p0' -g '*'", "2 4 5 6 7 8 10 "},
+        {"-p info..warning", "5 6 7 "},
+        {"-p '!debug,!emerg..crit'", "4 5 6 7 9 10 "},
+        {"-p 'warn,!alert'", "1 3 4 5 "},
+        {"-p '!err' -H '!b'", "1 2 3 5 6 7 9 "}, // no value is none that is excluded
+        {"--facility local0,23,!local7", "1 4 7 8 10 "},
+        {"-g failed", "1 2 "},
+        {"-g x -g '\"x y\"'", "3 "},
+        {"--since @1577836802 --until @1577836804", "3 4 5 "},
+        {"--table general_log --since 2020-01-01 --until 2020-01-02", "2 3 "},
+        {"--table general_log --until '2020-01-02 00:00' -p err..err", "1 3 4 "},
+    };
+    for (const auto &[options, ids] : cases) {
+        std::string found = Run("search -o csv --no-header --fields id " + options).out;
+        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
+            found.replace(at, 2, " ");
+        EXPECT_EQ(found, ids) << options.substr(0, 80);
+        Expect("count " + options, 0, std::to_string(std::ranges::count(ids, ' ')) + "\n");
+    }
+}
+
+TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
+    const std::string japanese = "\xe6\x97\xa5\xe6\x9c\xac", prog = "\x1b]0;owned\x07", bad = "\xef\xbf\xbd";
+    const std::string msg = "a\\b\r\nc\td \xff\xc3( \xed\xa0\x80 \xc2\x9b"
+                            "31m \xe2\x80\xae " +
+                            japanese;
+    const std::string shown = R"(a\b\r\nc\td \xff\xc3( \xed\xa0\x80 \u009b31m \u202e )" + japanese + "\n";
+    RunSql(logs_, "INSERT INTO logs(id, utcsec, prio, llevel, host, prog, msg) VALUES (9223372036854775807, "
+                  "1577959872, 'err', 'err', "
+                  "'h\"o,s''t', '" +
+                      prog + "', '" + msg + "')");
+    const std::string json =
+        R"({"id":9223372036854775807,"time":"2020-01-02T10:11:12+00:00","prio":"err","host":"h\"o,s't",)"
+        R"("prog":"\u001b]0;owned\u0007","msg":"a\\b\r\nc\td )" +
+        bad + bad + "( " + bad + bad + bad + " \\u009b31m \xe2\x80\xae " + japanese + "\"}";
+    Expect("search -o json --fields id,time,prio,host,prog,msg", 0, "[\n" + json + "\n]\n");
+    Expect("search -o jsonl --fields id,time,prio,host,prog,msg", 0, json + "\n");
+    Expect("search -o json -H nobody", 1, "[\n]\n");
+    Expect("search -o short", 0, "Jan 02 10:11:12 h\"o,s't \\x1b]0;owned\\x07: " + shown);
+    Expect("search --fields prog,msg", 0, "PROG              MSG\n\\x1b]0;owned\\x07  " + shown);
+    RunSql(logs_, "INSERT INTO logs(id) VALUES (1)");
+    Expect("search -o csv --fields host,prog,msg,llevel,id", 0,
+           "host,prog,msg,prio,id\r\n,,,debug,1\r\n\"h\"\"o,s't\"," + prog + ",\"" + msg +
+               "\",err,9223372036854775807\r\n");
+    Expect("search -o csv --no-header --fields msg -n 1 --offset 1", 0, "\"\"\r\n");
+}
+
 TEST_F(Search, DeletesOnlyWhatWasConfirmed) {
     InsertSampleLogs(logs_, 25000);
     const std::string debug = " 3125 matching logs from " + logs_ + "\n";

@@ -1,7 +1,6 @@
 #include "platform/db_fixture.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
 class Connecting : public testing::Test {
@@ -23,8 +22,6 @@ protected:
 
     TempRoot root;
 };
-
-} // namespace
 
 TEST_F(Connecting, GivesNullAndCreatesNothingForWhatIsNoFile) {
     fs::create_symlink("nowhere", root.File("dangling"));
@@ -87,3 +84,6 @@ TEST_F(Connecting, ReadsWalInAReadOnlyFolderUntilSomebodyWrites) {
     EXPECT_THAT(outcome.error, HasSubstr("changed"));
     EXPECT_FALSE(outcome.hasResult);
 }
+
+} // namespace
+} // namespace kelo::test

@@ -1,88 +1,76 @@
 #include "platform/db_fixture.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
-class Executing : public testing::Test {
+class Executing : public ConnectionTest {
 protected:
-    void SetUp() override {
-        RunSql(path, "CREATE TABLE logs(id INTEGER PRIMARY KEY, host TEXT, msg TEXT);"
-                     "INSERT INTO logs VALUES(1,'a','x'),(2,'b','y;z'),(3,'c','--')");
-        connection = ConnectTo(path);
-    }
-    std::string Count() const { return RunSql(path, "SELECT count(*) FROM logs"); }
-
-    TempRoot root;
-    const std::string path = root.File("logs.db");
-    Connection connection;
+    Executing()
+        : ConnectionTest("INSERT INTO logs(id, host, msg) VALUES(1,'a','x'),(2,'b','y;z'),(3,'c','--')") {}
+    std::string Count() const { return RunSql(path_, "SELECT count(*) FROM logs"); }
 };
-
-} // namespace
 
 TEST_F(Executing, RefusesASecondStatementBeforeAnythingRuns) {
     for (const char *sql : {"DELETE FROM logs; SELECT 1", "DELETE FROM logs;garbage",
                             "/* a */ DELETE FROM logs -- b\n; /* c */ DELETE FROM logs",
                             "PRAGMA user_version=7; DELETE FROM logs"}) {
-        const Outcome outcome = Execute(connection, sql);
+        const Outcome outcome = Run(sql);
         EXPECT_EQ(outcome.status, -1) << sql;
         EXPECT_EQ(outcome.error, "one statement per call") << sql;
-        EXPECT_EQ(SelectLimit(connection, sql, 1, 0, {}).status, -1) << sql;
+        EXPECT_EQ(Run(sql, {}, {{1, 0}}).status, -1) << sql;
     }
     EXPECT_EQ(Count(), "3");
-    EXPECT_EQ(RunSql(path, "PRAGMA user_version"), "0");
+    EXPECT_EQ(RunSql(path_, "PRAGMA user_version"), "0");
 }
 
 TEST_F(Executing, TakesOneStatementWithWhateverBlanksAndCommentsAroundIt) {
     for (const char *sql : {"SELECT * FROM logs", ";; SELECT * FROM logs ; ;\n",
                             "-- a;\nSELECT * FROM logs -- b; c", "/* ' */SELECT * FROM logs/* ; */;-- x",
                             "SELECT * FROM logs /* open;", "SELECT * FROM logs WHERE msg <> ';' --;"}) {
-        EXPECT_EQ(Execute(connection, sql, {"id"}).rows.size(), 3U) << sql;
-        EXPECT_EQ(SelectLimit(connection, sql, 1, 1, {"id", "msg"}).rows.size(), 1U) << sql;
+        EXPECT_EQ(Run(sql, {"id"}).rows.size(), 3U) << sql;
+        EXPECT_EQ(Run(sql, {"id", "msg"}, {{1, 1}}).rows.size(), 1U) << sql;
     }
     const char *trigger = "CREATE TRIGGER t AFTER DELETE ON logs BEGIN SELECT 1; SELECT 2; END;";
-    EXPECT_EQ(Execute(connection, trigger).status, 0);
-    EXPECT_EQ(Execute(connection, "EXPLAIN QUERY PLAN SELECT * FROM logs", {"detail"}).rows.size(), 1U);
+    EXPECT_EQ(Run(trigger).status, 0);
+    EXPECT_EQ(Run("EXPLAIN QUERY PLAN SELECT * FROM logs", {"detail"}).rows.size(), 1U);
 }
 
 TEST_F(Executing, BoundsOnlyASelect) { // Debian's SQLite knows DELETE ... LIMIT
-    EXPECT_EQ(SelectLimit(connection, "DELETE FROM logs", 1, 0, {}).errorCode, SQLITE_ERROR);
+    EXPECT_EQ(Run("DELETE FROM logs", {}, {{1, 0}}).errorCode, SQLITE_ERROR);
     EXPECT_EQ(Count(), "3");
     const std::string sql = "SELECT * FROM logs";
-    EXPECT_EQ(SelectLimit(connection, sql, 0, 1, {}).rows.size(), 2U);
-    EXPECT_EQ(SelectLimit(connection, sql, 4294967295U, 0, {}).rows.size(), 3U);
+    EXPECT_EQ(Run(sql, {}, {{0, 1}}).rows.size(), 2U);
+    EXPECT_EQ(Run(sql, {}, {{4294967295U, 0}}).rows.size(), 3U);
 }
 
 // Few rows are read one by one, many of several columns in another way: the result must be the same.
 TEST_F(Executing, DeliversManyRowsAsItDeliversFew) {
-    RunSql(
-        path,
-        "DELETE FROM logs;"
-        "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 300) "
-        "INSERT INTO logs SELECT i, iif(i % 3, 'h' || i, NULL), CASE i % 5 WHEN 0 THEN i / 3.0 WHEN 1 THEN "
-        "x'C3A4FF' WHEN 2 THEN -i * 30000000000000000 WHEN 3 THEN '' ELSE 'it''s ;' END FROM n");
+    RunSql(path_, "DELETE FROM logs;"
+                  "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 300) "
+                  "INSERT INTO logs(id, host, msg) SELECT i, iif(i % 3, 'h' || i, NULL), CASE i % 5 WHEN 0 "
+                  "THEN i / 3.0 WHEN 1 THEN "
+                  "x'C3A4FF' WHEN 2 THEN -i * 30000000000000000 WHEN 3 THEN '' ELSE 'it''s ;' END FROM n");
     for (const char *sql :
          {"SELECT id, host, msg, host FROM logs", " ;-- a\nSELECT *, 1 AS id FROM logs /* ; */;",
           "WITH x AS (SELECT * FROM logs) SELECT host AS id, msg, id AS host FROM x",
           "SELECT * FROM logs WHERE msg <> ';' ORDER BY msg, id DESC --;"}) {
         const std::vector<std::string> columns = {"id", "host", "msg"};
-        const Outcome all = Execute(connection, sql, columns);
-        auto pages = SelectLimit(connection, sql, 150, 0, columns).rows;
+        const Outcome all = Run(sql, columns);
+        auto pages = Run(sql, columns, {{150, 0}}).rows;
         for (unsigned int offset = 150; offset < 600; offset += 150) {
-            for (const auto &row : SelectLimit(connection, sql, 150, offset, columns).rows)
+            for (const auto &row : Run(sql, columns, {{150, offset}}).rows)
                 pages.push_back(row);
         }
         EXPECT_GT(pages.size(), 200U) << sql;
         EXPECT_EQ(all.rows, pages) << sql;
     }
-    const Outcome late =
-        Execute(connection, "SELECT id, host, abs(iif(id = 299, -9223372036854775808, id)) FROM logs");
+    const Outcome late = Run("SELECT id, host, abs(iif(id = 299, -9223372036854775808, id)) FROM logs");
     EXPECT_EQ(late.error, "integer overflow");
     EXPECT_FALSE(late.hasResult);
 }
 
 TEST_F(Executing, FailsForWhatIsTooBigAndWithoutAConnection) {
-    const Outcome outcome = Execute(connection, "SELECT zeroblob(100000000), 2, 3");
+    const Outcome outcome = Run("SELECT zeroblob(100000000), 2, 3");
     EXPECT_THAT(outcome.error, HasSubstr("too big"));
     EXPECT_FALSE(outcome.hasResult);
     DBResult_tag *result = nullptr;
@@ -118,21 +106,23 @@ TEST_F(Executing, InsertsTheSameByARepeatedFormAsSQLite) {
         "INSERT INTO t VALUES('a', 1)",
         "INSERT INTO t VALUES(NULL, 'after errors', 1)",
     };
-    const std::string twin = root.File("twin.db");
-    for (const std::string &file : {path, twin})
+    const std::string twin = root_.File("twin.db");
+    for (const std::string &file : {path_, twin})
         RunSql(file, "CREATE TABLE t(id INTEGER PRIMARY KEY, a, b TEXT)");
-    sqlite3 *db = nullptr;
-    ASSERT_EQ(sqlite3_open(twin.c_str(), &db), SQLITE_OK);
-    const std::unique_ptr<sqlite3, decltype(&sqlite3_close)> owner(db, sqlite3_close);
+    TestDatabase other(twin);
+    sqlite3 *const db = other.Get();
     for (const std::string &sql : inserts) {
         const bool isGood = sqlite3_exec(db, sql.c_str(), nullptr, nullptr, nullptr) == SQLITE_OK;
-        const Outcome outcome = Execute(connection, sql);
+        const Outcome outcome = Run(sql);
         EXPECT_EQ(outcome.status == 0, isGood) << sql;
         EXPECT_EQ(outcome.errorCode, sqlite3_errcode(db)) << sql;
         EXPECT_EQ(outcome.error, sqlite3_errmsg(db)) << sql;
     }
     const std::string rows = "SELECT group_concat(id || quote(a) || quote(b)) FROM t";
-    EXPECT_EQ(RunSql(path, rows), RunSql(twin, rows));
-    RunSql(path, "DROP TABLE t");
-    EXPECT_EQ(Execute(connection, inserts.back()).error, "no such table: t");
+    EXPECT_EQ(RunSql(path_, rows), RunSql(twin, rows));
+    RunSql(path_, "DROP TABLE t");
+    EXPECT_EQ(Run(inserts.back()).error, "no such table: t");
 }
+
+} // namespace
+} // namespace kelo::test

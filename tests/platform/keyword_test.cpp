@@ -1,11 +1,52 @@
 #include "keloplatform/errors.h"
 #include "keloplatform/gensqlregexp.h"
-#include "platform/search_table.h"
+#include "platform/db_fixture.h"
 
 namespace kelo::test {
 namespace {
 
 using Texts = std::vector<std::string>;
+
+// A table "logs" of texts (column "msg") and one row whose text is NULL, searched through the platform.
+class SearchTable {
+public:
+    explicit SearchTable(const Texts &texts) : texts_(texts) {
+        const std::string path = root_.File("logs.db");
+        CreateLogDatabase(path);
+        for (const std::string &text : texts) {
+            _SYSLOG_LOG_DATA_tag log;
+            log.msg = text;
+            InsertLogs(path, {log});
+        }
+        RunSql(path, "INSERT INTO logs(id) VALUES(0)");
+        connection_ = ConnectTo(path);
+    }
+
+    // The texts that the keyword finds, in their order. A statement that fails gives its error text.
+    Texts Matching(const std::string &keyword) const {
+        const Outcome outcome =
+            Execute(connection_,
+                    "SELECT id FROM logs WHERE id > 0 AND (" + GenSQLRegexp(keyword, "msg") + ") ORDER BY id",
+                    {"id"});
+        Texts found;
+        for (const auto &row : outcome.rows)
+            found.push_back(texts_[std::stoul(*row[0]) - 1]);
+        if (outcome.status != 0)
+            found.push_back(outcome.error);
+        return found;
+    }
+    // How many rows a condition is true for; -1 when the statement fails.
+    int CountWhere(const std::string &condition) const {
+        const Outcome outcome = Execute(connection_, "SELECT id FROM logs WHERE " + condition);
+        return outcome.status == 0 ? static_cast<int>(outcome.rows.size()) : -1;
+    }
+    const Connection &Database() const { return connection_; }
+
+private:
+    TempRoot root_;
+    Texts texts_;
+    Connection connection_;
+};
 
 TEST(Keyword, FindsWhatTheLanguageSays) {
     const struct {

@@ -1,6 +1,5 @@
 // Asking for a reload: by pid file with real processes, and by D-Bus with a systemd of our own.
 
-#include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <systemd/sd-bus.h>
@@ -10,6 +9,7 @@
 #include "keloplatform/errors.h"
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/root.h"
+#include "support/child_program.h"
 #include "support/test.h"
 
 namespace {
@@ -25,39 +25,6 @@ extern "C" int sd_booted() {
 namespace kelo::test {
 namespace {
 
-// A process of this name that ends when it gets a HUP signal, or otherwise with the object.
-class Daemon {
-public:
-    explicit Daemon(const char *name) {
-        char before[16];
-        prctl(PR_GET_NAME, before);
-        prctl(PR_SET_NAME, name); // is inherited
-        pid_ = fork();
-        while (pid_ == 0)
-            pause();
-        prctl(PR_SET_NAME, before);
-    }
-    ~Daemon() {
-        if (pid_ > 0)
-            Stop(SIGKILL);
-    }
-    Daemon(const Daemon &) = delete;
-    Daemon &operator=(const Daemon &) = delete;
-
-    pid_t Pid() const { return pid_; }
-    // The signal that ended it, sent or awaited.
-    int Stop(int signal = 0) {
-        if (signal != 0)
-            kill(pid_, signal);
-        int status = 0;
-        waitpid(std::exchange(pid_, -1), &status, 0);
-        return WIFSIGNALED(status) ? WTERMSIG(status) : 0;
-    }
-
-private:
-    pid_t pid_;
-};
-
 class Reload : public testing::Test {
 protected:
     Reload() {
@@ -68,59 +35,62 @@ protected:
         KELORootSet("");
         isBooted = 0;
     }
+    // A process of this name, which any signal ends.
+    std::unique_ptr<ChildProgram> Start(const std::string &name) const {
+        fs::remove(root_.File(name));
+        fs::create_symlink("/bin/sleep", root_.File(name));
+        auto daemon = std::make_unique<ChildProgram>(root_.Path(), "exec ./" + name + " 1000");
+        EXPECT_TRUE(daemon->AwaitName(name));
+        return daemon;
+    }
+
     TempRoot root_;
     SyslogCapture log_;
 };
 
 TEST_F(Reload, HangsUpTheProgramThatAPidFileNames) {
-    const struct {
-        const char *service;
-        const char *file;
-    } cases[] = {
-        {"syslog-ng", "/run/syslog-ng.pid"},
-        {"syslog-ng", "/var/lib/syslog-ng/syslog-ng.pid"}, // the other one is stale by then
-        {"pkg-Quillbay-syslog", "/run/pkg-Quillbay-syslog.pid"},
-        {"a-service-with-a-long-name", "/run/a-service-with-a-long-name.pid"},
+    const std::pair<std::string, const char *> cases[] = {
+        {"syslog-ng", "run/syslog-ng.pid"},
+        {"syslog-ng", "var/lib/syslog-ng/syslog-ng.pid"}, // the other one is stale by then
+        {"pkg-Quillbay-syslog", "run/pkg-Quillbay-syslog.pid"},
+        {"a-service-with-a-long-name", "run/a-service-with-a-long-name.pid"},
     };
     isBooted = 1; // has no effect under a root
-    for (const auto &c : cases) {
-        Daemon daemon(std::string(c.service).starts_with("pkg") ? "syslog-ng" : c.service);
-        WriteFile(root_.Path() + c.file, std::to_string(daemon.Pid()) + "\n");
-        EXPECT_TRUE(KELOSystemdReload(c.service)) << c.file;
-        EXPECT_EQ(daemon.Stop(), SIGHUP);
+    for (const auto &[service, file] : cases) {
+        const auto daemon = Start(service.starts_with("pkg") ? "syslog-ng" : service);
+        WriteFile(root_.File(file), std::to_string(daemon->Pid()) + "\n");
+        EXPECT_TRUE(KELOSystemdReload(service)) << file;
+        EXPECT_EQ(daemon->AwaitEnd().status, -SIGHUP);
     }
     EXPECT_THAT(log_.TakeTexts(), IsEmpty());
 }
 
 TEST_F(Reload, SparesEveryOtherProcess) {
-    Daemon other("postfix");
-    Daemon gone("syslog-ng");
-    const pid_t stale = gone.Pid();
-    gone.Stop(SIGKILL);
-    const struct {
-        std::string service;
-        std::string content;
-        std::string reason;
-    } cases[] = {
-        {"syslog-ng", std::to_string(other.Pid()), "is not syslog-ng"},
-        {"syslog-ng", std::to_string(stale), "is not syslog-ng"},
+    const auto postfix = Start("postfix"), gone = Start("syslog-ng");
+    const std::string other = std::to_string(postfix->Pid());
+    kill(gone->Pid(), SIGKILL);
+    gone->AwaitEnd();
+    const std::tuple<const char *, std::string, const char *> cases[] = {
+        {"syslog-ng", other, "is not syslog-ng"},
+        {"syslog-ng", std::to_string(gone->Pid()), "is not syslog-ng"},
         {"syslog-ng", "", "no process id"},
         {"syslog-ng", "-1", "no process id"},
         {"syslog-ng", "0", "no process id"},
-        {"syslog-ng", std::to_string(other.Pid()) + " 1", "no process id"},
+        {"syslog-ng", other + " 1", "no process id"},
         {"syslog-ng", "99999999999", "no process id"},
         {"absent", "1", "no pid file"},
-        {"../run/syslog-ng", std::to_string(other.Pid()), "not a service name"},
+        {"../run/syslog-ng", other, "not a service name"},
         {"", "1", "not a service name"},
     };
-    for (const auto &c : cases) {
-        WriteFile(root_.Path() + "/run/syslog-ng.pid", c.content);
-        EXPECT_FALSE(KELOSystemdReload(c.service)) << c.content;
+    for (const auto &[service, content, reason] : cases) {
+        WriteFile(root_.File("run/syslog-ng.pid"), content);
+        EXPECT_FALSE(KELOSystemdReload(service)) << content;
         const std::vector<std::string> texts = log_.TakeTexts();
-        EXPECT_THAT(texts, ElementsAre(HasSubstr(c.reason)));
+        EXPECT_THAT(texts, ElementsAre(HasSubstr(reason)));
         EXPECT_EQ(KELOErrorGet(), texts.at(0));
     }
-    EXPECT_EQ(other.Stop(SIGTERM), SIGTERM);
+    kill(postfix->Pid(), SIGTERM);
+    EXPECT_EQ(postfix->AwaitEnd().status, -SIGTERM);
 }
 
 constexpr char kJob[] = "/org/freedesktop/systemd1/job/7";

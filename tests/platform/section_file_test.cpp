@@ -1,71 +1,72 @@
 #include "keloplatform/torvc.h"
 #include "support/test.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
 constexpr char kFormat[] = "%s=\"%s\"\n";
 using Pairs = std::vector<std::pair<std::string, std::string>>;
 
-int Set(const std::string &path, const char *section, const char *newName, const Pairs &pairs,
-        const char *format = kFormat) {
-    TORVSZHASH *hash = TORVCSzHashAlloc(1);
-    for (const auto &[key, value] : pairs)
-        EXPECT_EQ(TORVCSzHashSetValue(&hash, key.c_str(), value.c_str()), 0);
-    const int status = TORVCFileSetSection(path.c_str(), section, newName, hash, format);
-    TORVCSzHashFree(hash);
-    return status;
-}
+class SectionFile : public testing::Test {
+protected:
+    static int Set(const std::string &path, const char *section, const char *newName, const Pairs &pairs,
+                   const char *format = kFormat) {
+        TORVSZHASH *hash = TORVCSzHashAlloc(1);
+        for (const auto &[key, value] : pairs)
+            EXPECT_EQ(TORVCSzHashSetValue(&hash, key.c_str(), value.c_str()), 0);
+        const int status = TORVCFileSetSection(path.c_str(), section, newName, hash, format);
+        TORVCSzHashFree(hash);
+        return status;
+    }
 
-// The value of one key of a section; "(none)" where it or the section is missing, "(failed)" on failure.
-std::string Get(const std::string &path, const char *section, const char *key) {
-    TORVSZHASH *hash = TORVCSzHashAlloc(4);
-    const int status = TORVCFileGetSection(path.c_str(), section, &hash);
-    const char *value = TORVCSzHashGetValue(hash, key);
-    const std::string text = value != nullptr ? value : status < 0 && errno != ENOENT ? "(failed)" : "(none)";
-    TORVCSzHashFree(hash);
-    return text;
-}
+    // The value of one key of a section; "(none)" where it or the section is missing, "(failed)" on failure.
+    std::string Get(const char *section, const char *key) const {
+        TORVSZHASH *hash = TORVCSzHashAlloc(4);
+        const int status = TORVCFileGetSection(path_.c_str(), section, &hash);
+        const char *value = TORVCSzHashGetValue(hash, key);
+        const std::string text = value != nullptr                ? value
+                                 : status < 0 && errno != ENOENT ? "(failed)"
+                                                                 : "(none)";
+        TORVCSzHashFree(hash);
+        return text;
+    }
 
-std::vector<std::string> Names(const std::string &path, int expectedStatus = 0) {
-    TORVSZLIST *list = TORVCSzListAlloc(1);
-    EXPECT_EQ(TORVCFileEnumSection(path.c_str(), &list), expectedStatus);
-    std::vector<std::string> names(list->items, list->items + list->count);
-    TORVCSzListFree(list);
-    return names;
-}
+    std::vector<std::string> Names(int expectedStatus = 0) const {
+        TORVSZLIST *list = TORVCSzListAlloc(1);
+        EXPECT_EQ(TORVCFileEnumSection(path_.c_str(), &list), expectedStatus);
+        std::vector<std::string> names(list->items, list->items + list->count);
+        TORVCSzListFree(list);
+        return names;
+    }
 
-} // namespace
+    TempRoot root_;
+    SyslogCapture log_;
+    const std::string path_ = root_.File("notify.conf");
+};
 
-TEST(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
+TEST_F(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     const std::string content = "[R1]\nkey=\"1\"\n[R2]\nkey=\"2\"\n";
-    WriteFile(path, content);
+    WriteFile(path_, content);
     const struct {
-        const char *section, *newName, *key, *value, *format, *message;
+        const char *newName, *key, *value, *format, *message;
     } cases[] = {
-        {"R1", "R1", "key", "two\nlines", kFormat, "value of key"},
-        {"R1", "R1", "#key", "1", kFormat, "value of #key"},
-        {"R1", "R1", "key", " blank", "%s=%s\n", "value of key"},
-        {"R1", "R1", "key", "1", "%s=%s%n\n", "line format"},
-        {"R1", "R1", "key", "1", "%s=%s", "line format"},
-        {"R1", "R[1]", "key", "1", kFormat, "\"R[1]\""},
-        {"R1", "", "key", "1", kFormat, "not a section name"},
-        {"R1", "R2", "key", "1", kFormat, "there is a section R2"},
+        {"R1", "key", "two\nlines", kFormat, "value of key"},
+        {"R1", "#key", "1", kFormat, "value of #key"},
+        {"R1", "key", " blank", "%s=%s\n", "value of key"},
+        {"R1", "key", "1", "%s=%s%n\n", "line format"},
+        {"R1", "key", "1", "%s=%s", "line format"},
+        {"R[1]", "key", "1", kFormat, "\"R[1]\""},
+        {"", "key", "1", kFormat, "not a section name"},
+        {"R2", "key", "1", kFormat, "there is a section R2"},
     };
     for (const auto &c : cases) {
-        SyslogCapture log;
-        EXPECT_EQ(Set(path, c.section, c.newName, {{c.key, c.value}}, c.format), -1) << c.message;
-        EXPECT_THAT(log.TakeTexts(), ElementsAre(AllOf(StartsWith(path + ": "), HasSubstr(c.message))));
+        EXPECT_EQ(Set(path_, "R1", c.newName, {{c.key, c.value}}, c.format), -1) << c.message;
+        EXPECT_THAT(log_.TakeTexts(), ElementsAre(AllOf(StartsWith(path_ + ": "), HasSubstr(c.message))));
     }
-    EXPECT_EQ(ReadFile(path), content);
+    EXPECT_EQ(ReadFile(path_), content);
 }
 
-TEST(SectionFile, ChangesNothingButTheSection) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
+TEST_F(SectionFile, ChangesNothingButTheSection) {
     const std::string head = "\xEF\xBB\xBF# rules\r\nloose = 1\r\n\r\n";
     const std::string broken = "[bad\nx=1\n[R1]\nkey=\"late\"";
     const std::string tail = "; about R2\n  [R2] # second\nkey=\"2\"\nno entry\n" + broken;
@@ -82,89 +83,76 @@ TEST(SectionFile, ChangesNothingButTheSection) {
         {"R1", nullptr, {}, head + "\n" + tail},
     };
     for (const auto &c : cases) {
-        WriteFile(path, before);
-        EXPECT_EQ(Set(path, c.section, c.newName, c.pairs), 0);
-        EXPECT_EQ(ReadFile(path), c.after);
+        WriteFile(path_, before);
+        EXPECT_EQ(Set(path_, c.section, c.newName, c.pairs), 0);
+        EXPECT_EQ(ReadFile(path_), c.after);
     }
 }
 
-TEST(SectionFile, ReadsWhatPeopleWrite) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
-    WriteFile(path, "\xEF\xBB\xBF[R1]\r\n a =  plain text # all of it\r\n\tb=\"x\" \r\nc=\na=\"second\"\n"
-                    "[R1] ; again\na=\"third\"\n[ R2 ]\nopen=\"1\nfine=1\n[]\na=1\n[R3");
-    SyslogCapture log;
-    EXPECT_THAT(Names(path), ElementsAre("R1", " R2 "));
-    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr(path + ":11: not a section header")));
-    EXPECT_EQ(Get(path, "R1", "a"), "plain text # all of it");
-    EXPECT_EQ(Get(path, "R1", "b"), "x");
-    EXPECT_EQ(Get(path, "R9", "a"), "(none)");
-    EXPECT_EQ(Get(path, " R2 ", "fine"), "(failed)");
-    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr(path + ":9: ")));
+TEST_F(SectionFile, ReadsWhatPeopleWrite) {
+    WriteFile(path_, "\xEF\xBB\xBF[R1]\r\n a =  plain text # all of it\r\n\tb=\"x\" \r\nc=\na=\"second\"\n"
+                     "[R1] ; again\na=\"third\"\n[ R2 ]\nopen=\"1\nfine=1\n[]\na=1\n[R3");
+    EXPECT_THAT(Names(), ElementsAre("R1", " R2 "));
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre(HasSubstr(path_ + ":11: not a section header")));
+    EXPECT_EQ(Get("R1", "a"), "plain text # all of it");
+    EXPECT_EQ(Get("R1", "b"), "x");
+    EXPECT_EQ(Get("R9", "a"), "(none)");
+    log_.Take();
+    EXPECT_EQ(Get(" R2 ", "fine"), "(failed)");
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre(HasSubstr(path_ + ":9: ")));
 }
 
-TEST(SectionFile, AnswersForEveryKindOfFile) {
-    const TempRoot root;
-    const std::string path = root.File("file");
-    EXPECT_THAT(Names(path, -1), ElementsAre());
+TEST_F(SectionFile, AnswersForEveryKindOfFile) {
+    EXPECT_THAT(Names(-1), IsEmpty());
     EXPECT_EQ(errno, ENOENT);
-    EXPECT_EQ(Set(root.Path(), "R", "R", {}), -1);
+    EXPECT_EQ(Set(root_.Path(), "R", "R", {}), -1);
     EXPECT_EQ(errno, EISDIR);
-    ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
-    Names(path, -1);
-    EXPECT_EQ(Set(path, "R", "R", {}), -1);
-    std::filesystem::remove(path);
+    ASSERT_EQ(mkfifo(path_.c_str(), 0600), 0);
+    Names(-1);
+    EXPECT_EQ(Set(path_, "R", "R", {}), -1);
+    fs::remove(path_);
     const std::string content = std::string("\xFF[\0=\n\x01", 6) + "\n";
-    WriteFile(path, content);
-    EXPECT_EQ(Set(path, "R1", "R1", {{"key", "1"}}), 0);
-    EXPECT_EQ(Get(path, "R1", "key"), "1");
-    EXPECT_TRUE(ReadFile(path).starts_with(content));
+    WriteFile(path_, content);
+    EXPECT_EQ(Set(path_, "R1", "R1", {{"key", "1"}}), 0);
+    EXPECT_EQ(Get("R1", "key"), "1");
+    EXPECT_THAT(ReadFile(path_), StartsWith(content));
 }
 
-TEST(SectionFile, SeesEveryChangeInPlace) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf");
-    for (int i = 0; i < 200; ++i) {
-        WriteFile(path, "[R]\nkey=\"" + std::to_string(10000 + i) + "\"\n");
-        ASSERT_EQ(Get(path, "R", "key"), std::to_string(10000 + i));
+TEST_F(SectionFile, SeesEveryChangeInPlace) {
+    for (int i = 10000; i < 10200; ++i) {
+        WriteFile(path_, "[R]\nkey=\"" + std::to_string(i) + "\"\n");
+        ASSERT_EQ(Get("R", "key"), std::to_string(i));
     }
 }
 
-TEST(SectionFile, KeepsModeOwnerAndLinksWhenItIsReplaced) {
-    const TempRoot root;
-    std::filesystem::create_directory(root.File("real"));
-    const std::string real = root.File("real/notify.conf");
-    const std::string link = root.File("notify.conf");
+TEST_F(SectionFile, KeepsModeOwnerAndLinksWhenItIsReplaced) {
+    const std::string real = root_.File("real/notify.conf"), temporary = root_.File("real/.notify.conf.new");
     WriteFile(real, "[R]\n");
-    WriteFile(root.File("real/.notify.conf.new"), "left by a writer that was killed");
+    WriteFile(temporary, "left by a writer that was killed");
     struct stat before, after;
     ASSERT_EQ(chmod(real.c_str(), 0640), 0);
     ASSERT_TRUE(geteuid() != 0 || chown(real.c_str(), 12345, 23456) == 0);
     ASSERT_EQ(lstat(real.c_str(), &before), 0);
-    std::filesystem::create_symlink("real/notify.conf", link);
-    ASSERT_EQ(Set(link, "R", "R", {{"key", "1"}}), 0);
+    fs::create_symlink("real/notify.conf", path_);
+    ASSERT_EQ(Set(path_, "R", "R", {{"key", "1"}}), 0);
     ASSERT_EQ(lstat(real.c_str(), &after), 0);
-    EXPECT_EQ(after.st_mode, before.st_mode);
-    EXPECT_EQ(after.st_uid, before.st_uid);
-    EXPECT_EQ(after.st_gid, before.st_gid);
-    EXPECT_EQ(Get(real, "R", "key"), "1");
-    EXPECT_TRUE(std::filesystem::is_symlink(link));
-    EXPECT_FALSE(std::filesystem::exists(root.File("real/.notify.conf.new")));
+    EXPECT_EQ(std::tie(after.st_mode, after.st_uid, after.st_gid),
+              std::tie(before.st_mode, before.st_uid, before.st_gid));
+    EXPECT_EQ(Get("R", "key"), "1");
+    EXPECT_TRUE(fs::is_symlink(path_) && !fs::exists(temporary));
 
-    std::filesystem::remove(real);
-    SyslogCapture log;
-    EXPECT_EQ(Set(link, "R", "R", {{"key", "1"}}), -1);
-    EXPECT_THAT(log.TakeTexts(), ElementsAre(HasSubstr("symbolic link to nothing")));
+    fs::remove(real);
+    log_.Take();
+    EXPECT_EQ(Set(path_, "R", "R", {{"key", "1"}}), -1);
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre(HasSubstr("symbolic link to nothing")));
 }
 
-TEST(SectionFile, TwoWritersOfDifferentSectionsLoseNothing) {
-    const TempRoot root;
-    const std::string path = root.File("notify.conf"); // does not exist at the start
-    const auto write = [&](const std::string &writer) {
+TEST_F(SectionFile, LosesNothingToTwoWritersOfDifferentSections) {
+    const auto write = [&](const std::string &writer) { // creates the file
         int failures = 0;
         for (int i = 0; i < 50; ++i) {
             const std::string name = writer + std::to_string(i);
-            failures += Set(path, name.c_str(), name.c_str(), {{"key", name}}) != 0;
+            failures += Set(path_, name.c_str(), name.c_str(), {{"key", name}}) != 0;
         }
         return failures;
     };
@@ -175,22 +163,19 @@ TEST(SectionFile, TwoWritersOfDifferentSectionsLoseNothing) {
     int status = -1;
     ASSERT_EQ(waitpid(child, &status, 0), child);
     EXPECT_EQ(status, 0);
-    EXPECT_EQ(Names(path).size(), 100U);
+    EXPECT_THAT(Names(), testing::SizeIs(100));
 }
 
-TEST(KeyValueFile, GivesTheFirstValueAndTellsWhenItIsCut) {
-    const TempRoot root;
-    const std::string path = root.File("keloinfo.conf");
-    WriteFile(path, "# smtp=\"no\"\nsmtp=\"yes\"\nsmtp=\"no\"\nopen=\"x\n[mail]\nlong=\"0123456789\"\n");
-    const struct {
-        const char *key;
-        int result;
-        const char *text;
-    } cases[] = {{"smtp", 3, "yes"}, {"long", 10, "012"}, {"none", -1, ""}, {"open", -1, ""}};
-    for (const auto &c : cases) {
+TEST_F(SectionFile, GivesTheFirstValueOfAKeyAndTellsWhenItIsCut) {
+    WriteFile(path_, "# smtp=\"no\"\nsmtp=\"yes\"\nsmtp=\"no\"\nopen=\"x\n[mail]\nlong=\"0123456789\"\n");
+    for (const auto &[key, result, text] :
+         {std::tuple("smtp", 3, "yes"), {"long", 10, "012"}, {"none", -1, ""}, {"open", -1, ""}}) {
         char buffer[5] = {'#', '#', '#', '#', '#'};
-        EXPECT_EQ(TORVCFileGetKeyValue(path.c_str(), c.key, buffer, 4, 0), c.result) << c.key;
-        EXPECT_STREQ(buffer, c.text);
+        EXPECT_EQ(TORVCFileGetKeyValue(path_.c_str(), key, buffer, 4, 0), result) << key;
+        EXPECT_STREQ(buffer, text);
         EXPECT_EQ(buffer[4], '#');
     }
 }
+
+} // namespace
+} // namespace kelo::test

@@ -3,8 +3,7 @@
 #include "keloplatform/gensqlregexp.h"
 #include "query/query_fixture.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
 using ConditionText = QueryTest;
@@ -94,3 +93,4 @@ TEST_F(ConditionText, IsBuiltFromTheFilterForm) {
 }
 
 } // namespace
+} // namespace kelo::test

@@ -1,12 +1,8 @@
-#include <syslog.h>
-
-#include <optional>
 #include <stdexcept>
 
 #include "query/query_fixture.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
 const _SYSLOG_SQL_COND_tag kMatchAll{SYSLOG_ATTRI_MSG, SYSLOG_OP_GLOB, "**", {}};
@@ -15,44 +11,35 @@ const _SYSLOG_SQL_COND_tag kHost{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host01", {}};
 using SyslogDBSelectTest = QueryTest;
 
 TEST_F(SyslogDBSelectTest, SendsTheStatementOfItsCase) {
-    using Limit = std::optional<_SYSLOG_SQL_LIMIT_tag>;
-    using Order = std::optional<_SYSLOG_SQL_ORDER_tag>;
-    const Conditions none, all = {kMatchAll}, host = {kHost};
-    const std::string start = "SELECT * FROM t",
+    const std::string all = "SELECT * FROM t", ofHost = all + " WHERE (host = 'host01')",
                       page = "SELECT *, (SELECT max(rowid) FROM t) totalCount FROM t WHERE ";
-    const std::string ofHost = start + " WHERE (host = 'host01')";
-    const char *const execute = "KELODBExecute";
-    const std::string newest = " ORDER BY id desc";
     struct Case {
         Conditions conditions;
-        Limit limit;
-        Order order;
+        std::optional<_SYSLOG_SQL_LIMIT_tag> limit;
+        std::optional<_SYSLOG_SQL_ORDER_tag> order;
         PlatformCall call;
     } cases[] = {
-        {none, {}, {}, {execute, start}},
-        {none, {{0, 7}}, {{1, SYSLOG_ATTRI_XFERIP}}, {execute, start + " ORDER BY ip asc"}},
-        {none,
+        {{}, {}, {}, {"KELODBExecute", all}},
+        {{}, {{0, 7}}, {{1, SYSLOG_ATTRI_XFERIP}}, {"KELODBExecute", all + " ORDER BY ip asc"}},
+        {{},
          {{50, 0}},
          {{0, SYSLOG_ATTRI_ID}},
-         {execute, page + "( id > totalCount - 50 AND id <= totalCount - 0)" + newest}},
-        {all,
+         {"KELODBExecute", page + "( id > totalCount - 50 AND id <= totalCount - 0) ORDER BY id desc"}},
+        {{kMatchAll},
          {{UINT64_MAX, 2}},
          {},
-         {execute, page + "(msg GLOB '**') AND ( id > totalCount - 1 AND id <= totalCount - 2)"}},
-        {host, {}, {{-1, SYSLOG_ATTRI_ID}}, {execute, ofHost + " ORDER BY id asc"}},
-        {host, {{0, 5}}, {}, {"KELODBSelectLimit", ofHost, 0, 5}},
-        {host, {{0x100000005, 0x200000003}}, {}, {"KELODBSelectLimit", ofHost, 5, 3}},
+         {"KELODBExecute", page + "(msg GLOB '**') AND ( id > totalCount - 1 AND id <= totalCount - 2)"}},
+        {{kHost}, {}, {{-1, SYSLOG_ATTRI_ID}}, {"KELODBExecute", ofHost + " ORDER BY id asc"}},
+        {{kHost}, {{0, 5}}, {}, {"KELODBSelectLimit", ofHost, 0, 5}},
+        {{kHost}, {{0x100000005, 0x200000003}}, {}, {"KELODBSelectLimit", ofHost, 5, 3}},
     };
     for (auto &[conditions, limit, order, call] : cases) {
         EXPECT_EQ(SyslogDBSelectByTable(path_, "t", conditions, limit ? &*limit : nullptr,
                                         order ? &*order : nullptr, nullptr, nullptr, false),
                   -1);
-        const std::string message = "fail to execute database command (" + call.text + ")";
-        EXPECT_THAT(log_.Take(), ElementsAre(SyslogMessage{LOG_ERR, message}));
-        const PlatformCall &made = PlatformCalls::Recorded().back();
-        EXPECT_EQ(made.function, call.function);
-        EXPECT_EQ(made.limit, call.limit);
-        EXPECT_EQ(made.offset, call.offset);
+        EXPECT_THAT(log_.Take(),
+                    ElementsAre(Pair(LOG_ERR, "fail to execute database command (" + call.text + ")")));
+        EXPECT_EQ(PlatformCalls::Recorded().back(), call) << call.text;
         EXPECT_EQ(TakeStatement(), call.text);
     }
 }
@@ -124,3 +111,4 @@ TEST_F(SyslogDBSelectCountTest, TellsAMissingRowFromSeveral) {
 }
 
 } // namespace
+} // namespace kelo::test

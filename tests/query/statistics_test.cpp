@@ -1,7 +1,6 @@
 #include "query/query_fixture.h"
 
-using namespace kelo::test;
-
+namespace kelo::test {
 namespace {
 
 class Statistics : public QueryTest {
@@ -32,7 +31,7 @@ TEST_F(Statistics, ReadTheHistogram) {
     EXPECT_EQ(TakeStatement(), "SELECT * FROM histogram WHERE device = 'a'b'");
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "a''b"), 5u);
     EXPECT_EQ(SyslogDBHistGetSingle(path_, "nothing"), 0u);
-    EXPECT_THAT(log_.Take(), IsEmpty());
+    EXPECT_THAT(TakeTexts(), IsEmpty());
 }
 
 TEST_F(Statistics, SumASampleButKeepTheFirstRowOfADevice) {
@@ -67,9 +66,9 @@ TEST_F(Lookup, ListsTheValuesOfAnAttribute) {
     EXPECT_EQ(PlatformCalls::Recorded()[1].offset, 2u);
     EXPECT_THAT(values, ElementsAre("before", "", "a", "b", "c", "b"));
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "event", nullptr, values), -1);
-    EXPECT_THAT(log_.Take(), IsEmpty());
+    EXPECT_THAT(TakeTexts(), IsEmpty());
     EXPECT_EQ(SyslogDBAttriValueGet(path_, "host, msg", nullptr, values), -1);
-    EXPECT_THAT(log_.TakeTexts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
+    EXPECT_THAT(TakeTexts(), ElementsAre("dbutil:710 Log attribute type is incorrect!"));
 }
 
 TEST_F(Lookup, NumbersTheNamesOfADatabaseWithoutKeyTables) {
@@ -83,21 +82,18 @@ TEST_F(Lookup, NumbersTheNamesOfADatabaseWithoutKeyTables) {
 }
 
 TEST_F(Lookup, ReadsTheKeyTablesOfTheFirstGeneration) {
-    const struct {
-        _SYSLOG_EXTKEY_TB_TYPE_tag type;
-        std::string kind;
-    } kinds[] = {{SYSLOG_EXTKEY_HOST, "host"},
-                 {SYSLOG_EXTKEY_PROG, "prog"},
-                 {SYSLOG_EXTKEY_TAG, "tag"},
-                 {SYSLOG_EXTKEY_FAC, "fac"}};
     EXPECT_EQ(SyslogDBVersionGet(path_), 2);
     RunSql(path_, "CREATE TABLE db_info(x)");
     EXPECT_EQ(SyslogDBVersionGet(path_), 1);
     EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, SYSLOG_EXTKEY_HOST, "x"), 0u);
-    EXPECT_THAT(log_.TakeTexts(), ElementsAre("dbutil:966 Fail to get foreign key map"));
-    for (const auto &[type, kind] : kinds) {
-        RunSql(path_, "CREATE TABLE " + kind + "s(" + kind + "_id, " + kind + "_name)");
-        RunSql(path_, "INSERT INTO " + kind + "s VALUES(9, 'x'), (5, 'x'), (5, 'y'), (7, NULL)");
+    EXPECT_THAT(TakeTexts(), ElementsAre("dbutil:966 Fail to get foreign key map"));
+    for (const auto &[type, kind] :
+         std::map<_SYSLOG_EXTKEY_TB_TYPE_tag, std::string>{{SYSLOG_EXTKEY_HOST, "host"},
+                                                           {SYSLOG_EXTKEY_PROG, "prog"},
+                                                           {SYSLOG_EXTKEY_TAG, "tag"},
+                                                           {SYSLOG_EXTKEY_FAC, "fac"}}) {
+        RunSql(path_, "CREATE TABLE " + kind + "s(" + kind + "_id, " + kind + "_name); INSERT INTO " + kind +
+                          "s VALUES(9, 'x'), (5, 'x'), (5, 'y'), (7, NULL)");
         EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, type, "x"), 5u) << kind;
         EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, type, ""), 7u);
         EXPECT_EQ(SyslogDBExtkeyLookupByName(path_, type, "y"), 0u);
@@ -106,4 +102,30 @@ TEST_F(Lookup, ReadsTheKeyTablesOfTheFirstGeneration) {
     EXPECT_EQ(SyslogDBExtkeyMapGet(path_, static_cast<_SYSLOG_EXTKEY_TB_TYPE_tag>(4), names), -1);
 }
 
+using Schema = QueryTest;
+
+TEST_F(Schema, DefinesOneTableOfLogsForWorkingDatabasesAndArchives) {
+    const std::string archive = root_.File("archive.db");
+    CreateLogDatabase(archive, "archive.sql");
+    RunSql(archive, "UPDATE db_info SET device = 'nas'");
+    CreateLogDatabase(archive, "archive.sql"); // once more: keeps what is there
+    EXPECT_EQ(RunSql(archive, "SELECT group_concat(device) FROM db_info"), "nas");
+    const std::string definitions = "SELECT group_concat(name || sql, ';') FROM (SELECT * FROM sqlite_master "
+                                    "WHERE tbl_name = 'logs' ORDER BY name)";
+    for (const char *index : {"logs_host_idx", "logs_prog_idx", "logs_ldate_idx", "logs_utcsec_idx"})
+        EXPECT_THAT(RunSql(path_, definitions), HasSubstr(index));
+    EXPECT_EQ(RunSql(archive, definitions), RunSql(path_, definitions));
+    EXPECT_EQ(SyslogDBVersionGet(path_), 2);
+    EXPECT_EQ(SyslogDBVersionGet(archive), 1);
+}
+
+TEST_F(Schema, NeverUsesAnIdAgain) {
+    InsertSampleLogs(path_, 3);
+    EXPECT_EQ(SyslogDBDelete(path_, {}), 0);
+    EXPECT_EQ(TakeStatement(), "DELETE FROM logs");
+    InsertSampleLogs(path_, 1);
+    EXPECT_EQ(RunSql(path_, "SELECT group_concat(id) FROM logs"), "4");
+}
+
 } // namespace
+} // namespace kelo::test

@@ -63,9 +63,14 @@ bool ChildProgram::AwaitErr(const std::string &text) {
     return Await([&] { return Err().find(text) != std::string::npos; });
 }
 
+bool ChildProgram::AwaitName(const std::string &name) {
+    const std::string path = "/proc/" + std::to_string(pid_) + "/comm";
+    return Await([&] { return ReadFile(path) == name.substr(0, 15) + "\n"; });
+}
+
 ProgramResult ChildProgram::AwaitEnd() {
     HasEnded(0);
-    return {WIFEXITED(status_) ? WEXITSTATUS(status_) : -1, Out(), Err()};
+    return {WIFEXITED(status_) ? WEXITSTATUS(status_) : -WTERMSIG(status_), Out(), Err()};
 }
 
 ProgramResult ChildProgram::End() {

@@ -10,7 +10,7 @@
 namespace kelo::test {
 
 struct ProgramResult {
-    int status = -1; // exit status, -1 when a signal ended it
+    int status = -1; // exit status; -N when signal N ended it
     std::string out;
     std::string err;
 };
@@ -35,6 +35,8 @@ public:
     // Waits until the condition holds; false when the program ends before, or after a minute.
     bool Await(const std::function<bool()> &isReached);
     bool AwaitErr(const std::string &text);
+    // Waits until "exec" has made it the program of this name.
+    bool AwaitName(const std::string &name);
     // Waits for its end, with its input left open or closed.
     ProgramResult AwaitEnd();
     ProgramResult End();

@@ -16,6 +16,7 @@ struct PlatformCall {
     std::string text;       // SQL text, path or other leading text argument
     unsigned int limit = 0; // of KELODBSelectLimit
     unsigned int offset = 0;
+    bool operator==(const PlatformCall &) const = default;
 };
 
 // One call of the notification service.
