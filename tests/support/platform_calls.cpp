@@ -110,11 +110,10 @@ using namespace kelo::test;
 
 #define KELO_REAL(name, ...) CallReal<&name>(#name, __VA_ARGS__)
 #define KELO_UNPACK(...) __VA_ARGS__
-// A function that fails with `failure` when it has to. `text` is recorded; `after` takes the real one's
-// answer.
+// A function that fails with `failure` when it must. `text` is recorded; `after` gets the real one's result.
 #define KELO_DOUBLE(Type, name, parameters, arguments, text, failure, after)                                 \
     Type name parameters {                                                                                   \
-        return MustFail(#name, text) ? failure : after(KELO_REAL(name, KELO_UNPACK arguments));              \
+        return MustFail(#name, text) ? (failure) : after(KELO_REAL(name, KELO_UNPACK arguments));            \
     }
 
 bool KELOSystemdReload(const std::string &service) {
