@@ -18,16 +18,16 @@ protected:
         PlatformCalls::Reset();
     }
 
+    // The messages since the last call; behind "<N>" where the priority is not that of an error.
+    std::vector<std::string> Take() {
+        std::vector<std::string> messages;
+        for (const auto &[priority, text] : log_.Take())
+            messages.push_back((priority == LOG_ERR ? "" : "<" + std::to_string(priority) + ">") + text);
+        return messages;
+    }
+
     const std::string path_ = root_.File("logs.db");
     DBHandler db_{path_, BuildPath("package/schema/archive.sql")};
 };
-
-// What a report and a message of other priority look like.
-inline SyslogMessage Error(const std::string &text) {
-    return {LOG_ERR, text};
-}
-inline SyslogMessage Info(const std::string &text) {
-    return {LOG_INFO, text};
-}
 
 } // namespace kelo::test

@@ -28,10 +28,10 @@ TEST_F(DbInfo, ReadsThe32BitTimesAndThe64BitCount) {
     EXPECT_EQ(info.start_time, 0);
     info.device = "kept";
     RunSql(path_, "DROP TABLE db_info");
-    log_.Take();
+    Take();
     EXPECT_EQ(db_.DBInfoGet(info), -1);
     EXPECT_EQ(info.device, "kept");
-    EXPECT_EQ(log_.Take().back(), Error("Fail to execute SQL command: SELECT * FROM db_info"));
+    EXPECT_EQ(Take().back(), "Fail to execute SQL command: SELECT * FROM db_info");
 }
 
 TEST_F(DbInfo, ComputesCountAndTimesFromTheLogs) {
@@ -45,16 +45,15 @@ TEST_F(DbInfo, ComputesCountAndTimesFromTheLogs) {
     EXPECT_EQ(db_.DBLogEndTimeGet(), 2147483647);
     EXPECT_EQ(db_.DBInfoEndStrGet(), "2038-01-19");
     EXPECT_EQ(db_.DBInfoStartStrGet(), "2020-01-01"); // the day before in UTC
-    EXPECT_THAT(log_.Take(), IsEmpty());
+    EXPECT_THAT(Take(), IsEmpty());
 
     RunSql(path_, "DELETE FROM logs");
     EXPECT_EQ(db_.DBLogCountGet(), 0);
     EXPECT_EQ(db_.DBLogStartTimeGet(), 0);
-    EXPECT_THAT(log_.Take(), IsEmpty());
+    EXPECT_THAT(Take(), IsEmpty());
     EXPECT_EQ(db_.DBInfoStartStrGet(), "1970-01-01");
     EXPECT_EQ(db_.DBInfoEndStrGet(), "1970-01-01");
-    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to get database start time"),
-                                         Error("Fail to get database end time")));
+    EXPECT_THAT(Take(), ElementsAre("Fail to get database start time", "Fail to get database end time"));
 }
 
 } // namespace

@@ -8,12 +8,12 @@ using Syslogng = DbTest;
 TEST_F(Syslogng, HangsUpThePackagesServiceWhereThePackageIsEnabled) {
     PlatformCalls::answers.reload = false;
     EXPECT_EQ(SyslogngHupSignalSend(), -1);
-    EXPECT_THAT(log_.Take(), ElementsAre(Error("Fail to send HUP signal to syslog-ng")));
+    EXPECT_THAT(Take(), ElementsAre("Fail to send HUP signal to syslog-ng"));
     WriteFile(root_.File("var/packages/Quillbay/enabled"), "");
     PlatformCalls::answers.reload = true;
     EXPECT_EQ(SyslogngHupSignalSend(), 0);
     EXPECT_THAT(PlatformCalls::Texts({"KELOSystemdReload"}), ElementsAre("syslog-ng", "pkg-Quillbay-syslog"));
-    EXPECT_THAT(log_.Take(), IsEmpty());
+    EXPECT_THAT(Take(), IsEmpty());
 }
 
 TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {

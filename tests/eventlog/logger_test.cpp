@@ -1,4 +1,5 @@
 #include "eventlog/event_fixture.h"
+#include "support/naive_match.h"
 
 namespace kelo::test {
 namespace {
@@ -7,42 +8,33 @@ using LoggerTest = EventTest;
 
 // The calls of one LogAdd that rotates: each fails once, in turn.
 TEST_F(LoggerTest, ReportsEachFailingStepAndKeepsTheEventOnceItIsIn) {
-    const std::string insert = "INSERT INTO log VALUES(NULL, '0', '";
-    const struct {
-        const char *step;
-        int result;
-        Lines messages; // the beginning of each
-    } cases[] = {
-        {"connect", -1, {"Fail to open db: " + db_, "Fail to connect db"}},
-        {"BEGIN", 0, {"Fail to begin transaction", "Fail to check sanity (DBTranEnd)"}},
-        {"INSERT", -1, {"Fail to execute SQL command: " + insert}},
-        {"END", -1, {"Fail to end transaction"}},
-        {"connect to count", 0, {"Fail to connect syslog log database"}},
-        {"COUNT", 0, {"Fail to select syslog log database"}},
-        {"fetch the count", 0, {"Fail to fetch row"}},
-        {"connect to rotate",
-         0,
-         {"Fail to open db: " + db_, "Fail to connect db", "Fail to rotate log database"}},
-        {"SELECT time",
-         0,
-         {"Fail to execute SQL command: SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000",
-          "Fail to rotate log database"}},
-        {"fetch the time", 0, {}},
-        {"DELETE",
-         0,
-         {"Fail to execute SQL command: DELETE FROM log WHERE time <= 0", "Fail to rotate log database"}},
-        {"VACUUM", 0, {"Fail to execute SQL command: VACUUM", "Fail to rotate log database"}},
+    const std::string noDatabase = "Fail to open db: " + db_ + ";Fail to connect db;",
+                      failed = "Fail to execute SQL command: ", noRotation = ";Fail to rotate log database;";
+    const std::tuple<const char *, int, std::string> cases[] = {
+        {"connect", -1, noDatabase},
+        {"BEGIN", 0, "Fail to begin transaction;Fail to check sanity (DBTranEnd);"},
+        {"INSERT", -1, failed + "INSERT INTO log VALUES(NULL, '0', '*;"},
+        {"END", -1, "Fail to end transaction;"},
+        {"connect to count", 0, "Fail to connect syslog log database;"},
+        {"COUNT", 0, "Fail to select syslog log database;"},
+        {"fetch the count", 0, "Fail to fetch row;"},
+        {"connect to rotate", 0, noDatabase + "Fail to rotate log database;"},
+        {"SELECT time", 0,
+         failed + "SELECT time FROM log ORDER BY time DESC LIMIT 1 OFFSET 18000" + noRotation},
+        {"fetch the time", 0, ""},
+        {"DELETE", 0, failed + "DELETE FROM log WHERE time <= 0" + noRotation},
+        {"VACUUM", 0, failed + "VACUUM" + noRotation},
     };
     CreateEvents(19998);
     int rows = 19998;
-    for (int call = 1; const auto &[step, result, messages] : cases) {
+    for (int call = 1; const auto &[step, result, pattern] : cases) {
         PlatformCalls::FailFrom(call++, 1);
         EXPECT_EQ(logger_.LogAdd(db_, 0, "ann", step), result) << step;
         EXPECT_TRUE(PlatformCalls::HasFailed()) << step;
-        std::vector<testing::Matcher<std::string>> expected;
-        for (const std::string &message : messages)
-            expected.push_back(StartsWith(message));
-        EXPECT_THAT(TakeTexts(), testing::ElementsAreArray(expected)) << step;
+        std::string messages;
+        for (const std::string &text : TakeTexts())
+            messages += text + ";";
+        EXPECT_TRUE(NaiveMatch(messages, pattern)) << messages;
         rows += result == 0;
         EXPECT_EQ(Rows(), std::to_string(rows)) << step;
         EXPECT_EQ(PlatformCalls::OpenHandles(), 0) << step;
