@@ -11,10 +11,10 @@ using Words = std::set<std::string>;
 
 // What bash offers for the last of `words`, which are to be quoted for the shell.
 Words Complete(const std::string &words) {
-    const ProgramResult result = RunIn(
-        ProgramFolder(), "bash -c \". ../package/completion/kelosyslog; COMP_WORDS=(kelosyslog " + words +
-                             "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
-                             "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"");
+    const ProgramResult result =
+        RunIn(BuildPath("package"), "bash -c \". completion/kelosyslog; COMP_WORDS=(kelosyslog " + words +
+                                        "); COMP_CWORD=\\$((\\${#COMP_WORDS[@]} - 1)); _kelosyslog; "
+                                        "printf '%s\\n' \\\"\\${COMPREPLY[@]}\\\"\"");
     EXPECT_EQ(result.status, 0) << result.err;
     Words offered;
     std::istringstream lines(result.out);

@@ -15,7 +15,7 @@
 namespace kelo::test {
 
 std::string InFolder(const std::string &folder, const std::string &command) {
-    return "cd '" + folder + "' && PATH=" + ProgramFolder() + ":$PATH TZ=UTC0 && export PATH TZ && " +
+    return "cd '" + folder + "' && PATH=" + BuildPath("bin") + ":$PATH TZ=UTC0 && export PATH TZ && " +
            command;
 }
 

@@ -1,13 +1,11 @@
 #include "support/platform_calls.h"
 
-#include <atomic>
 #include <mutex>
 
 #include "keloplatform/kelodb.h"
 #include "keloplatform/kelonotify.h"
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/torvc.h"
-#include "support/doubles.h"
 
 namespace kelo::test {
 namespace {
@@ -15,41 +13,12 @@ namespace {
 // In the real library: what it calls of its own functions is no call into the platform.
 using PlatformVisit = Stay<struct Platform>;
 
-struct State {
-    std::vector<PlatformCall> recorded;
-    std::vector<SentNotification> sent;
-    NthCall failing;
-    std::string failedFunction;
-};
-State state;
 std::mutex mutex;
-std::atomic<int> openHandles;
 std::map<const TORVSZHASH *, std::map<std::string, std::string>> hashes;
 
-std::string TextOf(const char *text) {
-    return text != nullptr ? text : "";
-}
-std::string TextOf(const std::string &text) {
-    return text;
-}
-
-// Records a call, and says whether it has to fail.
-template <typename Text>
-bool MustFail(const char *function, const Text &text, unsigned int limit = 0, unsigned int offset = 0) {
-    if (PlatformVisit::IsActive())
-        return false;
+bool MustFail(const char *function, const char *text, unsigned int limit = 0, unsigned int offset = 0) {
     const FaultPause pause;
-    const std::lock_guard lock(mutex);
-    state.recorded.push_back({function, TextOf(text), limit, offset});
-    const bool fails = state.failing.MustFail();
-    if (fails && state.failedFunction.empty())
-        state.failedFunction = function;
-    return fails;
-}
-
-void CountHandle(const void *handle, int change) {
-    if (handle != nullptr && !PlatformVisit::IsActive())
-        openHandles += change;
+    return PlatformCalls::MustFail(function, text != nullptr ? text : "", limit, offset);
 }
 
 template <auto *Function, typename... Arguments>
@@ -60,48 +29,49 @@ auto CallReal(const char *name, const Arguments &...arguments) {
 
 template <typename Handle>
 Handle *Opened(Handle *handle) {
-    CountHandle(handle, 1);
+    PlatformCalls::CountHandle(handle, 1);
     return handle;
 }
 
 int WithResult(int status, DBResult_tag **result) {
     if (status >= 0 && result != nullptr)
-        CountHandle(*result, 1);
+        Opened(*result);
     return status;
+}
+
+template <typename Handle>
+Handle *Closing(Handle *handle) {
+    PlatformCalls::CountHandle(handle, -1);
+    return handle;
 }
 
 } // namespace
 
-void PlatformCalls::Reset() {
-    state = {};
+bool PlatformCalls::MustFail(const char *function, const std::string &text, unsigned int limit,
+                             unsigned int offset) {
+    if (PlatformVisit::IsActive())
+        return false;
+    const FaultPause pause;
+    const std::lock_guard lock(mutex);
+    recorded_.push_back({function, text, limit, offset});
+    const bool fails = failing_.MustFail();
+    if (fails && failedFunction_.empty())
+        failedFunction_ = function;
+    return fails;
 }
-void PlatformCalls::Start() {
-    Reset();
-    answers = {};
+
+void PlatformCalls::CountHandle(const void *handle, int change) {
+    if (handle != nullptr && !PlatformVisit::IsActive())
+        openHandles_ += change;
 }
-const std::vector<PlatformCall> &PlatformCalls::Recorded() {
-    return state.recorded;
-}
+
 std::vector<std::string> PlatformCalls::Texts(const std::set<std::string> &functions) {
     std::vector<std::string> texts;
-    for (const PlatformCall &call : state.recorded) {
+    for (const PlatformCall &call : recorded_) {
         if (functions.contains(call.function))
             texts.push_back(call.text);
     }
     return texts;
-}
-const std::vector<SentNotification> &PlatformCalls::Sent() {
-    return state.sent;
-}
-int PlatformCalls::OpenHandles() {
-    return openHandles;
-}
-void PlatformCalls::FailFrom(int first, int times) {
-    state.failing = {first, times};
-    state.failedFunction.clear();
-}
-std::string PlatformCalls::FailedFunction() {
-    return state.failedFunction;
 }
 
 } // namespace kelo::test
@@ -117,7 +87,7 @@ using namespace kelo::test;
     }
 
 bool KELOSystemdReload(const std::string &service) {
-    if (MustFail("KELOSystemdReload", service))
+    if (MustFail("KELOSystemdReload", service.c_str()))
         return false;
     if (PlatformCalls::answers.onReload)
         PlatformCalls::answers.onReload();
@@ -176,31 +146,24 @@ int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDi
     if (MustFail("KELOSysNotifySendNotificationCustomized", tag))
         return -1;
     const FaultPause pause;
-    state.sent.push_back({tag, textsDir, filterFile, {}});
-    if (hash != nullptr && *hash != nullptr)
-        state.sent.back().values = hashes[*hash];
+    PlatformCalls::Send({tag, textsDir, filterFile, hash != nullptr ? hashes[*hash] : hashes[nullptr]});
     const auto answer = PlatformCalls::answers.notification;
     return answer ? *answer
                   : KELO_REAL(KELOSysNotifySendNotificationCustomized, tag, textsDir, filterFile, hash, zero);
 }
 
 int KELODBClose(DBConnect_tag *connection) {
-    CountHandle(connection, -1);
-    return KELO_REAL(KELODBClose, connection);
+    return KELO_REAL(KELODBClose, Closing(connection));
 }
 
 void KELODBFreeResult(DBResult_tag *result) {
-    CountHandle(result, -1);
-    KELO_REAL(KELODBFreeResult, result);
+    KELO_REAL(KELODBFreeResult, Closing(result));
 }
 
 void TORVCSzHashFree(TORVSZHASH *hash) {
-    CountHandle(hash, -1);
-    {
-        const FaultPause pause;
-        hashes.erase(hash);
-    }
-    KELO_REAL(TORVCSzHashFree, hash);
+    KELO_REAL(TORVCSzHashFree, Closing(hash));
+    const FaultPause pause;
+    hashes.erase(hash);
 }
 
 } // extern "C"

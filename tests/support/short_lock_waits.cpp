@@ -2,50 +2,18 @@
 
 #include <sqlite3.h>
 
-#include <utility>
-
 #include "support/doubles.h"
 
-namespace kelo::test {
-namespace {
+using namespace kelo::test;
 
-bool isShort = false;
-int (*installed)(void *, int) = nullptr;
-int givenUp = 0;
-
-int AskTwice(void *context, int calls) {
-    if (calls < 2)
-        return installed(context, calls);
-    ++givenUp;
-    return 0;
+ShortLockWaits::Handler ShortLockWaits::Replaced(Handler handler) {
+    if (!isShort_ || FaultPause::IsActive())
+        return handler;
+    installed_ = handler;
+    return [](void *context, int calls) { return calls < 2 ? installed_(context, calls) : (++givenUp_, 0); };
 }
-
-} // namespace
-
-ShortLockWaits::ShortLockWaits() {
-    isShort = true;
-    givenUp = 0;
-}
-
-ShortLockWaits::~ShortLockWaits() {
-    isShort = false;
-}
-
-int ShortLockWaits::TakeCount() {
-    return std::exchange(givenUp, 0);
-}
-
-bool ShortLockWaits::WaitsAtCall(int number) const {
-    return installed != nullptr && installed(nullptr, number) != 0;
-}
-
-} // namespace kelo::test
 
 extern "C" int sqlite3_busy_handler(sqlite3 *db, int (*handler)(void *, int), void *context) {
-    using namespace kelo::test;
-    static const auto real = Real<&sqlite3_busy_handler>("sqlite3_busy_handler");
-    if (!isShort || FaultPause::IsActive())
-        return real(db, handler, context);
-    installed = handler;
-    return real(db, AskTwice, context);
+    return Real<&sqlite3_busy_handler>("sqlite3_busy_handler")(db, ShortLockWaits::Replaced(handler),
+                                                               context);
 }

@@ -1,14 +1,27 @@
 #pragma once
 
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
 #include <string>
 
 namespace kelo::test {
 
+namespace fs = std::filesystem;
+
 // A fresh folder that disappears with the object. Its name holds nothing that needs quoting.
 class TempRoot {
 public:
-    TempRoot();
-    ~TempRoot();
+    TempRoot() {
+        if (mkdtemp(path_.data()) == nullptr)
+            throw std::runtime_error("cannot create " + path_);
+    }
+    ~TempRoot() {
+        std::error_code ignored;
+        fs::remove_all(path_, ignored);
+    }
     TempRoot(const TempRoot &) = delete;
     TempRoot &operator=(const TempRoot &) = delete;
 
@@ -16,12 +29,23 @@ public:
     std::string File(const std::string &name) const { return path_ + "/" + name; }
 
 private:
-    std::string path_;
+    std::string path_ = (fs::temp_directory_path() / "kelosyslog-test-XXXXXX").string();
 };
 
 // The whole content of a file; "" when it cannot be read.
-std::string ReadFile(const std::string &path);
+inline std::string ReadFile(const std::string &path) {
+    std::ostringstream content;
+    content << std::ifstream(path, std::ios::binary).rdbuf();
+    return content.str();
+}
+
 // Creates or replaces a file, with its folders. Throws when it cannot.
-void WriteFile(const std::string &path, const std::string &content);
+inline void WriteFile(const std::string &path, const std::string &content) {
+    fs::create_directories(fs::path(path).parent_path());
+    std::ofstream file(path, std::ios::binary | std::ios::trunc);
+    file << content;
+    if (!file.flush())
+        throw std::runtime_error("cannot write " + path);
+}
 
 } // namespace kelo::test

@@ -27,6 +27,8 @@
 #include <string>
 #include <vector>
 
+#include "keloplatform/root.h"
+#include "kelosyslog/root.h"
 #include "support/log_database.h"
 #include "support/platform_calls.h"
 #include "support/source_dir.h"
@@ -35,7 +37,6 @@
 
 namespace kelo::test {
 
-namespace fs = std::filesystem;
 using testing::AllOf, testing::AnyOf, testing::Not, testing::IsEmpty;
 using testing::Contains, testing::ElementsAre, testing::Pair;
 using testing::HasSubstr, testing::MatchesRegex, testing::StartsWith;
@@ -44,11 +45,23 @@ using testing::HasSubstr, testing::MatchesRegex, testing::StartsWith;
 // the platform is left open.
 class LibraryTest : public testing::Test {
 protected:
-    LibraryTest();
-    ~LibraryTest() override;
+    LibraryTest() {
+        SyslogRootSet(root_.Path());
+        KELORootSet(root_.Path().c_str());
+        PlatformCalls::Start();
+    }
+    ~LibraryTest() override {
+        EXPECT_EQ(PlatformCalls::OpenHandles(), 0);
+        SyslogRootSet("");
+        KELORootSet("");
+    }
 
     // The system log since the last call, without what the database handler adds about failed statements.
-    std::vector<std::string> TakeTexts();
+    std::vector<std::string> TakeTexts() {
+        std::vector<std::string> texts = log_.TakeTexts();
+        std::erase_if(texts, [](const std::string &text) { return text.starts_with("dbhandler:"); });
+        return texts;
+    }
 
     TempRoot root_;
     SyslogCapture log_;
