@@ -3,6 +3,8 @@
 #include <memory>
 #include <stdexcept>
 
+#include "base/text_encoding.h"
+
 namespace kelo::tool {
 
 Json::Value ParseJson(const std::string &text) {
@@ -24,11 +26,33 @@ Json::Value ParseJson(const std::string &text) {
     return value;
 }
 
-std::string WriteJsonLine(const Json::Value &value) {
+std::string WriteJsonLine(const Json::Value &value, JsonTexts texts) {
     Json::StreamWriterBuilder builder;
     builder["indentation"] = "";
-    builder["emitUTF8"] = true;
+    builder["emitUTF8"] = texts == JsonTexts::kUtf8;
+    if (texts == JsonTexts::kAscii) {
+        builder["precision"] = 2;
+        builder["precisionType"] = "decimal";
+    }
     return Json::writeString(builder, value) + "\n";
+}
+
+void JsonObject::AddName(std::string_view name) {
+    out_ += std::exchange(separator_, ',');
+    if (layout_ == Layout::kLineEach)
+        out_ += "\n  ";
+    AppendJsonString(out_, name);
+    out_ += layout_ == Layout::kLineEach ? ": " : ":";
+}
+
+void JsonObject::Add(std::string_view name, std::string_view text) {
+    AddName(name);
+    AppendJsonString(out_, text);
+}
+
+void JsonObject::AddJson(std::string_view name, std::string_view json) {
+    AddName(name);
+    out_ += json;
 }
 
 } // namespace kelo::tool

@@ -6,6 +6,7 @@
 #include <memory>
 
 #include "base/errors.h"
+#include "base/json.h"
 #include "base/text_encoding.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
@@ -39,14 +40,15 @@ const char *TypeName(int32_t type) {
     return type >= kSeverityRule && type <= kKeywordRule ? kNames[type] : "unknown";
 }
 
-std::string ToJson(const _SYSLOG_NOTIFY_RULES_tag &rule) {
-    std::string text = "{\"name\":";
-    AppendJsonString(text, rule.name);
-    text += std::string(",\"type\":\"") + TypeName(rule.type) +
-            "\",\"severity\":" + std::to_string(rule.pri) + ",\"eps\":" + std::to_string(rule.eps) +
-            ",\"keyword\":";
-    AppendJsonString(text, rule.pattern);
-    return text + ",\"enabled\":" + (rule.enable ? "true" : "false") + "}";
+void AppendJson(std::string &out, const _SYSLOG_NOTIFY_RULES_tag &rule) {
+    JsonObject object(out);
+    object.Add("name", rule.name);
+    object.Add("type", TypeName(rule.type));
+    object.AddJson("severity", std::to_string(rule.pri));
+    object.AddJson("eps", std::to_string(rule.eps));
+    object.Add("keyword", rule.pattern);
+    object.AddJson("enabled", rule.enable ? "true" : "false");
+    object.End();
 }
 
 } // namespace
@@ -99,16 +101,21 @@ std::string DescribeRule(const _SYSLOG_NOTIFY_RULES_tag &rule) {
 
 int PrintRules(const RuleSet &set, const std::string &path, const std::string &format) {
     const bool isJson = IsJson(format);
-    std::string text = isJson ? "[" : "";
+    JsonLines lines(isJson);
+    std::string text;
+    lines.Begin(text);
     for (const _SYSLOG_NOTIFY_RULES_tag &rule : set.rules) {
+        lines.BeginItem(text);
         if (isJson)
-            text += (text.size() > 1 ? ",\n" : "\n") + ToJson(rule);
+            AppendJson(text, rule);
         else
             text += std::string(rule.enable ? "on   " : "off  ") + EscapeForTerminal(rule.name) + ": " +
-                    EscapeForTerminal(DescribeRule(rule)) + "\n";
+                    EscapeForTerminal(DescribeRule(rule));
+        lines.EndItem(text);
     }
+    lines.End(text);
     Output output(true);
-    output.Write(isJson ? text + "\n]\n" : text);
+    output.Write(text);
     output.Finish();
     if (!set.broken.empty()) {
         PrintMessage(path + ": section [" + set.broken +

@@ -1,6 +1,7 @@
 #include "commands/rule_test.h"
 
 #include "base/errors.h"
+#include "base/json.h"
 #include "base/text_encoding.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
@@ -25,39 +26,42 @@ bool Fires(const _SYSLOG_NOTIFY_RULES_tag &rule, const RuleTestOptions &options)
            options.text.find(rule.pattern) != std::string::npos;
 }
 
-// One line of the result: a rule, or the tested part of a record, and the match.
-void AppendLine(std::string &out, bool isJson, const std::string &name, const std::string &what) {
-    if (!isJson) {
-        out += EscapeForTerminal(name) + ": " + EscapeForTerminal(what) + "\n";
-        return;
-    }
-    out += out.empty() ? "[\n{\"name\":" : ",\n{\"name\":";
-    AppendJsonString(out, name);
-    out += ",\"fires_for\":";
-    AppendJsonString(out, what);
-    out += '}';
-}
+// A rule, or the tested part of a record, and the match.
+using Findings = std::vector<std::pair<std::string, std::string>>;
 
-int Print(std::string text, bool isJson) {
-    const bool isEmpty = text.empty();
-    if (isJson)
-        text += isEmpty ? "[\n]\n" : "\n]\n";
+int Print(const Findings &findings, bool isJson) {
+    JsonLines lines(isJson);
+    std::string text;
+    lines.Begin(text);
+    for (const auto &[name, what] : findings) {
+        lines.BeginItem(text);
+        if (isJson) {
+            JsonObject object(text);
+            object.Add("name", name);
+            object.Add("fires_for", what);
+            object.End();
+        } else {
+            text += EscapeForTerminal(name) + ": " + EscapeForTerminal(what);
+        }
+        lines.EndItem(text);
+    }
+    lines.End(text);
     Output output(true);
     output.Write(text);
     output.Finish();
-    return isEmpty ? kExitNothing : kExitFound;
+    return findings.empty() ? kExitNothing : kExitFound;
 }
 
 // Checks a record and sends its notifications. Returns the number that could not be sent.
 int CheckLog(NotificationManager &manager, const _SYSLOG_LOG_DATA_tag &log, const RuleTestOptions &options,
-             bool isJson, std::string &out) {
+             Findings &findings) {
     int failures = 0;
     if (manager.CheckSev(log.prio)) {
-        AppendLine(out, isJson, "severity " + PriorTypeToStr(log.prio), log.host + ": " + log.msg);
+        findings.emplace_back("severity " + PriorTypeToStr(log.prio), log.host + ": " + log.msg);
         failures += options.mustNotify && manager.NotificationSendSev(log.host, log.prio, log) != 0 ? 1 : 0;
     }
     if (const std::string keyword = manager.CheckKeyword(log.msg); !keyword.empty()) {
-        AppendLine(out, isJson, "keyword " + keyword, log.host + ": " + log.msg);
+        findings.emplace_back("keyword " + keyword, log.host + ": " + log.msg);
         failures +=
             options.mustNotify && manager.NotificationSendKeyword(log.host, keyword, log) != 0 ? 1 : 0;
     }
@@ -71,12 +75,12 @@ int TestStoredLogs(const RuleTestOptions &options, bool isJson, const std::strin
     const uint64_t count =
         options.lines.empty() ? kDefaultLogs : ParseNumber("--lines", options.lines, 1, kMaxLogs);
     NotificationManager manager;
-    std::string out;
+    Findings findings;
     int failures = 0;
     LogReader(table, {}).ReadPage({count, 0}, true, [&](const _SYSLOG_LOG_DATA_tag &log) {
-        failures += CheckLog(manager, log, options, isJson, out);
+        failures += CheckLog(manager, log, options, findings);
     });
-    const int status = Print(std::move(out), isJson);
+    const int status = Print(findings, isJson);
     if (failures > 0)
         throw DatabaseError(std::to_string(failures) +
                             " notifications could not be sent; the system log tells why");
@@ -98,12 +102,12 @@ int TestRules(const RuleTestOptions &options, const std::string &path, const std
         throw UsageError("rules test: --severity, --eps and --text go with no option about stored logs");
     if (!isGiven)
         return TestStoredLogs(options, isJson, root);
-    std::string out;
+    Findings findings;
     for (const _SYSLOG_NOTIFY_RULES_tag &rule : rules.rules) {
         if (Fires(rule, options))
-            AppendLine(out, isJson, rule.name, DescribeRule(rule));
+            findings.emplace_back(rule.name, DescribeRule(rule));
     }
-    return Print(std::move(out), isJson);
+    return Print(findings, isJson);
 }
 
 } // namespace kelo::tool

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "base/errors.h"
+#include "base/json.h"
 #include "base/text_encoding.h"
 #include "cli/completion.h"
 #include "cli/exit_status.h"
@@ -63,25 +64,26 @@ std::list<std::string> ReadValues(const Options &options, const LogTable &table)
 
 void Print(const std::list<std::string> &values, const Options &options, OutputFormat format,
            Output &output) {
-    const bool isArray = format == OutputFormat::Json;
+    JsonLines lines(format == OutputFormat::Json);
+    std::string text;
     if (format == OutputFormat::Csv && !options.noHeader)
-        output.Write(options.attribute + "\r\n");
-    const char *separator = isArray ? "[\n" : "";
+        text = options.attribute + "\r\n";
+    lines.Begin(text);
     for (const std::string &value : values) {
-        std::string text = separator;
-        separator = isArray ? ",\n" : "";
-        if (format == OutputFormat::Csv)
+        if (format == OutputFormat::Csv) {
             AppendCsvLine(text, {value});
-        else if (format == OutputFormat::Text)
+        } else if (format == OutputFormat::Text) {
             text += EscapeForTerminal(value) + "\n";
-        else
+        } else {
+            lines.BeginItem(text);
             AppendJsonString(text, value);
-        if (format == OutputFormat::Jsonl)
-            text += '\n';
+            lines.EndItem(text);
+        }
         output.Write(text);
+        text.clear();
     }
-    if (isArray)
-        output.Write(values.empty() ? "[\n]\n" : "\n]\n");
+    lines.End(text);
+    output.Write(text);
     output.Finish();
 }
 

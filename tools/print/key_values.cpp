@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "base/json.h"
 #include "base/text_encoding.h"
 #include "print/output.h"
 
@@ -37,21 +38,22 @@ void KeyValues::AddList(const std::string &name, const std::vector<std::string> 
 }
 
 std::string KeyValues::Render(OutputFormat format) const {
+    std::string text;
+    if (format == OutputFormat::Json) {
+        JsonObject object(text, JsonObject::Layout::kLineEach);
+        for (const Entry &entry : entries_)
+            object.AddJson(entry.name, entry.json);
+        object.End();
+        return text;
+    }
     size_t width = 0;
     for (const Entry &entry : entries_)
         width = std::max(width, entry.lines.empty() ? 0 : entry.name.size());
-    std::string text;
     for (const Entry &entry : entries_) {
-        if (format == OutputFormat::Json) {
-            text += text.empty() ? "{\n  " : ",\n  ";
-            AppendJsonString(text, entry.name);
-            text += ": " + entry.json;
-        } else {
-            for (const std::string &line : entry.lines)
-                text += entry.name + std::string(width + 2 - entry.name.size(), ' ') + line + "\n";
-        }
+        for (const std::string &line : entry.lines)
+            text += entry.name + std::string(width + 2 - entry.name.size(), ' ') + line + "\n";
     }
-    return format == OutputFormat::Json ? text + "\n}\n" : text;
+    return text;
 }
 
 void Print(const KeyValues &values, OutputFormat format) {

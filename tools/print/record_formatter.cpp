@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "base/errors.h"
+#include "base/json.h"
 #include "base/text_encoding.h"
 
 namespace kelo::tool {
@@ -121,39 +122,27 @@ public:
 
 class JsonWriter final : public LayoutWriter {
 public:
-    explicit JsonWriter(RecordLayout layout) : LayoutWriter(std::move(layout)) {}
+    explicit JsonWriter(RecordLayout layout)
+        : LayoutWriter(std::move(layout)), lines_(Layout().format == OutputFormat::Json) {}
 
-    void Begin(std::string &out) override {
-        if (IsArray())
-            out += '[';
-    }
+    void Begin(std::string &out) override { lines_.Begin(out); }
     void Add(const Log &log, std::string &out) override {
-        if (IsArray())
-            out += isFirst_ ? "\n" : ",\n";
-        isFirst_ = false;
-        char separator = '{';
+        lines_.BeginItem(out);
+        JsonObject object(out);
         for (const RecordField *field : Layout().fields) {
-            out += separator;
-            separator = ',';
-            AppendJsonString(out, field->name);
-            out += ':';
             const std::string value = Value(*field, log, &TimeFormat::Iso);
             if (field->isNumber)
-                out += value;
+                object.AddJson(field->name, value);
             else
-                AppendJsonString(out, value);
+                object.Add(field->name, value);
         }
-        out += IsArray() ? "}" : "}\n";
+        object.End();
+        lines_.EndItem(out);
     }
-    void End(std::string &out) override {
-        if (IsArray())
-            out += "\n]\n";
-    }
+    void End(std::string &out) override { lines_.End(out); }
 
 private:
-    bool IsArray() const { return Layout().format == OutputFormat::Json; }
-
-    bool isFirst_ = true;
+    JsonLines lines_;
 };
 
 class CsvWriter final : public LayoutWriter {

@@ -9,6 +9,7 @@
 #include <cmath>
 #include <cstdlib>
 
+#include "base/json.h"
 #include "base/text_encoding.h"
 
 namespace kelo::tool {
@@ -119,23 +120,23 @@ std::vector<std::string> StatisticsTable::TextLines(bool hasHeader) const {
 }
 
 std::string StatisticsTable::Json(bool isArray) const {
-    std::string out = isArray ? "[" : "";
-    const char *separator = isArray ? "\n" : "";
+    std::string out;
+    JsonLines lines(isArray);
+    lines.Begin(out);
     for (const std::vector<std::string> &cells : rows_) {
-        out += separator;
-        separator = isArray ? ",\n" : "";
+        lines.BeginItem(out);
+        JsonObject object(out);
         for (size_t i = 0; i < cells.size(); ++i) {
-            out += i == 0 ? '{' : ',';
-            AppendJsonString(out, columns_[i].name);
-            out += ':';
             if (columns_[i].isNumber)
-                out += cells[i];
+                object.AddJson(columns_[i].name, cells[i]);
             else
-                AppendJsonString(out, cells[i]);
+                object.Add(columns_[i].name, cells[i]);
         }
-        out += isArray ? "}" : "}\n";
+        object.End();
+        lines.EndItem(out);
     }
-    return isArray ? out + "\n]\n" : out;
+    lines.End(out);
+    return out;
 }
 
 std::string StatisticsTable::Csv(bool hasHeader) const {

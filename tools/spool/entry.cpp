@@ -1,7 +1,5 @@
 #include "spool/entry.h"
 
-#include <json/json.h>
-
 #include <stdexcept>
 
 #include "base/json.h"

@@ -1,7 +1,6 @@
 #include "status/status_json.h"
 
-#include <json/json.h>
-
+#include "base/json.h"
 #include "status/state_names.h"
 
 namespace kelo::tool {
@@ -183,13 +182,7 @@ std::string StatusJson(const ServerStatus &status) {
     json["notifications"] = ToJson(status.notifications);
     json["events"] = ToArray(status.events);
     json["volumes"] = ToArray(status.volumes);
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "";
-    // Texts are then ASCII, with U+FFFD for bytes that are not UTF-8.
-    builder["emitUTF8"] = false;
-    builder["precision"] = 2;
-    builder["precisionType"] = "decimal";
-    return Json::writeString(builder, json) + "\n";
+    return WriteJsonLine(json, JsonTexts::kAscii);
 }
 
 } // namespace kelo::tool
