@@ -26,6 +26,8 @@ ChildProgram::ChildProgram(const std::string &folder, const std::string &command
     EXPECT_EQ(pipe2(ends, O_CLOEXEC), 0);
     pid_ = fork();
     if (pid_ == 0) {
+        for (const int signal : {SIGHUP, SIGINT, SIGQUIT}) // ignored under nohup and in the background
+            std::signal(signal, SIG_DFL);
         dup2(ends[0], STDIN_FILENO);
         execl("/bin/sh", "sh", "-c", line.c_str(), nullptr);
         _exit(127);
