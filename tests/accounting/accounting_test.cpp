@@ -75,11 +75,8 @@ protected:
 };
 
 TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
-    const struct {
-        std::vector<std::pair<time_t, Names>> logs; // devices by second
-        std::string samples;
-        int64_t open; // logs in the sample that is still open
-    } cases[] = {
+    // Devices by second, the samples, and the logs in the sample that is still open.
+    const std::tuple<std::vector<std::pair<time_t, Names>>, std::string, int64_t> cases[] = {
         {{{1000, {"a", "b", "c"}}}, "1000 a 1", 2},
         {{{1000, {"a", "b", "a", "a"}}, {1001, {"c"}}}, "1000 a 1;1001 a 2;1001 b 1", 1},
         // The clock jumps back.
@@ -88,18 +85,18 @@ TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
         // Devices are in the order of their bytes.
         {{{1, {"x", "b", "B", "\xff", "b"}}, {2, {"x", "x"}}}, "1 x 1;2 B 1;2 b 2;2 \xff 1", 2},
     };
-    for (const auto &c : cases) {
-        SCOPED_TRACE(c.samples);
+    for (const auto &[logs, samples, open] : cases) {
+        SCOPED_TRACE(samples);
         RunSql(path_, "DELETE FROM eps");
         AccountingManager accounting;
-        for (const auto &[second, devices] : c.logs) {
+        for (const auto &[second, devices] : logs) {
             machine.now = second;
             for (const std::string &device : devices)
                 EXPECT_EQ(accounting.LogInc(device), 0);
         }
         EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
-        EXPECT_EQ(Samples(), c.samples);
-        EXPECT_EQ(accounting.CurrentEpsGet(), c.open);
+        EXPECT_EQ(Samples(), samples);
+        EXPECT_EQ(accounting.CurrentEpsGet(), open);
     }
 }
 
@@ -215,23 +212,21 @@ TEST_F(Accounting, TrimsOldSamplesOfALargeFile) {
     const std::string trim = "DELETE FROM eps WHERE stamp < strftime('%s', 'now') - 24*60*60;";
     const std::string recent = stamp + " new 1";
     const std::string all = "999 old 1;" + recent + ";" + kRows;
-    const struct {
-        int filler; // bytes
-        bool fails;
-        std::string samples;
-    } cases[] = {{5000000, false, all}, {5300000, true, all}, {5300000, false, recent}};
-    for (const auto &c : cases) {
-        SCOPED_TRACE(c.filler + c.fails);
+    // Bytes of filler, whether the trim fails, and the samples then.
+    const std::tuple<int, bool, std::string> cases[] = {
+        {5000000, false, all}, {5300000, true, all}, {5300000, false, recent}};
+    for (const auto &[filler, fails, samples] : cases) {
+        SCOPED_TRACE(filler + fails);
         RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
         AccountingManager accounting;
         CountLogs(accounting);
         RunSql(path_, "INSERT INTO eps VALUES(NULL, 999, 'old', 1), (NULL, " + stamp + ", 'new', 1);" +
-                          "CREATE TABLE filler AS SELECT zeroblob(" + std::to_string(c.filler) + ")");
-        PlatformCalls::FailFrom(c.fails ? 9 : 1000, 1);
+                          "CREATE TABLE filler AS SELECT zeroblob(" + std::to_string(filler) + ")");
+        PlatformCalls::FailFrom(fails ? 9 : 1000, 1);
         EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
         RunSql(path_, "DROP TABLE filler; VACUUM");
-        EXPECT_EQ(Samples(), c.samples);
-        EXPECT_EQ(TakeTexts(), c.fails ? Names{"Fail to execute SQL command: " + trim} : Names());
+        EXPECT_EQ(Samples(), samples);
+        EXPECT_EQ(TakeTexts(), fails ? Names{"Fail to execute SQL command: " + trim} : Names());
     }
 }
 

@@ -155,20 +155,18 @@ TEST_F(ArchiveTest, LeavesNothingWhenAWriteFails) {
 }
 
 TEST(ArchiveName, IsSafeAndRecognised) {
-    const struct {
-        std::string device, name;
-    } cases[] = {
+    const std::pair<std::string, std::string> cases[] = {
         {"nas-1.lan", "nas-1.lan"},  {"../../etc", "_._.._etc"},
         {".hidden", "_hidden"},      {"-rf", "_rf"},
         {"a b\n\t'\"$", "a_b_____"}, {"", "_"},
         {"n\xc3\xa4s", "n__s"},      {std::string(300, 'x'), std::string(100, 'x')},
     };
-    for (const auto &c : cases) {
-        EXPECT_EQ(SafeDeviceName(c.device), c.name);
-        const std::string first = ArchiveName(c.device, "2020-01-02", "2020-02-03", 1);
-        EXPECT_EQ(first, c.name + "_2020-01-02_2020-02-03.db");
+    for (const auto &[device, name] : cases) {
+        EXPECT_EQ(SafeDeviceName(device), name);
+        const std::string first = ArchiveName(device, "2020-01-02", "2020-02-03", 1);
+        EXPECT_EQ(first, name + "_2020-01-02_2020-02-03.db");
         EXPECT_TRUE(IsArchiveName(first) &&
-                    IsArchiveName(ArchiveName(c.device, "2020-01-02", "2020-02-03", 12)));
+                    IsArchiveName(ArchiveName(device, "2020-01-02", "2020-02-03", 12)));
     }
     for (const char *name :
          {"logs.db", "a_2020-01-02.db", "a_2020-01-02_2020-02-03.db-wal", ".a_2020-01-02_2020-02-03.db"})
@@ -180,10 +178,7 @@ TEST(Retention, TakesTheOldestAndSparesTheNewOne) {
         {"a", "", 0, 100, 1, 10}, {"b", "", 0, 200, 1, 20}, {"c", "", 0, 300, 1, 40}};
     const std::vector<Archive> withoutTimes = {{"a", "", 0, 0, 1, 10}};
     EXPECT_TRUE(Expired(withoutTimes, {1000, {}, ""}).empty()) << "its age is not known";
-    const struct {
-        Retention retention;
-        std::string expired;
-    } cases[] = {
+    const std::pair<Retention, std::string> cases[] = {
         {{}, ""},
         {{200, {}, ""}, "a"},
         {{1000, {}, "b"}, "ac"},
@@ -193,11 +188,11 @@ TEST(Retention, TakesTheOldestAndSparesTheNewOne) {
         {{{}, 60, "a"}, "b"},
         {{101, 40, ""}, "ab"},
     };
-    for (const auto &c : cases) {
+    for (const auto &[retention, expired] : cases) {
         std::string names;
-        for (const Archive &archive : Expired(archives, c.retention))
+        for (const Archive &archive : Expired(archives, retention))
             names += archive.name;
-        EXPECT_EQ(names, c.expired);
+        EXPECT_EQ(names, expired);
     }
     EXPECT_EQ(ParseSize("s", "10G"), uint64_t{10} << 30);
     EXPECT_EQ(ParseSize("s", "3KiB"), 3072U);

@@ -23,12 +23,8 @@ int TakeText(_SYSLOG_LOG_DATA_tag &log, void *context) {
 }
 
 TEST(DBRecToLogInfo, FillsWhatTheTableHas) {
-    const struct {
-        const char *table;
-        bool trimUser;
-        std::string columns;
-        const char *expected; // id, utcsec, prio, isdir, then the texts in order
-    } cases[] = {
+    // Expected are id, utcsec, prio and isdir, then the texts in order.
+    const std::tuple<const char *, bool, std::string, const char *> cases[] = {
         {"logs", false, kEveryColumn,
          "7|-5|3|0|86|h|10.0.0.1|auth|+08:00|2020/01/02|10:11:12|sshd|root: hi: there||||||"},
         {"logs", true, kEveryColumn,
@@ -44,15 +40,15 @@ TEST(DBRecToLogInfo, FillsWhatTheTableHas) {
         {"logs", false, "'18446744073709551615' id, 4294967296 utcsec", "-1|4294967296|7|0|||||||||||||||"},
         {"LOGS", false, kEveryColumn, ""}, // the case counts
     };
-    for (const auto &c : cases) {
+    for (const auto &[table, trimUser, columns, expected] : cases) {
         const TempRoot root;
         const std::string path = root.File("rows.db");
-        RunSql(path, std::string("CREATE TABLE ") + c.table + " AS SELECT " + c.columns);
+        RunSql(path, std::string("CREATE TABLE ") + table + " AS SELECT " + columns);
         std::string text;
-        EXPECT_EQ(SyslogDBSelectByTable(path, c.table, {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}}}, nullptr,
-                                        nullptr, TakeText, &text, c.trimUser),
+        EXPECT_EQ(SyslogDBSelectByTable(path, table, {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}}}, nullptr,
+                                        nullptr, TakeText, &text, trimUser),
                   0);
-        EXPECT_EQ(text, c.expected) << c.table << " " << c.columns;
+        EXPECT_EQ(text, expected) << table << " " << columns;
     }
 }
 

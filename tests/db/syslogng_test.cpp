@@ -18,28 +18,25 @@ TEST_F(Syslogng, HangsUpThePackagesServiceWhereThePackageIsEnabled) {
 
 TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {
     PlatformCalls::answers.reload = false; // is ignored
-    const struct {
-        uintmax_t bytes;
-        int32_t limit;
-        bool isKept;
-    } cases[] = {{2047, 1, true}, {2048, 1, false}, {0, -1, false}, {uintmax_t{5} << 40, INT32_MAX, false}};
+    const std::tuple<uintmax_t, int32_t, bool> cases[] = {
+        {2047, 1, true}, {2048, 1, false}, {0, -1, false}, {uintmax_t{5} << 40, INT32_MAX, false}};
     const std::string target = root_.File("target");
     WriteFile(path_ + "-wal", "");
-    for (const auto &c : cases) {
+    for (const auto &[bytes, limit, isKept] : cases) {
         for (const bool isLink : {false, true}) {
-            SCOPED_TRACE(c.bytes);
+            SCOPED_TRACE(bytes);
             fs::remove(path_);
             WriteFile(target, "");
             std::error_code tooLarge;
-            fs::resize_file(target, c.bytes, tooLarge);
+            fs::resize_file(target, bytes, tooLarge);
             if (tooLarge)
                 continue; // not on every file system
             isLink ? fs::create_symlink(target, path_) : fs::rename(target, path_);
             PlatformCalls::Reset();
-            EXPECT_EQ(SyslogngWorkingDbCheck(path_, c.limit), 0);
-            EXPECT_EQ(fs::exists(fs::symlink_status(path_)), c.isKept);
+            EXPECT_EQ(SyslogngWorkingDbCheck(path_, limit), 0);
+            EXPECT_EQ(fs::exists(fs::symlink_status(path_)), isKept);
             EXPECT_TRUE(!isLink || fs::exists(target)) << "only the link goes";
-            EXPECT_EQ(PlatformCalls::Texts({"KELOSystemdReload"}).size(), c.isKept ? 0u : 1u);
+            EXPECT_EQ(PlatformCalls::Texts({"KELOSystemdReload"}).size(), isKept ? 0u : 1u);
         }
     }
     EXPECT_TRUE(fs::exists(path_ + "-wal"));

@@ -18,11 +18,7 @@ protected:
 TEST_F(Enumeration, GivesPagesNewestFirstAndNothingWhereItFails) {
     CreateEvents(6);
     RunSql(db_, "UPDATE log SET time = 1004 WHERE id = 1; DELETE FROM log WHERE id = 2");
-    const struct {
-        int offset;
-        int limit;
-        std::string ids;
-    } cases[] = {
+    const std::tuple<int, int, std::string> cases[] = {
         {0, 0, "6 5 1 4 3 "}, {3, 0, "6 5 1 4 3 "}, {1, 2, "5 1 "}, {4, 10, "3 "}, {20, 10, ""},
     };
     for (const auto &[offset, limit, ids] : cases)

@@ -4,11 +4,7 @@
 using namespace kelo::test;
 
 TEST(CmdParse, CutsTheTextBehindEveryClosingBrace) {
-    const struct {
-        std::string text;
-        bool parses;
-        size_t values;
-    } kCases[] = {
+    const std::tuple<std::string, bool, size_t> kCases[] = {
         {"", true, 0},
         {"}}}", true, 0},
         {R"({"a":1}{"b":[1,{}]})", false, 1},

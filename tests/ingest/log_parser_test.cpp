@@ -18,10 +18,7 @@ std::string Line(const _SYSLOG_LOG_DATA_tag &log) {
 } // namespace
 
 TEST(ParseSingleEntry, TakesElevenFieldsAndTheMessageVerbatim) {
-    const struct {
-        std::string line;
-        std::string msg;
-    } kCases[] = {
+    const std::pair<std::string, std::string> kCases[] = {
         {kEleven + " two  words", "two  words"},
         {"   local0 info 2020/01/02    10:11:12 100 200 +08:00 nas 127.0.0.1 prog tag two words",
          "two words"},

@@ -92,11 +92,7 @@ TEST_F(NotificationSwitches, AreOnWhenAnyChannelIs) {
                       sms = "sms_enabled=\"yes\"\n", mobile = "pushservice_mobile_enabled=\"no\"\n",
                       msn = "pushservice_msn_enabled=\"no\"\n",
                       push = mobile + msn + "pushservice_skype_enabled=\"no\"\n";
-    const struct {
-        std::string settings;
-        bool isOn;
-        std::vector<std::string> messages;
-    } cases[] = {
+    const std::tuple<std::string, bool, std::vector<std::string>> cases[] = {
         {to + noMail + push, false, {}},
         {to + mail + push, true, {}},
         {mail + "smtp_to=\"a@b.c\"\n" + push, false, {}},

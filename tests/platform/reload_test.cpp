@@ -149,12 +149,8 @@ struct PrivateSystemd {
 TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
     KELORootSet("");
     isBooted = 1;
-    const struct {
-        const char *state;
-        const char *result;
-        std::string reason; // "" for success
-        int reloads;
-    } cases[] = {
+    // State of the unit, result of the job, reason of a failure, and reloads that were asked for.
+    const std::tuple<const char *, const char *, std::string, int> cases[] = {
         {"active", "done", "", 1},
         {"active", "failed", "the reload ended as failed", 1},
         {"inactive", "done", "syslog-ng.service is inactive.", 1},
@@ -167,14 +163,14 @@ TEST_F(Reload, AsksSystemdAndAwaitsItsJob) {
     ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr *>(&address), sizeof address), 0);
     ASSERT_EQ(listen(listener, 1), 0);
     setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + root_.File("bus")).c_str(), 1);
-    for (const auto &c : cases) {
-        SCOPED_TRACE(std::string(c.state) + " " + c.result);
-        PrivateSystemd systemd{c.state, c.result};
+    for (const auto &[state, result, reason, reloads] : cases) {
+        SCOPED_TRACE(std::string(state) + " " + result);
+        PrivateSystemd systemd{state, result};
         std::thread server([&] { systemd.Serve(listener); });
-        EXPECT_EQ(KELOSystemdReload("syslog-ng"), c.reason.empty());
+        EXPECT_EQ(KELOSystemdReload("syslog-ng"), reason.empty());
         server.join();
-        EXPECT_EQ(systemd.reloads, c.reloads);
-        const std::string text = c.reason.empty() ? "" : "cannot reload service syslog-ng: " + c.reason;
+        EXPECT_EQ(systemd.reloads, reloads);
+        const std::string text = reason.empty() ? "" : "cannot reload service syslog-ng: " + reason;
         EXPECT_EQ(KELOErrorGet(), text);
         EXPECT_EQ(log_.TakeTexts(), std::vector<std::string>(text.empty() ? 0 : 1, text));
     }

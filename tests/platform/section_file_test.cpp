@@ -47,9 +47,7 @@ protected:
 TEST_F(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
     const std::string content = "[R1]\nkey=\"1\"\n[R2]\nkey=\"2\"\n";
     WriteFile(path_, content);
-    const struct {
-        const char *newName, *key, *value, *format, *message;
-    } cases[] = {
+    const std::tuple<const char *, const char *, const char *, const char *, const char *> cases[] = {
         {"R1", "key", "two\nlines", kFormat, "value of key"},
         {"R1", "#key", "1", kFormat, "value of #key"},
         {"R1", "key", " blank", "%s=%s\n", "value of key"},
@@ -59,9 +57,9 @@ TEST_F(SectionFile, RefusesWhatItCouldNotGiveBackAndStaysAsItIs) {
         {"", "key", "1", kFormat, "not a section name"},
         {"R2", "key", "1", kFormat, "there is a section R2"},
     };
-    for (const auto &c : cases) {
-        EXPECT_EQ(Set(path_, "R1", c.newName, {{c.key, c.value}}, c.format), -1) << c.message;
-        EXPECT_THAT(log_.TakeTexts(), ElementsAre(AllOf(StartsWith(path_ + ": "), HasSubstr(c.message))));
+    for (const auto &[newName, key, value, format, message] : cases) {
+        EXPECT_EQ(Set(path_, "R1", newName, {{key, value}}, format), -1) << message;
+        EXPECT_THAT(log_.TakeTexts(), ElementsAre(AllOf(StartsWith(path_ + ": "), HasSubstr(message))));
     }
     EXPECT_EQ(ReadFile(path_), content);
 }
@@ -71,21 +69,17 @@ TEST_F(SectionFile, ChangesNothingButTheSection) {
     const std::string broken = "[bad\nx=1\n[R1]\nkey=\"late\"";
     const std::string tail = "; about R2\n  [R2] # second\nkey=\"2\"\nno entry\n" + broken;
     const std::string before = head + "[R1]\n# why\nkey = 'old'\ngone=\"1\"\nkey=\"twice\"\n\n" + tail;
-    const struct {
-        const char *section, *newName;
-        Pairs pairs;
-        std::string after;
-    } cases[] = {
+    const std::tuple<const char *, const char *, Pairs, std::string> cases[] = {
         {"R1", "R1", {{"new", "n"}, {"key", "k"}}, head + "[R1]\n# why\nkey=\"k\"\nnew=\"n\"\n\n" + tail},
         {"R1", "R9", {{"key", "k"}}, head + "[R9]\n# why\nkey=\"k\"\n\n" + tail},
         {"R2", "R4", {}, before.substr(0, before.find("[R2]")) + "[R4] # second\n" + broken},
         {"R3", "R3", {{"key", "k"}}, before + "\n\n[R3]\nkey=\"k\"\n"},
         {"R1", nullptr, {}, head + "\n" + tail},
     };
-    for (const auto &c : cases) {
+    for (const auto &[section, newName, pairs, after] : cases) {
         WriteFile(path_, before);
-        EXPECT_EQ(Set(path_, c.section, c.newName, c.pairs), 0);
-        EXPECT_EQ(ReadFile(path_), c.after);
+        EXPECT_EQ(Set(path_, section, newName, pairs), 0);
+        EXPECT_EQ(ReadFile(path_), after);
     }
 }
 

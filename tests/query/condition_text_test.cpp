@@ -12,10 +12,7 @@ using ConditionText = QueryTest;
 constexpr char kCount[] = "SELECT COUNT(*) FROM logs WHERE ";
 
 TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
-    const struct {
-        _SYSLOG_SQL_COND_tag condition;
-        std::string text;
-    } cases[] = {
+    const std::pair<_SYSLOG_SQL_COND_tag, std::string> cases[] = {
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "", {}}, "(host = '')"},
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_NE, "O'Brien", {}}, "(host != 'O''Brien')"},
         {{SYSLOG_ATTRI_ISDIR, SYSLOG_OP_GE, "1", {}}, "(isdir >= '1')"},
@@ -39,8 +36,8 @@ TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
         SyslogDBSelectCount(path_, {condition}, nullptr, nullptr);
         EXPECT_EQ(TakeStatement(), kCount + text);
     }
-    SyslogDBSelectCount(path_, {cases[0].condition, cases[1].condition}, nullptr, nullptr);
-    EXPECT_EQ(TakeStatement(), kCount + cases[0].text + " AND " + cases[1].text);
+    SyslogDBSelectCount(path_, {cases[0].first, cases[1].first}, nullptr, nullptr);
+    EXPECT_EQ(TakeStatement(), kCount + cases[0].second + " AND " + cases[1].second);
 }
 
 TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
@@ -70,10 +67,8 @@ TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
 
 TEST_F(ConditionText, IsBuiltFromTheFilterForm) {
     const std::string keyword = GenSQLRegexp("any", "msg");
-    const struct {
-        std::array<std::string, 7> form; // host, level, facility, program, keyword, from, to
-        std::string text;
-    } cases[] = {
+    // Host, level, facility, program, keyword, from, to.
+    const std::pair<std::array<std::string, 7>, std::string> cases[] = {
         {{"any", "any", "", "any", "", "0", ""}, ""},
         {{"a, b", "err,warning", "auth", "x", "any", "2020/01/02", "2020/01/03"},
          "((host = 'a') OR (host = ' b')) AND ((llevel = 'err') OR (llevel = 'warning')) AND (fac = 'auth') "

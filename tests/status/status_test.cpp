@@ -112,11 +112,8 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
         ExpectAttention(named);
     }
     fs::remove_all(root_.File("run/kelosyslog/receive.json"));
-    const struct {
-        std::string file;
-        std::optional<std::string> content; // nothing: there is no such file
-        const char *named;
-    } files[] = {
+    // A file, its content (nothing: there is no such file), and what is named then.
+    const std::tuple<std::string, std::optional<std::string>, const char *> files[] = {
         {root_.File("run/kelosyslog/receive.json"), "{", "receive.json cannot be read"},
         {logs_, {}, "logs.db: no such file"},
         {logs_, "no database" + ReadFile(logs_), "database logs is damaged"},
