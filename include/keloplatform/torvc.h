@@ -28,7 +28,8 @@ extern "C" {
 // Runs a program, given by its path, with up to four arguments, the first null one ending them, and waits for
 // it. The command gets default signal handling, no open file of the caller's but standard error, and
 // /dev/null as standard input and output. It is not affected by other children of the process, nor by waits
-// and signal handlers for them.
+// and signal handlers for them. A lock that the caller holds by flock(2) is held until the command has ended,
+// also if the caller is killed before that.
 //
 // Returns 0 when the command ran and ended with exit status 0, else -1.
 KELOPLATFORM_API int TORVCExec(const char *program, const char *arg1, const char *arg2, const char *arg3,

@@ -3,15 +3,17 @@
 // One SQLite database of the log server: created from its schema when missing, and quarantined when corrupt.
 //
 //     DBHandler db("/var/log/kelolog/archive.db", "/usr/kelo/syslog/schema/archive.sql");
+//     const DBConnectionScope scope(db);
 //     if (db.DBCon() == 0) {
 //         db.DBTranStart();
 //         db.DBExecute("UPDATE db_info SET device='nas' WHERE id=1");
 //         db.DBTranEnd();
-//         db.DBDiscon();
 //     }
 //
 // Operations return 0 or -1 unless stated otherwise and never throw on a database error. A handler is used by
-// one thread at a time; several handlers, also in different processes, may work on one file.
+// one thread at a time; several handlers, also in different threads and processes, may work on one file.
+// Creating, quarantining and removing a database exclude each other by a lock on the file PATH.lock, which is
+// there only meanwhile.
 
 #include <cstdint>
 #include <string>
@@ -37,13 +39,14 @@ class KELOSYSLOG_API DBHandler {
 public:
     DBHandler() = default;
     DBHandler(std::string dbPath, std::string schemaPath);
-    // Does not close an open connection: call DBDiscon first.
+    // Does not close an open connection: call DBDiscon first, or use a DBConnectionScope.
     ~DBHandler() = default;
     DBHandler(const DBHandler &) = delete;
     DBHandler &operator=(const DBHandler &) = delete;
 
-    // Opens the connection, after creating a missing database (DBCreate). Fails on a connected handler. Every
-    // failure is reported.
+    // Opens the connection, after creating a missing database as DBCreate does; a file without a byte counts
+    // as missing. If another process or thread is creating the database, or quarantining it, waits for that
+    // (up to 30 seconds) and connects to the result. Fails on a connected handler. Every failure is reported.
     int DBCon();
     // Closes the connection, if there is one. Always 0. The in-transaction flag stays as it is.
     int DBDiscon();
@@ -52,8 +55,17 @@ public:
     int32_t isInTran() const;
 
     // Creates the database with the sqlite3 tool: its folder (with parents), the file from the schema,
-    // write-ahead logging. A failure to set write-ahead logging is reported and tolerated. The paths go
-    // through a shell: the database path in double quotes, the schema path bare.
+    // write-ahead logging. A failure to set write-ahead logging is reported and tolerated. On a database that
+    // is there the schema runs once more.
+    //
+    // The paths go through a shell: the database path in double quotes, so one with " $ ` \ or a line feed is
+    // refused, the schema path bare. A path without '/' is taken for the folder, which is created, and fails;
+    // a symbolic link to nothing is refused.
+    //
+    // What a failed creation leaves is removed, unless it has records: another program was faster then.
+    // Despite an error in the schema the rest of it runs, and the creation fails at the end. A process that
+    // is killed leaves nothing or all of the database, provided that the schema is one transaction, as the
+    // shipped ones are.
     int DBCreate();
 
     // Runs one statement and hands its result to `callback` (which may be null), then frees it. A failed
@@ -64,7 +76,9 @@ public:
     int DBExecute(std::string sql);
 
     // "BEGIN;", "END;" and "ROLLBACK;". Each checks that it is connected and that the flag allows it;
-    // failures are reported but do not go to DBErrorHandle, and leave the flag as it was.
+    // failures are reported but do not go to DBErrorHandle, and leave the flag as it was. After an END that
+    // failed, roll back. If that fails too, disconnect, which undoes the transaction, and continue with a new
+    // handler: on this one the flag stays 1 and DBTranStart fails.
     int DBTranStart();
     int DBTranEnd();
     int DBTranRollback();
@@ -72,17 +86,23 @@ public:
     // `text` made safe between single quotes; "" after a reported failure.
     std::string DBCmdEscape(std::string text);
 
-    // Copies the write-ahead log into the database file. With `removeFiles`, unlinks "-wal" and "-shm"
-    // afterwards: only for a database that is not open anywhere else.
+    // Copies the write-ahead log into the database file as far as no reader prevents it: 0 does not mean that
+    // all of it was copied. With `removeFiles`, unlinks "-wal" and "-shm" afterwards, also if it was not. Use
+    // that only on a database that is open nowhere else, and disconnect at once: what is written through this
+    // connection afterwards can be lost.
     int DBWalCheckpoint(bool removeFiles);
 
     // Whether the database has a table of this name, which goes into the statement unchanged. A failed
     // query is reported and gives false.
     bool DBcheckTableExist(std::string table);
 
-    // The reaction to a failed statement, called by DBExecute: reports it at a priority that its SQLite error
-    // code decides (LOG_INFO for busy and the like, LOG_ERR else) and quarantines a corrupt database
-    // (DBErrorHandle_SQLITE_CORRUPT).
+    // The reaction to a failed statement, called by DBExecute: reports it, at a priority that SQLite's error
+    // code decides.
+    //
+    //     1 (SQLITE_ERROR)                        LOG_INFO if the database has a table "logs", else LOG_ERR
+    //     5 (busy), 16 (empty), 26 (no database)  LOG_INFO
+    //     11 (corrupt)                            LOG_ERR, after DBErrorHandle_SQLITE_CORRUPT
+    //     any other                               LOG_ERR
     void DBErrorHandle(std::string sql);
 
     // Computed from table "logs". Count: -1 on failure. Times of the earliest and latest record in seconds
@@ -115,13 +135,29 @@ private:
     int32_t inTransaction_ = 0;
 };
 
+// Disconnects a handler at the end of a scope.
+class DBConnectionScope {
+public:
+    // `handler` must live longer.
+    explicit DBConnectionScope(DBHandler &handler) : handler_(handler) {}
+    ~DBConnectionScope() { handler_.DBDiscon(); }
+    DBConnectionScope(const DBConnectionScope &) = delete;
+    DBConnectionScope &operator=(const DBConnectionScope &) = delete;
+
+private:
+    DBHandler &handler_;
+};
+
 // The reaction to a corrupt database: sends the notification "KELOSYSLOG_DB_CORRUPT", renames the file to its
-// path followed by ".corrupt", which replaces an older one, and reloads syslog-ng so that it starts a fresh
-// database. The "-wal" and "-shm" files stay where they are. `connection` is not used and stays open: its
-// owner must disconnect, because a further statement on it would move the fresh database too.
+// path followed by ".corrupt", and its "-wal" and "-shm" files alike, and reloads syslog-ng so that it starts
+// a fresh database. An older ".corrupt" is kept, as ".corrupt.1" and so on.
 //
-// Returns 0, or -1: the notification could not be sent (the file keeps its name), the rename failed (with
-// errno set), or the reload failed.
+// Does nothing if the file of `connection` no longer has the path: whoever met the damage first has moved it,
+// and what has the path now is sound. Without a connection (null) the caller answers for that. The connection
+// stays open on the moved file: its owner must disconnect at once.
+//
+// Returns 0, or -1: there is no such file, it could not be locked (reported), the notification could not be
+// sent (the file keeps its name), the rename failed (with errno set), or the reload failed.
 KELOSYSLOG_API int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, std::string dbPath);
 
 // Makes syslog-ng reopen its files: the package's own service if the package is enabled, else the
@@ -129,8 +165,9 @@ KELOSYSLOG_API int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, s
 KELOSYSLOG_API int32_t SyslogngHupSignalSend();
 
 // Deletes syslog-ng's working database and makes syslog-ng start a new one when the file is larger than
-// `limitKib` KiB (whole KiB count); of a symbolic link the link. "-wal" and "-shm" stay. Returns 0 when the
-// file was examined, -1 when it cannot be (silently) or is no regular file (reported).
+// `limitKib` KiB (whole KiB count); of a symbolic link the link. "-wal" and "-shm" go with it: who still has
+// the file open shares nothing with the new one, and should disconnect. Returns 0 when the file was examined,
+// -1 when it cannot be (silently) or is no regular file (reported).
 KELOSYSLOG_API int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib);
 
 // Switches a database to write-ahead logging with the sqlite3 tool. The path goes through a shell without

@@ -1,4 +1,8 @@
 -- The accounting database: samples of logs per second and device, and the count of logs per device.
+-- All or nothing, while readers wait; write-ahead logging last, as no transaction can include it.
+PRAGMA busy_timeout = 10000;
+BEGIN EXCLUSIVE;
+
 CREATE TABLE IF NOT EXISTS eps (
     id INTEGER PRIMARY KEY,
     stamp INTEGER NOT NULL,
@@ -15,3 +19,6 @@ CREATE TABLE IF NOT EXISTS histogram (
 );
 -- The devices with the most logs are read by count.
 CREATE INDEX IF NOT EXISTS histogram_count ON histogram (count);
+
+COMMIT;
+PRAGMA journal_mode = WAL;

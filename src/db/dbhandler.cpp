@@ -1,5 +1,6 @@
 #include "kelosyslog/dbhandler.h"
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <memory>
@@ -8,10 +9,25 @@
 
 #include "common/db_handles.h"
 #include "db/catalogue.h"
+#include "db/creation.h"
+#include "db/database_lock.h"
 #include "db/first_row.h"
 #include "keloplatform/kelodb.h"
 #include "keloplatform/torvc.h"
 #include "kelosyslog/debuger.h"
+
+namespace {
+
+// Far more than the processes that could move one database after the other while another connects.
+constexpr int kConnectTries = 100;
+
+// The inode of what has the name; 0 for nothing.
+ino_t InodeOf(const std::string &path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0 ? status.st_ino : 0;
+}
+
+} // namespace
 
 DBHandler::DBHandler(std::string dbPath, std::string schemaPath)
     : schemaPath_(std::move(schemaPath)), dbPath_(std::move(dbPath)) {}
@@ -21,19 +37,37 @@ int DBHandler::DBCon() {
         Debuger::MSG(0, "Connection is already existed");
         return -1;
     }
-    if (!TORVCFileExist(dbPath_.c_str())) {
-        Debuger::MSG(2, "Database is not existed: " + dbPath_);
-        if (DBCreate() != 0) {
-            Debuger::MSG(0, "Fail to create database: " + dbPath_);
-            return -1;
+    // What is moved or removed while this connects is no reason to fail: what comes after it is connected to.
+    for (int tries = 0; tries < kConnectTries; ++tries) {
+        const bool isThere = TORVCFileExist(dbPath_.c_str()) && !kelo::IsEmptyFile(dbPath_);
+        if (isThere) {
+            if (!kelo::AwaitCreation(dbPath_, schemaPath_))
+                break;
+        } else {
+            Debuger::MSG(2, "Database is not existed: " + dbPath_);
+            if (kelo::CreateDatabase(dbPath_, schemaPath_, kelo::Creation::kIfMissing) != 0) {
+                Debuger::MSG(0, "Fail to create database: " + dbPath_);
+                return -1;
+            }
+        }
+        const ino_t tried = InodeOf(dbPath_);
+        kelo::DbConnection connection = kelo::Connect(dbPath_);
+        if (connection == nullptr && TORVCFileExist(dbPath_.c_str()) && InodeOf(dbPath_) == tried)
+            break;
+        // What is being created has no tables yet.
+        const bool isUnfinished =
+            kelo::DatabaseLock::IsTaken(dbPath_) || (isThere && kelo::IsEmptyFile(dbPath_));
+        if (connection != nullptr && !isUnfinished) {
+            connection_ = connection.release();
+            return 0;
         }
     }
-    connection_ = kelo::Connect(dbPath_).release();
-    if (connection_ == nullptr) {
-        Debuger::MSG(0, "Fail to open db: " + dbPath_);
-        return -1;
-    }
-    return 0;
+    Debuger::MSG(0, "Fail to open db: " + dbPath_);
+    return -1;
+}
+
+int DBHandler::DBCreate() {
+    return kelo::CreateDatabase(dbPath_, schemaPath_, kelo::Creation::kAlways);
 }
 
 int DBHandler::DBDiscon() {

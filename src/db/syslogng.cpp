@@ -1,8 +1,9 @@
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include "common/report.h"
 #include "common/root.h"
+#include "db/database_files.h"
+#include "db/database_lock.h"
 #include "db/shell.h"
 #include "keloplatform/kelosystem.h"
 #include "keloplatform/torvc.h"
@@ -27,7 +28,10 @@ int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib) {
         return -1;
     }
     if (int64_t{status.st_size} / 1024 > limitKib) {
-        unlink(dbPath.c_str());
+        {
+            const kelo::DatabaseLock lock(dbPath);
+            kelo::RemoveDatabase(dbPath);
+        }
         SyslogngHupSignalSend();
     }
     return 0;

@@ -1,10 +1,10 @@
 #include "eventlog/event_kinds.h"
 
-#include <unistd.h>
-
 #include <memory>
 
 #include "common/report.h"
+#include "db/database_files.h"
+#include "db/database_lock.h"
 #include "eventlog/event_database.h"
 #include "keloplatform/torvc.h"
 #include "kelosyslog/debuger.h"
@@ -82,7 +82,10 @@ int Logger::LogAddLogClear(std::string dbPath, std::string user) const {
 }
 
 int Logger::LogClear(std::string dbPath, std::string user) const {
-    unlink(dbPath.c_str());
+    {
+        const kelo::DatabaseLock lock(dbPath);
+        kelo::RemoveDatabase(dbPath);
+    }
     if (LogAddLogClear(dbPath, user) < 0) {
         kelo::ReportErrorAt("logger", 638,
                             std::string("Fail to add log [") + kelo::kEventKinds[kelo::kLogClear].format +

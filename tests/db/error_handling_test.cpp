@@ -57,12 +57,5 @@ TEST_F(DBErrorHandle, EndsWhenItsOwnQuestionFails) {
     EXPECT_EQ(PlatformCalls::Texts().size(), 2u);
 }
 
-TEST_F(DBErrorHandle, EndsTheQuarantineWhenTheFileCannotBeRenamed) {
-    WriteFile(path_, "damaged");
-    fs::create_directory(path_ + ".corrupt");
-    EXPECT_EQ(DBErrorHandle_SQLITE_CORRUPT(nullptr, path_), -1);
-    EXPECT_THAT(PlatformCalls::Texts({"KELOSystemdReload"}), IsEmpty());
-}
-
 } // namespace
 } // namespace kelo::test

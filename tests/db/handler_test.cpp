@@ -10,7 +10,7 @@ const std::string kSchema = BuildPath("package/schema/archive.sql");
 
 using DBHandlerTest = DbTest;
 
-TEST_F(DBHandlerTest, LeavesAUsableFileWhenTheDiskTakesNoMore) {
+TEST_F(DBHandlerTest, LeavesNothingWhenTheToolIsKilled) {
     rlimit before{};
     getrlimit(RLIMIT_FSIZE, &before);
     const rlimit tight{16384, before.rlim_max};
@@ -19,8 +19,9 @@ TEST_F(DBHandlerTest, LeavesAUsableFileWhenTheDiskTakesNoMore) {
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &before), 0);
     EXPECT_THAT(Take(), ElementsAre("Fail to create database: " + path_ + "," + kSchema,
                                     "Fail to create database: " + path_));
+    EXPECT_FALSE(fs::exists(path_));
     ASSERT_EQ(db_.DBCon(), 0);
-    EXPECT_EQ(db_.DBExecute("CREATE TABLE IF NOT EXISTS logs (id)"), 0);
+    EXPECT_TRUE(db_.DBcheckTableExist("logs"));
 }
 
 TEST_F(DBHandlerTest, ConnectsOnceAtATimeAndAgainAfterwards) {

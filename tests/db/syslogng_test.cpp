@@ -21,7 +21,6 @@ TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {
     const std::tuple<uintmax_t, int32_t, bool> cases[] = {
         {2047, 1, true}, {2048, 1, false}, {0, -1, false}, {uintmax_t{5} << 40, INT32_MAX, false}};
     const std::string target = root_.File("target");
-    WriteFile(path_ + "-wal", "");
     for (const auto &[bytes, limit, isKept] : cases) {
         for (const bool isLink : {false, true}) {
             SCOPED_TRACE(bytes);
@@ -39,7 +38,26 @@ TEST_F(Syslogng, ThrowsAwayAWorkingDatabaseBeyondItsLimit) {
             EXPECT_EQ(PlatformCalls::Texts({"KELOSystemdReload"}).size(), isKept ? 0u : 1u);
         }
     }
-    EXPECT_TRUE(fs::exists(path_ + "-wal"));
+}
+
+// A reader that still has a removed or quarantined database open and the users of the next one do not meet.
+TEST_F(Syslogng, KeepsUsersOfAnOldDatabaseApartFromThoseOfTheNextOne) {
+    for (const bool isRemoved : {true, false}) {
+        Connect(3);
+        InsertLogsIntoWal(path_, {SampleLog(3)});
+        EXPECT_EQ(isRemoved ? SyslogngWorkingDbCheck(path_, 0) : DBErrorHandle_SQLITE_CORRUPT(nullptr, path_),
+                  0);
+        EXPECT_FALSE(fs::exists(path_ + "-wal") || fs::exists(path_ + "-shm"));
+        CreateLogDatabase(path_, "archive.sql");
+        InsertLogsIntoWal(path_, {SampleLog(0)});
+        EXPECT_EQ(db_.DBLogCountGet(), 4);
+        EXPECT_EQ(RunSql(path_, "SELECT count(*) FROM logs"), "1");
+        db_.DBDiscon();
+        EXPECT_EQ(RunSql(path_, "SELECT count(*) FROM logs"), "1");
+        EXPECT_EQ(RunSql(path_, "PRAGMA integrity_check"), "ok");
+        fs::remove(path_);
+    }
+    EXPECT_EQ(RunSql(path_ + ".corrupt", "SELECT count(*) FROM logs"), "4");
 }
 
 } // namespace

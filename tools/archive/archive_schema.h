@@ -2,7 +2,7 @@
 
 namespace kelo::tool {
 
-// The text of the shipped schema archive.sql.
-extern const char *const kArchiveSchema;
+// What the shipped schema archive.sql creates, without the transaction around it.
+extern const char *const kArchiveTables;
 
 } // namespace kelo::tool

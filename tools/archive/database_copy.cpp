@@ -77,7 +77,7 @@ void RequireSound(SqliteConnection &copy, const std::string &source) {
 
 void AddSchema(SqliteConnection &copy, const std::string &source) {
     try {
-        copy.Run(kArchiveSchema);
+        copy.Run(kArchiveTables);
     } catch (const DatabaseError &error) { // for example where a column lacks
         throw DatabaseError(source + " cannot be archived: " + error.what());
     }

@@ -9,6 +9,7 @@
 #include <cstring>
 #include <filesystem>
 #include <limits>
+#include <memory>
 
 #include "base/errors.h"
 #include "base/files.h"
@@ -17,6 +18,7 @@
 #include "cli/exit_status.h"
 #include "commands/db_commands.h"
 #include "keloplatform/errors.h"
+#include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
 #include "read/failure_reason.h"
 #include "read/read_only_query.h"
@@ -158,37 +160,51 @@ bool IsSound(const LogTable &table) {
     }
 }
 
+// The name under which a quarantine has put the file with this number: ".corrupt", or ".corrupt.1" and so on
+// where an older one could not be renamed. Empty if it was not moved.
+std::string FindMoved(const std::string &aside, ino_t inode) {
+    std::string name = aside;
+    for (int number = 1;; ++number) {
+        struct stat status {};
+        if (stat(name.c_str(), &status) != 0 && number > 1)
+            return "";
+        if (status.st_ino == inode)
+            return name;
+        name = aside + "." + std::to_string(number);
+    }
+}
+
 int Quarantine(const QuarantineOptions &options) {
     const OutputFormat format = options.Format();
     const std::string path = options.Table().path;
     const std::string aside = path + ".corrupt";
-    if (!fs::is_regular_file(path))
+    struct stat before {};
+    if (stat(path.c_str(), &before) != 0 || !S_ISREG(before.st_mode))
         throw DatabaseError(DescribeDatabaseProblem(options.Table()));
+    // Opened before the check, so that nothing but what was checked is moved: the check may take long, and
+    // other processes may quarantine the database meanwhile.
+    const std::unique_ptr<DBConnect_tag, decltype(&KELODBClose)> connection(
+        KELODBConnect(nullptr, nullptr, nullptr, path.c_str()), &KELODBClose);
     if (!options.isForced && IsSound(options.Table())) {
         PrintMessage(path + " is sound; nothing moved (--force moves it nevertheless)");
         return kExitNothing;
     }
-    const std::string action =
-        "move " + path + " to " + aside + (fs::exists(aside) ? ", which replaces an older one" : "");
-    if (!options.isConfirmed && !Confirm("db quarantine", action)) {
+    if (!options.isConfirmed && !Confirm("db quarantine", "move " + path + " to " + aside)) {
         PrintMessage("nothing moved");
         return kExitNothing;
     }
-    struct stat before {};
-    stat(path.c_str(), &before);
-    const auto isMoved = [&] {
-        struct stat after {};
-        return stat(aside.c_str(), &after) == 0 && after.st_ino == before.st_ino;
-    };
-    const bool isReloaded = DBErrorHandle_SQLITE_CORRUPT(nullptr, path) == 0;
+    const bool isReloaded = DBErrorHandle_SQLITE_CORRUPT(connection.get(), path) == 0;
     const int moveError = errno;
     const std::string unsent = KELOErrorGet(); // the notification that comes before
-    if (!isReloaded && !isMoved())
+    const std::string moved = FindMoved(aside, before.st_ino);
+    if (moved.empty())
         throw DatabaseError("cannot move " + path + ": " +
-                            (unsent.empty() ? std::strerror(moveError) : unsent));
+                            (isReloaded       ? "it was replaced meanwhile"
+                             : unsent.empty() ? std::strerror(moveError)
+                                              : unsent));
     KeyValues values;
     values.Add("moved", path);
-    values.Add("to", aside);
+    values.Add("to", moved);
     values.AddBool("reloaded", isReloaded);
     Print(values, format);
     if (isReloaded)

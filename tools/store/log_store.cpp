@@ -44,7 +44,7 @@ void Create(const std::string &path, int busyTimeoutMs) {
         SqliteConnection forerunner(file, {.mode = SqliteMode::kCreate, .busyTimeoutMs = busyTimeoutMs},
                                     path);
         forerunner.Run("PRAGMA journal_mode=WAL");
-        forerunner.Run(kLogsSchema);
+        forerunner.Run(kLogsTables);
     }
     // Whoever was faster keeps the name: both files are alike.
     if (!RenameToFreeName(file, path) && errno != EEXIST)
@@ -87,7 +87,7 @@ void LogStore::FillEmpty() {
     db_.Run("PRAGMA journal_mode=WAL");
     SqliteTransaction transaction(db_);
     if (isEmpty())
-        db_.Run(kLogsSchema);
+        db_.Run(kLogsTables);
     transaction.Commit();
 }
 

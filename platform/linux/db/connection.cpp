@@ -1,5 +1,7 @@
 #include "db/connection.h"
 
+#include <unistd.h>
+
 #include <chrono>
 #include <memory>
 #include <new>
@@ -52,6 +54,26 @@ int WaitForLock(void *, int calls) {
     return 1;
 }
 
+bool HasMoved(sqlite3 *db) {
+    int hasMoved = 0;
+    sqlite3_file_control(db, "main", SQLITE_FCNTL_HAS_MOVED, &hasMoved);
+    return hasMoved != 0;
+}
+
+// Opens the write-ahead log too and returns whether the file kept its name meanwhile. SQLite opens the log at
+// the first read, by its name: of a file that was moved since, that is the log of the one that came after it.
+bool OpenLog(sqlite3 *db) {
+    if (HasMoved(db))
+        return false;
+    const char *log = sqlite3_filename_wal(sqlite3_db_filename(db, "main"));
+    // The connection that closes last has the file for itself while it deletes the log.
+    for (int calls = 0; sqlite3_exec(db, "PRAGMA user_version", nullptr, nullptr, nullptr) == SQLITE_BUSY &&
+                        access(log, F_OK) == 0 && WaitForLock(nullptr, calls) != 0;
+         ++calls) {
+    }
+    return !HasMoved(db);
+}
+
 } // namespace
 
 DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path) {
@@ -59,9 +81,13 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
         return nullptr;
     try {
         auto connection = std::make_unique<DBConnect_tag>(path);
-        Database db = connection->file.Open();
-        if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()) ||
-            sqlite3_busy_handler(db.get(), WaitForLock, nullptr) != SQLITE_OK)
+        Database db;
+        do {
+            db = connection->file.Open();
+            if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()))
+                return nullptr;
+        } while (!OpenLog(db.get()));
+        if (sqlite3_busy_handler(db.get(), WaitForLock, nullptr) != SQLITE_OK)
             return nullptr;
         connection->db = db.release();
         return connection.release();

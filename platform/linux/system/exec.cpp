@@ -38,17 +38,17 @@ void ResetSignals() {
     sigprocmask(SIG_SETMASK, &none, nullptr);
 }
 
-// Leaves only standard input and output, both on /dev/null, and standard error, which goes there too if
-// the caller has none: a file that the command opens must not become one of the three.
-void ResetDescriptors() {
-    close_range(STDERR_FILENO + 1, ~0U, 0);
+// Puts standard input and output on /dev/null, and standard error too if the caller has none: a file that the
+// command opens must not become one of the three.
+void ResetStandardFiles() {
     const bool hasError = fcntl(STDERR_FILENO, F_GETFD) >= 0;
     const int null = open("/dev/null", O_RDWR);
     dup2(null, STDIN_FILENO);
     dup2(null, STDOUT_FILENO);
     if (!hasError)
         dup2(null, STDERR_FILENO);
-    close_range(STDERR_FILENO + 1, ~0U, 0);
+    if (null > STDERR_FILENO)
+        close(null);
 }
 
 // Blocks the signals of this thread during its lifetime: a handler of the caller must not run in the child,
@@ -68,9 +68,12 @@ private:
     sigset_t before_;
 };
 
+// Keeps what the caller has open until the command has ended: a lock of the caller's, taken with flock(2),
+// guards what the command does, also after the caller was killed.
 [[noreturn]] void RunCommand(const char *program, char *const *arguments) {
     const pid_t command = Fork(SIGCHLD);
     if (command == 0) {
+        close_range(STDERR_FILENO + 1, ~0U, 0);
         execv(program, arguments);
         _exit(127);
     }
@@ -91,7 +94,7 @@ int TORVCExec(const char *program, const char *arg1, const char *arg2, const cha
         keeper = Fork(0);
         if (keeper == 0) {
             ResetSignals();
-            ResetDescriptors();
+            ResetStandardFiles();
             RunCommand(program, const_cast<char *const *>(arguments));
         }
     }
