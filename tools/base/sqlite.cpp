@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "base/stop_signals.h"
+#include "keloplatform/vfs.h"
 
 namespace kelo::tool {
 namespace {
@@ -42,7 +43,7 @@ SqliteConnection::SqliteConnection(const std::string &path, const SqliteOptions 
     : name_(name.empty() ? path : name), options_(options) {
     sqlite3 *db = nullptr;
     const int status =
-        sqlite3_open_v2(path.c_str(), &db, FlagsOf(options.mode) | SQLITE_OPEN_NOMUTEX, nullptr);
+        sqlite3_open_v2(path.c_str(), &db, FlagsOf(options.mode) | SQLITE_OPEN_NOMUTEX, KELODBVfs());
     db_.reset(db);
     if (status != SQLITE_OK)
         Fail(status);

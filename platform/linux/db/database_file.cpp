@@ -7,12 +7,14 @@
 #include <system_error>
 #include <utility>
 
+#include "keloplatform/vfs.h"
+
 namespace kelo::platform {
 namespace {
 
 Database OpenNamed(const char *name, int flags) {
     sqlite3 *db = nullptr;
-    const int status = sqlite3_open_v2(name, &db, flags, nullptr);
+    const int status = sqlite3_open_v2(name, &db, flags, KELODBVfs());
     Database owner(db);
     return status == SQLITE_OK ? std::move(owner) : nullptr;
 }
