@@ -22,6 +22,7 @@
 // When memory runs out, operations throw std::bad_alloc; the counts stay as they were.
 
 #include <cstdint>
+#include <functional>
 #include <list>
 #include <memory>
 #include <string>
@@ -82,6 +83,11 @@ public:
     // cannot be written; the histogram does not change. Returns the number of discarded samples.
     size_t SamplesDrop(size_t samples, size_t counts);
 
+    // From now on the count of each sample that is closed goes to `handler`, and the manager neither checks
+    // its rules nor sends or adds anything. For callers that limit the notifications, or that load rules
+    // anew.
+    void EpsHandlerSet(std::function<void(uint64_t eps)> handler);
+
     // Writes the figures to the debug channel at level 2.
     void AccountingDump();
 
@@ -109,4 +115,5 @@ private:
     std::vector<kelo::Device *> openSample_;     // the devices with records in the open sample
     std::list<Sample> samples_;
     NotificationManager notifications_;
+    std::function<void(uint64_t)> epsHandler_; // empty: the rules are checked
 };

@@ -63,9 +63,15 @@ int AccountingManager::CurEpsUpdate() {
         samples_.back().devices.emplace_back(device, std::exchange(device->inOpenSample, 0));
     openSample_.clear();
     const auto eps = static_cast<uint64_t>(std::exchange(currentCount_, 0));
-    if (notifications_.CheckEps(eps))
+    if (epsHandler_)
+        epsHandler_(eps);
+    else if (notifications_.CheckEps(eps))
         NotifyEps(eps);
     return 0;
+}
+
+void AccountingManager::EpsHandlerSet(std::function<void(uint64_t eps)> handler) {
+    epsHandler_ = std::move(handler);
 }
 
 void AccountingManager::NotifyEps(uint64_t eps) {

@@ -178,6 +178,12 @@ TEST_F(Accounting, NotifiesWhenASampleReachesARule) {
     countSecond(1);
     EXPECT_THAT(TakeTexts(), IsEmpty());
     EXPECT_EQ(RunSql(events_, "SELECT count(*) FROM log"), "2");
+    std::vector<uint64_t> samples;
+    accounting.EpsHandlerSet([&](uint64_t eps) { samples.push_back(eps); });
+    countSecond(5);
+    countSecond(1);
+    EXPECT_THAT(samples, ElementsAre(1, 5));
+    EXPECT_EQ(PlatformCalls::Sent().size(), 2u) << "only the handler learns of them";
 }
 
 TEST_F(Accounting, GivesUpTheOldestSamplesAboveABound) {

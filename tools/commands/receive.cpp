@@ -81,7 +81,7 @@ void AddReceive(Program &program) {
     AddText(*command, "--set-aside", options->receiver.setAside, "FILE",
             "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
     AddText(*command, "--notify-limit", options->notifyLimit, "N",
-            "Raise at most N notifications a minute for a keyword or severity, 5 N for all of them (10)");
+            "Raise at most N notifications a minute for a keyword, a severity or the rate, 5 N for all of them (10)");
     command->add_flag("-v,--verbose", options->verbose,
                       "Write to the standard error, too, what goes to the system log");
 }

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <utility>
 
 namespace kelo::tool {
 namespace {
@@ -18,24 +19,18 @@ constexpr int64_t kFlushWhileFailingSec = 60;
 constexpr size_t kMostSamples = 24 * 60 * 60;
 constexpr size_t kMostCounts = 1'000'000;
 
-uint64_t Total(const AccountingManager &manager) {
-    uint64_t total = 0;
-    for (const KELOLOG_LOG_DEVICE_STATISTIC &entry : manager.HistogramGet())
-        total += entry.count;
-    return total;
-}
-
 } // namespace
 
-AccountingFlusher::AccountingFlusher() : manager_(std::make_unique<AccountingManager>()) {}
+AccountingFlusher::AccountingFlusher(std::function<void(uint64_t)> onSample) {
+    manager_.EpsHandlerSet(std::move(onSample));
+}
 
 void AccountingFlusher::Tick(int64_t now) {
-    manager_->CurEpsUpdate();
+    manager_.CurEpsUpdate();
     if (now < nextFlush_)
         return;
-    isReloadPutOff_ = false;
     nextFlush_ = now + kFlushSec;
-    if (!manager_->isNeed2Flush()) // its clock was set back: the next answer is right again
+    if (!manager_.isNeed2Flush()) // its clock was set back: the next answer is right again
         return;
     using Clock = std::chrono::steady_clock;
     const Clock::time_point begin = Clock::now();
@@ -46,35 +41,15 @@ void AccountingFlusher::Tick(int64_t now) {
         now + std::max(isStillFailing ? kFlushWhileFailingSec : kFlushSec, sec + sec * kPausePerFlush);
 }
 
-void AccountingFlusher::RequestReload() {
-    mustReload_ = true;
-    isReloadPutOff_ = false;
-}
-
-bool AccountingFlusher::MayCount() {
-    if (!mustReload_ || isReloadPutOff_)
-        return true;
-    if (!CloseSample())
-        return false;
-    if (Flush())
-        Replace();
-    isReloadPutOff_ = mustReload_;
-    return true;
-}
-
 bool AccountingFlusher::Finish() {
-    return CloseSample() && Flush();
-}
-
-bool AccountingFlusher::CloseSample() {
-    manager_->CurEpsUpdate();
-    return manager_->CurrentEpsGet() == 0;
+    manager_.CurEpsUpdate();
+    return manager_.CurrentEpsGet() == 0 && Flush();
 }
 
 bool AccountingFlusher::Flush() {
-    const bool isFlushed = manager_->AccoutingFlush2DB() == 0;
+    const bool isFlushed = manager_.AccoutingFlush2DB() == 0;
     if (!isFlushed) {
-        if (const size_t dropped = manager_->SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
+        if (const size_t dropped = manager_.SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
             syslog(LOG_ERR, "%zu samples of the accounting were given up, as it cannot be written", dropped);
         if (!isFailing_)
             syslog(LOG_ERR, "the accounting cannot be written and waits in memory");
@@ -82,17 +57,8 @@ bool AccountingFlusher::Flush() {
         syslog(LOG_NOTICE, "the accounting has been written");
     }
     isFailing_ = !isFlushed;
-    isIdle_ = isFlushed && manager_->CurrentEpsGet() == 0;
+    isIdle_ = isFlushed && manager_.CurrentEpsGet() == 0;
     return isFlushed;
-}
-
-// A manager that could not read the totals of the present one would later overwrite them with lower ones.
-void AccountingFlusher::Replace() {
-    auto fresh = std::make_unique<AccountingManager>();
-    if (Total(*fresh) < Total(*manager_))
-        return;
-    manager_ = std::move(fresh);
-    mustReload_ = false;
 }
 
 } // namespace kelo::tool

@@ -25,7 +25,6 @@ constexpr const char *kFolder = "/var/log/kelolog";
 constexpr int64_t kSecondMs = 1000;
 constexpr int64_t kBeatMs = 6000;
 constexpr int64_t kRepairMs = 60'000;
-constexpr int64_t kHoldMs = 20;          // between checks of the clock while no record may be counted
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
 constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
 constexpr int64_t kLeastFinishMs = 2000; // of it, if waiting for the database has taken the time before
@@ -43,7 +42,9 @@ std::string FolderOf(const ReceiverOptions &options) {
 Receiver::Receiver(ReceiverOptions options)
     : options_(std::move(options)), volume_(FolderOf(options_)),
       setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
-      rules_(options_.notifyLimit), lines_(LogStream::kMaxLineBytes),
+      rules_(options_.notifyLimit),
+      accounting_([this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
+      lines_(LogStream::kMaxLineBytes),
       import_([this](const LineReader &reader,
                      const std::string &reason) { setAside_.Add(reason, reader.Line()); },
               true) {
@@ -126,16 +127,13 @@ bool Receiver::Advance() {
     const bool isStored = !writer_ || writer_->Advance(now_);
     if (writer_ && writer_->Reason() != state_.waiting)
         TickState();
-    const bool mayCount = accounting_.MayCount();
-    if (isStored && !mayCount)
-        FireAt(writerTimer_, now_ + kHoldMs);
-    else if (writer_ && writer_->NextTime() != INT64_MAX)
+    if (writer_ && writer_->NextTime() != INT64_MAX)
         FireAt(writerTimer_, writer_->NextTime());
     if (!isTicking_ && !IsIdle()) {
         isTicking_ = true;
         FireAt(secondTimer_, now_ + kSecondMs);
     }
-    return isStored && mayCount;
+    return isStored;
 }
 
 bool Receiver::HasEnded(const BlockReader &input) const {
@@ -155,7 +153,6 @@ void Receiver::Reload() {
     }
     setAside_.Reopen();
     rules_.Reload();
-    accounting_.RequestReload();
 }
 
 // Whether there is no work every second until the next event.

@@ -2,6 +2,7 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <utility>
 
 #include "base/text_encoding.h"
@@ -47,14 +48,28 @@ void RuleChecker::Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now) {
         Handle({Kind::Keyword, keyword, log.host}, log.msg);
 }
 
-void RuleChecker::Handle(const Match &match, const std::string &message) {
-    const std::string rule = (match.kind == Kind::Severity ? "severity [" : "keyword [") + match.what + "]";
+void RuleChecker::CheckEps(uint64_t eps, int64_t now) {
+    now_ = now;
+    if (rules_->CheckEps(eps))
+        Handle({.kind = Kind::Eps, .what = "logs per second", .eps = eps}, "");
+}
+
+void RuleChecker::Handle(Match match, const std::string &message) {
+    const std::string rule = NameOf(match);
     if (limit_.Allow(rule, now_)) {
         Raise(match, Content(message));
         return;
     }
-    lastSuppressed_.insert_or_assign(rule, match);
+    if (const auto before = lastSuppressed_.find(rule); before != lastSuppressed_.end())
+        match.eps = std::max(match.eps, before->second.eps);
+    lastSuppressed_.insert_or_assign(rule, std::move(match));
     ++suppressed_;
+}
+
+std::string RuleChecker::NameOf(const Match &match) {
+    if (match.kind == Kind::Eps)
+        return match.what;
+    return (match.kind == Kind::Severity ? "severity [" : "keyword [") + match.what + "]";
 }
 
 void RuleChecker::Tick(int64_t now) {
@@ -71,7 +86,8 @@ void RuleChecker::Finish() {
         GiveUpFirst();
 }
 
-// One notification, under the name of the first rule.
+// One notification, under the name of the first rule whose notification has a text. That of the records per
+// second has none: alone, it names the highest number.
 void RuleChecker::Tell(const RateLimiter::Counts &counts) {
     if (counts.empty())
         return;
@@ -79,7 +95,14 @@ void RuleChecker::Tell(const RateLimiter::Counts &counts) {
     for (const auto &[rule, count] : counts)
         content +=
             (content.empty() ? "" : ", ") + std::to_string(count) + (counts.size() > 1 ? " of " + rule : "");
-    Raise(lastSuppressed_.at(counts.begin()->first), Content(content + kTail));
+    Match head{.kind = Kind::Eps, .what = ""};
+    for (const auto &[rule, count] : counts) {
+        Match &match = lastSuppressed_.at(rule);
+        if (head.kind == Kind::Eps)
+            head = match;
+        match.eps = 0;
+    }
+    Raise(head, Content(content + kTail));
 }
 
 void RuleChecker::Raise(const Match &match, const std::string &content) {
@@ -91,16 +114,18 @@ void RuleChecker::Raise(const Match &match, const std::string &content) {
             nextNotify_ = now_ + kNotifyPauseSec;
         waiting_.push_back({match, content, now_});
     }
-    if (match.kind == Kind::Severity)
-        AddEvent([&] { return Logger().LogAddNotifySev(match.what, content); });
-    else
-        AddEvent([&] { return Logger().LogAddNotifyKw(match.what, content); });
+    AddEvent(match, content);
 }
 
 bool RuleChecker::Notify(const Match &match, const std::string &content) {
-    return (match.kind == Kind::Severity
-                ? rules_->NotificationSendSev(match.host, match.what, content)
-                : rules_->NotificationSendKeyword(match.host, match.what, content)) == 0;
+    switch (match.kind) {
+    case Kind::Severity:
+        return rules_->NotificationSendSev(match.host, match.what, content) == 0;
+    case Kind::Keyword:
+        return rules_->NotificationSendKeyword(match.host, match.what, content) == 0;
+    default:
+        return rules_->NotificationSendEps(match.eps) == 0;
+    }
 }
 
 void RuleChecker::NotifyAgain() {
@@ -113,18 +138,29 @@ void RuleChecker::NotifyAgain() {
 
 void RuleChecker::GiveUpFirst() {
     const Match &match = waiting_.front().match;
-    syslog(LOG_ERR, "A notification was given up, as it could not be put into the spool: %s from %s",
-           match.what.c_str(), match.host.c_str());
+    const std::string host = match.host.empty() ? "" : " from " + match.host;
+    syslog(LOG_ERR, "A notification was given up, as it could not be put into the spool: %s%s",
+           match.what.c_str(), host.c_str());
     waiting_.pop_front();
     ++lost_;
 }
 
+int RuleChecker::WriteEvent(const Match &match, const std::string &content) {
+    switch (match.kind) {
+    case Kind::Severity:
+        return Logger().LogAddNotifySev(match.what, content);
+    case Kind::Keyword:
+        return Logger().LogAddNotifyKw(match.what, content);
+    default:
+        return Logger().LogAddNotifyEps(match.eps);
+    }
+}
+
 // An event with a locked database takes seconds, in which nothing is received.
-template <typename Write>
-void RuleChecker::AddEvent(Write write) {
+void RuleChecker::AddEvent(const Match &match, const std::string &content) {
     if (now_ < nextEvent_) {
         ++lostEvents_;
-    } else if (write() != 0) {
+    } else if (WriteEvent(match, content) != 0) {
         nextEvent_ = now_ + kEventPauseSec;
         ++lostEvents_;
     } else if (const uint64_t lost = std::exchange(lostEvents_, 0); lost > 0) {

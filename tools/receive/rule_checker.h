@@ -11,8 +11,9 @@
 
 namespace kelo::tool {
 
-// Checks records against the severity and keyword rules. A match sends a notification and adds an event.
-// Their number a minute is limited for each rule (a keyword, or a severity) and for all (RateLimiter).
+// Checks records, and their number, against the rules. A match sends a notification and adds an event. Their
+// number a minute is limited for each rule (a keyword, a severity, or the records a second) and for all
+// (RateLimiter).
 //
 // A notification that fails because the spool has no room is tried again for an hour; at most a hundred wait.
 // A failed event is only reported in the system log, by the library; then no events are added for a minute.
@@ -24,6 +25,9 @@ public:
     explicit RuleChecker(uint64_t notifyLimit);
 
     void Check(const _SYSLOG_LOG_DATA_tag &log, int64_t now);
+
+    // The same for the number of records of a sample.
+    void CheckEps(uint64_t eps, int64_t now);
 
     // Call it about once a second, unless idle: reports what was suppressed in a minute that is over.
     void Tick(int64_t now);
@@ -47,30 +51,32 @@ public:
     uint64_t Lost() const { return lost_; }
 
 private:
-    enum class Kind { Severity, Keyword };
-    // The match of a record, and the host of the record.
+    enum class Kind { Severity, Keyword, Eps };
+    // The match of a record and its host, or of a number of records.
     struct Match {
         Kind kind;
-        std::string what; // the severity or the keyword
-        std::string host;
+        std::string what; // the severity, the keyword or the rule about numbers
+        std::string host = {};
+        uint64_t eps = 0;
     };
     struct Notification {
         Match match;
         std::string content;
         int64_t since; // when it failed first
     };
-    void Handle(const Match &match, const std::string &message);
+    void Handle(Match match, const std::string &message);
+    static std::string NameOf(const Match &match);
+    static int WriteEvent(const Match &match, const std::string &content);
     void Raise(const Match &match, const std::string &content);
     bool Notify(const Match &match, const std::string &content);
     void NotifyAgain();
     void GiveUpFirst();
     void Tell(const RateLimiter::Counts &counts);
-    template <typename Write>
-    void AddEvent(Write write);
+    void AddEvent(const Match &match, const std::string &content);
 
     std::optional<NotificationManager> rules_;
     RateLimiter limit_;
-    std::map<std::string, Match> lastSuppressed_; // by rule
+    std::map<std::string, Match> lastSuppressed_; // by rule, with the highest number of records
     uint64_t suppressed_ = 0;
     std::deque<Notification> waiting_; // those that failed, oldest first
     int64_t nextNotify_ = 0;           // when they are tried again
