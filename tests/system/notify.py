@@ -4,6 +4,7 @@ import email.policy
 import json
 import os
 import random
+import shutil
 import ssl
 import subprocess
 import tempfile
@@ -62,6 +63,26 @@ class NotifyTest(unittest.TestCase):
 
     def names(self, folder):
         return sorted(os.listdir(f"{self.spool}/{folder}"))
+
+    def test_no_link_in_the_spool_is_followed(self):
+        """The spool belongs to a service, and root works in it, too."""
+        self.settings.update(desktop_enabled="yes")
+        self.write_settings()
+        os.makedirs(self.root + "/usr/kelo/keloman/webman/modules")
+        os.symlink(os.path.abspath(os.path.dirname(__file__) + "/../../package"), self.root + "/usr/kelo/keloman/webman/modules/Quillbay")
+        for name in ("tmp", "new", "failed", "state", "desktop"):
+            shutil.rmtree(self.spool)
+            for folder in ("tmp", "new", "failed", "state", "desktop"):
+                os.makedirs(f"{self.spool}/{folder}")
+            given_up, waits = self.add(channels=["desktop"]), self.add(channels=["desktop"])
+            os.rename(f"{self.spool}/new/{given_up}.json", f"{self.spool}/failed/{given_up}.json")
+            elsewhere = f"{self.root}/elsewhere-{name}"
+            os.rename(f"{self.spool}/{name}", elsewhere)
+            os.symlink(elsewhere, f"{self.spool}/{name}")
+            before = os.listdir(elsewhere)
+            for command in ("kelosyslog notify list", "kelosyslog notify retry --all", "kelosyslog notify test desktop", "kelonotify"):
+                subprocess.run([BIN + "/" + command.split()[0], "--root", self.root, *command.split()[1:]], capture_output=True, timeout=60)
+                self.assertEqual(os.listdir(elsewhere), before, f"{command} with a link as {name}")
 
     def test_mail_arrives_whole_whatever_it_holds(self):
         server = self.start(MailServer())

@@ -13,6 +13,7 @@
 #include "archive/archive_name.h"
 #include "base/atomic_file.h"
 #include "base/errors.h"
+#include "base/folder.h"
 #include "base/sqlite.h"
 
 namespace kelo::tool {
@@ -122,7 +123,8 @@ std::string ArchiveFolder::Publish(const std::string &temporary, const std::stri
 
 void ArchiveFolder::NoteRemoval(const std::string &name, const std::string &source) const {
     const std::string note = path_ + "/" + kRemoval + name;
-    if (!WriteFileAtomically(path_ + "/" + kTemporary + "note", note, source))
+    const Folder folder(path_);
+    if (!folder.Write(kRemoval + name, source, folder, std::string(kTemporary) + "note"))
         Fail(note, errno);
 }
 

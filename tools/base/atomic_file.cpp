@@ -23,10 +23,6 @@ mode_t ModeOf(const std::string &target) {
     return 0666 & ~mask;
 }
 
-bool SyncAndRename(const FileHandle &file, const std::string &from, const std::string &to) {
-    return fsync(file.Get()) == 0 && std::rename(from.c_str(), to.c_str()) == 0;
-}
-
 } // namespace
 
 AtomicFile::AtomicFile(const std::string &target) : target_(target), path_(target + ".XXXXXX") {
@@ -49,7 +45,8 @@ void AtomicFile::Write(std::string_view text) {
 }
 
 void AtomicFile::Commit() {
-    if (fchmod(file_.Get(), ModeOf(target_)) != 0 || !SyncAndRename(file_, path_, target_))
+    if (fchmod(file_.Get(), ModeOf(target_)) != 0 || fsync(file_.Get()) != 0 ||
+        std::rename(path_.c_str(), target_.c_str()) != 0)
         Fail(std::strerror(errno));
     path_.clear();
     SyncFolderOf(target_); // if that fails, the file is complete nevertheless
@@ -57,22 +54,6 @@ void AtomicFile::Commit() {
 
 void AtomicFile::Fail(const std::string &reason) const {
     throw OutputError("cannot write " + target_ + ": " + reason);
-}
-
-bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content) {
-    const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW;
-    const FileHandle file(open(temporary.c_str(), flags, 0640));
-    if (file && WriteAll(file.Get(), content) && SyncAndRename(file, temporary, path))
-        return SyncFolderOf(path);
-    const int cause = errno;
-    unlink(temporary.c_str());
-    errno = cause;
-    return false;
-}
-
-bool RenameDurably(const std::string &from, const std::string &to) {
-    // The new name first: between the two syncs the file may have both names, never none.
-    return std::rename(from.c_str(), to.c_str()) == 0 && SyncFolderOf(to) && SyncFolderOf(from);
 }
 
 bool RenameToFreeName(const std::string &from, const std::string &to) {

@@ -44,13 +44,6 @@ private:
 
 // Each of these sets errno when it fails.
 
-// The same for a whole text: written as `temporary` with mode 0640, synced, renamed to `path`, whose folder
-// is synced. Both paths are on one file system.
-bool WriteFileAtomically(const std::string &temporary, const std::string &path, std::string_view content);
-
-// Renames, and syncs the folders of both paths.
-bool RenameDurably(const std::string &from, const std::string &to);
-
 // Renames unless the new name is taken (EEXIST). Syncs nothing.
 bool RenameToFreeName(const std::string &from, const std::string &to);
 

@@ -21,8 +21,12 @@ FileHandle::~FileHandle() {
 
 std::optional<std::string> ReadWhole(const std::string &path) {
     const FileHandle file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    return file ? ReadWhole(file) : std::nullopt;
+}
+
+std::optional<std::string> ReadWhole(const FileHandle &file) {
     struct stat status;
-    if (!file || fstat(file.Get(), &status) != 0)
+    if (fstat(file.Get(), &status) != 0)
         return std::nullopt;
     if (!S_ISREG(status.st_mode) || status.st_size > kMaxBytes) {
         errno = S_ISREG(status.st_mode) ? EFBIG : EINVAL;

@@ -29,6 +29,7 @@ private:
 
 // The whole content of a regular file of up to 16 MiB; nothing on failure.
 std::optional<std::string> ReadWhole(const std::string &path);
+std::optional<std::string> ReadWhole(const FileHandle &file);
 
 // Writes all of `content`.
 bool WriteAll(int fd, std::string_view content);

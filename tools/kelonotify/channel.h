@@ -5,8 +5,8 @@
 #include <string_view>
 #include <vector>
 
-#include "spool/entry.h"
 #include "spool/settings.h"
+#include "spool/spool.h"
 
 namespace kelo::tool {
 
@@ -36,7 +36,7 @@ public:
 struct ChannelOptions {
     const Settings &settings;
     long timeoutSec;
-    std::string feedFolder; // of the desktop channel
+    const Spool &spool; // which has the feed of the desktop channel
 };
 
 std::unique_ptr<Channel> MakeMailChannel(const ChannelOptions &options);

@@ -186,7 +186,7 @@ void Deliverer::Wait(int64_t until) {
 
 Channel &Deliverer::ChannelOf(const std::string &name) {
     std::unique_ptr<Channel> &channel = channels_[name];
-    const ChannelOptions options{settings_, options_.timeoutSec, spool_.File("desktop")};
+    const ChannelOptions options{settings_, options_.timeoutSec, spool_};
     if (channel == nullptr && name == "mail")
         channel = MakeMailChannel(options);
     else if (channel == nullptr && name == "desktop")

@@ -49,7 +49,7 @@ void PopUp(const Entry &entry, long timeoutSec) {
 class DesktopChannel final : public Channel {
 public:
     explicit DesktopChannel(const ChannelOptions &options)
-        : feed_(options.feedFolder), folder_(options.feedFolder), timeoutSec_(options.timeoutSec) {}
+        : feed_(options.spool), folder_(options.spool.File("desktop")), timeoutSec_(options.timeoutSec) {}
 
     std::vector<std::string> Targets() const override { return {"desktop"}; }
 

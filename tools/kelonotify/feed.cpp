@@ -1,19 +1,18 @@
 #include "kelonotify/feed.h"
 
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 
-#include "base/atomic_file.h"
 #include "base/json.h"
 #include "kelonotify/safe_text.h"
 
 namespace kelo::tool {
 namespace {
 
+constexpr const char *kFeed = "feed.jsonl";
+constexpr const char *kOlderFeed = "feed.1.jsonl";
 constexpr size_t kMaxFeedBytes = size_t{1} << 20;
 constexpr size_t kMaxTextBytes = size_t{16} << 10;
 
@@ -36,26 +35,25 @@ bool Holds(const std::string &content, const std::string &id) {
 } // namespace
 
 Feed::Added Feed::Add(const Entry &entry) const {
-    const std::string path = folder_ + "/feed.jsonl";
-    const std::string olderPath = folder_ + "/feed.1.jsonl";
-    const std::optional<std::string> content = ReadWhole(path);
+    const Folder folder = spool_.Sub("desktop");
+    const std::optional<std::string> content = folder.Read(kFeed);
     if (!content && errno != ENOENT)
         return Added::No;
-    const std::optional<std::string> older = ReadWhole(olderPath);
+    const std::optional<std::string> older = folder.Read(kOlderFeed);
     if (!older && errno != ENOENT)
         return Added::No;
     const size_t whole = content ? content->rfind('\n') + 1 : 0; // 0 also without a line feed
     if ((content && Holds(content->substr(0, whole), entry.id)) || (older && Holds(*older, entry.id)))
         return Added::AlreadyThere;
     const bool isFull = whole > kMaxFeedBytes;
-    if (isFull && !RenameDurably(path, olderPath))
+    if (isFull && !folder.Rename(kFeed, folder, kOlderFeed))
         return Added::No;
-    const FileHandle file(open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
+    const FileHandle file = folder.Open(kFeed, O_WRONLY | O_CREAT);
     const off_t end = isFull ? 0 : static_cast<off_t>(whole);
     const bool isWritten = file && ftruncate(file.Get(), end) == 0 &&
                            lseek(file.Get(), end, SEEK_SET) == end && WriteAll(file.Get(), Line(entry)) &&
                            fsync(file.Get()) == 0;
-    return isWritten && SyncFolderOf(path) ? Added::Yes : Added::No;
+    return isWritten && folder.Sync() ? Added::Yes : Added::No;
 }
 
 } // namespace kelo::tool

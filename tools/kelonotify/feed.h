@@ -1,15 +1,13 @@
 #pragma once
 
-#include <string>
-
-#include "spool/entry.h"
+#include "spool/spool.h"
 
 namespace kelo::tool {
 
-// The file of notifications for a web page: one JSON object on each line, the newest last.
+// The file of notifications for a web page, in the spool: one JSON object on each line, the newest last.
 class Feed {
 public:
-    explicit Feed(std::string folder) : folder_(std::move(folder)) {}
+    explicit Feed(const Spool &spool) : spool_(spool) {}
 
     enum class Added { Yes, AlreadyThere, No };
 
@@ -19,7 +17,7 @@ public:
     Added Add(const Entry &entry) const;
 
 private:
-    std::string folder_;
+    const Spool &spool_;
 };
 
 } // namespace kelo::tool

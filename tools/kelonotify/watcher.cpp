@@ -14,7 +14,8 @@
 namespace kelo::tool {
 
 Watcher::Watcher(const std::string &folder) : files_(inotify_init1(IN_NONBLOCK | IN_CLOEXEC)) {
-    if (!files_ || inotify_add_watch(files_.Get(), folder.c_str(), IN_MOVED_TO | IN_CREATE) < 0)
+    if (!files_ || inotify_add_watch(files_.Get(), folder.c_str(),
+                                     IN_MOVED_TO | IN_CREATE | IN_ONLYDIR | IN_DONT_FOLLOW) < 0)
         throw SpoolError(folder + ": " + std::strerror(errno));
     news_ = loop_.AddInput(files_.Get(), [this] { TakeNews(); });
     term_ = loop_.AddSignal(SIGTERM, [this] { isStopped_ = true; });

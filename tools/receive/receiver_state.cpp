@@ -3,7 +3,7 @@
 #include <filesystem>
 #include <system_error>
 
-#include "base/atomic_file.h"
+#include "base/folder.h"
 #include "base/json.h"
 
 namespace kelo::tool {
@@ -60,10 +60,12 @@ std::string ReceiverStatePath(const std::string &root) {
 }
 
 bool WriteReceiverState(const std::string &root, const ReceiverState &state) {
-    const std::string path = ReceiverStatePath(root);
+    const std::filesystem::path path = ReceiverStatePath(root);
     std::error_code ignored; // the write fails then, and says why
-    std::filesystem::create_directories(std::filesystem::path(path).parent_path(), ignored);
-    return WriteFileAtomically(path + ".new", path, WriteJsonLine(ToJson(state)));
+    std::filesystem::create_directories(path.parent_path(), ignored);
+    const Folder folder(path.parent_path());
+    const std::string name = path.filename();
+    return folder.Write(name, WriteJsonLine(ToJson(state)), folder, name + ".new");
 }
 
 std::optional<ReceiverState> ReadReceiverState(const std::string &root) {

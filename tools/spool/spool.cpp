@@ -10,30 +10,14 @@
 #include <cstring>
 #include <filesystem>
 
-#include "base/atomic_file.h"
-
 namespace kelo::tool {
 namespace {
 
 namespace fs = std::filesystem;
 
+constexpr mode_t kFolderMode = 0750;
 constexpr int64_t kTemporarySec = 24 * 3600;
-constexpr const char *kRetryRequest = "new/retry";
-
-std::vector<std::string> NamesIn(const std::string &folder) {
-    std::vector<std::string> names;
-    std::error_code error;
-    for (fs::directory_iterator at(folder, error), end; !error && at != end; at.increment(error))
-        names.push_back(at->path().filename().string());
-    if (error && error != std::errc::no_such_file_or_directory)
-        throw SpoolError(folder + ": " + error.message());
-    return names;
-}
-
-bool Exists(const std::string &path) {
-    struct stat status;
-    return lstat(path.c_str(), &status) == 0 || errno != ENOENT;
-}
+constexpr const char *kRetryRequest = "retry";
 
 } // namespace
 
@@ -42,15 +26,44 @@ void Spool::Require(bool isDone, const std::string &name) const {
         throw SpoolError(File(name) + ": " + std::strerror(errno));
 }
 
+Folder Spool::FolderOf(const std::string &name) const {
+    const size_t slash = name.find('/');
+    return slash == std::string::npos ? Folder(path_) : Sub(name.substr(0, slash));
+}
+
+std::vector<std::string> Spool::NamesIn(const std::string &folder) const {
+    const std::optional<std::vector<std::string>> names = Sub(folder).Names();
+    Require(names || errno == ENOENT, folder);
+    return names.value_or(std::vector<std::string>());
+}
+
+std::optional<std::string> Spool::Read(const std::string &name) const {
+    return FolderOf(name).Read(Leaf(name));
+}
+
+bool Spool::Exists(const std::string &name) const {
+    return FolderOf(name).Status(Leaf(name)) || errno != ENOENT;
+}
+
+void Spool::Remove(const std::string &name) const {
+    FolderOf(name).Remove(Leaf(name));
+}
+
+void Spool::Rename(const std::string &name, const std::string &newName) const {
+    Require(FolderOf(name).Rename(Leaf(name), FolderOf(newName), Leaf(newName)), newName);
+}
+
 void Spool::CreateFolders() const {
     std::error_code error;
     fs::create_directories(fs::path(path_).parent_path(), error);
-    for (const char *name : {"", "tmp", "new", "state", "failed", "desktop"})
-        Require(mkdir(File(name).c_str(), 0750) == 0 || errno == EEXIST, name);
+    Require(mkdir(path_.c_str(), kFolderMode) == 0 || errno == EEXIST, "");
+    const Folder spool(path_);
+    for (const char *name : {"tmp", "new", "state", "failed", "desktop"})
+        Require(spool.MakeFolder(name, kFolderMode) || errno == EEXIST, name);
 }
 
 FileHandle Spool::Lock() const {
-    FileHandle file(open(File("lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
+    FileHandle file = Folder(path_).Open("lock", O_RDWR | O_CREAT);
     Require(static_cast<bool>(file), "lock");
     if (flock(file.Get(), LOCK_EX | LOCK_NB) == 0)
         return file;
@@ -60,7 +73,7 @@ FileHandle Spool::Lock() const {
 
 std::vector<std::string> Spool::Ids(const std::string &folder) const {
     std::vector<std::string> ids;
-    for (const std::string &name : NamesIn(File(folder))) {
+    for (const std::string &name : NamesIn(folder)) {
         const std::string id = name.substr(0, name.size() - std::min<size_t>(name.size(), 5));
         if (name == id + ".json" && IsEntryId(id))
             ids.push_back(id);
@@ -70,7 +83,7 @@ std::vector<std::string> Spool::Ids(const std::string &folder) const {
 }
 
 Entry Spool::ReadEntry(const std::string &name, const std::string &id) const {
-    const std::optional<std::string> content = ReadWhole(File(name));
+    const std::optional<std::string> content = Read(name);
     if (!content && errno == ENOENT)
         throw EntryGone(File(name) + ": " + std::strerror(ENOENT));
     if (!content)
@@ -79,7 +92,7 @@ Entry Spool::ReadEntry(const std::string &name, const std::string &id) const {
 }
 
 Progress Spool::ReadRecord(const std::string &name) const {
-    const std::optional<std::string> content = ReadWhole(File(name));
+    const std::optional<std::string> content = Read(name);
     Require(content || errno == ENOENT, name);
     try {
         return content ? ParseProgress(*content) : Progress();
@@ -89,8 +102,8 @@ Progress Spool::ReadRecord(const std::string &name) const {
 }
 
 void Spool::Save(const std::string &name, const Progress &progress) const {
-    const std::string temporary = "tmp/" + name.substr(name.find('/') + 1) + "." + std::to_string(getpid());
-    Require(WriteFileAtomically(File(temporary), File(name), ToJson(progress)), name);
+    const std::string temporary = Leaf(name) + "." + std::to_string(getpid());
+    Require(FolderOf(name).Write(Leaf(name), ToJson(progress), Sub("tmp"), temporary), name);
 }
 
 void Spool::SaveProgress(const std::string &id, const Progress &progress) const {
@@ -99,54 +112,54 @@ void Spool::SaveProgress(const std::string &id, const Progress &progress) const 
 
 void Spool::Finish(const std::string &id) const {
     // In this order: a record without an entry is harmless, an entry without its record is sent again.
-    Require(RemoveDurably(File("new/" + id + ".json")), "new/" + id + ".json");
-    unlink(File("state/" + id + ".json").c_str());
+    const Folder entries = Sub("new");
+    Require((entries.Remove(id + ".json") || errno == ENOENT) && entries.Sync(), "new/" + id + ".json");
+    Remove("state/" + id + ".json");
 }
 
 void Spool::GiveUp(const std::string &id, const Progress &progress) const {
     Save("failed/" + id + ".state", progress);
-    Require(RenameDurably(File("new/" + id + ".json"), File("failed/" + id + ".json")), "failed");
-    unlink(File("state/" + id + ".json").c_str());
+    Rename("new/" + id + ".json", "failed/" + id + ".json");
+    Remove("state/" + id + ".json");
 }
 
 bool Spool::Retry(const std::string &id, int64_t now) const {
-    if (!IsEntryId(id) || !Exists(File("failed/" + id + ".json")))
+    if (!IsEntryId(id) || !Exists("failed/" + id + ".json"))
         return false;
     Progress progress = ReadFailedProgress(id);
     std::erase_if(progress.targets, [](const auto &target) { return !target.second.isDone; });
     progress.since = now;
     progress.reason.clear();
     SaveProgress(id, progress);
-    Require(RenameDurably(File("failed/" + id + ".json"), File("new/" + id + ".json")), "new");
-    unlink(File("failed/" + id + ".state").c_str());
+    Rename("failed/" + id + ".json", "new/" + id + ".json");
+    Remove("failed/" + id + ".state");
     return true;
 }
 
 void Spool::RequestRetry() const {
-    const FileHandle file(
-        open(File(kRetryRequest).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
-    Require(static_cast<bool>(file), kRetryRequest);
+    Require(static_cast<bool>(Sub("new").Open(kRetryRequest, O_WRONLY | O_CREAT)), kRetryRequest);
 }
 
 bool Spool::TakeRetryRequest() const {
-    return unlink(File(kRetryRequest).c_str()) == 0;
+    return Sub("new").Remove(kRetryRequest);
 }
 
 void Spool::CleanUp(int64_t now) const {
-    for (const std::string &name : NamesIn(File("tmp"))) {
-        struct stat status;
-        if (lstat(File("tmp/" + name).c_str(), &status) == 0 && status.st_mtime < now - kTemporarySec)
-            unlink(File("tmp/" + name).c_str());
+    const Folder temporaries = Sub("tmp");
+    for (const std::string &name : NamesIn("tmp")) {
+        const std::optional<struct stat> status = temporaries.Status(name);
+        if (status && status->st_mtime < now - kTemporarySec)
+            temporaries.Remove(name);
     }
     // First `failed`, then `new`: an entry that is moved back is found in one of them.
     for (const std::string &id : Ids("state")) {
-        if (!Exists(File("failed/" + id + ".json")) && !Exists(File("new/" + id + ".json")))
-            unlink(File("state/" + id + ".json").c_str());
+        if (!Exists("failed/" + id + ".json") && !Exists("new/" + id + ".json"))
+            Remove("state/" + id + ".json");
     }
-    for (const std::string &name : NamesIn(File("failed"))) {
+    for (const std::string &name : NamesIn("failed")) {
         const std::string id = name.substr(0, name.rfind('.'));
-        if (name.ends_with(".state") && !Exists(File("failed/" + id + ".json")))
-            unlink(File("failed/" + name).c_str());
+        if (name.ends_with(".state") && !Exists("failed/" + id + ".json"))
+            Remove("failed/" + name);
     }
 }
 

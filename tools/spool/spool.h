@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "base/files.h"
+#include "base/folder.h"
 #include "spool/entry.h"
 #include "spool/progress.h"
 
@@ -20,7 +20,8 @@ struct EntryGone : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// The folders of docs/notification-spool.md below `root`. A change is on the disk when the call returns;
+// The folders of docs/notification-spool.md below `root`. They belong to a service, so no link in them is
+// followed. A change is on the disk when the call returns;
 // every function throws SpoolError if that fails.
 class Spool {
 public:
@@ -28,6 +29,7 @@ public:
 
     const std::string &Path() const { return path_; }
     std::string File(const std::string &name) const { return path_ + "/" + name; }
+    Folder Sub(const std::string &name) const { return {Folder(path_), name}; }
 
     // Creates the folders that are missing.
     void CreateFolders() const;
@@ -73,6 +75,14 @@ private:
     Entry ReadEntry(const std::string &name, const std::string &id) const;
     Progress ReadRecord(const std::string &name) const;
     void Save(const std::string &name, const Progress &progress) const;
+    // The folder of "folder/file", and the file's name in it.
+    Folder FolderOf(const std::string &name) const;
+    static std::string Leaf(const std::string &name) { return name.substr(name.find('/') + 1); }
+    std::vector<std::string> NamesIn(const std::string &folder) const;
+    std::optional<std::string> Read(const std::string &name) const;
+    bool Exists(const std::string &name) const;
+    void Remove(const std::string &name) const;
+    void Rename(const std::string &name, const std::string &newName) const;
     void Require(bool isDone, const std::string &name) const;
 
     std::string path_;

@@ -55,28 +55,28 @@ std::string ToJson(const SpoolEntry &entry, const std::string &id, time_t now) {
     return Json::writeString(builder, root) + "\n";
 }
 
-UniqueFd OpenExisting(int parent, const std::string &name) {
-    return UniqueFd(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+UniqueFd OpenExisting(int parent, const std::string &name, int flags) {
+    return UniqueFd(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | flags));
 }
 
 // Opens a folder of the parent, creating it if it is missing. A created folder is synced into its parent, so
 // that it survives a crash like its content.
-UniqueFd OpenOrCreate(int parent, const std::string &name) {
-    UniqueFd folder = OpenExisting(parent, name);
+UniqueFd OpenOrCreate(int parent, const std::string &name, int flags = 0) {
+    UniqueFd folder = OpenExisting(parent, name, flags);
     if (folder || errno != ENOENT)
         return folder;
     // Another process may be quicker.
     if (mkdirat(parent, name.c_str(), kFolderMode) == 0 ? fsync(parent) != 0 : errno != EEXIST)
         return UniqueFd();
-    return OpenExisting(parent, name);
+    return OpenExisting(parent, name, flags);
 }
 
 // Opens the folder at the absolute `path`, creating missing parents.
 UniqueFd OpenFolder(const std::string &path) {
-    UniqueFd folder = OpenExisting(AT_FDCWD, path);
+    UniqueFd folder = OpenExisting(AT_FDCWD, path, 0);
     if (folder || errno != ENOENT)
         return folder;
-    folder = OpenExisting(AT_FDCWD, "/");
+    folder = OpenExisting(AT_FDCWD, "/", 0);
     for (size_t at = path.find_first_not_of('/'); folder && at < path.size();) {
         const size_t end = std::min(path.find('/', at), path.size());
         folder = OpenOrCreate(folder.Get(), path.substr(at, end - at));
@@ -96,8 +96,10 @@ bool AddToSpool(const SpoolEntry &entry) {
     clock_gettime(CLOCK_REALTIME, &now);
     const std::string id = NewId(now);
     const std::string content = ToJson(entry, id, now.tv_sec);
-    const UniqueFd tmp = OpenFolder(SpoolPath() + "/tmp");
-    const UniqueFd fresh = tmp ? OpenFolder(SpoolPath() + "/new") : UniqueFd();
+    // The spool belongs to a service, which must not lead root elsewhere by a link.
+    const UniqueFd spool = OpenFolder(SpoolPath());
+    const UniqueFd tmp = spool ? OpenOrCreate(spool.Get(), "tmp", O_NOFOLLOW) : UniqueFd();
+    const UniqueFd fresh = tmp ? OpenOrCreate(spool.Get(), "new", O_NOFOLLOW) : UniqueFd();
     if (!fresh)
         return false;
 
