@@ -43,6 +43,12 @@ control=$'\x1b[31m \x07 \xff '$'\u202e\u200f'
 "${kelosyslog[@]}" events add keyword "$script" "$image$control"
 quoted() { printf "'%s'" "${1//\'/\'\'}"; }
 sqlite3 "$events" "UPDATE log SET user = $(quoted "$image") WHERE id = (SELECT max(id) FROM log)"
+"${kelosyslog[@]}" events export "$root/events.html"
+show "$root/events.html"
+in_page '&lt;script&gt;document.title='
+in_page '\x1b[31m \x07 \xff \u202e'
+expect "elements from texts of events" "$(elements script)$(elements img)" 00
+expect "title of the exported page" "$(grep -o '<title>.*</title>' "$root/dom")" '<title>Syslog Server Log</title>'
 now=$(date +%s)
 for host in "$script" "$image" "$control" nas; do
     sqlite3 "$root/var/log/kelolog/logs.db" "INSERT INTO logs (host, prio, llevel, utcsec, msg)

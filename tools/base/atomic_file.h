@@ -26,9 +26,6 @@ public:
     AtomicFile(const AtomicFile &) = delete;
     AtomicFile &operator=(const AtomicFile &) = delete;
 
-    // The path of the temporary file, for code that writes it by its name.
-    const std::string &Path() const { return path_; }
-
     void Write(std::string_view text);
 
     // Syncs the file, gives it the target's mode or a new file's, and renames it.

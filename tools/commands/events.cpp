@@ -4,7 +4,6 @@
 #include "commands/commands.h"
 
 #include <ctime>
-#include <fstream>
 #include <limits>
 
 #include "base/atomic_file.h"
@@ -14,6 +13,7 @@
 #include "kelosyslog/logger.h"
 #include "print/event_fields.h"
 #include "read/event_log.h"
+#include "report/event_page.h"
 
 namespace kelo::tool {
 namespace {
@@ -31,7 +31,6 @@ constexpr const char *kFooter =
     "Exit status: 0 found or done, 1 nothing matched or not confirmed, 2 usage, 3 database, 4 output.";
 
 constexpr uint64_t kMaxLines = std::numeric_limits<int>::max();
-constexpr const char *kPageEnd = "</table></body></html>\n";
 
 struct EventPage {
     int limit = 0; // 0 for all
@@ -106,27 +105,16 @@ int Count(const EventsOptions &options, const std::string &root) {
     return count > 0 ? kExitFound : kExitNothing;
 }
 
-// The library does not report a page that could not be written in full, so its end is checked.
-void RequireWholePage(const AtomicFile &file) {
-    std::string end(std::char_traits<char>::length(kPageEnd), '\0');
-    std::ifstream page(file.Path());
-    page.seekg(-static_cast<std::streamoff>(end.size()), std::ios::end);
-    if (!page.read(end.data(), static_cast<std::streamsize>(end.size())) || end != kPageEnd)
-        file.Fail("the page did not fit; is the disk full?");
-}
-
 int Export(const EventsOptions &options, const std::string &target, const std::string &root) {
     RefuseListOptions(options, "export", false);
     ApplyUtc(options.output.inUtc);
-    const std::string path = EventDatabasePath(options.db, root);
-    if (ReadEvents(path, 0, 1).empty()) {
+    const std::list<Event> events = ReadEvents(EventDatabasePath(options.db, root));
+    if (events.empty()) {
         PrintMessage("no events to export");
         return kExitNothing;
     }
     AtomicFile file(target);
-    if (Logger().LogHtmlGen(path, "html", file.Path()) != 0)
-        FailEventDatabase(path);
-    RequireWholePage(file);
+    file.Write(RenderEventPage(events));
     file.Commit();
     return kExitFound;
 }
