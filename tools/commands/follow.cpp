@@ -59,9 +59,11 @@ public:
             lastId_ = isReplaced ? newest : std::max(lastId_, newest);
             return newest < first ? 0 : reader_.Scan({first, newest}, true, 0, format_, print_);
         } catch (const DatabaseError &) {
-            if (!isReplaced || file_ == current)
+            const bool hasNoTableYet = isReplaced && file_ != current;
+            const bool isReplacedNow = IdentifyFile(reader_.Table().path) != current;
+            if (!hasNoTableYet && !isReplacedNow)
                 throw;
-            return 0; // a new file that does not have its table yet
+            return 0;
         }
     }
 
