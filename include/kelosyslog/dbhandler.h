@@ -69,7 +69,7 @@ public:
     int DBCreate();
 
     // Runs one statement and hands its result to `callback` (which may be null), then frees it. A failed
-    // statement goes to DBErrorHandle.
+    // statement goes to DBErrorHandle. One with a NUL byte is reported and not run.
     int DBExecute(std::string sql, DBHandlerCallback callback, void *context);
     // Runs one statement without a result. Unlike the form above it reports nothing when the handler is not
     // connected.

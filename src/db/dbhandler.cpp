@@ -3,11 +3,13 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstring>
 #include <memory>
 #include <new>
 #include <utility>
 
 #include "common/db_handles.h"
+#include "common/report.h"
 #include "db/catalogue.h"
 #include "db/creation.h"
 #include "db/database_lock.h"
@@ -20,6 +22,17 @@ namespace {
 
 // Far more than the processes that could move one database after the other while another connects.
 constexpr int kConnectTries = 100;
+
+// The platform would run the part in front of a NUL byte: a DELETE without its condition, for example.
+bool IsWhole(const std::string &sql) {
+    if (sql.find('\0') == std::string::npos)
+        return true;
+    kelo::ReportErrorAt("dbhandler", __LINE__,
+                        std::string("Fail to execute SQL command: ") + sql.c_str() +
+                            ", it is followed by a NUL byte and " +
+                            std::to_string(sql.size() - std::strlen(sql.c_str()) - 1) + " more");
+    return false;
+}
 
 // The inode of what has the name; 0 for nothing.
 ino_t InodeOf(const std::string &path) {
@@ -89,6 +102,8 @@ int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *cont
         Debuger::MSG(0, "DB is not connected");
         return -1;
     }
+    if (!IsWhole(sql))
+        return -1;
     DBResult_tag *raw = nullptr;
     if (KELODBExecute(connection_, sql.c_str(), &raw) < 0) {
         DBErrorHandle(sql);
@@ -102,6 +117,8 @@ int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *cont
 
 int DBHandler::DBExecute(std::string sql) {
     if (connection_ == nullptr)
+        return -1;
+    if (!IsWhole(sql))
         return -1;
     if (KELODBExecute(connection_, sql.c_str(), nullptr) < 0) {
         DBErrorHandle(sql);

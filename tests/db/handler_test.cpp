@@ -51,7 +51,11 @@ TEST_F(DBHandlerTest, HandsTheResultToTheCallbackWhateverItReturns) {
     EXPECT_EQ(db_.DBExecute("DELETE FROM logs WHERE id = 1", keep, &rows), 0);
     EXPECT_EQ(db_.DBExecute("SELECT * FROM logs", nullptr, nullptr), 0);
     EXPECT_EQ(db_.DBExecute("SELECT * FROM nothing", keep, &rows), -1);
+    const std::string cut("DELETE FROM logs\0 WHERE id = 2", 31);
+    EXPECT_EQ(db_.DBExecute(cut), -1);
+    EXPECT_EQ(db_.DBExecute(cut, nullptr, nullptr), -1);
     EXPECT_THAT(rows, ElementsAre(3, -1));
+    EXPECT_EQ(RunSql(path_, "SELECT count(*) FROM logs"), "2");
 }
 
 TEST_F(DBHandlerTest, KeepsTheStateOfItsTransaction) {
