@@ -60,8 +60,14 @@ void RequirePlainPaths(const std::string &path, const std::string &schema) {
 int Create(const CreateOptions &options) {
     const OutputFormat format = options.Format();
     const std::string path = options.Table().path;
-    if (fs::exists(fs::symlink_status(path))) {
-        PrintMessage(path + " is there already; nothing created");
+    std::error_code error;
+    const fs::file_status status = fs::symlink_status(path, error);
+    if (status.type() == fs::file_type::none)
+        throw DatabaseError("cannot create " + path + ": " + error.message());
+    if (fs::exists(status)) {
+        const bool leadsNowhere = fs::is_symlink(status) && !fs::exists(path, error);
+        PrintMessage(path + (leadsNowhere ? " is a link to nothing" : " is there already") +
+                     "; nothing created");
         return kExitNothing;
     }
     std::optional<TemporaryFile> shipped; // a file of its own, as the sqlite3 tool reads it
