@@ -42,10 +42,6 @@ bool RunQuery(DBConnect_tag *connection, const std::string &sql, const _SYSLOG_S
     return status >= 0;
 }
 
-bool RunCommand(DBConnect_tag *connection, const std::string &sql) {
-    return IsWhole(sql) && KELODBExecute(connection, sql.c_str(), nullptr) >= 0;
-}
-
 Answer Ask(const std::string &dbPath, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page) {
     Answer answer;
     answer.connection = Connect(dbPath);

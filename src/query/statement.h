@@ -22,9 +22,6 @@ std::string OrderClause(const _SYSLOG_SQL_ORDER_tag *order);
 bool RunQuery(DBConnect_tag *connection, const std::string &sql, const _SYSLOG_SQL_LIMIT_tag *page,
               DbResult &result);
 
-// The same for a statement without rows.
-bool RunCommand(DBConnect_tag *connection, const std::string &sql);
-
 // The rows of one statement with their connection, for callers that do not distinguish between a failed
 // connection and a failed statement.
 struct Answer {
