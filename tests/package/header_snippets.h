@@ -2,20 +2,6 @@
 
 // What the examples in the headers take for granted: the reader's own variables and functions.
 
-#include <cstdio>
-
-#include "kelosyslog/accounting.h"
-#include "kelosyslog/cmdparser.h"
-#include "kelosyslog/dbhandler.h"
-#include "kelosyslog/dbutil.h"
-#include "kelosyslog/debuger.h"
-#include "kelosyslog/logger.h"
-#include "kelosyslog/logparser.h"
-#include "kelosyslog/notification.h"
-#include "kelosyslog/records.h"
-#include "kelosyslog/root.h"
-#include "kelosyslog/utils.h"
-
 inline AccountingManager accounting;
 inline LogParser parser;
 inline std::string text;
