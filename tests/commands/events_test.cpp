@@ -103,6 +103,14 @@ TEST_F(Events, AndLogsBecomeAReportThatReplacesAFileOnlyWhenItIsWhole) {
     struct stat status {};
     stat(page.c_str(), &status);
     EXPECT_EQ(status.st_mode & 0777U, 0640U);
+    const std::string before = ReadFile(page);
+    RunSql(events_, "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 3000) "
+                    "INSERT INTO log SELECT NULL, 1, 1, 'SYSTEM', 'event' FROM n");
+    const ProgramResult full = RunIn(root_.Path(), std::string("trap '' XFSZ; ulimit -f 64; ") + kProgram +
+                                                       "events export page.html");
+    EXPECT_EQ(full.status, 4);
+    EXPECT_THAT(full.err, HasSubstr("cannot write page.html"));
+    EXPECT_TRUE(ReadFile(page) == before);
     for (const auto &file : fs::directory_iterator(root_.Path()))
         EXPECT_THAT(file.path().string(), Not(HasSubstr("page.html."))) << "left behind";
 }

@@ -1,5 +1,6 @@
 # shellcheck shell=bash
-# Every message over TCP is one row, whatever its format and text, with each of its parts in the right column.
+# Every message over TCP is one row, whatever its format and text, with each of its parts in the right column of the table that
+# logs.sql creates.
 source "$(dirname "$0")/support.sh"
 syslog_ng_start "$root"
 
@@ -16,6 +17,18 @@ make_messages 6000 old | sed 's/^.*\]: //' | sort >"$root/wanted"
 query 'SELECT msg FROM logs' | sort >"$root/found"
 cmp "$root/wanted" "$root/found" || fail "the texts differ"
 expect "errors" "$(row_count "$database" "prio = 'err' AND llevel = 'err'")" 240
+
+# syslog-ng has created the table, from its own configuration.
+describe() {
+    sql "$1" "
+        SELECT 'column', cid, name, type, \"notnull\", dflt_value, pk FROM pragma_table_xinfo('logs');
+        SELECT 'autoincrement', sql LIKE '%PRIMARY KEY AUTOINCREMENT%' FROM sqlite_master WHERE name = 'logs';
+        SELECT 'index', l.name, l.\"unique\", l.partial, x.seqno, x.name, x.desc, x.coll
+            FROM pragma_index_list('logs') l, pragma_index_xinfo(l.name) x ORDER BY l.name, x.seqno;"
+}
+sqlite3 "$root/schema.db" <"$KELO_SOURCE_DIR/package/schema/logs.sql"
+expect "table" "$(describe "$database")" "$(describe "$root/schema.db")"
+expect "journal mode" "$(query 'PRAGMA journal_mode')" wal
 
 # Hostile texts byte by byte, framed and, where they hold no line feed, as lines; as datagrams with their line feeds.
 query 'DELETE FROM logs'

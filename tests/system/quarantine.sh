@@ -49,6 +49,6 @@ for part in pages header wal; do
     expect "$part: rows of the fresh database" "$(query 'SELECT count(DISTINCT msg), min(id) FROM logs')" "2000|1"
     expect "$part: integrity" "$(query 'PRAGMA integrity_check')" ok
     syslog_ng_stop "$root"
-    rm -rf "$database"* "${root:?}/var"
+    rm -rf "$database"* "$root/var/spool"
     first=$((first + 5000))
 done

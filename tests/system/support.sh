@@ -7,7 +7,7 @@ source "$KELO_SOURCE_DIR/scripts/lib/syslog-ng.sh"
 source "$KELO_SOURCE_DIR/scripts/lib/messages.sh"
 
 root=$(mktemp -d)
-database=$root/logs.db
+database=$root/var/log/kelolog/logs.db
 clean_up() {
     syslog_ng_stop "$root"
     rm -rf "$root"
@@ -40,3 +40,4 @@ unlock_database() {
 landed() { wait_until 60 has_rows "$database" "$1" || fail "only $(row_count "$database") of $1 messages arrived"; }
 
 syslog_ng_configure "$root" "$KELO_SOURCE_DIR/package/syslog-ng/kelosyslog.conf" "$KELO_BIN_DIR/kelosyslog"
+define "$root/kelosyslog.conf" kelo_db "$database"
