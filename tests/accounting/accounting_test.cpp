@@ -1,35 +1,18 @@
 #include "kelosyslog/accounting.h"
 
 #include "notify/notify_fixture.h"
-#include "support/doubles.h"
-#include "support/short_lock_waits.h"
 
 namespace {
 
-// What replaces the machine for the whole program.
-struct Machine {
-    time_t now = 1000;
-    std::function<void()> beforeStep; // called before every step of an SQLite statement
-};
-Machine machine;
+time_t now = 1000; // the machine's clock for the whole program
 
 } // namespace
 
-extern "C" {
-
-time_t time(time_t *seconds) noexcept {
+extern "C" time_t time(time_t *seconds) noexcept {
     if (seconds != nullptr)
-        *seconds = machine.now;
-    return machine.now;
+        *seconds = now;
+    return now;
 }
-
-int sqlite3_step(sqlite3_stmt *statement) {
-    if (machine.beforeStep)
-        machine.beforeStep();
-    return kelo::test::Real<&sqlite3_step>("sqlite3_step")(statement);
-}
-
-} // extern "C"
 
 namespace kelo::test {
 namespace {
@@ -37,19 +20,17 @@ namespace {
 using Names = std::vector<std::string>;
 
 const std::string kRows = "1000 a 1;1001 a 1;1001 b'c 1";
-const std::string kCounts = "a 2;b'c 1;d 1";
 
 // An accounting database and an event database of the shipped schemas under a root of its own, no rules, and
 // a clock that stands still until a test moves it.
 class Accounting : public NotifyTest {
 protected:
     Accounting() {
-        machine = {};
+        now = 1000;
         CreateLogDatabase(path_, "accinfo.sql");
         CreateLogDatabase(events_, "kelosyslog.sql");
         WriteRules("");
     }
-    ~Accounting() override { machine = {}; }
 
     // The rows of table "eps" in the order of their insertion: "stamp device eps;..."
     std::string Samples() const {
@@ -64,12 +45,11 @@ protected:
     // Three sample rows that wait for a flush, and a log in the open sample.
     static void CountLogs(AccountingManager &accounting) {
         for (const auto &[second, device] : {std::pair(1000, "a"), {1000, "a"}, {1000, "b'c"}, {1001, "d"}}) {
-            machine.now = second;
+            now = second;
             accounting.LogInc(device);
         }
     }
 
-    ShortLockWaits waits_;
     const std::string path_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
     const std::string events_ = root_.File("usr/kelo/etc/kelosyslog.db");
 };
@@ -90,7 +70,7 @@ TEST_F(Accounting, ClosesASampleAtTheFirstLogOfANewSecond) {
         RunSql(path_, "DELETE FROM eps");
         AccountingManager accounting;
         for (const auto &[second, devices] : logs) {
-            machine.now = second;
+            now = second;
             for (const std::string &device : devices)
                 EXPECT_EQ(accounting.LogInc(device), 0);
         }
@@ -110,7 +90,7 @@ TEST_F(Accounting, AsksForAFlushOnABeatAboveFiveSeconds) {
     for (const auto &calls : cases) {
         AccountingManager accounting;
         for (const auto &[second, isDue] : calls) {
-            machine.now = second;
+            now = second;
             EXPECT_EQ(accounting.isNeed2Flush(), isDue) << second;
         }
     }
@@ -145,10 +125,10 @@ TEST_F(Accounting, CountsManyDevicesExactly) {
     for (uint64_t log = 0; log < 20000; ++log) {
         const std::string device = "device " + std::to_string(log % 3 == 0 ? log % 7 : log * 7919 % 2000);
         ++counted[device];
-        machine.now += log % 5000 == 0;
+        now += log % 5000 == 0;
         accounting.LogInc(device);
     }
-    ++machine.now;
+    ++now;
     accounting.CurEpsUpdate();
     EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
     EXPECT_EQ(SyslogDBHistGet(path_, 0), counted);
@@ -160,7 +140,7 @@ TEST_F(Accounting, NotifiesWhenASampleReachesARule) {
     WriteRules(RuleText("R", 1, "", "3", ""));
     AccountingManager accounting;
     const auto countSecond = [&](int logs) {
-        ++machine.now;
+        ++now;
         for (int i = 0; i < logs; ++i)
             accounting.LogInc("a");
     };
@@ -193,20 +173,7 @@ TEST_F(Accounting, GivesUpTheOldestSamplesAboveABound) {
     EXPECT_EQ(accounting.SamplesDrop(2, 2), 1U);
     EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
     EXPECT_EQ("1000 a 1;" + Samples(), kRows);
-    EXPECT_EQ(Histogram(), kCounts);
-}
-
-TEST_F(Accounting, KeepsItsSamplesWhileAnotherWriterHasTheDatabase) {
-    AccountingManager accounting;
-    CountLogs(accounting);
-    {
-        const DatabaseLock lock(path_);
-        EXPECT_EQ(accounting.AccoutingFlush2DB(), -1);
-    }
-    EXPECT_GT(waits_.TakeCount(), 0);
-    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
-    EXPECT_EQ(Samples(), kRows);
-    EXPECT_EQ(Histogram(), kCounts);
+    EXPECT_EQ(Histogram(), "a 2;b'c 1;d 1");
     PlatformCalls::Reset();
     EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
     EXPECT_THAT(PlatformCalls::Recorded(), IsEmpty()) << "without samples there is nothing to do";
@@ -234,29 +201,6 @@ TEST_F(Accounting, TrimsOldSamplesOfALargeFile) {
         EXPECT_EQ(Samples(), samples);
         EXPECT_EQ(TakeTexts(), fails ? Names{"Fail to execute SQL command: " + trim} : Names());
     }
-}
-
-TEST_F(Accounting, FlushesAllOrNothingWhenTheProcessIsKilled) {
-    int step = 1;
-    for (int status = -1; status != 0; ++step) {
-        RunSql(path_, "DELETE FROM eps; DELETE FROM histogram");
-        const pid_t child = fork();
-        if (child == 0) { // it dies before this step of SQLite
-            AccountingManager accounting;
-            CountLogs(accounting);
-            machine.beforeStep = [&step] {
-                if (--step == 0)
-                    raise(SIGKILL);
-            };
-            _exit(accounting.AccoutingFlush2DB() == 0 ? 0 : 1);
-        }
-        waitpid(child, &status, 0);
-        ASSERT_TRUE(status == 0 || WIFSIGNALED(status)) << status;
-        EXPECT_EQ(RunSql(path_, "PRAGMA integrity_check"), "ok");
-        EXPECT_EQ(Samples(), status == 0 ? kRows : "") << step;
-        EXPECT_EQ(Histogram(), status == 0 ? kCounts : "") << step;
-    }
-    EXPECT_GT(step, 8) << "not every statement was met";
 }
 
 } // namespace

@@ -15,6 +15,7 @@ TEST_F(ConditionText, EscapesAndQuotesByOperatorAndColumn) {
     const std::pair<_SYSLOG_SQL_COND_tag, std::string> cases[] = {
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "", {}}, "(host = '')"},
         {{SYSLOG_ATTRI_HOST, SYSLOG_OP_NE, "O'Brien", {}}, "(host != 'O''Brien')"},
+        {{SYSLOG_ATTRI_PROG, SYSLOG_OP_LE, "''", {}}, "(prog <= '''''')"},
         {{SYSLOG_ATTRI_ISDIR, SYSLOG_OP_GE, "1", {}}, "(isdir >= '1')"},
         {{SYSLOG_ATTRI_XFERIP, SYSLOG_OP_LT, "1%_[\\", {}}, "(ip < '1%_[\\')"},
         {{SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "a*b?c", {}}, "(msg LIKE 'a%b_c' escape '\\')"},
@@ -62,6 +63,8 @@ TEST_F(ConditionText, FailsForWhatSqlHasNoTextFor) {
     EXPECT_EQ(SyslogDBDelete(path_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_GE, "zz", {}}}), -1);
     _SYSLOG_SQL_ORDER_tag order{1, noAttribute};
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, &order), -1);
+    EXPECT_EQ(SyslogDBDelete(path_, {{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "", {}}}), 0)
+        << "the empty text is one";
     EXPECT_EQ(SyslogDBSelectCount(path_, {plain}, nullptr, nullptr), 3);
 }
 
