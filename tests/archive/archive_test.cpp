@@ -1,5 +1,7 @@
 // Archiving while a writer works, and what a failure leaves.
 
+#include <sys/file.h>
+
 #include <atomic>
 #include <thread>
 
@@ -54,6 +56,15 @@ protected:
     ArchiveTest() {
         CreateLogDatabase(source_);
         fs::create_directory(folder_);
+        // Whoever may only read the folder cannot stop archiving.
+        reader_ = open(folder_.c_str(), O_RDONLY | O_CLOEXEC);
+        EXPECT_EQ(flock(reader_, LOCK_EX), 0);
+    }
+    ~ArchiveTest() override {
+        struct stat lock {};
+        EXPECT_EQ(stat((folder_ + "/.lock").c_str(), &lock), 0);
+        EXPECT_EQ(lock.st_mode & 0444, 0U) << "who can open the lock can stop archiving";
+        close(reader_);
     }
     DatabaseCopy Make(const std::string &host = "") const {
         ArchiveFolder folder(folder_, false);
@@ -63,12 +74,14 @@ protected:
         std::vector<std::string> names;
         for (const auto &file : fs::directory_iterator(folder_))
             names.push_back(file.path().filename());
+        std::erase(names, ".lock");
         return names;
     }
 
     TempRoot root_;
     std::string source_ = root_.File("logs.db");
     std::string folder_ = root_.File("archive");
+    int reader_ = -1;
 };
 
 TEST_F(ArchiveTest, CopiesAPrefixAndRemovesExactlyThatBesideAWriter) {

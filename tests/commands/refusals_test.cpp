@@ -47,13 +47,13 @@ protected:
         return values;
     }
 
-    // Every file's content, without what SQLite keeps beside a database and what is to record failures.
+    // Every file's content, without what SQLite keeps beside a database, locks, and what records failures.
     std::map<std::string, std::string> Files() const {
         std::map<std::string, std::string> files;
         for (const auto &file : fs::recursive_directory_iterator(root_.Path())) {
             const std::string path = file.path();
             if (file.symlink_status().type() == fs::file_type::regular && !path.ends_with("-wal") &&
-                !path.ends_with("-shm") && path != events_)
+                !path.ends_with("-shm") && !path.ends_with(".lock") && path != events_)
                 files[path] = ReadFile(path);
         }
         return files;
@@ -145,7 +145,7 @@ TEST_F(Refusals, SayWhyADatabaseCannotBeRead) {
 }
 
 TEST_F(Refusals, NameTheFileThatCannotBeUsed) {
-    const int busy = open(root_.File("busy").c_str(), O_RDONLY | O_CLOEXEC);
+    const int busy = open(root_.File("busy/.lock").c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
     flock(busy, LOCK_EX);
     ExpectAll({
         {"events", 3, events_},

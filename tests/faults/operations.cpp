@@ -110,6 +110,7 @@ const std::string kNewSection = "[R]\nkey=\"new\"\n";
 
 void SetUpSection(Fixture &fixture) {
     WriteFile(fixture.root.File("notify.conf"), kOldSection);
+    WriteFile(fixture.root.File(".notify.conf.lock"), "");
 }
 
 int SetSection(Fixture &fixture) {

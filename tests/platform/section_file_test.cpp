@@ -1,3 +1,5 @@
+#include <sys/file.h>
+
 #include "keloplatform/torvc.h"
 #include "support/test.h"
 
@@ -142,6 +144,9 @@ TEST_F(SectionFile, KeepsModeOwnerAndLinksWhenItIsReplaced) {
 }
 
 TEST_F(SectionFile, LosesNothingToTwoWritersOfDifferentSections) {
+    // Whoever may only read the folder cannot make a writer wait.
+    const int reader = open(root_.Path().c_str(), O_RDONLY | O_CLOEXEC);
+    EXPECT_EQ(flock(reader, LOCK_EX), 0);
     const auto write = [&](const std::string &writer) { // creates the file
         int failures = 0;
         for (int i = 0; i < 50; ++i) {
@@ -158,6 +163,10 @@ TEST_F(SectionFile, LosesNothingToTwoWritersOfDifferentSections) {
     ASSERT_EQ(waitpid(child, &status, 0), child);
     EXPECT_EQ(status, 0);
     EXPECT_THAT(Names(), testing::SizeIs(100));
+    close(reader);
+    struct stat lock {};
+    ASSERT_EQ(stat(root_.File(".notify.conf.lock").c_str(), &lock), 0);
+    EXPECT_EQ(lock.st_mode & 0444, 0U) << "nor take the lock itself";
 }
 
 TEST_F(SectionFile, GivesTheFirstValueOfAKeyAndTellsWhenItIsCut) {

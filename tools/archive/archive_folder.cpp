@@ -8,6 +8,7 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <tuple>
 #include <utility>
 
 #include "archive/archive_name.h"
@@ -23,6 +24,8 @@ namespace fs = std::filesystem;
 
 constexpr const char *kTemporary = ".kelosyslog-archive-";
 constexpr const char *kRemoval = ".removing-";
+constexpr const char *kLock = ".lock";
+constexpr int kLockFlags = O_WRONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
 constexpr mode_t kFolderMode = 0750;
 
 } // namespace
@@ -34,9 +37,7 @@ ArchiveFolder::ArchiveFolder(std::string path, bool mayCreate) : path_(std::move
         if (mkdir(path_.c_str(), kFolderMode) != 0 && errno != EEXIST)
             Fail(path_, errno);
     }
-    lock_ = FileHandle(open(path_.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (!lock_)
-        Fail(path_, errno);
+    lock_ = OpenLock();
     if (flock(lock_.Get(), LOCK_EX | LOCK_NB) != 0) {
         if (errno == EWOULDBLOCK)
             throw OutputError(path_ + ": another run of kelosyslog archive works in this folder");
@@ -45,6 +46,24 @@ ArchiveFolder::ArchiveFolder(std::string path, bool mayCreate) : path_(std::move
     if (access(path_.c_str(), W_OK | X_OK) != 0)
         Fail(path_, errno);
     RemoveLeftovers();
+}
+
+// Whoever may read the folder can lock it, and the group adm may. So the lock is on a file in it that has no
+// right to read: access lists give those rights that its mode has, too.
+FileHandle ArchiveFolder::OpenLock() const {
+    const std::string path = path_ + "/" + kLock;
+    FileHandle made(open(path.c_str(), kLockFlags | O_CREAT | O_EXCL, S_IWUSR));
+    struct stat status {};
+    if (made && stat(path_.c_str(), &status) == 0) {
+        // Where this fails the lock stays the owner's.
+        std::ignore = fchown(made.Get(), static_cast<uid_t>(-1), status.st_gid);
+        std::ignore = fchmod(made.Get(), S_IWUSR | (status.st_mode & (S_IWGRP | S_IWOTH)));
+        return made;
+    }
+    FileHandle file(errno == EEXIST ? open(path.c_str(), kLockFlags) : -1);
+    if (!file)
+        Fail(path_, errno);
+    return file;
 }
 
 ArchiveFolder::~ArchiveFolder() {

@@ -41,6 +41,7 @@ public:
     std::vector<std::string> PendingRemovals(const std::string &source) const;
 
 private:
+    FileHandle OpenLock() const;
     void RemoveLeftovers() const;
     std::vector<std::string> Names() const;
     [[noreturn]] void Fail(const std::string &path, int error) const;

@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <ctime>
+#include <tuple>
 
 namespace kelo::platform {
 namespace {
@@ -12,7 +13,22 @@ namespace {
 constexpr int kLockPollMs = 10;
 constexpr int kLockPolls = 30 * 1000 / kLockPollMs;
 
-// Any process that may read the folder could hold the lock, so the wait is limited.
+// Opens or makes the lock file, for those who may write to the folder: only who can open a file can lock it.
+// Its mode has no right to read, so that an access list which lets others read the folder gives them nothing.
+UniqueFd OpenLock(int folder, const std::string &name) {
+    constexpr int kFlags = O_WRONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+    UniqueFd made(openat(folder, name.c_str(), kFlags | O_CREAT | O_EXCL, S_IWUSR));
+    struct stat status;
+    if (made && fstat(folder, &status) == 0) {
+        // Where this fails the lock stays the owner's.
+        std::ignore = fchown(made.Get(), static_cast<uid_t>(-1), status.st_gid);
+        std::ignore = fchmod(made.Get(), S_IWUSR | (status.st_mode & (S_IWGRP | S_IWOTH)));
+    }
+    if (made || errno != EEXIST)
+        return made;
+    return UniqueFd(openat(folder, name.c_str(), kFlags));
+}
+
 bool WaitForLock(int fd) {
     const timespec pause{0, kLockPollMs * 1'000'000};
     for (int poll = 0; poll < kLockPolls; ++poll) {
@@ -53,14 +69,17 @@ bool WriteAll(int fd, std::string_view content) {
     return true;
 }
 
-LockedFolder::LockedFolder(const std::string &path)
-    : fd_(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
-    if (fd_ && !WaitForLock(fd_.Get()))
-        fd_ = UniqueFd(); // keeps errno
+LockedFile::LockedFile(const std::string &folder, const std::string &name)
+    : name_(name), fd_(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
+    if (!fd_)
+        return;
+    lock_ = OpenLock(fd_.Get(), "." + name + ".lock");
+    if (lock_ && !WaitForLock(lock_.Get()))
+        lock_ = UniqueFd(); // keeps errno
 }
 
-bool LockedFolder::ReplaceFile(const std::string &name, std::string_view content, const struct stat *old) {
-    const std::string temporary = "." + name + ".new";
+bool LockedFile::Replace(std::string_view content, const struct stat *old) {
+    const std::string temporary = "." + name_ + ".new";
     if (unlinkat(fd_.Get(), temporary.c_str(), 0) != 0 && errno != ENOENT)
         return false;
     const mode_t mode = old != nullptr ? 0600 : 0644;
@@ -68,7 +87,7 @@ bool LockedFolder::ReplaceFile(const std::string &name, std::string_view content
     if (!file)
         return false;
     if (WriteSynced(file.Get(), content, old) &&
-        renameat(fd_.Get(), temporary.c_str(), fd_.Get(), name.c_str()) == 0)
+        renameat(fd_.Get(), temporary.c_str(), fd_.Get(), name_.c_str()) == 0)
         return fsync(fd_.Get()) == 0;
     const int cause = errno;
     unlinkat(fd_.Get(), temporary.c_str(), 0);

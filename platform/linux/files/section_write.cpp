@@ -81,8 +81,8 @@ int Apply(const std::string &path, const SectionChange &change) {
     FilePlace place;
     if (!Locate(path, place))
         return -1;
-    LockedFolder folder(place.folder);
-    if (!folder.IsLocked())
+    LockedFile file(place.folder, place.name);
+    if (!file.IsLocked())
         return -1;
 
     struct stat old;
@@ -107,7 +107,7 @@ int Apply(const std::string &path, const SectionChange &change) {
             return Refuse(path, EEXIST, "there is a section " + std::string(change.newName) + " already");
         edited = ReplaceSection(text, change.name, change.newName, change.entries);
     }
-    return folder.ReplaceFile(place.name, edited, exists ? &old : nullptr) ? 0 : -1;
+    return file.Replace(edited, exists ? &old : nullptr) ? 0 : -1;
 }
 
 } // namespace
