@@ -102,6 +102,36 @@ TEST_F(ReceiveProgram, LoadsChangedRulesAndBoundsAFlood) {
     EXPECT_EQ(Counted(), "51");
 }
 
+TEST_F(ReceiveProgram, CountsSoManyNamesUntilSomeAreForgotten) {
+    ChildProgram receiver(root_.Path(), std::string(kProgram) + "receive -v --device-limit 3");
+    const auto send = [&receiver](const std::string &host) {
+        receiver.Send("local0 info 2020/01/02 10:11:12 100 200 +08:00 " + host +
+                      " 127.0.0.1 prog tag text\n");
+    };
+    const auto awaitDevices = [&](const std::string &devices) {
+        return receiver.Await([&] {
+            return Query(accounting_, "SELECT group_concat(device || count, ' ') FROM "
+                                      "(SELECT * FROM histogram ORDER BY device)") == devices;
+        });
+    };
+    const std::string longName = std::string(254, 'z') + "\xc3\xbc" + "z";
+    for (const std::string &host :
+         std::vector<std::string>{"a[1", "a[2", longName, longName + "z", "b", "c", "a[1"})
+        send(host);
+    EXPECT_TRUE(awaitDevices("(others)2 a[12 a[21 " + std::string(254, 'z') + "2"));
+    EXPECT_TRUE(receiver.Await([&] { return State().others == 2; }));
+    EXPECT_EQ(Events("Records of more than 3 devices were received*"), "1");
+    EXPECT_THAT(Run("stats forget 'a[[]*' -y").err, HasSubstr("no such device"));
+    EXPECT_EQ(Run("stats forget 'a[*' --below 2 --yes").out, "forgot 1 device in " + accounting_ + "\n");
+    ASSERT_TRUE(receiver.AwaitErr("rules loaded anew"));
+    EXPECT_TRUE(receiver.Await([&] { return Query(accounting_, "SELECT count(*) FROM forgotten") == "0"; }));
+    send("b");
+    send("c");
+    EXPECT_TRUE(awaitDevices("(others)3 a[12 b1 " + std::string(254, 'z') + "2"));
+    EXPECT_EQ(receiver.End().status, 0);
+    EXPECT_EQ(Counted(), "8");
+}
+
 TEST_F(ReceiveProgram, KeepsNotificationsUntilTheSpoolTakesThem) {
     WriteRule(7);
     fs::rename(spool_ + "new", spool_ + "away");

@@ -31,6 +31,7 @@ constexpr const char *kFooter =
 struct Options {
     ReceiverOptions receiver;
     std::string notifyLimit = "10";
+    std::string deviceLimit = "10000";
     bool verbose = false;
 };
 
@@ -56,6 +57,7 @@ FileHandle LockAgainstOthers(const std::string &root) {
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
+    options.receiver.deviceLimit = ParseNumber("--device-limit", options.deviceLimit, 1, 10'000'000);
     // A limit of the file size is handled like a full disk.
     std::signal(SIGXFSZ, SIG_IGN);
     openlog("kelosyslog", LOG_PID | (options.verbose ? LOG_PERROR : 0), LOG_DAEMON);
@@ -81,7 +83,10 @@ void AddReceive(Program &program) {
     AddText(*command, "--set-aside", options->receiver.setAside, "FILE",
             "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
     AddText(*command, "--notify-limit", options->notifyLimit, "N",
-            "Raise at most N notifications a minute for a keyword, a severity or the rate, 5 N for all of them (10)");
+            "Raise at most N notifications a minute for a keyword, a severity or the rate, 5 N for all of "
+            "them (10)");
+    AddText(*command, "--device-limit", options->deviceLimit, "N",
+            "Count the logs of at most N devices each by its name, those of others as (others) (10000)");
     command->add_flag("-v,--verbose", options->verbose,
                       "Write to the standard error, too, what goes to the system log");
 }

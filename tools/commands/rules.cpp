@@ -2,9 +2,7 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <csignal>
 #include <cstring>
-#include <ctime>
 
 #include "base/errors.h"
 #include "base/text_encoding.h"
@@ -14,9 +12,9 @@
 #include "commands/common_options.h"
 #include "commands/rule_set.h"
 #include "commands/rule_test.h"
+#include "commands/tell_receiver.h"
 #include "keloplatform/torvc.h"
 #include "read/severity_filter.h"
-#include "status/receiver.h"
 
 namespace kelo::tool {
 namespace {
@@ -127,16 +125,6 @@ void Change(const std::string &path, const Options &options) {
     }
 }
 
-// A running receiver loads the changed rules.
-void TellReceiver(const std::string &root) {
-    const ReceiverStatus receiver = GatherReceiver(root, std::time(nullptr));
-    if (receiver.state != ReceiverStatus::State::Running && receiver.state != ReceiverStatus::State::Silent)
-        return;
-    if (kill(static_cast<pid_t>(receiver.told.pid), SIGHUP) != 0 && errno != ESRCH)
-        PrintMessage("the receiver goes on with the rules from before: process " +
-                     std::to_string(receiver.told.pid) + " cannot be sent SIGHUP: " + std::strerror(errno));
-}
-
 int Run(const Options &options, const std::string &root) {
     const std::string path = root + "/etc/kelosyslog/notify.conf";
     const bool isDescription = options.action == "add" || options.action == "set";
@@ -166,7 +154,7 @@ int Run(const Options &options, const std::string &root) {
     if (options.names.empty() || (isDescription && options.names.size() > 1))
         throw UsageError("rules " + options.action + ": needs the name of a rule");
     Change(path, options);
-    TellReceiver(root);
+    TellReceiver(root, "the rules from before");
     return kExitFound;
 }
 

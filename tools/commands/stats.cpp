@@ -13,6 +13,7 @@
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
+#include "commands/stats_forget.h"
 #include "kelosyslog/dbutil.h"
 #include "print/statistics_table.h"
 #include "read/accounting_samples.h"
@@ -26,19 +27,21 @@ constexpr const char *kFooter =
     "devices      logs per device since counting began, most first\n"
     "device NAME  the same of one device\n"
     "total        logs of all devices\n"
-    "eps          logs per second, minute or hour; the last day unless --since or --until is given\n\n"
+    "eps          logs per second, minute or hour; the last day unless --since or --until is given\n"
+    "forget NAME  removes devices and their counts; a receiver that runs forgets them too\n\n"
     "Examples:\n"
     "  kelosyslog stats devices --top 10 --plot\n"
     "  kelosyslog stats eps --by hour --since yesterday --plot\n"
     "  kelosyslog stats eps --by second --since -10min --device nas1\n"
-    "  kelosyslog stats eps --by hour --per-device -o csv > hours.csv\n\n"
+    "  kelosyslog stats eps --by hour --per-device -o csv > hours.csv\n"
+    "  kelosyslog stats forget 'printer-*' --below 10 --dry-run\n\n"
     "Exit status: 0 found, 1 nothing was counted, 2 usage, 3 database, 4 output.";
 
 constexpr int64_t kDay = 24 * 60 * 60;
 
 struct Options {
     std::string what;
-    std::string name; // of "device NAME"
+    ForgetOptions forget; // its names are also those of "device NAME"
     std::string db;
     std::string top;
     LogFilter period; // only its bounds are used
@@ -83,11 +86,11 @@ Answer Devices(const std::string &path, const Options &options) {
 Answer Device(const std::string &path, const Options &options) {
     RequireHistogram(path);
     std::string quoted;
-    for (const char byte : options.name)
+    for (const char byte : options.forget.names.front())
         quoted.append(byte == '\'' ? 2 : 1, byte);
     StatisticsTable table({{"device", false}, {"count", true}});
     if (const uint64_t count = SyslogDBHistGetSingle(path, quoted); count > 0)
-        table.Add({options.name, std::to_string(count)});
+        table.Add({options.forget.names.front(), std::to_string(count)});
     return {table, 1};
 }
 
@@ -166,7 +169,7 @@ const Question &QuestionOf(const Options &options) {
         if (options.what == question.what)
             return question;
     }
-    throw UsageError("stats: '" + options.what + "' is none of devices, device, total, eps");
+    throw UsageError("stats: '" + options.what + "' is none of devices, device, total, eps, forget");
 }
 
 // Refuses an option that would silently do nothing.
@@ -181,9 +184,14 @@ void RequireSense(const Options &options, OutputFormat format) {
     belongsTo("--until", !options.period.until.empty(), isEps, "eps");
     belongsTo("--device", !options.device.empty(), isEps, "eps");
     belongsTo("--per-device", options.perDevice, isEps, "eps");
-    belongsTo("NAME", !options.name.empty(), options.what == "device", "device");
-    if (options.what == "device" && options.name.empty())
-        throw UsageError("stats device: the name of a device is missing");
+    const bool isDevice = options.what == "device";
+    const bool isForget = options.what == "forget";
+    belongsTo("NAME", !options.forget.names.empty(), isDevice || isForget, "device' and 'stats forget");
+    belongsTo("--below", !options.forget.below.empty(), isForget, "forget");
+    belongsTo("--dry-run", options.forget.isDryRun, isForget, "forget");
+    belongsTo("--yes", options.forget.isConfirmed, isForget, "forget");
+    if (isDevice && options.forget.names.size() != 1)
+        throw UsageError("stats device: the name of a device is missing, or there are several");
     if (format == OutputFormat::Short)
         throw UsageError("--output: statistics have no form 'short'; forms are text, json, jsonl, csv");
     if (options.plot && format != OutputFormat::Text)
@@ -191,6 +199,10 @@ void RequireSense(const Options &options, OutputFormat format) {
 }
 
 int Run(const Options &options, const std::string &root) {
+    if (options.what == "forget") {
+        RequireSense(options, OutputFormat::Text);
+        return ForgetDevicesByOptions(AccountingPath(options.db, root), options.forget, root);
+    }
     const Question &question = QuestionOf(options);
     const OutputFormat format = ParseOutputFormat(options.format);
     RequireSense(options, format);
@@ -213,14 +225,19 @@ void AddStats(Program &program) {
     CLI::App *command = AddSubcommand(program, "stats", "Print how many logs were received",
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
-    OfferWords(AddText(*command, "what", options->what, "", "devices, device, total or eps"),
-               {"devices", "device", "total", "eps"})
+    OfferWords(AddText(*command, "what", options->what, "", "devices, device, total, eps or forget"),
+               {"devices", "device", "total", "eps", "forget"})
         ->required();
-    AddText(*command, "name", options->name, "", "The device of 'stats device'");
+    command->add_option(
+        "name", options->forget.names,
+        "The device of 'stats device'; the devices of 'stats forget', with wildcards * and ?");
     AddText(*command, "--top", options->top, "N", "devices: the N that sent most");
     AddText(*command, "-S,--since", options->period.since, "TIME", "eps: from this time on");
     AddText(*command, "-U,--until", options->period.until, "TIME",
             "eps: up to this second; a day alone ends before it begins");
+    AddText(*command, "--below", options->forget.below, "N", "forget: only devices with fewer than N logs");
+    command->add_flag("--dry-run", options->forget.isDryRun, "forget: only tell how many devices match");
+    command->add_flag("-y,--yes", options->forget.isConfirmed, "forget: do not ask");
     OfferWords(
         AddText(*command, "--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour"),
         {"second", "minute", "hour"});

@@ -6,6 +6,9 @@
 #include <chrono>
 #include <utility>
 
+#include "base/errors.h"
+#include "store/forgotten_devices.h"
+
 namespace kelo::tool {
 namespace {
 
@@ -21,16 +24,35 @@ constexpr size_t kMostCounts = 1'000'000;
 
 } // namespace
 
-AccountingFlusher::AccountingFlusher(std::function<void(uint64_t)> onSample) {
-    manager_.EpsHandlerSet(std::move(onSample));
+AccountingFlusher::AccountingFlusher(std::string path, size_t deviceLimit,
+                                     std::function<void(uint64_t)> onSample)
+    : path_(std::move(path)), onSample_(std::move(onSample)), names_(deviceLimit) {
+    Load();
+}
+
+// Only while no count is waiting.
+void AccountingFlusher::Load() {
+    bool isChanged = false;
+    try {
+        isChanged = DropForgottenDevices(path_);
+        isReloadDue_ = false;
+    } catch (const DatabaseError &error) {
+        syslog(LOG_WARNING, "devices are not forgotten yet: %s", error.what());
+    }
+    if (manager_ && !isChanged)
+        return;
+    manager_.emplace();
+    manager_->EpsHandlerSet(onSample_);
+    names_.Load(manager_->HistogramGet());
 }
 
 void AccountingFlusher::Tick(int64_t now) {
-    manager_.CurEpsUpdate();
+    manager_->CurEpsUpdate();
     if (now < nextFlush_)
         return;
     nextFlush_ = now + kFlushSec;
-    if (!manager_.isNeed2Flush()) // its clock was set back: the next answer is right again
+    // False when its clock was set back: the next answer is right again.
+    if (!manager_->isNeed2Flush() && !isReloadDue_)
         return;
     using Clock = std::chrono::steady_clock;
     const Clock::time_point begin = Clock::now();
@@ -39,17 +61,21 @@ void AccountingFlusher::Tick(int64_t now) {
     const auto sec = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin).count();
     nextFlush_ =
         now + std::max(isStillFailing ? kFlushWhileFailingSec : kFlushSec, sec + sec * kPausePerFlush);
+    if (isReloadDue_ && isIdle_)
+        Load();
+    else if (isReloadDue_ && !isFailing_)
+        nextFlush_ = now + 1;
 }
 
 bool AccountingFlusher::Finish() {
-    manager_.CurEpsUpdate();
-    return manager_.CurrentEpsGet() == 0 && Flush();
+    manager_->CurEpsUpdate();
+    return manager_->CurrentEpsGet() == 0 && Flush();
 }
 
 bool AccountingFlusher::Flush() {
-    const bool isFlushed = manager_.AccoutingFlush2DB() == 0;
+    const bool isFlushed = manager_->AccoutingFlush2DB() == 0;
     if (!isFlushed) {
-        if (const size_t dropped = manager_.SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
+        if (const size_t dropped = manager_->SamplesDrop(kMostSamples, kMostCounts); dropped > 0)
             syslog(LOG_ERR, "%zu samples of the accounting were given up, as it cannot be written", dropped);
         if (!isFailing_)
             syslog(LOG_ERR, "the accounting cannot be written and waits in memory");
@@ -57,7 +83,7 @@ bool AccountingFlusher::Flush() {
         syslog(LOG_NOTICE, "the accounting has been written");
     }
     isFailing_ = !isFlushed;
-    isIdle_ = isFlushed && manager_.CurrentEpsGet() == 0;
+    isIdle_ = isFlushed && manager_->CurrentEpsGet() == 0;
     return isFlushed;
 }
 

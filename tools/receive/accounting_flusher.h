@@ -2,9 +2,11 @@
 
 #include <cstdint>
 #include <functional>
+#include <optional>
 #include <string>
 
 #include "kelosyslog/accounting.h"
+#include "receive/device_names.h"
 
 namespace kelo::tool {
 
@@ -15,14 +17,23 @@ namespace kelo::tool {
 // Times are seconds of any clock that does not go back.
 class AccountingFlusher {
 public:
-    // `onSample` gets the number of records of each sample, about once a second.
-    explicit AccountingFlusher(std::function<void(uint64_t)> onSample);
+    // `path` is that of the accounting database; `onSample` gets the number of records of each sample, about
+    // once a second. No more than `deviceLimit` devices are counted each by its name.
+    AccountingFlusher(std::string path, size_t deviceLimit, std::function<void(uint64_t)> onSample);
 
-    // The accounting database keeps a name up to its first NUL.
     void Count(const std::string &host) {
         isIdle_ = false;
-        const char *name = host.c_str();
-        manager_.LogInc(name);
+        manager_->LogInc(names_.NameFor(host));
+    }
+
+    // Records that were not counted for their host but as DeviceNames::kOthers.
+    uint64_t Others() const { return names_.Others(); }
+
+    // Forgets, soon, the devices that were removed from the database by ForgetDevices.
+    void Reload() {
+        isReloadDue_ = true;
+        isIdle_ = false;
+        nextFlush_ = 0;
     }
 
     // Call it about once a second, unless idle. Closes the sample, and flushes when its time has come.
@@ -40,8 +51,13 @@ public:
 
 private:
     bool Flush();
+    void Load();
 
-    AccountingManager manager_;
+    std::string path_;
+    std::function<void(uint64_t)> onSample_;
+    DeviceNames names_;
+    std::optional<AccountingManager> manager_;
+    bool isReloadDue_ = true;
     int64_t nextFlush_ = 0;
     bool isFailing_ = false;
     bool isIdle_ = true;

@@ -21,6 +21,8 @@ namespace {
 
 constexpr const char *kEventText = "kelosyslog receive";
 constexpr const char *kFolder = "/var/log/kelolog";
+constexpr const char *kEventDatabase = "/usr/kelo/etc/kelosyslog.db";
+constexpr int kWarning = 1; // the level of an event
 
 constexpr int64_t kSecondMs = 1000;
 constexpr int64_t kBeatMs = 6000;
@@ -43,7 +45,8 @@ Receiver::Receiver(ReceiverOptions options)
     : options_(std::move(options)), volume_(FolderOf(options_)),
       setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
       rules_(options_.notifyLimit),
-      accounting_([this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
+      accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
+                  [this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
       lines_(LogStream::kMaxLineBytes),
       import_([this](const LineReader &reader,
                      const std::string &reason) { setAside_.Add(reason, reader.Line()); },
@@ -153,6 +156,7 @@ void Receiver::Reload() {
     }
     setAside_.Reopen();
     rules_.Reload();
+    accounting_.Reload();
 }
 
 // Whether there is no work every second until the next event.
@@ -172,9 +176,20 @@ void Receiver::TickSecond() {
         FireAt(secondTimer_, next);
 }
 
+// One event, however long the flood of names lasts.
+void Receiver::TellOthers() {
+    if (areOthersTold_ || accounting_.Others() == 0)
+        return;
+    const std::string text = "Records of more than " + std::to_string(options_.deviceLimit) +
+                             " devices were received; those of further ones are counted as " +
+                             DeviceNames::kOthers + ".";
+    areOthersTold_ = Logger().LogAdd(options_.root + kEventDatabase, kWarning, "SYSTEM", text) == 0;
+}
+
 void Receiver::TickState() {
     now_ = NowMs();
     volume_.Tick();
+    TellOthers();
     WriteState();
     FireAt(stateTimer_, now_ + kBeatMs);
 }
@@ -201,6 +216,7 @@ void Receiver::WriteState() {
     state_.overlong = counts.overlong;
     state_.suppressed = rules_.Suppressed();
     state_.lostNotifications = rules_.Lost();
+    state_.others = accounting_.Others();
     if (writer_) {
         state_.stored = writer_->Stored();
         state_.waiting = writer_->Reason();

@@ -23,6 +23,7 @@ struct ReceiverOptions {
     std::string database;      // to store into; empty: records are only counted and checked
     std::string setAside;      // file for lines that are not valid records; empty: the default below the root
     uint64_t notifyLimit = 10; // notifications a minute for each rule
+    size_t deviceLimit = 10'000; // devices that are counted each by its name
 };
 
 // Receives log text from a pipe: counts the records, checks them against the rules and stores them.
@@ -55,6 +56,7 @@ private:
     void TickSecond();
     void Repair();
     void TickState();
+    void TellOthers();
     void WriteState();
     void Finish();
     uint64_t Received() const;
@@ -79,6 +81,7 @@ private:
     uint64_t receivedBefore_ = 0; // at the last update of the state
     int64_t stateTime_ = 0;
     bool isStateFailing_ = false;
+    bool areOthersTold_ = false;
     bool isReading_ = false;
     bool isTicking_ = true;
     bool hasInputEnded_ = false;

@@ -26,6 +26,7 @@ Json::Value ToJson(const ReceiverState &state) {
     root["database"] = state.database;
     root["suppressed"] = Json::UInt64{state.suppressed};
     root["lost_notifications"] = Json::UInt64{state.lostNotifications};
+    root["other_devices"] = Json::UInt64{state.others};
     root["waiting"] = state.waiting;
     root["eps"] = state.eps;
     return root;
@@ -48,6 +49,7 @@ ReceiverState FromJson(const Json::Value &root) {
     state.database = root["database"].asString();
     state.suppressed = root["suppressed"].asUInt64();
     state.lostNotifications = root["lost_notifications"].asUInt64();
+    state.others = root["other_devices"].asUInt64();
     state.waiting = root["waiting"].asString();
     state.eps = root["eps"].asDouble();
     return state;

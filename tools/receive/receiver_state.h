@@ -23,6 +23,7 @@ struct ReceiverState {
     std::string database;                       // the absolute path of that database, or empty
     uint64_t suppressed = 0;                    // matches of rules without a notification of their own
     uint64_t lostNotifications = 0;             // of rules, given up
+    uint64_t others = 0;                        // counted as DeviceNames::kOthers
     std::string waiting;                        // why reading pauses; empty when it does not
     double eps = 0;                             // complete records a second, between the last two updates
 

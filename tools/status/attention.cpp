@@ -60,6 +60,9 @@ void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
     if (status.told.lostNotifications > 0)
         lines.push_back("the receiver gave up " + Counted(status.told.lostNotifications, "notification") +
                         ", as the spool had no room");
+    if (status.told.others > 0)
+        lines.push_back(Counted(status.told.others, "record") +
+                        " came from more devices than are counted by name (kelosyslog stats forget)");
     if ((status.state == State::Running || status.state == State::Silent) && !status.told.waiting.empty())
         lines.push_back("the receiver waits: " + status.told.waiting);
 }

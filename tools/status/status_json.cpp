@@ -73,6 +73,7 @@ Value ToJson(const ReceiverStatus &status) {
     json["database"] = told.database;
     json["suppressed"] = Count(told.suppressed);
     json["lost_notifications"] = Count(told.lostNotifications);
+    json["other_devices"] = Count(told.others);
     json["waiting"] = told.waiting;
     return json;
 }
