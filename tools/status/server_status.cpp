@@ -1,5 +1,8 @@
 #include "status/server_status.h"
 
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include <algorithm>
 #include <ctime>
 
@@ -32,6 +35,12 @@ void WithDatabase(ServerStatus &status, const std::string &name, auto read) {
     }
 }
 
+// Root opens no file that a service names.
+bool MayOpenPathsOf(const ReceiverStatus &receiver) {
+    struct stat file {};
+    return geteuid() != 0 || (stat(receiver.path.c_str(), &file) == 0 && file.st_uid == 0);
+}
+
 } // namespace
 
 ServerStatus GatherStatus(const StatusOptions &options) {
@@ -40,7 +49,7 @@ ServerStatus GatherStatus(const StatusOptions &options) {
     status.syslogNg = GatherSyslogNg(options.root, options.control, options.timeout);
     status.receiver = GatherReceiver(options.root, status.time);
     std::vector<std::string> others;
-    if (!status.receiver.told.database.empty())
+    if (!status.receiver.told.database.empty() && MayOpenPathsOf(status.receiver))
         others.push_back(status.receiver.told.database);
     status.databases = GatherDatabases(options.root, others);
     status.archives = GatherArchives(options.root);
