@@ -1,5 +1,6 @@
 # shellcheck shell=bash
-# Messages sent to syslog-ng are stored, counted and checked, with either of syslog-ng and the receiver storing them.
+# Messages sent to syslog-ng in both formats and framings are stored, counted and checked, each once, with either of syslog-ng and
+# the receiver storing them.
 # usage: receive.sh database|receiver
 source "$(dirname "$0")/support.sh"
 define "$root/kelosyslog.conf" kelo_store "$1"
@@ -21,6 +22,10 @@ total=$((6000 + ${#hostileTexts[@]}))
 send_lines "$root/lines"
 send_frames "$root/frames"
 landed $total
+make_messages 6000 old | sed 's/^.*\]: //' | sort >"$root/wanted"
+query "SELECT msg FROM logs WHERE prog != 'hostile'" | sort >"$root/found"
+cmp "$root/wanted" "$root/found" || fail "the texts differ"
+expect "errors" "$(row_count "$database" "prog != 'hostile' AND prio = 'err' AND llevel = 'err'")" 240
 await_counted $total
 expect "rows of the hostile texts" "$(row_count "$database" "prog = 'hostile' AND host = 'lab'")" ${#hostileTexts[@]}
 expect "notifications of a flood" "$(notifications)" 10

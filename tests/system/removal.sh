@@ -5,7 +5,7 @@
 source "$(dirname "$0")/support.sh"
 define "$root/kelosyslog.conf" kelo_store "$1"
 mkdir "$root/run"
-trap 'kill $(jobs -p) 2>/dev/null; clean_up' EXIT
+trap 'kill $(jobs -p) 2>/dev/null || true; clean_up' EXIT
 ln -s ../syslog-ng.pid "$root/run/syslog-ng.pid"
 kelosyslog() { "$KELO_BIN_DIR/kelosyslog" --root "$root" "$@" --db "$database"; }
 

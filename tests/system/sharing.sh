@@ -1,10 +1,12 @@
 # shellcheck shell=bash
-# A handler runs transactions, checkpoints and queries while syslog-ng writes at full speed: no error, and every
-# message is a row. For KELO_LOAD_SECONDS seconds (5).
+# A handler runs transactions, checkpoints and queries while syslog-ng writes at full speed: no error, and every message is a row;
+# for KELO_LOAD_SECONDS seconds (5). Then the database is damaged: the first statement that fails moves it away, the administrator
+# is notified, and syslog-ng continues in a fresh database that contains everything sent afterwards.
 source "$(dirname "$0")/support.sh"
+mkdir "$root/run"
+ln -s ../syslog-ng.pid "$root/run/syslog-ng.pid"
 syslog_ng_start "$root"
-make_messages 1 old >"$root/line"
-send_lines "$root/line"
+send_lines <(make_messages 1 old)
 landed 1
 
 mkfifo "$root/running"
@@ -32,3 +34,22 @@ expect "rows" "$(row_count "$database")" $sent
 (($(<"$root/rounds") >= 5)) || fail "only $(<"$root/rounds") rounds beside the writer"
 expect "integrity" "$(query 'PRAGMA integrity_check')" ok
 echo "$sent rows beside $(<"$root/rounds") rounds"
+
+# Every page but the first two, in place, so that it stays readable as a database.
+query 'PRAGMA wal_checkpoint(TRUNCATE)' >/dev/null
+for ((offset = 8192; offset < $(stat -c %s "$database"); offset += 65536)); do
+    head -c 8 /dev/zero | tr '\0' '\377' | dd of="$database" bs=1 seek="$offset" conv=notrunc status=none
+done
+status=0
+"$KELO_BIN_DIR/use_database" "$root" "$database" 2>"$root/reported" < <(sleep 60) || status=$?
+expect "status of the handler" $status 3
+grep -q 'error code is : 11' "$root/reported" || fail "$(head -c 500 "$root/reported")"
+[[ -s $database.corrupt ]] || fail "nothing was put aside"
+entries=("$root"/var/spool/kelonotify/new/*.json)
+expect "notifications" "${#entries[@]}" 1
+grep -q "\"%DBPATH%\": *\"$database\"" "${entries[0]}" || fail "$(<"${entries[0]}")"
+wait_until 30 grep -q 'Configuration reload finished' "$root/syslog-ng.log" || fail "no reload"
+send_frames <(make_messages 2000 new | frame_lines)
+landed 2000
+expect "rows of the fresh database" "$(query 'SELECT count(DISTINCT msg), min(id) FROM logs')" "2000|1"
+expect "its integrity" "$(query 'PRAGMA integrity_check')" ok
