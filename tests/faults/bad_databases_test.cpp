@@ -5,8 +5,29 @@
 
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/dbutil.h"
-#include "support/short_lock_waits.h"
+#include "support/doubles.h"
 #include "support/test.h"
+
+namespace {
+
+int (*waitForLock)(void *, int) = nullptr; // as the last connection has it
+int givenUp = 0;                           // waits for a lock
+
+} // namespace
+
+// In this program a connection, but for those of the tests themselves, waits for a lock only until its
+// handler was asked twice.
+extern "C" int sqlite3_busy_handler(sqlite3 *db, int (*handler)(void *, int), void *context) {
+    using namespace kelo::test;
+    const auto install = Real<&sqlite3_busy_handler>("sqlite3_busy_handler");
+    if (FaultPause::IsActive())
+        return install(db, handler, context);
+    waitForLock = handler;
+    const auto waitTwice = [](void *unused, int calls) {
+        return calls < 2 ? waitForLock(unused, calls) : (++givenUp, 0);
+    };
+    return install(db, waitTwice, context);
+}
 
 namespace kelo::test {
 namespace {
@@ -35,7 +56,7 @@ TEST(BadDatabase, IsNotFoundByAPathThatOnlyBeginsWithItsName) {
 }
 
 TEST(LockedDatabase, FailsAfterWaiting) {
-    ShortLockWaits waits;
+    givenUp = 0;
     const TempRoot root;
     const std::string path = root.File("logs.db");
     CreateSingleFile(path);
@@ -45,44 +66,34 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), -1);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
     EXPECT_EQ(rows, 0);
-    EXPECT_EQ(waits.TakeCount(), 3);
-    EXPECT_TRUE(waits.WaitsAtCall(1000)) << "it is asked every millisecond";
+    EXPECT_EQ(givenUp, 3);
+    EXPECT_NE(waitForLock(nullptr, 1000), 0) << "it is asked every millisecond";
     // A writer does not keep readers out of a database with a write-ahead log.
     lock.Run("COMMIT; PRAGMA journal_mode = WAL; BEGIN IMMEDIATE");
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), 4);
-    EXPECT_EQ(waits.TakeCount(), 0);
+    EXPECT_EQ(givenUp, 3);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
-    EXPECT_EQ(waits.TakeCount(), 1);
+    EXPECT_EQ(givenUp, 4);
     EXPECT_EQ(PlatformCalls::OpenHandles(), 0);
     EXPECT_EQ(RunSql(path, "SELECT count(*) FROM logs"), "200");
 }
 
-// Flips bits, overwrites, swaps and cuts: where it hits is up to `random`.
+// Overwrites or cuts: where it hits is up to `random`.
 std::string Damaged(std::string content, std::mt19937 &random) {
     const auto below = [&](size_t bound) {
         return std::uniform_int_distribution<size_t>(0, bound - 1)(random);
     };
-    constexpr size_t kPage = 4096;
-    const auto page = [&] { return below(content.size() / kPage) * kPage; };
-    switch (below(5)) {
-    case 0:
-        for (size_t flips = 1 + below(20); flips > 0; --flips)
-            content[below(content.size())] ^= static_cast<char>(1U << below(8));
-        break;
-    case 1: // the header of the file and its schema
-        for (size_t bytes = 1 + below(8); bytes > 0; --bytes)
-            content[below(600)] = static_cast<char>(random());
-        break;
-    case 2: // the header of a page, where its cells are listed
-        for (size_t at = page(), end = at + 16; at < end; ++at)
-            content[at] = static_cast<char>(random());
-        break;
-    case 3:
-        content.replace(page(), kPage, content.substr(page(), kPage));
-        break;
-    default:
+    if (below(5) == 0) {
         content.resize(below(content.size()));
+        return content;
     }
+    constexpr size_t kPage = 4096;
+    const size_t page = below(content.size() / kPage) * kPage;
+    // The header of the file and its schema; that of a page, where its cells are listed; anywhere.
+    const std::pair<size_t, size_t> ranges[] = {{0, 600}, {page, 16}, {page, kPage}};
+    const auto &[first, size] = ranges[below(3)];
+    for (size_t bytes = 1 + below(16); bytes > 0; --bytes)
+        content[first + below(size)] = static_cast<char>(random());
     return content;
 }
 
@@ -105,7 +116,6 @@ bool HandleErrors(const std::string &path) {
 }
 
 TEST(DamagedDatabase, GivesAnErrorAndNeverACrash) {
-    const ShortLockWaits waits;
     PlatformCalls::Start();
     const TempRoot root;
     const std::string path = root.File("logs.db");

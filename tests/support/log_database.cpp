@@ -9,16 +9,6 @@
 #include "support/temp_root.h"
 
 namespace kelo::test {
-namespace {
-
-std::string Quoted(const std::string &text) {
-    const std::unique_ptr<char, decltype(&sqlite3_free)> quoted(sqlite3_mprintf("%Q", text.c_str()),
-                                                                sqlite3_free);
-    return quoted.get();
-}
-
-} // namespace
-
 TestDatabase::TestDatabase(const std::string &path) : db_(nullptr, sqlite3_close) {
     std::filesystem::create_directories(std::filesystem::path(path).parent_path());
     sqlite3 *db = nullptr;
@@ -53,14 +43,16 @@ void InsertLogs(const std::string &path, const std::vector<_SYSLOG_LOG_DATA_tag>
     TestDatabase db(path);
     db.Run("BEGIN IMMEDIATE");
     for (const _SYSLOG_LOG_DATA_tag &log : logs) {
-        std::string values;
-        for (const std::string &text :
-             {log.host, log.ip, log.fac, PriorTypeToStr(log.prio), PriorTypeToStr(log.prio), log.tag,
-              log.tzoffset, log.ldate, log.ltime, log.prog, log.msg})
-            values += Quoted(text) + ",";
-        db.Run(
-            "INSERT INTO logs(host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec,id) VALUES(" +
-            values + std::to_string(log.utcsec) + ",nullif(" + std::to_string(log.id) + ",0))");
+        const std::string severity = PriorTypeToStr(log.prio);
+        const std::unique_ptr<char, decltype(&sqlite3_free)> sql(
+            sqlite3_mprintf(
+                "INSERT INTO logs(host,ip,fac,prio,llevel,tag,tzoffset,ldate,ltime,prog,msg,utcsec,id) "
+                "VALUES(%Q,%Q,%Q,%Q,%Q,%Q,%Q,%Q,%Q,%Q,%Q,%lld,nullif(%llu,0))",
+                log.host.c_str(), log.ip.c_str(), log.fac.c_str(), severity.c_str(), severity.c_str(),
+                log.tag.c_str(), log.tzoffset.c_str(), log.ldate.c_str(), log.ltime.c_str(), log.prog.c_str(),
+                log.msg.c_str(), static_cast<long long>(log.utcsec), static_cast<unsigned long long>(log.id)),
+            sqlite3_free);
+        db.Run(sql.get());
     }
     db.Run("COMMIT");
 }
