@@ -10,7 +10,6 @@
 #include "keloplatform/gensqlregexp.h"
 #include "keloplatform/kelodb.h"
 #include "quiet.h"
-#include "support/naive_match.h"
 
 namespace {
 
@@ -71,10 +70,29 @@ Texts Where(const std::string &condition) {
     return found;
 }
 
+std::string LowerAscii(std::string text) {
+    for (char &byte : text)
+        byte = byte >= 'A' && byte <= 'Z' ? static_cast<char>(byte + ('a' - 'A')) : byte;
+    return text;
+}
+
+// By the definition, character by character: whether the pattern matches the whole text.
+bool Matches(std::string_view text, std::string_view pattern) {
+    if (pattern.empty())
+        return text.empty();
+    if (pattern[0] == '\1')
+        return Matches(text, pattern.substr(1)) || (!text.empty() && Matches(text.substr(1), pattern));
+    const bool isAny = pattern[0] == '\2';
+    if (text.empty() || (!isAny && pattern[0] != text[0]))
+        return false;
+    size_t length = 1;
+    while (isAny && length < text.size() && (static_cast<unsigned char>(text[length]) & 0xC0) == 0x80)
+        ++length;
+    return Matches(text.substr(length), pattern.substr(1));
+}
+
 bool Contains(const std::string &text, const std::string &term) {
-    const bool folds = kelo::test::LowerAscii(term) == term;
-    return kelo::test::NaiveMatch(folds ? kelo::test::LowerAscii(text) : text, "\1" + term + "\1", '\1',
-                                  '\2');
+    return Matches(LowerAscii(term) == term ? LowerAscii(text) : text, "\1" + term + "\1");
 }
 
 std::string Written(const std::string &term) {

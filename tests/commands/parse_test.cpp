@@ -43,21 +43,6 @@ TEST_F(Parse, AccountsForEveryLine) {
               "nas127.0.0.1local0infoinfotag100+08:002020/01/0210:11:12progFF00");
 }
 
-TEST_F(Parse, StoresWholeBatchesWhenKilledAndResumes) {
-    constexpr int kTotal = 12 * kBatchRows + 17;
-    Write(LogLines(0, kTotal));
-    for (const int rows : {1, 3 * kBatchRows, 6 * kBatchRows}) {
-        ChildProgram child(root_.Path(), kProgram + std::string("parse --db logs.db --resume <in"));
-        ASSERT_TRUE(child.Await([&] { return Rows() >= rows; })) << "ended before it could be killed";
-        kill(child.Pid(), SIGKILL);
-        EXPECT_EQ(child.AwaitEnd().status, -SIGKILL);
-        EXPECT_EQ(Rows() % kBatchRows, 0);
-        ExpectMessages(Rows());
-    }
-    Expect("parse --db logs.db --resume <in", 0);
-    ExpectMessages(kTotal);
-}
-
 TEST_F(Parse, ResumesWhereTheSameInputEnded) {
     ProgramResult result;
     for (const std::string input :

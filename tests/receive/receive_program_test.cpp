@@ -149,23 +149,6 @@ TEST_F(ReceiveProgram, KeepsNotificationsUntilTheSpoolTakesThem) {
     EXPECT_EQ(State().lostNotifications, 1U);
 }
 
-TEST_F(ReceiveProgram, WaitsForALockedDatabase) {
-    ChildProgram receiver = Start();
-    receiver.Send(LogLines(0, 10));
-    ASSERT_TRUE(AwaitRows(receiver, 10));
-    {
-        const DatabaseLock lock(logs_);
-        receiver.Send(LogLines(10, 10));
-        ASSERT_TRUE(receiver.Await([&] { return !State().waiting.empty(); }));
-        receiver.Send(LogLines(20, 500)); // stays in the pipe
-    }
-    ASSERT_TRUE(AwaitRows(receiver, 520));
-    ASSERT_TRUE(receiver.Await([&] { return State().waiting.empty(); }));
-    const std::string err = receiver.Err();
-    EXPECT_EQ(err.find("receiving waits"), err.rfind("receiving waits")) << err;
-    EXPECT_EQ(receiver.End().status, 0);
-}
-
 TEST_F(ReceiveProgram, WaitsForRoomOnAFullDisk) {
     ChildProgram receiver = Start("ulimit -S -f 512; ");
     std::thread sender([&] { receiver.Send(LogLines(0, 20000)); });
