@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <mutex>
 #include <set>
 
 #include "support/doubles.h"
@@ -12,14 +13,17 @@
 namespace kelo::test {
 namespace {
 
+// Threads of a test write at once.
 struct State {
     FileFaults::Kind kind = FileFaults::Kind::kWrite;
     NthCall failing;
     std::set<ino_t> unsynced;
 };
 State state;
+std::mutex stateMutex;
 
 bool MustFail(bool isRead) {
+    const std::lock_guard lock(stateMutex);
     if (isRead != (state.kind == FileFaults::Kind::kRead) || !state.failing.MustFail())
         return false;
     errno = state.kind == FileFaults::Kind::kFull ? ENOSPC : EIO;
@@ -34,6 +38,7 @@ ino_t Inode(int fd) {
 
 // How much of `size` bytes is written at once; the file then has to be synced.
 size_t Share(int fd, size_t size) {
+    const std::lock_guard lock(stateMutex);
     // SQLite makes room for shared memory by single bytes, which need not reach the disk.
     if (state.failing.times == 0 || size <= 1)
         return size;
@@ -45,6 +50,7 @@ size_t Share(int fd, size_t size) {
 int Sync(int fd) {
     if (MustFail(false))
         return -1;
+    const std::lock_guard lock(stateMutex);
     const FaultPause pause;
     state.unsynced.erase(Inode(fd));
     return 0;
@@ -53,10 +59,12 @@ int Sync(int fd) {
 } // namespace
 
 void FileFaults::Start(Kind kind, int first, int times) {
+    const std::lock_guard lock(stateMutex);
     state = {kind, {first, times}, {}};
 }
 
 bool FileFaults::Stop() {
+    const std::lock_guard lock(stateMutex);
     state.failing.times = 0;
     return state.failing.hasFailed;
 }
