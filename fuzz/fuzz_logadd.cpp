@@ -56,10 +56,5 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     const Logs logs = parser.LogListGet();
     RequireSame(logs, ParseLines(text), "line by line");
     RequireSame(logs, ParsePieces(text, size_t{data[0]} + 1), "in pieces");
-    for (_SYSLOG_LOG_DATA_tag log : logs) {
-        // Eleven fields are there, so only the message can be empty.
-        if ((parser.isValidLog(log) == 1) == log.msg.empty())
-            std::abort();
-    }
     return 0;
 }
