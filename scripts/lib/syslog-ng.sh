@@ -59,6 +59,7 @@ syslog_ng_configure() {
     define "$root/kelosyslog.conf" kelo_receive "exec $3 receive --root $root"
     define "$root/kelosyslog.conf" kelo_db "$root/logs.db"
     define "$root/kelosyslog.conf" kelo_buffer_dir "$root"
+    define "$root/kelosyslog.conf" kelo_reserve "$(readlink -f "$(dirname "${BASH_SOURCE[0]}")/../../package/syslog-ng/reserve-buffer")"
     define "$root/kelosyslog.conf" kelo_address 127.0.0.1
     cat >"$root/syslog-ng.conf" <<END
 @version: 3.38

@@ -41,3 +41,6 @@ landed() { wait_until 60 has_rows "$database" "$1" || fail "only $(row_count "$d
 
 syslog_ng_configure "$root" "$KELO_SOURCE_DIR/package/syslog-ng/kelosyslog.conf" "$KELO_BIN_DIR/kelosyslog"
 define "$root/kelosyslog.conf" kelo_db "$database"
+# Disk space of this size is reserved.
+define "$root/kelosyslog.conf" kelo_buffer_bytes 67108864
+define "$root/kelosyslog.conf" kelo_buffer_window 33554432

@@ -1,0 +1,81 @@
+# shellcheck shell=bash
+# While the disk is full, the senders over TCP wait, and status, an event and a notification report it. When there is room
+# again, reception goes on by itself, and every message is a row, once. Takes about 20 s, on a volume in memory.
+# usage: full_disk.sh database|receiver
+if [[ ! ${KELO_OWN_MOUNTS:-} ]]; then
+    mounts=(unshare --map-root-user --mount)
+    "${mounts[@]}" mount -t tmpfs tmpfs /mnt || { echo "SKIPPED: may not mount"; exit 77; }
+    KELO_OWN_MOUNTS=yes exec "${mounts[@]}" bash "$0" "$@"
+fi
+source "$(dirname "$0")/support.sh"
+clean_up() {
+    syslog_ng_stop "$root"
+    umount --lazy "$root/var" || true
+    rm -rf "$root"
+}
+mkdir -p "$root/var"
+mount -t tmpfs -o size=160m tmpfs "$root/var"
+mkdir -p "$root/var/log/kelolog" "$root/var/buffer" "$root/var/ballast" "$root/var/etc" "$root/var/spool/kelonotify" "$root/run/kelosyslog"
+rmdir "$root/usr/kelo/etc"
+ln -s "$root/var/etc" "$root/usr/kelo/etc"
+database=$root/var/log/kelolog/logs.db
+define "$root/kelosyslog.conf" kelo_store "$1"
+define "$root/kelosyslog.conf" kelo_db "$database"
+define "$root/kelosyslog.conf" kelo_buffer_dir "$root/var/buffer"
+define "$root/kelosyslog.conf" kelo_buffer_bytes 16777216
+define "$root/kelosyslog.conf" kelo_buffer_window 8388608
+
+# send NAME OPTIONS...: sends for a while; `sent` tells how many messages that were.
+send() { loggen --inet --quiet --interval=10 "${@:2}" >"$root/$1" 2>&1 & }
+sent() { sed -n 's/.*count=\([0-9]*\).*/\1/p' "$root/$1"; }
+received() {
+    syslog_ng_control "$root" stats | awk -F';' '$1 == "source" && $2 ~ /^s_kelo_(lines|frames)$/ && $5 == "processed" { sum += $6 }
+        END { print sum + 0 }'
+}
+reserved() { (($(stat -c %b "$root"/var/buffer/*.rqf) * 512 > 16777216)); }
+# Takes all free space but BYTES; again what has become free since.
+fill() {
+    local free
+    free=$(df --output=avail --block-size=1 "$root/var" | tail -n 1)
+    fallocate --length $((free - ${1:-0})) "$root/var/ballast/$((++fillers))" 2>/dev/null || true
+}
+notified() { grep -qs KELOSYSLOG_VOL_FULL "$root"/var/spool/kelonotify/new/*.json; }
+# Nothing may have been received while status looked, which takes a second and a half.
+reported() {
+    fill
+    stopped=$(received)
+    status=0
+    "$KELO_BIN_DIR/kelosyslog" status --root "$root" --control "$root/syslog-ng.ctl" >"$root/screen" || status=$?
+    ((status == 1)) && grep -qE '^! syslog-ng cannot write [0-9,]+ messages for d_kelo' "$root/screen" &&
+        grep -q "^! the volume of $root/var/log/kelolog is full: " "$root/screen" && (($(received) == stopped))
+}
+fillers=0
+goes_on() { (($(received) > stopped)); }
+
+syslog_ng_start "$root"
+wait_until 20 reserved || fail "no disk space is reserved for the buffer: $(ls -ls "$root/var/buffer")"
+wait_until 20 test -s "$root/var/spool/kelonotify/.reserve" || fail "no disk space is reserved for notifications"
+send lines --stream --rate=5000 --size=200 --active-connections=3 127.0.0.1 "$syslogPort"
+lines=$!
+send frames --stream --syslog-proto --rate=5000 --size=220 127.0.0.1 "$framePort"
+frames=$!
+send datagrams --dgram --rate=50 --size=240 127.0.0.1 "$syslogPort"
+datagrams=$!
+wait_until 20 has_rows "$database" 10000 || fail "nothing arrives"
+
+# With room for nothing but what the receiver has reserved. In the other way syslog-ng might take that.
+declare -A left=([database]=8388608 [receiver]=0)
+fill_partly() { fill "${left[$1]}" && notified; }
+filled=$EPOCHSECONDS
+wait_until 20 fill_partly "$1" || fail "no notification of a full volume"
+wait_until 20 reported || fail "status does not report it, or the senders do not wait: $(<"$root/screen")"
+
+rm "$root"/var/ballast/*
+freed=$EPOCHSECONDS
+wait_until 10 goes_on || fail "nothing is received when there is room again"
+wait $lines $frames $datagrams
+total=$(($(sent lines) + $(sent frames) + $(sent datagrams)))
+landed $total
+expect "rows, and different ones" "$(query 'SELECT count(*), count(DISTINCT msg) FROM logs')" "$total|$total"
+expect "events while it lasted" "$(sql "$root/usr/kelo/etc/kelosyslog.db" \
+    "SELECT count(*), sum(time BETWEEN $filled AND $freed) FROM log WHERE event = 'Volume space is not enough.'")" "1|1"
