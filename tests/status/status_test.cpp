@@ -137,7 +137,8 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     }
     ServerStatus status = Gather();
     EXPECT_THAT(status.attention, testing::IsEmpty());
-    status.volumes = {{{"/x"}, 1000, 100}};
+    constexpr uint64_t kMiB = 1 << 20;
+    status.volumes = {{{"/x"}, 1000 * kMiB, 100 * kMiB}, {{"/y"}, 100 * kMiB, 16 * kMiB}};
     EXPECT_TRUE(FindAttention(status).empty());
     // A few messages may wait for their batch; many, or few for long, are stuck.
     status.databases.front().last = status.time - 59;
@@ -148,10 +149,12 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
               "syslog-ng cannot write 999 messages for d_db#0 (logs.db); the newest record is 1 min old");
     status.syslogNg.destinations.front().isStuck = false;
     EXPECT_TRUE(FindAttention(status).empty());
-    status.volumes.front().free = 99;
+    status.volumes.front().free -= 1;
+    status.volumes.back().free -= 1;
     status.syslogNg.destinations.front().dropped = 2;
-    EXPECT_THAT(FindAttention(status),
-                ElementsAre(HasSubstr("dropped 2 messages for d_db#0"), HasSubstr("/x is nearly full")));
+    EXPECT_THAT(FindAttention(status), ElementsAre(HasSubstr("dropped 2 messages for d_db#0"),
+                                                   HasSubstr("/x is nearly full: 100 MiB free"),
+                                                   HasSubstr("/y is full: 16 MiB free")));
 }
 
 TEST_F(Status, WaitsNeitherForAWriterNorForALock) {

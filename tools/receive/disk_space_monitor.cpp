@@ -1,69 +1,84 @@
 #include "receive/disk_space_monitor.h"
 
-#include <sys/statvfs.h>
 #include <syslog.h>
 
+#include <algorithm>
 #include <cstdint>
 
+#include "base/volumes.h"
 #include "kelosyslog/logger.h"
 #include "kelosyslog/notification.h"
 
 namespace kelo::tool {
 namespace {
 
-// Below the first value the volume is full, from the second on it is not. Between them nothing changes, so
-// that a volume near the limit causes no series of events.
-constexpr uint64_t kFullBytes = 16 * 1024 * 1024;
-constexpr uint64_t kRoomBytes = 32 * 1024 * 1024;
+// From here on a volume that was full is not. Between the two limits nothing changes, so that a volume near
+// the limit causes no series of events.
+constexpr uint64_t kRoomBytes = 2 * VolumeStatus::kFullBytes;
+constexpr std::chrono::seconds kRetry{30}; // each try may wait for a lock
 
 } // namespace
 
+DiskSpaceMonitor::DiskSpaceMonitor(const std::string &root, std::string folder)
+    : root_(root), folder_(std::move(folder)), reserve_(root) {}
+
+std::string DiskSpaceMonitor::NameOfVolume() const {
+    for (const VolumeStatus &volume : GatherVolumes(root_, folder_)) {
+        if (std::find(volume.folders.begin(), volume.folders.end(), folder_) != volume.folders.end())
+            return volume.folders.front();
+    }
+    return folder_;
+}
+
 void DiskSpaceMonitor::NoteFull() {
-    Enter(isWriteFailing_);
+    Set(NameOfVolume(), &Volume::isWriteFailing, true);
 }
 
 void DiskSpaceMonitor::NoteWritten() {
-    Leave(isWriteFailing_);
+    Set(NameOfVolume(), &Volume::isWriteFailing, false);
 }
 
 void DiskSpaceMonitor::Tick() {
-    struct statvfs status {};
-    if (statvfs(folder_.c_str(), &status) != 0)
-        return;
-    const uint64_t freeBytes = uint64_t{status.f_bavail} * status.f_frsize;
-    if (freeBytes < kFullBytes)
-        Enter(isSpaceLow_);
-    else if (freeBytes >= kRoomBytes)
-        Leave(isSpaceLow_);
+    for (const VolumeStatus &status : GatherVolumes(root_, folder_)) {
+        const std::string &name = status.folders.front();
+        if (status.FreeLevel() == VolumeStatus::Level::Full)
+            Set(name, &Volume::isSpaceLow, true);
+        else if (status.free >= kRoomBytes)
+            Set(name, &Volume::isSpaceLow, false);
+    }
+    bool isAnyFull = false;
+    for (auto &[name, volume] : volumes_) {
+        if (Clock::now() >= volume.retryTime)
+            Tell(name, volume);
+        isAnyFull = isAnyFull || volume.IsFull();
+    }
+    if (!isAnyFull)
+        reserve_.Hold();
 }
 
-void DiskSpaceMonitor::Enter(bool &cause) {
-    const bool wasFull = isWriteFailing_ || isSpaceLow_;
-    cause = true;
-    if (wasFull)
+void DiskSpaceMonitor::Set(const std::string &name, bool Volume::*cause, bool value) {
+    Volume &volume = volumes_[name];
+    const bool wasFull = volume.IsFull();
+    volume.*cause = value;
+    if (volume.IsFull() == wasFull)
         return;
-    syslog(LOG_ERR, "the volume of %s is full", folder_.c_str());
-    isEventDue_ = true;
-    isNotificationDue_ = true;
-    Tell();
+    if (wasFull) {
+        syslog(LOG_NOTICE, "the volume of %s has room again", name.c_str());
+    } else {
+        syslog(LOG_ERR, "the volume of %s is full", name.c_str());
+        volume.isEventDue = true;
+        volume.isNotificationDue = true;
+        reserve_.Release();
+    }
+    Tell(name, volume);
 }
 
-void DiskSpaceMonitor::Leave(bool &cause) {
-    const bool wasFull = isWriteFailing_ || isSpaceLow_;
-    cause = false;
-    if (!wasFull || isWriteFailing_ || isSpaceLow_)
-        return;
-    syslog(LOG_NOTICE, "the volume of %s has room again", folder_.c_str());
-    Tell();
-    isEventDue_ = false;
-    isNotificationDue_ = false;
-}
-
-void DiskSpaceMonitor::Tell() {
-    if (isEventDue_)
-        isEventDue_ = Logger().LogAddVolFull() != 0;
-    if (isNotificationDue_)
-        isNotificationDue_ = NotificationManager().NotificationSendVolFull(folder_) != 0;
+void DiskSpaceMonitor::Tell(const std::string &name, Volume &volume) {
+    if (volume.isEventDue)
+        volume.isEventDue = Logger().LogAddVolFull() != 0;
+    if (volume.isNotificationDue)
+        volume.isNotificationDue = NotificationManager().NotificationSendVolFull(name) != 0;
+    volume.retryTime = Clock::now() + kRetry;
 }
 
 } // namespace kelo::tool

@@ -1,17 +1,22 @@
 #pragma once
 
+#include <chrono>
+#include <map>
 #include <string>
+
+#include "receive/space_reserve.h"
 
 namespace kelo::tool {
 
-// Notifies the administrator when the volume of a folder is full: one event and one notification each time.
-// If they cannot be stored because the volume is full, they are sent when there is room again.
+// Notifies the administrator when one of the system's volumes is full: one event and one notification each
+// time. They find room in a reserve that is given up for them; if they cannot be stored nevertheless, they
+// are tried again until they are.
 class DiskSpaceMonitor {
 public:
-    // `folder` is the absolute path that the notification names.
-    explicit DiskSpaceMonitor(std::string folder) : folder_(std::move(folder)) {}
+    // `folder` is the absolute path that NoteFull is about; `root` is that of the system's files.
+    DiskSpaceMonitor(const std::string &root, std::string folder);
 
-    // Something could not be written because there was no space.
+    // Something could not be written into the folder because there was no space.
     void NoteFull();
     // It could be written.
     void NoteWritten();
@@ -20,15 +25,27 @@ public:
     void Tick();
 
 private:
-    void Enter(bool &cause);
-    void Leave(bool &cause);
-    void Tell();
+    using Clock = std::chrono::steady_clock;
 
+    // Of a volume, which is known by one of its folders.
+    struct Volume {
+        bool isWriteFailing = false;
+        bool isSpaceLow = false;
+        bool isEventDue = false;
+        bool isNotificationDue = false;
+        Clock::time_point retryTime;
+
+        bool IsFull() const { return isWriteFailing || isSpaceLow; }
+    };
+
+    void Set(const std::string &name, bool Volume::*cause, bool value);
+    void Tell(const std::string &name, Volume &volume);
+    std::string NameOfVolume() const;
+
+    std::string root_;
     std::string folder_;
-    bool isWriteFailing_ = false;
-    bool isSpaceLow_ = false;
-    bool isEventDue_ = false;
-    bool isNotificationDue_ = false;
+    SpaceReserve reserve_;
+    std::map<std::string, Volume> volumes_;
 };
 
 } // namespace kelo::tool

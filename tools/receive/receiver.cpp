@@ -42,7 +42,7 @@ std::string FolderOf(const ReceiverOptions &options) {
 } // namespace
 
 Receiver::Receiver(ReceiverOptions options)
-    : options_(std::move(options)), volume_(FolderOf(options_)),
+    : options_(std::move(options)), volume_(options_.root, FolderOf(options_)),
       setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
       rules_(options_.notifyLimit),
       accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
@@ -170,6 +170,7 @@ void Receiver::TickSecond() {
     accounting_.Tick(now_ / kSecondMs);
     rules_.Tick(now_ / kSecondMs);
     setAside_.Tick(now_ / kSecondMs);
+    volume_.Tick();
     Repair();
     isTicking_ = !IsIdle();
     if (isTicking_)

@@ -2,6 +2,7 @@
 
 #include "status/figures.h"
 #include "status/server_status.h"
+#include "status/state_names.h"
 
 namespace kelo::tool {
 namespace {
@@ -112,10 +113,10 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     LookAtDatabases(status, lines);
     LookAtNotifications(status.notifications, status.time, lines);
     for (const VolumeStatus &volume : status.volumes) {
-        if (volume.IsNearlyFull())
-            lines.push_back("the volume of " + volume.folders.front() +
-                            " is nearly full: " + Bytes(static_cast<int64_t>(volume.free)) + " free of " +
-                            Bytes(static_cast<int64_t>(volume.size)));
+        if (volume.FreeLevel() != VolumeStatus::Level::Good)
+            lines.push_back("the volume of " + volume.folders.front() + " is " +
+                            StateName(volume.FreeLevel()) + ": " + Bytes(static_cast<int64_t>(volume.free)) +
+                            " free of " + Bytes(static_cast<int64_t>(volume.size)));
     }
     return lines;
 }

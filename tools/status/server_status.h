@@ -5,13 +5,13 @@
 #include <string>
 #include <vector>
 
+#include "base/volumes.h"
 #include "status/accounting.h"
 #include "status/databases.h"
 #include "status/notifications.h"
 #include "status/receiver.h"
 #include "status/recent_events.h"
 #include "status/syslog_ng.h"
-#include "status/volumes.h"
 
 namespace kelo::tool {
 

@@ -17,4 +17,9 @@ const char *StateName(DatabaseStatus::State state) {
     return kNames[static_cast<size_t>(state)];
 }
 
+const char *StateName(VolumeStatus::Level level) {
+    constexpr const char *kNames[] = {"good", "nearly full", "full"};
+    return kNames[static_cast<size_t>(level)];
+}
+
 } // namespace kelo::tool

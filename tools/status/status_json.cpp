@@ -155,6 +155,7 @@ Value ToJson(const VolumeStatus &status) {
     json["folders"] = Json::arrayValue;
     for (const std::string &folder : status.folders)
         json["folders"].append(folder);
+    json["state"] = StateName(status.FreeLevel());
     json["size_bytes"] = Count(status.size);
     json["free_bytes"] = Count(status.free);
     json["free_percent"] = status.FreePercent();

@@ -202,7 +202,7 @@ void AddVolumes(Lines &lines, const std::vector<VolumeStatus> &volumes) {
                            " %) free of " + Bytes(static_cast<int64_t>(volume.size)) + ":";
         for (const std::string &folder : volume.folders)
             text += " " + folder;
-        AddText(lines, text, volume.IsNearlyFull() ? kBad : kPlain);
+        AddText(lines, text, volume.FreeLevel() != VolumeStatus::Level::Good ? kBad : kPlain);
     }
 }
 

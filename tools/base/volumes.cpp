@@ -1,4 +1,4 @@
-#include "status/volumes.h"
+#include "base/volumes.h"
 
 #include <sys/stat.h>
 #include <sys/statvfs.h>
@@ -27,14 +27,25 @@ double VolumeStatus::FreePercent() const {
     return size > 0 ? 100 * static_cast<double>(free) / static_cast<double>(size) : 100;
 }
 
-std::vector<VolumeStatus> GatherVolumes(const std::string &root) {
+VolumeStatus::Level VolumeStatus::FreeLevel() const {
+    if (free < kFullBytes)
+        return Level::Full;
+    return FreePercent() < 10 ? Level::NearlyFull : Level::Good;
+}
+
+std::vector<VolumeStatus> GatherVolumes(const std::string &root, const std::string &folder) {
+    std::vector<std::string> paths;
+    for (const char *name : kFolders)
+        paths.push_back(root + name);
+    if (!folder.empty())
+        paths.push_back(folder);
     std::vector<VolumeStatus> volumes;
     std::map<dev_t, size_t> known;
-    for (const char *name : kFolders) {
+    for (const std::string &path : paths) {
         struct stat status {};
         struct statvfs space {};
-        const std::string folder = ExistingFolder(root + name, status);
-        if (statvfs(folder.c_str(), &space) != 0)
+        const std::string existing = ExistingFolder(path, status);
+        if (statvfs(existing.c_str(), &space) != 0)
             continue;
         const auto [at, isNew] = known.emplace(status.st_dev, volumes.size());
         if (isNew) {
@@ -44,8 +55,8 @@ std::vector<VolumeStatus> GatherVolumes(const std::string &root) {
                 {{}, (used + space.f_bavail) * space.f_frsize, space.f_bavail * space.f_frsize});
         }
         std::vector<std::string> &folders = volumes[at->second].folders;
-        if (std::find(folders.begin(), folders.end(), folder) == folders.end())
-            folders.push_back(folder);
+        if (std::find(folders.begin(), folders.end(), existing) == folders.end())
+            folders.push_back(existing);
     }
     return volumes;
 }
