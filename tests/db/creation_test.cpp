@@ -1,9 +1,8 @@
 // Creating a database under adverse conditions.
 
-#include <sys/mount.h>
-
 #include "db/db_fixture.h"
 #include "db/killed_process.h"
+#include "support/volume.h"
 
 namespace kelo::test {
 namespace {
@@ -58,25 +57,10 @@ TEST_F(Creation, BrokenOffAtAnyCallLeavesNothingOrAll) {
     }
 }
 
-// A folder that is a file system of its own, of 256 KiB.
-class Volume {
-public:
-    explicit Volume(const std::string &folder, unsigned long flags = 0) : folder_(folder) {
-        fs::create_directories(folder);
-        isMounted_ = mount("tmpfs", folder.c_str(), "tmpfs", flags, "size=256k") == 0;
-    }
-    ~Volume() { umount(folder_.c_str()); }
-    bool IsMounted() const { return isMounted_; }
-
-private:
-    const std::string folder_;
-    bool isMounted_;
-};
-
 TEST_F(Creation, LeavesNothingOnAFullDiskAndSucceedsWhenThereIsRoom) {
     for (const size_t roomKib : {0, 4, 8, 12, 16, 20, 24, 28, 32, 36, 40, 44, 48, 52, 56, 60, 64}) {
         SCOPED_TRACE(roomKib);
-        const Volume volume(folder_);
+        const Volume volume(folder_, "256k");
         if (!volume.IsMounted())
             GTEST_SKIP() << "may not mount";
         const std::string filler = folder_ + "/filler";
@@ -93,7 +77,7 @@ TEST_F(Creation, LeavesNothingOnAFullDiskAndSucceedsWhenThereIsRoom) {
 }
 
 TEST_F(Creation, RefusesWhatIsNoPlaceForADatabase) {
-    const Volume readOnly(folder_ + "/read-only", MS_RDONLY);
+    const Volume readOnly(folder_ + "/read-only", "256k", MS_RDONLY);
     fs::create_directory(folder_ + "/folder.db");
     fs::create_symlink("nowhere", folder_ + "/link.db");
     ASSERT_EQ(mknod((folder_ + "/socket.db").c_str(), S_IFSOCK | 0600, 0), 0);

@@ -8,13 +8,15 @@
 #include "kelosyslog/root.h"
 
 namespace kelo::test {
+
+time_t now = 1000;
+
 namespace {
 
 using Lines = std::vector<std::string>;
 
 constexpr int kRows = 40;
 const _SYSLOG_SQL_COND_tag kFromHost3{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "host03", {}};
-time_t now = 1000;
 
 // A database of kRows sample logs, the last two of them still in the write-ahead log, as a busy writer leaves
 // it.

@@ -8,6 +8,8 @@
 
 namespace kelo::test {
 
+extern time_t now; // what time(2) returns
+
 // What an operation works on. The files under the root are put back before every run.
 struct Fixture {
     Fixture();
