@@ -31,10 +31,12 @@ std::string DiskSpaceMonitor::NameOfVolume() const {
 }
 
 void DiskSpaceMonitor::NoteFull() {
+    Tick();
     Set(NameOfVolume(), &Volume::isWriteFailing, true);
 }
 
 void DiskSpaceMonitor::NoteWritten() {
+    Tick(); // a little may fit in although the volume is still full
     Set(NameOfVolume(), &Volume::isWriteFailing, false);
 }
 
