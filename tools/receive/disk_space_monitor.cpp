@@ -70,7 +70,7 @@ void DiskSpaceMonitor::Set(const std::string &name, bool Volume::*cause, bool va
         syslog(LOG_ERR, "the volume of %s is full", name.c_str());
         volume.isEventDue = true;
         volume.isNotificationDue = true;
-        reserve_.Release();
+        reserve_.ReleaseForEvent();
     }
     Tell(name, volume);
 }
@@ -78,8 +78,13 @@ void DiskSpaceMonitor::Set(const std::string &name, bool Volume::*cause, bool va
 void DiskSpaceMonitor::Tell(const std::string &name, Volume &volume) {
     if (volume.isEventDue)
         volume.isEventDue = Logger().LogAddVolFull() != 0;
-    if (volume.isNotificationDue)
-        volume.isNotificationDue = NotificationManager().NotificationSendVolFull(name) != 0;
+    const auto fails = [&] { return NotificationManager().NotificationSendVolFull(name) != 0; };
+    if (volume.isNotificationDue && fails()) {
+        reserve_.ReleaseForNotification();
+        volume.isNotificationDue = fails();
+    } else {
+        volume.isNotificationDue = false;
+    }
     volume.retryTime = Clock::now() + kRetry;
 }
 

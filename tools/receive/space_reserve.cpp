@@ -14,13 +14,13 @@ struct ReserveFile {
 };
 
 // An event needs a write-ahead log and its index too.
-constexpr ReserveFile kFiles[] = {{"/usr/kelo/etc/.reserve", 256 * 1024},
-                                  {"/var/spool/kelonotify/.reserve", 64 * 1024}};
+constexpr ReserveFile kOfEvents{"/usr/kelo/etc/.reserve", 256 * 1024};
+constexpr ReserveFile kOfSpool{"/var/spool/kelonotify/.reserve", 64 * 1024};
 
 } // namespace
 
 void SpaceReserve::Hold() const {
-    for (const ReserveFile &reserve : kFiles) {
+    for (const ReserveFile &reserve : {kOfEvents, kOfSpool}) {
         const std::string path = root_ + reserve.path;
         const FileHandle file(open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0640));
         if (file && posix_fallocate(file.Get(), 0, reserve.bytes) != 0)
@@ -28,9 +28,12 @@ void SpaceReserve::Hold() const {
     }
 }
 
-void SpaceReserve::Release() const {
-    for (const ReserveFile &reserve : kFiles)
-        unlink((root_ + reserve.path).c_str());
+void SpaceReserve::ReleaseForEvent() const {
+    unlink((root_ + kOfEvents.path).c_str());
+}
+
+void SpaceReserve::ReleaseForNotification() const {
+    unlink((root_ + kOfSpool.path).c_str());
 }
 
 } // namespace kelo::tool

@@ -18,6 +18,7 @@ namespace fs = std::filesystem;
 constexpr mode_t kFolderMode = 0750;
 constexpr int64_t kTemporarySec = 24 * 3600;
 constexpr const char *kRetryRequest = "retry";
+constexpr const char *kReserve = ".reserve";
 
 } // namespace
 
@@ -103,7 +104,10 @@ Progress Spool::ReadRecord(const std::string &name) const {
 
 void Spool::Save(const std::string &name, const Progress &progress) const {
     const std::string temporary = Leaf(name) + "." + std::to_string(getpid());
-    Require(FolderOf(name).Write(Leaf(name), ToJson(progress), Sub("tmp"), temporary), name);
+    const auto write = [&] {
+        return FolderOf(name).Write(Leaf(name), ToJson(progress), Sub("tmp"), temporary);
+    };
+    Require(write() || (errno == ENOSPC && Folder(path_).Remove(kReserve) && write()), name);
 }
 
 void Spool::SaveProgress(const std::string &id, const Progress &progress) const {
