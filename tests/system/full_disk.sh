@@ -52,6 +52,10 @@ reported() {
 fillers=0
 goes_on() { (($(received) > stopped)); }
 
+# Two recipients: what each of them got must be recorded, so that nothing is sent unless that works.
+mkdir -p "$root/etc"
+printf '%s\n' 'smtp_mail_enabled="yes"' 'smtp_from="a@x"' 'smtp_to="b@x, c@x"' 'smtp_server="127.0.0.1"' 'smtp_port="1"' \
+    'desktop_enabled="no"' >"$root/etc/keloinfo.conf"
 syslog_ng_start "$root"
 wait_until 20 reserved || fail "no disk space is reserved for the buffer: $(ls -ls "$root/var/buffer")"
 wait_until 20 test -s "$root/var/spool/kelonotify/.reserve" || fail "no disk space is reserved for notifications"
@@ -69,6 +73,9 @@ fill_partly() { fill "${left[$1]}" && notified; }
 filled=$EPOCHSECONDS
 wait_until 20 fill_partly "$1" || fail "no notification of a full volume"
 wait_until 20 reported || fail "status does not report it, or the senders do not wait: $(<"$root/screen")"
+status=0
+"$KELO_BIN_DIR/kelonotify" --root "$root" 2>"$root/kelonotify" || status=$?
+expect "kelonotify that tries to deliver" "$status" 1
 
 rm "$root"/var/ballast/*
 freed=$EPOCHSECONDS
