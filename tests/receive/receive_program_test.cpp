@@ -174,6 +174,20 @@ TEST_F(ReceiveProgram, CompletesEmptyDatabases) {
     EXPECT_EQ(Events("Server was started*"), "1");
 }
 
+// A view can give rows without end.
+TEST_F(ReceiveProgram, PutsAsideAnAccountingWithViewsForTables) {
+    RunSql(
+        accounting_,
+        "CREATE TABLE eps (id INTEGER PRIMARY KEY, stamp, device, eps); CREATE VIEW histogram AS WITH n(i) "
+        "AS (SELECT 1 UNION ALL SELECT i + 1 FROM n) SELECT i AS id, i AS device, i AS count FROM n");
+    EXPECT_THAT(Run("status").out, HasSubstr("'histogram' in it is no table"));
+    ChildProgram receiver = Start();
+    receiver.Send(LogLines(0, 10));
+    EXPECT_EQ(receiver.End().status, 0);
+    EXPECT_EQ(Counted(), "10");
+    EXPECT_TRUE(fs::exists(accounting_ + ".corrupt"));
+}
+
 // Each event that is tried would hold up what is received for seconds.
 TEST_F(ReceiveProgram, TriesALockedEventLogOnce) {
     WriteRule(6);

@@ -81,6 +81,12 @@ int64_t ReadOnlyQuery::Number(const std::string &sql) const {
     return row ? std::strtoll(row->front().c_str(), nullptr, 10) : 0;
 }
 
+void ReadOnlyQuery::RequireTable() const {
+    if (Number("SELECT count(*) AS value FROM sqlite_master WHERE lower(name) = '" + table_.name +
+               "' AND (type = 'view' OR sql LIKE 'create virtual%')") != 0)
+        throw DatabaseError(table_.path + ": '" + table_.name + "' in it is no table");
+}
+
 bool ReadOnlyQuery::HasTable(const std::string &table) const {
     return Number("SELECT count(*) AS value FROM sqlite_master WHERE type = 'table' AND name = '" + table +
                   "'") != 0;

@@ -34,6 +34,9 @@ public:
     // The first row's column "value" as a number; 0 without one.
     int64_t Number(const std::string &sql) const;
     bool HasTable(const std::string &table) const;
+    // Throws DatabaseError if the connection's table is a view or virtual: reading it can take any time, and
+    // nothing of ours creates one.
+    void RequireTable() const;
 
 private:
     struct Closer {

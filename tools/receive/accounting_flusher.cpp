@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "base/errors.h"
+#include "receive/complete_databases.h"
 #include "store/forgotten_devices.h"
 
 namespace kelo::tool {
@@ -41,6 +42,7 @@ void AccountingFlusher::Load() {
     }
     if (manager_ && !isChanged)
         return;
+    PutAsideIfItHasViews(path_);
     manager_.emplace();
     manager_->EpsHandlerSet(onSample_);
     names_.Load(manager_->HistogramGet());

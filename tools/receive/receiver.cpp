@@ -42,11 +42,11 @@ std::string FolderOf(const ReceiverOptions &options) {
 } // namespace
 
 Receiver::Receiver(ReceiverOptions options)
-    : options_(std::move(options)), volume_(options_.root, FolderOf(options_)),
-      setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
-      rules_(options_.notifyLimit),
+    : options_(std::move(options)), rules_(options_.notifyLimit),
       accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
                   [this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
+      volume_(options_.root, FolderOf(options_)),
+      setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
       lines_(LogStream::kMaxLineBytes),
       import_([this](const LineReader &reader,
                      const std::string &reason) { setAside_.Add(reason, reader.Line()); },

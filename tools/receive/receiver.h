@@ -33,7 +33,7 @@ struct ReceiverOptions {
 // memory stays bounded.
 class Receiver : private RecordSink {
 public:
-    // Opens nothing but the signals. Throws std::system_error.
+    // Loads the rules and the counts, and handles the signals from then on. Throws std::system_error.
     explicit Receiver(ReceiverOptions options);
 
     // Receives from the file descriptor until its end, or until SIGTERM or SIGINT has come and nothing more
@@ -64,6 +64,9 @@ private:
     static void FireAt(EventSource &timer, int64_t time);
 
     ReceiverOptions options_;
+    // First, as they load files, which may take seconds: a signal ends the program until then.
+    RuleChecker rules_;
+    AccountingFlusher accounting_;
     EventLoop loop_;
     std::vector<EventSource> signals_ = AddSignals();
     // They call TickSecond, TickState and Advance.
@@ -72,8 +75,6 @@ private:
     EventSource writerTimer_ = loop_.AddTimer([] {});
     DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
-    RuleChecker rules_;
-    AccountingFlusher accounting_;
     std::optional<LogWriter> writer_;
     LineReader lines_;
     LogImport import_;

@@ -1,40 +1,50 @@
 #include "status/accounting.h"
 
-#include <algorithm>
+#include <cstdlib>
 #include <limits>
 
-#include "kelosyslog/dbutil.h"
-#include "read/accounting_samples.h"
-#include "read/eps_series.h"
 #include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
 
+// For each statement; the sum of a million devices takes a tenth of it.
+constexpr std::chrono::milliseconds kPatience{2000};
+constexpr size_t kLongestName = 255; // bytes that are shown of a device's name
+
 // Records a second in the `seconds` that end with `newest`.
-double MeanRate(const std::string &path, int64_t newest, int64_t seconds) {
-    int64_t logs = 0;
-    ReadEps(path, newest - seconds + 1, newest, [&](const SYSLOG_LOG_EPS &sample) { logs += sample.eps; });
+double MeanRate(const ReadOnlyQuery &database, int64_t newest, int64_t seconds) {
+    const int64_t logs =
+        database.Number("SELECT total(eps) AS value FROM eps WHERE stamp BETWEEN " +
+                        std::to_string(newest - seconds + 1) + " AND " + std::to_string(newest));
     return static_cast<double>(logs) / static_cast<double>(seconds);
+}
+
+uint64_t Count(const std::string &text) {
+    return std::strtoull(text.c_str(), nullptr, 10);
 }
 
 } // namespace
 
 AccountingStatus GatherAccounting(const std::string &path, int devices) {
-    // Keeps the library's connections from being the last to close, so that none of them has to clean up.
-    const ReadOnlyQuery open({path, "eps"}, std::chrono::milliseconds(150));
+    const ReadOnlyQuery database({path, "histogram"}, kPatience);
+    database.RequireTable();
     AccountingStatus status;
-    if (const auto stored = StoredStamps(path, {0, std::numeric_limits<int32_t>::max()})) {
-        status.newest = stored->last;
-        status.perSecond = MeanRate(path, status.newest, 60);
-        status.perSecondHour = MeanRate(path, status.newest, 3600);
+    const auto newest = database.FirstRow("SELECT max(stamp) AS newest FROM eps WHERE stamp BETWEEN 0 AND " +
+                                              std::to_string(std::numeric_limits<int32_t>::max()),
+                                          {"newest"});
+    if (newest && !newest->front().empty()) {
+        status.newest = std::strtoll(newest->front().c_str(), nullptr, 10);
+        status.perSecond = MeanRate(database, status.newest, 60);
+        status.perSecondHour = MeanRate(database, status.newest, 3600);
     }
-    RequireHistogram(path);
-    status.total = SyslogDBHistTotalGet(path);
-    for (const auto &device : SyslogDBHistGet(path, devices))
-        status.devices.push_back(device);
-    std::stable_sort(status.devices.begin(), status.devices.end(),
-                     [](const auto &one, const auto &other) { return one.second > other.second; });
+    status.total = Count(database.FirstRow("SELECT sum(count) AS total FROM histogram", {"total"})->front());
+    for (const auto &row :
+         database.Rows("SELECT substr(device, 1, " + std::to_string(kLongestName) +
+                           ") AS device, count FROM histogram ORDER BY count DESC, device LIMIT " +
+                           std::to_string(devices),
+                       {"device", "count"}))
+        status.devices.emplace_back(row[0], Count(row[1]));
     return status;
 }
 

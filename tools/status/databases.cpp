@@ -92,6 +92,7 @@ State StateAfter(int code) {
 void Read(DatabaseStatus &status) {
     try {
         const ReadOnlyQuery database({status.path, status.table}, kPatience);
+        database.RequireTable();
         ReadRows(database, status);
         try {
             if (status.table == "transfer_log")
