@@ -180,12 +180,41 @@ class NotifyTest(unittest.TestCase):
         self.retry()
         self.assertEqual(len(web.requests), 6)
 
-    def test_mail_goes_encrypted_and_authenticated_to_a_server_that_is_trusted(self):
+    def test_an_answer_without_end_is_left_after_64_kib(self):
+        web = WebServer()
+        self.addCleanup(web.stop)
+        self.settings.update(sms_enabled="yes", sms_url=web.url, sms_to="+491", sms_body="%TITLE%")
+        begin = time.monotonic()
+        for endless, status in ((b"\r\n" + b"x" * 65536, 0), (b"A: " + b"x" * 1000 + b"\r\n", 1)):
+            web.endless = endless
+            self.add(channels=["sms"])
+            log = self.deliver(status=status)
+        self.assertIn("64 KiB", log)
+        self.assertLess(time.monotonic() - begin, 2, "it was not left before the time-out")
+
+    def certificate(self, names):
         key, certificate = self.root + "/key.pem", self.root + "/cert.pem"
         subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-keyout", key, "-out", certificate, "-days", "2",
-                        "-subj", "/CN=nas", "-addext", "subjectAltName=IP:127.0.0.1"], check=True, capture_output=True)
+                        "-subj", "/CN=nas", "-addext", "subjectAltName=" + names], check=True, capture_output=True)
         context = ssl.SSLContext(ssl.PROTOCOL_TLS_SERVER)
         context.load_cert_chain(certificate, key)
+        return certificate, context
+
+    def test_requests_go_to_a_server_that_is_trusted(self):
+        for name, trusted in (("IP:127.0.0.1", False), ("IP:127.0.0.2", True), ("IP:127.0.0.1", True)):
+            certificate, context = self.certificate(name)
+            web = WebServer(context)
+            self.addCleanup(web.stop)
+            self.settings.update(sms_enabled="yes", sms_url=web.url, sms_to="+491", sms_body="%TITLE%",
+                                 notify_ca_file=certificate if trusted else "")
+            self.add(channels=["sms"])
+            open(self.spool + "/new/retry", "w").close()
+            isGood = trusted and name == "IP:127.0.0.1"
+            self.deliver(status=0 if isGood else 1)
+            self.assertEqual(len(web.requests), 3 if isGood else 0, (name, trusted))
+
+    def test_mail_goes_encrypted_and_authenticated_to_a_server_that_is_trusted(self):
+        certificate, context = self.certificate("IP:127.0.0.1")
         server = self.start(MailServer(tls_context=context, require_starttls=True, auth_required=True))
         self.settings.update(smtp_security="starttls", smtp_user="nas1", smtp_password="pass word")
         self.add()

@@ -61,10 +61,11 @@ class Silence:
 
 
 class WebServer:
-    """HTTP. `requests` holds (path, headers, body bytes); `answer` is the status of the next ones."""
+    """HTTP. `requests` holds (path, headers, body bytes); `answer` is the status of the next ones, and `endless` what follows it
+    without end."""
 
-    def __init__(self):
-        self.requests, self.answer = [], 200
+    def __init__(self, tls_context=None):
+        self.requests, self.answer, self.endless = [], 200, b""
         owner = self
 
         class Handler(http.server.BaseHTTPRequestHandler):
@@ -72,13 +73,21 @@ class WebServer:
                 body = self.rfile.read(int(self.headers["Content-Length"]))
                 owner.requests.append((self.path, self.headers, body))
                 self.send_response(owner.answer)
-                self.end_headers()
+                self.flush_headers()
+                try:
+                    while owner.endless:
+                        self.wfile.write(owner.endless)
+                    self.end_headers()
+                except OSError:
+                    self.close_connection = True
 
             def log_message(self, *arguments):
                 pass
 
         self.server = http.server.ThreadingHTTPServer(("127.0.0.1", 0), Handler)
-        self.url = f"http://127.0.0.1:{self.server.server_address[1]}"
+        if tls_context:
+            self.server.socket = tls_context.wrap_socket(self.server.socket, server_side=True)
+        self.url = f"http{'s' if tls_context else ''}://127.0.0.1:{self.server.server_address[1]}"
         threading.Thread(target=self.server.serve_forever, daemon=True).start()
 
     def stop(self):

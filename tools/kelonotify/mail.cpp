@@ -145,7 +145,7 @@ private:
             self->reply_.clear();
         if (isFailure && self->reply_.size() < kMaxReplyBytes)
             self->reply_ += isFirst ? line : line.substr(std::min<size_t>(line.size(), 3));
-        return size * count;
+        return self->transfer_.CountHeader(size * count);
     }
 
     static size_t ReadText(char *buffer, size_t size, size_t count, void *channel) {
