@@ -17,7 +17,14 @@ namespace {
 
 constexpr size_t kBufferSize = 64 * 1024;
 
+// Whether somebody else lets the user run this program, who then must not run others with it.
+bool IsLent() {
+    return std::getenv("SUDO_UID") != nullptr || geteuid() != getuid();
+}
+
 std::string PagerCommand() {
+    if (IsLent())
+        return "less";
     const char *pager = std::getenv("PAGER");
     return pager == nullptr ? "less" : pager;
 }
@@ -25,7 +32,9 @@ std::string PagerCommand() {
 // In the child: the pager reads from the pipe and gets the signals that we ignore.
 [[noreturn]] void RunPager(const std::string &command, int readEnd) {
     dup2(readEnd, STDIN_FILENO);
-    setenv("LESS", "FRX", 0); // leave when it fits on the screen, show colours
+    setenv("LESS", "FRX", 0);   // leave when it fits on the screen, show colours
+    if (IsLent())
+        setenv("LESSSECURE", "1", 1); // no commands, no other files
     std::signal(SIGPIPE, SIG_DFL);
     execl("/bin/sh", "sh", "-c", command.c_str(), nullptr);
     _exit(127);

@@ -24,7 +24,8 @@ bool WantsColour(ColourMode mode);
 class Output {
 public:
     // With `mayPage` the first text starts the pager (environment PAGER, else "less" with FRX), provided that
-    // the standard output is a terminal. An empty PAGER or "cat" means none.
+    // the standard output is a terminal. An empty PAGER or "cat" means none. Under sudo it is
+    // always "less" without its commands.
     explicit Output(bool mayPage);
     ~Output();
     Output(const Output &) = delete;
