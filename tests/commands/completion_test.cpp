@@ -38,7 +38,7 @@ TEST(Completion, OffersWhatGoesWithTheCommandLine) {
         {"count --priority = err,\\!e", {"err,!emerg", "err,!err"}},
         {"search --facility local0,local7,ke", {"local0,local7,kern"}},
         {"search --output = js", {"json", "jsonl"}},
-        {"values -o s", {}},
+        {"values -o sh", {}},
         {"values ut", {"utcsec"}},
         {"values host ''", {}},
         {"notify test d", {"desktop"}},

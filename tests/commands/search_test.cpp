@@ -86,7 +86,7 @@ TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
     const std::string json =
         R"({"id":9223372036854775807,"time":"2020-01-02T10:11:12+00:00","prio":"err","host":"h\"o,s't",)"
         R"("prog":"\u001b]0;owned\u0007","msg":"a\\b\r\nc\td )" +
-        bad + bad + "( " + bad + bad + bad + " \\u009b31m \xe2\x80\xae " + japanese + "\"}";
+        bad + bad + "( " + bad + bad + bad + " \\u009b31m \\u202e " + japanese + "\"}";
     Expect("search -o json --fields id,time,prio,host,prog,msg", 0, "[\n" + json + "\n]\n");
     Expect("search -o jsonl --fields id,time,prio,host,prog,msg", 0, json + "\n");
     Expect("search -o json -H nobody", 1, "[\n]\n");
@@ -97,6 +97,24 @@ TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
            "host,prog,msg,prio,id\r\n,,,debug,1\r\n\"h\"\"o,s't\"," + prog + ",\"" + msg +
                "\",err,9223372036854775807\r\n");
     Expect("search -o csv --no-header --fields msg -n 1 --offset 1", 0, "\"\"\r\n");
+    EXPECT_THAT(RunIn(root_.Path(), "exec script -qec 'kelosyslog --root . search -o csv --no-header "
+                                    "--fields prog -n 1 --no-pager' log")
+                    .out,
+                HasSubstr("\\x1b]0;owned\\x07\r"));
+    RunSql(logs_, "DELETE FROM logs");
+    std::string expected;
+    int id = 0;
+    for (const auto &[text, shown] : std::map<std::string, std::string>{{"=1+1", "'=1+1"},
+                                                                        {"-5", "-5"},
+                                                                        {"-5+A1", "'-5+A1"},
+                                                                        {"@x,y", "\"'@x,y\""},
+                                                                        {"\t=1", "'\t=1"},
+                                                                        {"a=1", "a=1"},
+                                                                        {"+", "'+"}}) {
+        RunSql(logs_, "INSERT INTO logs(id, msg) VALUES (" + std::to_string(++id) + ", '" + text + "')");
+        expected += shown + "\r\n";
+    }
+    Expect("search -o spreadsheet --no-header --fields msg", 0, expected);
 }
 
 TEST_F(Search, DeletesOnlyWhatWasConfirmed) {

@@ -34,7 +34,7 @@ std::string WriteJsonLine(const Json::Value &value, JsonTexts texts) {
         builder["precision"] = 2;
         builder["precisionType"] = "decimal";
     }
-    return Json::writeString(builder, value) + "\n";
+    return EscapeDirections(Json::writeString(builder, value)) + "\n";
 }
 
 void JsonObject::AddName(std::string_view name) {

@@ -58,6 +58,12 @@ bool TurnsDirection(uint32_t code) {
     return (code >= 0x202a && code <= 0x202e) || (code >= 0x2066 && code <= 0x2069);
 }
 
+// What JSON need not escape, but what shows a text other than it is or ends a line of JavaScript.
+bool Misleads(uint32_t code) {
+    const bool isMark = code == 0x061c || code == 0x200e || code == 0x200f;
+    return isMark || code == 0x2028 || code == 0x2029 || TurnsDirection(code);
+}
+
 void AppendEscape(std::string &out, const char *format, uint32_t code) {
     char text[16];
     const int length = std::snprintf(text, sizeof text, format, code);
@@ -76,6 +82,15 @@ char ShortEscape(uint32_t code) {
     default:
         return 0;
     }
+}
+
+// A number with a sign is no formula.
+bool IsFormula(std::string_view text) {
+    if (text.empty() || std::string_view("=+-@\t\r\n").find(text.front()) == std::string_view::npos)
+        return false;
+    const std::string_view rest = text.substr(1);
+    const bool isNumber = !rest.empty() && rest.find_first_not_of("0123456789.") == std::string_view::npos;
+    return !isNumber || text.front() == '=' || text.front() == '@';
 }
 
 void AppendCsvField(std::string &out, std::string_view text) {
@@ -129,7 +144,9 @@ size_t WholeCharacters(std::string_view text, size_t maxBytes) {
 }
 
 void AppendJsonString(std::string &out, std::string_view text) {
-    const auto isPlain = [](uint32_t code) { return code != '"' && code != '\\' && !IsControl(code); };
+    const auto isPlain = [](uint32_t code) {
+        return code != '"' && code != '\\' && !IsControl(code) && !Misleads(code);
+    };
     out += '"';
     AppendEscaped(out, text, isPlain, [&](Character character) {
         if (!character.isValid)
@@ -157,11 +174,24 @@ std::string EscapeMarkup(std::string_view text, std::string_view characters) {
     return out;
 }
 
-void AppendCsvLine(std::string &out, const std::vector<std::string> &fields) {
+std::string EscapeDirections(std::string_view json) {
+    std::string out;
+    const auto isPlain = [](uint32_t code) { return !Misleads(code); };
+    AppendEscaped(out, json, isPlain, [&](Character character) {
+        if (character.isValid)
+            AppendEscape(out, "\\u%04x", character.code);
+        else
+            out += static_cast<char>(character.code);
+    });
+    return out;
+}
+
+void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, CsvStyle style) {
     for (const std::string &field : fields) {
         if (&field != &fields.front())
             out += ',';
-        AppendCsvField(out, field);
+        const std::string text = style.isForTerminal ? EscapeForTerminal(field) : field;
+        AppendCsvField(out, style.isForSpreadsheet && IsFormula(field) ? "'" + text : text);
     }
     if (fields.size() == 1 && fields[0].empty())
         out += "\"\""; // an empty line would be no record to most readers

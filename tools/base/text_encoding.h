@@ -22,15 +22,26 @@ size_t FirstCharacters(std::string_view text, size_t count);
 // Length in bytes of the whole characters within the first `maxBytes` of a text that is UTF-8.
 size_t WholeCharacters(std::string_view text, size_t maxBytes);
 
-// Appends the text as a JSON string with its quotes: control characters are escaped, and each byte that is no
-// UTF-8 becomes U+FFFD.
+// Appends the text as a JSON string with its quotes: control characters, characters that turn the writing
+// direction, and the line and paragraph separators are escaped, and each byte that is no UTF-8 becomes
+// U+FFFD.
 void AppendJsonString(std::string &out, std::string_view text);
 
 // The text with those of the characters & < > " ' as entities that are in `characters`.
 std::string EscapeMarkup(std::string_view text, std::string_view characters);
 
-// Appends a record of RFC 4180 with its line end: fields stand between double quotes where they need them,
-// and their bytes are unchanged.
-void AppendCsvLine(std::string &out, const std::vector<std::string> &fields);
+// The JSON with the characters that turn the writing direction and the line and paragraph separators as
+// "\u202e": they can only be in its strings.
+std::string EscapeDirections(std::string_view json);
+
+struct CsvStyle {
+    // Control characters are written as EscapeForTerminal does. Else the bytes of a field are unchanged.
+    bool isForTerminal = false;
+    // A text that a spreadsheet program would take for a formula begins with an apostrophe, which it hides.
+    bool isForSpreadsheet = false;
+};
+
+// Appends a record of RFC 4180 with its line end: fields stand between double quotes where they need them.
+void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, CsvStyle style = {});
 
 } // namespace kelo::tool

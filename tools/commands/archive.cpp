@@ -83,7 +83,8 @@ public:
     int List() {
         const OutputFormat format = ParseOutputFormat(options_.format);
         if (format == OutputFormat::Short)
-            throw UsageError("--output: archives have no form 'short'; forms are text, json, jsonl, csv");
+            throw UsageError(
+                "--output: archives have no form 'short'; forms are text, json, jsonl, csv, spreadsheet");
         const bool isText = format == OutputFormat::Text;
         const TimeFormat time(false);
         StatisticsTable table({{"name", false},
@@ -263,8 +264,9 @@ void AddArchive(Program &program) {
     command->add_flag("--dry-run", options->isDryRun, "Only tell what would be archived and removed");
     command->add_flag("-y,--yes", options->isConfirmed, "Do not ask");
     OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
-                       "--list: text (default), json (one array), jsonl (an object per line), csv"),
-               {"text", "json", "jsonl", "csv"});
+                       "--list: text (default), json (one array), jsonl (an object per line), csv, "
+                       "spreadsheet (csv without formulas)"),
+               {"text", "json", "jsonl", "csv", "spreadsheet"});
     command->add_flag("--no-header", options->noHeader, "--list: no heading in text and csv");
     AddUtcOption(*command, options->inUtc);
     AddTableOptions(*command, options->table, false);

@@ -66,15 +66,17 @@ void ApplyUtc(bool inUtc) {
 void AddOutputOptions(CLI::App &command, OutputOptions &options) {
     const std::string group = "How to print";
     OfferWords(AddText(command, "-o,--output", options.format, "FORMAT",
-                       "text (default), short, json (one array), jsonl (an object per line), csv"),
-               {"text", "short", "json", "jsonl", "csv"})
+                       "text (default), short, json (one array), jsonl (an object per line), csv, "
+                       "spreadsheet (csv without formulas)"),
+               {"text", "short", "json", "jsonl", "csv", "spreadsheet"})
         ->group(group);
     OfferList(AddText(command, "--fields", options.fields, "NAMES",
                       "These fields, in this order: column names, and 'time'. Default: what people read in "
                       "text, else all"),
               FieldNames())
         ->group(group);
-    command.add_flag("--no-header", options.noHeader, "No heading in text and csv")->group(group);
+    command.add_flag("--no-header", options.noHeader, "No heading in text, csv and spreadsheet")
+        ->group(group);
     command.add_flag("--utc", options.inUtc, "Read and print times in UTC, not in local time")->group(group);
     AddText(command, "--color", options.colour, "WHEN",
             "auto (default: on a terminal, unless NO_COLOR is set), always, never")

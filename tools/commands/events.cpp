@@ -68,7 +68,8 @@ int List(const EventsOptions &options, const std::string &root) {
     ApplyUtc(options.output.inUtc);
     RecordLayout layout = MakeLayout(options.output, TableKind::Logs);
     if (layout.format == OutputFormat::Short)
-        throw UsageError("--output: events have no form 'short'; forms are text, json, jsonl, csv");
+        throw UsageError(
+            "--output: events have no form 'short'; forms are text, json, jsonl, csv, spreadsheet");
     layout.fields = EventFields();
     const EventPage page = ParsePage(options);
     const std::list<Event> events = SelectedEvents(EventDatabasePath(options.db, root), options, page);
@@ -145,10 +146,12 @@ void AddListOptions(CLI::App &command, EventsOptions &options) {
     AddText(command, "--offset", options.offset, "N", "Skip the N newest events first")->group(howMany);
     const std::string how = "How to print";
     OfferWords(AddText(command, "-o,--output", options.output.format, "FORMAT",
-                       "text (default), json (one array), jsonl (an object per line), csv"),
-               {"text", "json", "jsonl", "csv"})
+                       "text (default), json (one array), jsonl (an object per line), csv, "
+                       "spreadsheet (csv without formulas)"),
+               {"text", "json", "jsonl", "csv", "spreadsheet"})
         ->group(how);
-    command.add_flag("--no-header", options.output.noHeader, "No heading in text and csv")->group(how);
+    command.add_flag("--no-header", options.output.noHeader, "No heading in text, csv and spreadsheet")
+        ->group(how);
     command.add_flag("--utc", options.output.inUtc, "Read and print times in UTC, not in local time")
         ->group(how);
     AddText(command, "--color", options.output.colour, "WHEN",

@@ -193,7 +193,8 @@ void RequireSense(const Options &options, OutputFormat format) {
     if (isDevice && options.forget.names.size() != 1)
         throw UsageError("stats device: the name of a device is missing, or there are several");
     if (format == OutputFormat::Short)
-        throw UsageError("--output: statistics have no form 'short'; forms are text, json, jsonl, csv");
+        throw UsageError(
+            "--output: statistics have no form 'short'; forms are text, json, jsonl, csv, spreadsheet");
     if (options.plot && format != OutputFormat::Text)
         throw UsageError("--plot: is text and goes with no other --output");
 }
@@ -244,10 +245,10 @@ void AddStats(Program &program) {
     AddText(*command, "--device", options->device, "NAME", "eps: only of this device");
     command->add_flag("--per-device", options->perDevice, "eps: a row for each device");
     command->add_flag("--plot", options->plot, "Draw the counts as bars");
-    OfferWords(
-        AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv"),
-        {"text", "json", "jsonl", "csv"});
-    command->add_flag("--no-header", options->noHeader, "No heading in text and csv");
+    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
+                       "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
+               {"text", "json", "jsonl", "csv", "spreadsheet"});
+    command->add_flag("--no-header", options->noHeader, "No heading in text, csv and spreadsheet");
     AddUtcOption(*command, options->inUtc);
     AddText(*command, "--db", options->db, "PATH", "This accounting database");
 }

@@ -66,12 +66,12 @@ void Print(const std::list<std::string> &values, const Options &options, OutputF
            Output &output) {
     JsonLines lines(format == OutputFormat::Json);
     std::string text;
-    if (format == OutputFormat::Csv && !options.noHeader)
+    if (IsCsv(format) && !options.noHeader)
         text = options.attribute + "\r\n";
     lines.Begin(text);
     for (const std::string &value : values) {
-        if (format == OutputFormat::Csv) {
-            AppendCsvLine(text, {value});
+        if (IsCsv(format)) {
+            AppendCsvLine(text, {value}, CsvStyleOf(format));
         } else if (format == OutputFormat::Text) {
             text += EscapeForTerminal(value) + "\n";
         } else {
@@ -91,7 +91,8 @@ int Run(const Options &options, const std::string &root) {
     RequireAttribute(options.attribute);
     const OutputFormat format = ParseOutputFormat(options.format);
     if (format == OutputFormat::Short)
-        throw UsageError("--output: values have no form 'short'; forms are text, json, jsonl, csv");
+        throw UsageError(
+            "--output: values have no form 'short'; forms are text, json, jsonl, csv, spreadsheet");
     const LogTable table = ResolveLogTable(options.table, root);
     if (table.kind != TableKind::Logs)
         throw UsageError("--log: values are known of table logs only, not of '" + options.table.log + "'");
@@ -115,10 +116,10 @@ void AddValues(Program &program) {
         ->required();
     AddText(*command, "-n,--lines", options->lines, "N", "The first N values");
     AddText(*command, "--offset", options->offset, "N", "Skip N values first");
-    OfferWords(
-        AddText(*command, "-o,--output", options->format, "FORMAT", "text (default), json, jsonl, csv"),
-        {"text", "json", "jsonl", "csv"});
-    command->add_flag("--no-header", options->noHeader, "No heading in csv");
+    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
+                       "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
+               {"text", "json", "jsonl", "csv", "spreadsheet"});
+    command->add_flag("--no-header", options->noHeader, "No heading in csv and spreadsheet");
     AddTableOptions(*command, options->table, false);
 }
 

@@ -1,5 +1,7 @@
 #include "print/record_formatter.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 
 #include "base/errors.h"
@@ -147,7 +149,8 @@ private:
 
 class CsvWriter final : public LayoutWriter {
 public:
-    explicit CsvWriter(RecordLayout layout) : LayoutWriter(std::move(layout)) {}
+    explicit CsvWriter(RecordLayout layout)
+        : LayoutWriter(std::move(layout)), style_(CsvStyleOf(Layout().format)) {}
 
     void Begin(std::string &out) override {
         if (!Layout().hasHeader)
@@ -155,29 +158,36 @@ public:
         std::vector<std::string> names;
         for (const RecordField *field : Layout().fields)
             names.emplace_back(field->name);
-        AppendCsvLine(out, names);
+        AppendCsvLine(out, names, style_);
     }
     void Add(const Log &log, std::string &out) override {
         std::vector<std::string> values;
         for (const RecordField *field : Layout().fields)
             values.push_back(Value(*field, log, &TimeFormat::Iso));
-        AppendCsvLine(out, values);
+        AppendCsvLine(out, values, style_);
     }
+
+private:
+    CsvStyle style_;
 };
 
 } // namespace
 
+CsvStyle CsvStyleOf(OutputFormat format) {
+    return {isatty(STDOUT_FILENO) == 1, format == OutputFormat::Spreadsheet};
+}
+
 OutputFormat ParseOutputFormat(const std::string &name) {
-    constexpr std::pair<const char *, OutputFormat> kFormats[] = {{"text", OutputFormat::Text},
-                                                                  {"short", OutputFormat::Short},
-                                                                  {"json", OutputFormat::Json},
-                                                                  {"jsonl", OutputFormat::Jsonl},
-                                                                  {"csv", OutputFormat::Csv}};
+    constexpr std::pair<const char *, OutputFormat> kFormats[] = {
+        {"text", OutputFormat::Text}, {"short", OutputFormat::Short},
+        {"json", OutputFormat::Json}, {"jsonl", OutputFormat::Jsonl},
+        {"csv", OutputFormat::Csv},   {"spreadsheet", OutputFormat::Spreadsheet}};
     for (const auto &[known, format] : kFormats) {
         if (name == known)
             return format;
     }
-    throw UsageError("--output: '" + name + "' is no format; formats are text, short, json, jsonl, csv");
+    throw UsageError("--output: '" + name +
+                     "' is no format; formats are text, short, json, jsonl, csv, spreadsheet");
 }
 
 std::unique_ptr<RecordFormatter> MakeRecordWriter(RecordLayout layout) {
@@ -191,6 +201,7 @@ std::unique_ptr<RecordFormatter> MakeRecordWriter(RecordLayout layout) {
     case OutputFormat::Jsonl:
         return std::make_unique<JsonWriter>(std::move(layout));
     case OutputFormat::Csv:
+    case OutputFormat::Spreadsheet:
         return std::make_unique<CsvWriter>(std::move(layout));
     default:
         return std::make_unique<TextWriter>(std::move(layout));

@@ -4,14 +4,22 @@
 #include <optional>
 #include <string>
 
+#include "base/text_encoding.h"
 #include "kelosyslog/records.h"
 #include "print/record_fields.h"
 
 namespace kelo::tool {
 
-enum class OutputFormat { Text, Short, Json, Jsonl, Csv };
+enum class OutputFormat { Text, Short, Json, Jsonl, Csv, Spreadsheet };
 
-// The format of this name ("text", "short", "json", "jsonl", "csv"). Throws UsageError naming --output.
+inline bool IsCsv(OutputFormat format) {
+    return format == OutputFormat::Csv || format == OutputFormat::Spreadsheet;
+}
+// For the standard output as it is.
+CsvStyle CsvStyleOf(OutputFormat format);
+
+// The format of this name ("text", "short", "json", "jsonl", "csv", "spreadsheet"). Throws UsageError naming
+// --output.
 OutputFormat ParseOutputFormat(const std::string &name);
 
 struct RecordLayout {
@@ -30,9 +38,10 @@ struct RecordLayout {
 //     json    one array of objects
 //     jsonl   one object on each line
 //     csv     RFC 4180 with a heading
+//     spreadsheet    the same, and no text is taken for a formula
 //
 // Text and short make control characters visible (EscapeForTerminal); JSON is valid with any bytes in a
-// record; CSV has them unchanged.
+// record; CSV has them unchanged, except on a terminal.
 class RecordFormatter {
 public:
     virtual ~RecordFormatter() = default;

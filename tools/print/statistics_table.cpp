@@ -49,8 +49,8 @@ size_t OutputWidth() {
 }
 
 std::string StatisticsTable::Write(OutputFormat format, bool hasHeader) const {
-    if (format == OutputFormat::Csv)
-        return Csv(hasHeader);
+    if (IsCsv(format))
+        return Csv(hasHeader, CsvStyleOf(format));
     if (format != OutputFormat::Text)
         return Json(format == OutputFormat::Json);
     std::string out;
@@ -139,15 +139,15 @@ std::string StatisticsTable::Json(bool isArray) const {
     return out;
 }
 
-std::string StatisticsTable::Csv(bool hasHeader) const {
+std::string StatisticsTable::Csv(bool hasHeader, CsvStyle style) const {
     std::string out;
     std::vector<std::string> names;
     for (const StatisticsColumn &column : columns_)
         names.emplace_back(column.name);
     if (hasHeader)
-        AppendCsvLine(out, names);
+        AppendCsvLine(out, names, style);
     for (const std::vector<std::string> &cells : rows_)
-        AppendCsvLine(out, cells);
+        AppendCsvLine(out, cells, style);
     return out;
 }
 

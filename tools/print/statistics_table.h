@@ -31,7 +31,7 @@ public:
 private:
     std::vector<std::string> TextLines(bool hasHeader) const;
     std::string Json(bool isArray) const;
-    std::string Csv(bool hasHeader) const;
+    std::string Csv(bool hasHeader, CsvStyle style) const;
 
     std::vector<StatisticsColumn> columns_;
     std::vector<std::vector<std::string>> rows_;

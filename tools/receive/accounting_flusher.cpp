@@ -42,7 +42,14 @@ void AccountingFlusher::Load() {
     }
     if (manager_ && !isChanged)
         return;
-    PutAsideIfItHasViews(path_);
+    try {
+        PutAsideIfItHasViews(path_);
+    } catch (const DatabaseError &error) {
+        if (!manager_)
+            throw;
+        syslog(LOG_ERR, "devices are not forgotten: %s", error.what());
+        return;
+    }
     manager_.emplace();
     manager_->EpsHandlerSet(onSample_);
     names_.Load(manager_->HistogramGet());
