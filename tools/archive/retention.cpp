@@ -27,6 +27,11 @@ std::optional<Archive> ReadArchive(const fs::directory_entry &file) {
     archive.bytes = file.file_size(error);
     try {
         SqliteConnection database(file.path().string(), kToRead);
+        // A view could take any time.
+        if (database.Number(
+                "SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'db_info' AND "
+                "sql NOT LIKE 'create virtual%'") == 0)
+            return std::nullopt;
         SqliteStatement row(database,
                             "SELECT start_time, end_time, log_count, device FROM db_info WHERE id = 1");
         if (error || !row.Step())
