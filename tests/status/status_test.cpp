@@ -187,6 +187,7 @@ TEST_F(Status, AsksSyslogNgForItsCountersInTime) {
          {std::tuple(kCounters, State::Running, ""),
           {"", State::Silent, "in time"},
           {"source;s;;a;processed;7\n", State::Silent, "not complete"}}) {
+        fs::remove(deep);
         const FakeSyslogNg syslogNg(deep, answer);
         const SyslogNgStatus status = GatherSyslogNg("", deep, 200ms);
         EXPECT_EQ(status.state, state) << status.problem;
@@ -199,9 +200,9 @@ TEST_F(Status, AsksSyslogNgForItsCountersInTime) {
             EXPECT_EQ(status.destinations[0].instance, "a;\"b\"");
             EXPECT_EQ(status.destinations[0].memory, 2048U);
         }
-        fs::remove(deep);
     }
-    EXPECT_EQ(GatherSyslogNg("", deep, 200ms).state, State::Stopped);
+    EXPECT_EQ(GatherSyslogNg("", deep, 200ms).state, State::Stopped) << "its socket is left";
+    fs::remove(deep);
     const FakeSyslogNg syslogNg(deep, "dst.sql;d#0;x;a;written;4\ndst.sql;d#0;x;a;queued;3\n.\n");
     EXPECT_TRUE(GatherSyslogNg("", deep, 200ms).destinations.at(0).isStuck);
 }
