@@ -83,14 +83,5 @@ TEST_F(EventLoopTest, TakesSignalsFirstAndDiscardsWhatIsLeft) {
     EXPECT_EQ(sigismember(&blocked, SIGTERM), 0);
 }
 
-TEST_F(EventLoopTest, DoesNotForgetTheTimeWhereAFileIsAlwaysReady) {
-    const EventSource busy = loop_.AddInput(null_.Get(), [] {});
-    loop_.Wait();
-    EventSource timer = loop_.AddTimer([&] { ++count_; });
-    timer.FireAt({});
-    loop_.Wait();
-    EXPECT_EQ(count_, 1);
-}
-
 } // namespace
 } // namespace kelo::test

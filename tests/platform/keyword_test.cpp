@@ -119,15 +119,8 @@ TEST(Keyword, ReportsABrokenRegexOnceAndMatchesNothingByIt) {
 }
 
 TEST(Keyword, ErrorIsTheFirstLineThatTheSystemLogGets) {
-    const std::string keywords[] = {"",
-                                    "/var/log",
-                                    "/a/ -\"(\"",
-                                    "x OR /(/",
-                                    "/]a/ /[a/",
-                                    "-/\x1b*/ a*b",
-                                    std::string("a\0/(/", 5),
-                                    "/" + std::string(1000, '(') + "/ /)/"};
-    for (const std::string &keyword : keywords) {
+    for (const std::string &keyword : {std::string(), std::string("/a/ -\"(\""), std::string("/]a/ /[a/"),
+                                       std::string("a\0/(/", 5), "-/" + std::string(1000, '(') + "/ /)/"}) {
         SyslogCapture log;
         GenSQLRegexp(keyword, "msg");
         const std::vector<std::string> lines = log.TakeTexts();
