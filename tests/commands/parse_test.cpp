@@ -75,5 +75,34 @@ TEST_F(Parse, LeavesNothingHalfWrittenWhenTheDiskIsFull) {
     ExpectMessages(20000);
 }
 
+// By a quarantine that was killed between two renames, and by a writer that was killed before it.
+TEST_F(Parse, UsesNothingThatAMovedDatabaseHasLeft) {
+    Write(LogLines(0, 1));
+    const std::string aside = db_ + ".corrupt";
+    CreateLogDatabase(db_);
+    InsertSampleLogs(db_, 500);
+    std::optional<DatabaseLock> user(db_); // keeps the write-ahead log there
+    for (const char *file : {"-wal", "-shm"})
+        fs::create_hard_link(db_ + file, aside + file);
+    fs::rename(db_, aside);
+    Expect("parse --db logs.db in", 0);
+    ExpectMessages(1);
+    user.reset();
+    EXPECT_EQ(RunSql(aside, "SELECT count(*) FROM logs"), "500");
+
+    RunSql(aside, "PRAGMA journal_mode=DELETE");
+    fs::rename(aside, db_);
+    if (fork() == 0) {
+        TestDatabase killed(db_);
+        killed.Run("PRAGMA cache_size=2; BEGIN; UPDATE logs SET msg = msg || hex(zeroblob(500))");
+        _exit(0);
+    }
+    wait(nullptr);
+    ASSERT_TRUE(fs::exists(db_ + "-journal"));
+    fs::rename(db_, aside);
+    Expect("parse --db logs.db in", 0);
+    ExpectMessages(1);
+}
+
 } // namespace
 } // namespace kelo::test

@@ -41,20 +41,42 @@ void SqliteConnection::Close::operator()(sqlite3 *db) const {
 SqliteConnection::SqliteConnection(const std::string &path, const SqliteOptions &options,
                                    const std::string &name)
     : name_(name.empty() ? path : name), options_(options) {
+    do {
+        Open(path);
+    } while (!OpenLog());
+    SetBusyTimeout(options.busyTimeoutMs);
+    if (options.heedsStopSignals)
+        sqlite3_progress_handler(db_.get(), kInstructionsPerCheck, MustStop, nullptr);
+    if (options.trustsSchema)
+        return;
+    sqlite3_db_config(db_.get(), SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
+    sqlite3_db_config(db_.get(), SQLITE_DBCONFIG_ENABLE_TRIGGER, 0, nullptr);
+    Run("PRAGMA cell_size_check=ON");
+}
+
+void SqliteConnection::Open(const std::string &path) {
     sqlite3 *db = nullptr;
     const int status =
-        sqlite3_open_v2(path.c_str(), &db, FlagsOf(options.mode) | SQLITE_OPEN_NOMUTEX, KELODBVfs());
+        sqlite3_open_v2(path.c_str(), &db, FlagsOf(options_.mode) | SQLITE_OPEN_NOMUTEX, KELODBVfs());
     db_.reset(db);
     if (status != SQLITE_OK)
         Fail(status);
-    SetBusyTimeout(options.busyTimeoutMs);
-    if (options.heedsStopSignals)
-        sqlite3_progress_handler(db, kInstructionsPerCheck, MustStop, nullptr);
-    if (options.trustsSchema)
-        return;
-    sqlite3_db_config(db, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
-    sqlite3_db_config(db, SQLITE_DBCONFIG_ENABLE_TRIGGER, 0, nullptr);
-    Run("PRAGMA cell_size_check=ON");
+}
+
+// Opens the write-ahead log too and returns whether the file kept its name meanwhile. SQLite opens the log at
+// the first read, by its name: of a file that was moved since, that is the log of the one that came after it.
+bool SqliteConnection::OpenLog() {
+    constexpr int kMostWaits = 5000;
+    if (HasMoved())
+        return false;
+    // Whoever closes the database last has it for itself while it deletes the log.
+    const char *const log = sqlite3_filename_wal(sqlite3_db_filename(db_.get(), "main"));
+    for (int waits = 0;
+         sqlite3_exec(db_.get(), "PRAGMA user_version", nullptr, nullptr, nullptr) == SQLITE_BUSY &&
+         access(log, F_OK) == 0 && waits < kMostWaits;
+         ++waits)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return !HasMoved();
 }
 
 void SqliteConnection::SetBusyTimeout(int timeoutMs) {

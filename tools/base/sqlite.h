@@ -85,6 +85,8 @@ private:
     struct Close {
         void operator()(sqlite3 *db) const;
     };
+    void Open(const std::string &path);
+    bool OpenLog();
     static int WaitForLock(void *connection, int calls);
 
     std::string name_;

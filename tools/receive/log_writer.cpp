@@ -6,9 +6,9 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 #include <filesystem>
 
+#include "base/atomic_file.h"
 #include "kelosyslog/dbhandler.h"
 
 namespace kelo::tool {
@@ -84,11 +84,12 @@ void LogWriter::Open() {
     }
     if (store_)
         return;
-    // SQLite would use a write-ahead log that is left there for the fresh database.
+    // What creates the fresh database deletes a write-ahead log that is left there. That of a database that
+    // was set aside before stays what it is.
     std::error_code isMissing;
     const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
     if (InodeOf(path_) == 0 && !isMissing && walBytes > 0)
-        std::rename((path_ + "-wal").c_str(), (path_ + ".corrupt-wal").c_str());
+        RenameToFreeName(path_ + "-wal", path_ + ".corrupt-wal");
     store_.emplace(path_, kStoreOptions);
 }
 

@@ -1,13 +1,18 @@
 #include "store/log_store.h"
 
 #include <sqlite3.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <iterator>
 
 #include "base/atomic_file.h"
+#include "base/files.h"
+#include "kelosyslog/dbhandler.h"
 #include "store/logs_schema.h"
 
 namespace kelo::tool {
@@ -36,7 +41,35 @@ private:
     std::string file_;
 };
 
+// Whether something lies under the names of the missing database: what a moved one has left, or the lock of
+// whoever moves it now.
+bool HasRemains(const std::string &path) {
+    const char *const files[] = {"-wal", "-shm", "-journal", ".lock"};
+    return std::any_of(std::begin(files), std::end(files), [&](const char *file) {
+        struct stat status {};
+        return lstat((path + file).c_str(), &status) == 0;
+    });
+}
+
+// Creates the database as every handler of the library does: under the lock that excludes whoever moves one
+// away, and with an empty file first, beside which SQLite deletes what a moved one has left. It would use the
+// write-ahead log of that, and roll its journal back. Returns false where the library cannot: its tool needs
+// a name that a shell can be given.
+bool CreateLocked(const std::string &path) {
+    namespace fs = std::filesystem;
+    std::error_code unknown;
+    const TemporaryFile schema((fs::temp_directory_path(unknown) / "kelosyslog-schema-XXXXXX").string(),
+                               kLogsSchema);
+    if (!schema.IsWritten() || !fs::is_directory(fs::path(path).parent_path(), unknown))
+        return false; // the library would create the folder
+    DBHandler database(path, schema.Path());
+    const DBConnectionScope scope(database);
+    return database.DBCon() == 0;
+}
+
 void Create(const std::string &path, int busyTimeoutMs) {
+    if (HasRemains(path) && CreateLocked(path))
+        return;
     const std::string file = path + ".new-" + std::to_string(getpid());
     const ForerunnerRemover remover(file);
     unlink(file.c_str()); // left by a killed process that had our number

@@ -33,8 +33,9 @@ struct LogStoreOptions {
 class LogStore {
 public:
     // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
-    // missing; it appears under its name only when it is complete. A database without any table gets the
-    // schema too. All functions throw SqliteError.
+    // missing; it appears under its name only when it is complete, but where a database that was moved has
+    // left files under its names. A database without any table gets the schema too. All functions throw
+    // SqliteError.
     explicit LogStore(const std::string &path, const LogStoreOptions &options = {});
     ~LogStore();
     LogStore(const LogStore &) = delete;
