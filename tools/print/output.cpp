@@ -32,7 +32,7 @@ std::string PagerCommand() {
 // In the child: the pager reads from the pipe and gets the signals that we ignore.
 [[noreturn]] void RunPager(const std::string &command, int readEnd) {
     dup2(readEnd, STDIN_FILENO);
-    setenv("LESS", "FRX", 0);   // leave when it fits on the screen, show colours
+    setenv("LESS", "FRX", 0); // leave when it fits on the screen, show colours
     if (IsLent())
         setenv("LESSSECURE", "1", 1); // no commands, no other files
     std::signal(SIGPIPE, SIG_DFL);
