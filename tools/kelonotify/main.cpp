@@ -8,6 +8,7 @@
 
 #include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <memory>
 
 #include "base/errors.h"
@@ -67,7 +68,9 @@ void ApplyRoot(std::string &root) {
 
 int Main(int argc, char **argv) {
     std::signal(SIGPIPE, SIG_IGN); // a server that goes away is noticed by the failing write
-    openlog("kelonotify", LOG_PID | LOG_PERROR, LOG_DAEMON);
+    // Where standard error is the journal each message would be there twice.
+    const bool isInJournal = std::getenv("JOURNAL_STREAM") != nullptr;
+    openlog("kelonotify", LOG_PID | (isInJournal ? 0 : LOG_PERROR), LOG_DAEMON);
     NotifierOptions options;
     CLI::App app;
     DeclareCommandLine(app, options);
