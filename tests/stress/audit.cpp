@@ -152,10 +152,8 @@ private:
         ++findings_.tried;
         const std::string who = TextOf(token) + " of " + kDatabaseNames[book_.DatabaseOf(token.worker)];
         const bool isRow = entry.live + entry.aside + entry.archived > 0;
-        if (is(kRefused) && isRow) {
-            ++findings_.refusedButStored;
+        if (is(kRefused) && isRow)
             Fault(who + " was refused and is stored");
-        }
         if (is(kDeleted) && entry.live > 0)
             Fault(who + " was deleted and is there");
         if (entry.live + entry.aside > 1 + entry.again)

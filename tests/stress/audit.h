@@ -17,7 +17,6 @@ struct Findings {
     uint64_t inBytes = 0;   // only as bytes of a file that was set aside
     uint64_t destroyed = 0; // not found: damage has overwritten them
     uint64_t atRisk = 0;    // not found: stored in a file whose write-ahead log was damaged
-    uint64_t refusedButStored = 0;
     std::vector<std::string> faults;
 };
 

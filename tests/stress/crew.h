@@ -32,7 +32,7 @@ public:
     // Waits for the end of all, once the board says that it is over. Kills and complains about what does not
     // end.
     void End();
-    // Takes the work on for this process: a worker with a number of its own.
+    // What this process does itself, it does as a worker.
     Worker &Own() { return own_; }
     uint64_t Kills() const { return kills_; }
 

@@ -9,6 +9,7 @@
 #include <fstream>
 #include <thread>
 
+#include "attic.h"
 #include "audit.h"
 #include "base/files.h"
 #include "crew.h"
@@ -16,7 +17,6 @@
 #include "disk.h"
 #include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
-#include "set_aside.h"
 
 namespace kelo::stress {
 namespace {
@@ -45,7 +45,7 @@ class Disturber {
 public:
     Disturber(const Site &site, const Options &options)
         : site_(site), options_(options), random_(options.seed), disk_(site), board_(Board::Make()),
-          removals_(site), crew_(site, board_, options.seed), ledger_(site, kDamageId, kLogs) {}
+          attic_(site), crew_(site, board_, options.seed), ledger_(site, kDamageId, kLogs) {}
 
     // Returns whether nothing was wrong.
     bool Execute() {
@@ -107,7 +107,7 @@ private:
         if (mayBe && Inflict(damage, site_.PathOf(database), random_, ledger_)) {
             ++damages_[static_cast<size_t>(damage)];
             Remember(std::string("damaged ") + kDamageNames[static_cast<size_t>(damage)], database);
-            removals_.Expect(InodeOf(site_.PathOf(database)), damage == Damage::kWal);
+            attic_.Expect(InodeOf(site_.PathOf(database)), damage == Damage::kWal);
             if (damage == Damage::kWal) {
                 ++board_.risk[database];
                 pending_[database] = {InodeOf(site_.PathOf(database)),
@@ -140,7 +140,7 @@ private:
         if (inode == 0)
             return;
         ++orders_;
-        removals_.Expect(inode);
+        attic_.Expect(inode);
         Remember("ordered aside", database);
         if (fork() == 0) {
             DBConnect_tag *const connection = KELODBConnect(nullptr, nullptr, nullptr, path.c_str());
@@ -171,7 +171,7 @@ private:
     void RemoveFromDisk() {
         crew_.Freeze();
         const std::set<std::string> open = Crew::OpenFiles();
-        removals_.Take([&](const std::string &path) { return open.contains(path); });
+        attic_.Take([&](const std::string &path) { return open.contains(path); });
         crew_.Thaw();
         LimitSize();
     }
@@ -189,13 +189,13 @@ private:
         }
         if (fs::exists(site_.PathOf(kLogs)))
             crew_.Own().RunProgram({"archive", "--remove-archived", "--yes"}, "", 1);
-        removals_.Take([](const std::string &) { return false; });
-        if (removals_.Unexpected() > 0)
-            crew_.Own().Complain(std::to_string(removals_.Unexpected()) +
+        attic_.Take([](const std::string &) { return false; });
+        if (attic_.Unexpected() > 0)
+            crew_.Own().Complain(std::to_string(attic_.Unexpected()) +
                                  " databases were set aside that were neither damaged nor ordered aside");
-        if (removals_.SetAside() > removals_.Notifications())
-            crew_.Own().Complain(std::to_string(removals_.SetAside()) + " databases were set aside with " +
-                                 std::to_string(removals_.Notifications()) + " notifications");
+        if (attic_.SetAside() > attic_.Notifications())
+            crew_.Own().Complain(std::to_string(attic_.SetAside()) + " databases were set aside with " +
+                                 std::to_string(attic_.Notifications()) + " notifications");
     }
 
     bool Report(const Findings &found) const {
@@ -207,7 +207,7 @@ private:
             std::printf("%-26s %8" PRIu64 " and %" PRIu64 " that failed\n", NameOf(static_cast<int>(kind)),
                         board_.done[kind].load(), board_.failed[kind].load());
         std::printf("databases set aside: %" PRIu64 " (%" PRIu64 " ordered), notifications: %" PRIu64 "\n",
-                    removals_.SetAside(), orders_, removals_.Notifications());
+                    attic_.SetAside(), orders_, attic_.Notifications());
         std::printf("tokens tried: %" PRIu64 ", acknowledged and not deleted: %" PRIu64 "; of these %" PRIu64
                     " in databases, %" PRIu64 " in archives, %" PRIu64 " set aside, %" PRIu64
                     " only in the bytes of files set aside, %" PRIu64 " overwritten, %" PRIu64
@@ -229,7 +229,7 @@ private:
     std::mt19937_64 random_;
     Disk disk_;
     Board &board_;
-    Removals removals_;
+    Attic attic_;
     Crew crew_;
     Ledger ledger_;
     std::array<Pending, kDatabases> pending_{};

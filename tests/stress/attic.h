@@ -10,9 +10,9 @@
 namespace kelo::stress {
 
 // What leaves the disk under test while it is in use: it would be full for ever.
-class Removals {
+class Attic {
 public:
-    explicit Removals(const Site &site) : site_(site) {}
+    explicit Attic(const Site &site) : site_(site) {}
 
     // Moves databases that were set aside, archives and notifications to the attic; not those that
     // `isOpen` names. No process may run meanwhile.

@@ -1,4 +1,4 @@
-#include "set_aside.h"
+#include "attic.h"
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -42,14 +42,14 @@ bool IsCompanion(const std::string &name) {
 
 } // namespace
 
-void Removals::Take(const std::function<bool(const std::string &)> &isOpen) {
+void Attic::Take(const std::function<bool(const std::string &)> &isOpen) {
     for (const Database database : {kEvents, kAccounts, kLogs})
         TakeSetAside(database, isOpen);
     TakeArchives(isOpen);
     TakeNotifications();
 }
 
-void Removals::TakeSetAside(Database database, const std::function<bool(const std::string &)> &isOpen) {
+void Attic::TakeSetAside(Database database, const std::function<bool(const std::string &)> &isOpen) {
     const fs::path path = site_.PathOf(database);
     if (IsLocked(path.string() + ".lock")) // a move may be half done
         return;
@@ -74,7 +74,7 @@ void Removals::TakeSetAside(Database database, const std::function<bool(const st
     }
 }
 
-void Removals::TakeArchives(const std::function<bool(const std::string &)> &isOpen) {
+void Attic::TakeArchives(const std::function<bool(const std::string &)> &isOpen) {
     for (const std::string &name : NamesIn(site_.Archives())) {
         const std::string path = site_.Archives() + "/" + name;
         // A note names the records that are still to be removed.
@@ -84,14 +84,14 @@ void Removals::TakeArchives(const std::function<bool(const std::string &)> &isOp
     }
 }
 
-void Removals::TakeNotifications() {
+void Attic::TakeNotifications() {
     for (const std::string &name : NamesIn(site_.Spool())) {
         ++notifications_;
         unlink((site_.Spool() + "/" + name).c_str());
     }
 }
 
-void Removals::Move(const std::string &path, const std::string &name) const {
+void Attic::Move(const std::string &path, const std::string &name) const {
     if (!fs::exists(path))
         return;
     fs::copy_file(path, site_.Attic() + "/" + name);
