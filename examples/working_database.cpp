@@ -13,7 +13,7 @@ int main(int argc, char **argv) {
         return 2;
     openlog("example", LOG_PERROR, LOG_USER);
     const std::string root = argv[1];
-    const std::string path = root + "/var/log/kelolog/logs.db";
+    const std::string path = root + "/var/log/kelosyslog/logs.db";
     DBHandler db(path, root + "/usr/kelo/syslog/schema/logs.sql");
     if (db.DBCreate() != 0)
         return 1;

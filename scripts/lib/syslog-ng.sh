@@ -54,7 +54,7 @@ define() {
 syslog_ng_configure() {
     local root=$1
     cp "$2" "$root/kelosyslog.conf"
-    mkdir -p "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelolog"
+    mkdir -p "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelosyslog" "$root/var/log/kelolog"
     ln -sfn "$(readlink -f "$(dirname "$2")/../schema")" "$root/usr/kelo/syslog/schema"
     define "$root/kelosyslog.conf" kelo_receive "exec $3 receive --root $root"
     define "$root/kelosyslog.conf" kelo_db "$root/logs.db"

@@ -26,7 +26,7 @@ Words Complete(const std::string &words) {
 
 TEST(Completion, OffersWhatGoesWithTheCommandLine) {
     const TempRoot root;
-    fs::create_directories(root.File("var/log/kelolog/archive/nas_2020.db"));
+    fs::create_directories(root.File("var/log/kelosyslog/archive/nas_2020.db"));
     const std::pair<std::string, Words> cases[] = {
         {"re", {"report", "receive"}},
         {"--root / db r", {"reopen"}}, // behind an option with its value

@@ -49,9 +49,11 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     EXPECT_THAT(quarantine.out, HasSubstr("reloaded  no"));
     EXPECT_TRUE(ReadFile(logs_ + ".corrupt") == content);
     EXPECT_TRUE(fs::exists(logs_ + ".corrupt.1/x")) << "what had the name is kept";
-    Expect("db limit 1000000 --db var/log/kelolog/logs.db.corrupt", 1);
-    Expect("db limit 8 --db var/log/kelolog/logs.db.corrupt", 0);
+    Expect("db limit 1000000 --db var/log/kelosyslog/logs.db.corrupt", 1);
+    fs::create_symlink(logs_ + ".corrupt", root_.File("link"));
+    Expect("db limit 8 --db link", 0);
     EXPECT_FALSE(fs::exists(logs_ + ".corrupt"));
+    EXPECT_TRUE(fs::is_symlink(root_.File("link"))) << "the database is removed, not the way to it";
 }
 
 } // namespace

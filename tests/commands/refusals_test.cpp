@@ -110,7 +110,7 @@ TEST_F(Refusals, NameTheWordOfAWrongCommandLine) {
         {"db limit 2147483648", 2, "2147483648"},
         {"db quarantine --force", 2, "--yes"},
         {"report page.html -S today -U yesterday", 2, "--since"},
-        {"events clear-log var/log/kelolog/logs.db", 2, "--yes"},
+        {"events clear-log var/log/kelosyslog/logs.db", 2, "--yes"},
         {"archive --remove-archived", 2, "--yes"},
         {"archive --log ftpxfer", 2, "ftpxfer"},
         {"archive --keep +1d --yes", 2, "+1d"},

@@ -55,7 +55,7 @@ const Write kWrites[] = {
     {"accinfo.sql", "var/log/kelolog/.KELOACCOUNTDB",
      "SELECT (SELECT count(*) FROM eps) / 300.0 * (SELECT sum(count) FROM histogram) / 300.0", Flush},
     {"kelosyslog.sql", "usr/kelo/etc/kelosyslog.db", "SELECT count(*) FROM log", AddEvent},
-    {"logs.sql", "var/log/kelolog/logs.db", "SELECT count(*) / 300.0 FROM logs", Store},
+    {"logs.sql", "var/log/kelosyslog/logs.db", "SELECT count(*) / 300.0 FROM logs", Store},
 };
 
 class LittleRoom : public LibraryTest, public testing::WithParamInterface<Write> {};

@@ -12,6 +12,7 @@
 #include "status/server_status.h"
 #include "status/status_json.h"
 #include "status/status_screen.h"
+#include "status/storage_folder.h"
 #include "support/program_test.h"
 
 namespace kelo::test {
@@ -140,6 +141,23 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     constexpr uint64_t kMiB = 1 << 20;
     status.volumes = {{{"/x"}, 1000 * kMiB, 100 * kMiB}, {{"/y"}, 100 * kMiB, 16 * kMiB}};
     EXPECT_TRUE(FindAttention(status).empty());
+    // Who stores should be the only one who can write the folder, also of a link.
+    fs::create_directories(root_.File("open"));
+    fs::create_symlink(logs_, root_.File("open/link.db"));
+    fs::permissions(root_.File("open"), fs::perms::others_write, fs::perm_options::add);
+    const std::string folder = fs::path(logs_).parent_path();
+    const std::tuple<std::string, fs::perms, std::string> stored[] = {
+        {logs_, fs::perms::owner_all, ""},
+        {logs_, fs::perms::owner_all | fs::perms::group_all, "can write " + folder},
+        {root_.File("open/link.db"), fs::perms::owner_all, "can write " + root_.File("open")},
+    };
+    for (const auto &[path, mode, named] : stored) {
+        fs::permissions(folder, mode);
+        status.syslogNg.destinations = {{"dst.sql", "d_db#0", "sqlite3,,," + path + ",logs"}};
+        const auto problems = FindFolderProblems(status.syslogNg, status.receiver);
+        EXPECT_EQ(problems.size(), named.empty() ? 0U : 1U);
+        EXPECT_THAT(problems, testing::Each(HasSubstr(named)));
+    }
     // A few messages may wait for their batch; many, or few for long, are stuck.
     status.databases.front().last = status.time - 59;
     status.syslogNg.destinations = {{"dst.sql", "d_db#0", "logs.db", 9, 4, 0, 999, 0, true}};

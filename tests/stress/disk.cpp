@@ -22,7 +22,7 @@ Disk::Disk(const Site &site)
     const std::string root = site.Root();
     for (const char *folder :
          {"/usr/kelo/syslog", "/usr/kelo/etc", "/usr/kelo/keloman/webman/modules/Quillbay",
-          "/var/log/kelolog", "/var/spool/kelonotify"})
+          "/var/log/kelosyslog", "/var/log/kelolog", "/var/spool/kelonotify"})
         fs::create_directories(root + folder);
     fs::create_directory(site.Copies());
     fs::create_directory(site.folder + "/run");

@@ -167,7 +167,7 @@ void WriteLikeSyslogNg(Worker &worker) {
 }
 
 void Receive(Worker &worker) {
-    tool::DiskSpaceMonitor volume(worker.site.Root(), worker.site.Root() + "/var/log/kelolog");
+    tool::DiskSpaceMonitor volume(worker.site.Root(), worker.site.Root() + "/var/log/kelosyslog");
     tool::LogWriter writer(worker.Path(), volume);
     int64_t now = 0; // a clock that goes fast, so that no pause is long
     while (!worker.IsOver()) {

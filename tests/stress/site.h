@@ -20,7 +20,7 @@ struct Site {
     std::string Ledgers() const { return folder + "/ledgers"; }
     // What was set aside or archived, moved away from the disk once no process had it open.
     std::string Attic() const { return folder + "/attic"; }
-    std::string Archives() const { return Root() + "/var/log/kelolog/archive"; }
+    std::string Archives() const { return Root() + "/var/log/kelosyslog/archive"; }
     std::string Copies() const { return Root() + "/copies"; }
     std::string Spool() const { return Root() + "/var/spool/kelonotify/new"; }
     // Each line is something that must not happen.
@@ -30,7 +30,7 @@ struct Site {
 
     std::string PathOf(Database database) const {
         static constexpr std::array<const char *, kDatabases> kPaths = {
-            "/usr/kelo/etc/kelosyslog.db", "/var/log/kelolog/.KELOACCOUNTDB", "/var/log/kelolog/logs.db"};
+            "/usr/kelo/etc/kelosyslog.db", "/var/log/kelolog/.KELOACCOUNTDB", "/var/log/kelosyslog/logs.db"};
         return Root() + kPaths[database];
     }
 };

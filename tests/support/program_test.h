@@ -19,8 +19,9 @@ inline std::string LogLines(int first, int count) {
 class ProgramTest : public testing::Test {
 protected:
     ProgramTest() {
-        for (const char *folder : {"usr/kelo/syslog", "usr/kelo/etc", "var/log/kelolog", "etc/kelosyslog",
-                                   "var/spool/kelonotify/new", "var/spool/kelonotify/failed"})
+        for (const char *folder :
+             {"usr/kelo/syslog", "usr/kelo/etc", "var/log/kelosyslog", "var/log/kelolog", "etc/kelosyslog",
+              "var/spool/kelonotify/new", "var/spool/kelonotify/failed"})
             fs::create_directories(root_.File(folder));
         fs::create_symlink(BuildPath("package/schema"), root_.File("usr/kelo/syslog/schema"));
     }
@@ -36,8 +37,8 @@ protected:
 
     static constexpr char kProgram[] = "exec kelosyslog --root . ";
     TempRoot root_;
-    const std::string logs_ = root_.File("var/log/kelolog/logs.db");
-    const std::string archives_ = root_.File("var/log/kelolog/archive");
+    const std::string logs_ = root_.File("var/log/kelosyslog/logs.db");
+    const std::string archives_ = root_.File("var/log/kelosyslog/archive");
     const std::string accounting_ = root_.File("var/log/kelolog/.KELOACCOUNTDB");
     const std::string events_ = root_.File("usr/kelo/etc/kelosyslog.db");
     const std::string rules_ = root_.File("etc/kelosyslog/notify.conf");

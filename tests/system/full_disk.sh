@@ -15,10 +15,10 @@ clean_up() {
 }
 mkdir -p "$root/var"
 mount -t tmpfs -o size=160m tmpfs "$root/var"
-mkdir -p "$root/var/log/kelolog" "$root/var/buffer" "$root/var/ballast" "$root/var/etc" "$root/var/spool/kelonotify" "$root/run/kelosyslog"
+mkdir -p "$root/var/log/kelosyslog" "$root/var/log/kelolog" "$root/var/buffer" "$root/var/ballast" "$root/var/etc" "$root/var/spool/kelonotify" "$root/run/kelosyslog"
 rmdir "$root/usr/kelo/etc"
 ln -s "$root/var/etc" "$root/usr/kelo/etc"
-database=$root/var/log/kelolog/logs.db
+database=$root/var/log/kelosyslog/logs.db
 define "$root/kelosyslog.conf" kelo_store "$1"
 define "$root/kelosyslog.conf" kelo_db "$database"
 define "$root/kelosyslog.conf" kelo_buffer_dir "$root/var/buffer"
@@ -47,7 +47,7 @@ reported() {
     status=0
     "$KELO_BIN_DIR/kelosyslog" status --root "$root" --control "$root/syslog-ng.ctl" >"$root/screen" || status=$?
     ((status == 1)) && grep -qE '^! syslog-ng cannot write [0-9,]+ messages for d_kelo' "$root/screen" &&
-        grep -q "^! the volume of $root/var/log/kelolog is full: " "$root/screen" && (($(received) == stopped))
+        grep -q "^! the volume of $root/var/log/kelosyslog is full: " "$root/screen" && (($(received) == stopped))
 }
 fillers=0
 goes_on() { (($(received) > stopped)); }

@@ -7,7 +7,7 @@ source "$KELO_SOURCE_DIR/scripts/lib/syslog-ng.sh"
 source "$KELO_SOURCE_DIR/scripts/lib/messages.sh"
 
 root=$(mktemp -d)
-database=$root/var/log/kelolog/logs.db
+database=$root/var/log/kelosyslog/logs.db
 clean_up() {
     syslog_ng_stop "$root"
     rm -rf "$root"

@@ -6,6 +6,7 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <filesystem>
 
 namespace kelo::tool {
 namespace {
@@ -57,6 +58,15 @@ bool WriteAll(int fd, std::string_view content) {
             content.remove_prefix(static_cast<size_t>(written));
     }
     return true;
+}
+
+std::string FollowLinks(const std::string &path) {
+    constexpr int kMostLinks = 40; // as the kernel
+    std::filesystem::path file = std::filesystem::absolute(path);
+    std::error_code error;
+    for (int i = 0; i < kMostLinks && std::filesystem::is_symlink(file, error); ++i)
+        file = file.parent_path() / std::filesystem::read_symlink(file, error);
+    return file.string();
 }
 
 TemporaryFile::TemporaryFile(std::string pattern, std::string_view content)

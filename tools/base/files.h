@@ -34,6 +34,10 @@ std::optional<std::string> ReadWhole(const FileHandle &file);
 // Writes all of `content`.
 bool WriteAll(int fd, std::string_view content);
 
+// The absolute path of the file that `path` leads to when its last component is a symbolic link, also where
+// nothing is there yet. What moves or removes a database must do so to the file and leave the link.
+std::string FollowLinks(const std::string &path);
+
 // A file that only its owner can read and that is removed with the object.
 class TemporaryFile {
 public:

@@ -10,8 +10,8 @@
 namespace kelo::tool {
 namespace {
 
-constexpr const char *kFolders[] = {"/var/log/kelolog", "/var/log/kelolog/archive", "/var/lib/syslog-ng",
-                                    "/var/spool/kelonotify", "/usr/kelo/etc"};
+constexpr const char *kFolders[] = {"/var/log/kelosyslog", "/var/log/kelosyslog/archive", "/var/log/kelolog",
+                                    "/var/lib/syslog-ng",  "/var/spool/kelonotify",       "/usr/kelo/etc"};
 
 // The folder, or the nearest existing one above it.
 std::string ExistingFolder(const std::string &path, struct stat &status) {

@@ -251,7 +251,7 @@ void AddArchive(Program &program) {
                                       [options, &program] { return Run(*options, program.root); });
     command->footer(kFooter);
     AddText(*command, "--to", options->to, "FOLDER",
-            "Folder of the archives, which must be there (default: /var/log/kelolog/archive)");
+            "Folder of the archives, which must be there (default: /var/log/kelosyslog/archive)");
     AddText(*command, "--device", options->device, "HOST", "Only the logs of this host (default: all)");
     command->add_flag("--remove-archived", options->isRemoving,
                       "Remove the archived logs from the database, once the archive is complete");

@@ -60,13 +60,14 @@ void RequirePlainPaths(const std::string &path, const std::string &schema) {
 int Create(const CreateOptions &options) {
     const OutputFormat format = options.Format();
     const std::string path = options.Table().path;
+    const std::string named = options.table.db.empty() ? path : fs::absolute(options.table.db).string();
     std::error_code error;
-    const fs::file_status status = fs::symlink_status(path, error);
+    const fs::file_status status = fs::symlink_status(named, error);
     if (status.type() == fs::file_type::none)
-        throw DatabaseError("cannot create " + path + ": " + error.message());
+        throw DatabaseError("cannot create " + named + ": " + error.message());
     if (fs::exists(status)) {
-        const bool leadsNowhere = fs::is_symlink(status) && !fs::exists(path, error);
-        PrintMessage(path + (leadsNowhere ? " is a link to nothing" : " is there already") +
+        const bool leadsNowhere = fs::is_symlink(status) && !fs::exists(named, error);
+        PrintMessage(named + (leadsNowhere ? " is a link to nothing" : " is there already") +
                      "; nothing created");
         return kExitNothing;
     }

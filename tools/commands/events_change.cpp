@@ -111,7 +111,7 @@ struct ClearOptions {
 
 int ClearLog(const EventsOptions &options, const ClearOptions &clear, const std::string &root) {
     RefuseListOptions(options, "clear-log", true);
-    const std::string path = std::filesystem::absolute(clear.database).lexically_normal().string();
+    const std::string path = std::filesystem::path(FollowLinks(clear.database)).lexically_normal().string();
     RequireDatabase(path);
     if (!clear.isConfirmed && !Confirm("clear-log", "delete all logs in " + path)) {
         PrintMessage("nothing deleted");
@@ -122,7 +122,7 @@ int ClearLog(const EventsOptions &options, const ClearOptions &clear, const std:
     if (access(path.c_str(), F_OK) == 0)
         throw DatabaseError("cannot delete " + path);
     // The writer of the working log continues to write into the deleted file until it is reloaded.
-    if (path == root + "/var/log/kelolog/logs.db" && SyslogngHupSignalSend() != 0)
+    if (path == ResolveLogTable({}, root).path && SyslogngHupSignalSend() != 0)
         PrintMessage("syslog-ng was not told and may go on writing to the deleted file; see the system log");
     const std::string events = EventDatabasePath("", root);
     const std::list<Event> newest = ReadEvents(events, 0, 1);

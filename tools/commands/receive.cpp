@@ -25,7 +25,7 @@ constexpr const char *kFooter =
     "SIGHUP reopens the files and loads the rules anew; SIGTERM ends when the input pauses.\n\n"
     "Examples:\n"
     "  kelosyslog receive                                  count the logs and check them against the rules\n"
-    "  kelosyslog receive --db /var/log/kelolog/logs.db    store them too\n\n"
+    "  kelosyslog receive --db /var/log/kelosyslog/logs.db    store them too\n\n"
     "Exit status: 0 the input ended, 2 usage, 4 the input cannot be read.";
 
 struct Options {
@@ -41,7 +41,7 @@ FileHandle LockAgainstOthers(const std::string &root) {
     const std::filesystem::path path = root + "/run/kelosyslog/receive.lock";
     std::error_code ignored; // opening fails then, and says why
     std::filesystem::create_directories(path.parent_path(), ignored);
-    FileHandle file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0640));
+    FileHandle file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600));
     if (file && flock(file.Get(), LOCK_EX | LOCK_NB) == 0)
         return file;
     if (file && errno == EWOULDBLOCK) {

@@ -19,7 +19,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr const char *kWorkingLog = "logs";
-constexpr const char *kWorkingLogPath = "/var/log/kelolog/logs.db";
+constexpr const char *kWorkingLogPath = "/var/log/kelosyslog/logs.db";
 constexpr size_t kHeaderSize = 100;
 using Header = std::array<uint8_t, kHeaderSize>;
 
@@ -94,9 +94,9 @@ LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root
         throw UsageError("--log: goes not together with --db");
     LogTable table;
     if (!options.db.empty()) {
-        table.path = std::filesystem::absolute(options.db).string();
+        table.path = FollowLinks(options.db);
     } else if (options.log.empty() || options.log == kWorkingLog) {
-        table.path = root + kWorkingLogPath;
+        table.path = FollowLinks(root + kWorkingLogPath);
     } else {
         const std::string path = XferlogDBPathGet(options.log.c_str());
         table.path = path.empty() ? ArchivePath(options.log, root) : root + path;
@@ -110,7 +110,7 @@ LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root
 }
 
 std::string ArchiveFolderPath(const std::string &root) {
-    return root + "/var/log/kelolog/archive";
+    return root + "/var/log/kelosyslog/archive";
 }
 
 std::vector<std::string> LogNames() {

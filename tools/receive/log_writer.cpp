@@ -9,6 +9,7 @@
 #include <filesystem>
 
 #include "base/atomic_file.h"
+#include "base/files.h"
 #include "kelosyslog/dbhandler.h"
 
 namespace kelo::tool {
@@ -35,7 +36,7 @@ ino_t InodeOf(const std::string &path) {
 } // namespace
 
 LogWriter::LogWriter(const std::string &path, DiskSpaceMonitor &volume)
-    : path_(std::filesystem::absolute(path)), volume_(volume) {}
+    : path_(FollowLinks(path)), volume_(volume) {}
 
 void LogWriter::Take(_SYSLOG_LOG_DATA_tag &log, int64_t now) {
     if (batch_.Size() == 0)

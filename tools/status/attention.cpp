@@ -110,6 +110,7 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     LookAtSyslogNg(status.syslogNg, lines);
     LookAtQueues(status, lines);
     LookAtReceiver(status.receiver, status.time, lines);
+    lines.insert(lines.end(), status.folderProblems.begin(), status.folderProblems.end());
     LookAtDatabases(status, lines);
     LookAtNotifications(status.notifications, status.time, lines);
     for (const VolumeStatus &volume : status.volumes) {

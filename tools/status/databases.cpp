@@ -24,7 +24,7 @@ using Row = ReadOnlyQuery::Row;
 
 constexpr std::chrono::milliseconds kPatience{150};
 constexpr int64_t kMostCounted = 100'000; // rows; counting them takes a few milliseconds
-constexpr const char *kArchives = "/var/log/kelolog/archive";
+constexpr const char *kArchives = "/var/log/kelosyslog/archive";
 
 std::optional<int64_t> SizeOf(const std::string &path) {
     struct stat status {};

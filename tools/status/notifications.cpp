@@ -1,6 +1,7 @@
 #include "status/notifications.h"
 
 #include <algorithm>
+#include <cerrno>
 
 namespace kelo::tool {
 namespace {
@@ -28,7 +29,10 @@ NotificationStatus GatherNotifications(const std::string &root) {
         status.waiting = ids.size();
         status.failed = spool.FailedIds().size();
         status.oldest = TimeOfFirst(spool, ids);
-        status.channels = ReadChannelHealth(spool, Settings(root));
+        // The settings hold passwords. For a user who may not read them nothing is known of the channels.
+        const Settings settings(root);
+        if (settings.IsReadable() || errno != EACCES)
+            status.channels = ReadChannelHealth(spool, settings);
     } catch (const SpoolError &error) {
         status.problem = error.what();
     }

@@ -7,6 +7,7 @@
 #include <ctime>
 
 #include "base/errors.h"
+#include "status/storage_folder.h"
 
 namespace kelo::tool {
 namespace {
@@ -48,6 +49,7 @@ ServerStatus GatherStatus(const StatusOptions &options) {
     status.time = std::time(nullptr);
     status.syslogNg = GatherSyslogNg(options.root, options.control, options.timeout);
     status.receiver = GatherReceiver(options.root, status.time);
+    status.folderProblems = FindFolderProblems(status.syslogNg, status.receiver);
     std::vector<std::string> others;
     if (!status.receiver.told.database.empty() && MayOpenPathsOf(status.receiver))
         others.push_back(status.receiver.told.database);

@@ -26,6 +26,7 @@ struct ServerStatus {
     NotificationStatus notifications;
     std::vector<Event> events; // newest first
     std::vector<VolumeStatus> volumes;
+    std::vector<std::string> folderProblems; // of folders that syslog-ng or the receiver stores into
 
     // What needs attention, one line each, in the order of the screen; empty for nothing.
     std::vector<std::string> attention;
