@@ -101,6 +101,8 @@ TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
                                     "--fields prog -n 1 --no-pager' log")
                     .out,
                 HasSubstr("\\x1b]0;owned\\x07\r"));
+    RunIn(root_.Path(), "SUDO_UID=1 PAGER='touch ran' exec script -qec 'kelosyslog --root . search' log");
+    EXPECT_FALSE(fs::exists(root_.File("ran"))) << "a rule of sudo for a search is none for other programs";
     RunSql(logs_, "DELETE FROM logs");
     std::string expected;
     int id = 0;
