@@ -44,7 +44,8 @@ std::string WithHeader(std::string content) {
 
 std::string Root() {
     std::string root = FuzzFolder();
-    for (const char *folder : {"/var/log/kelolog", "/usr/kelo/etc", "/usr/kelo/syslog/schema"})
+    for (const char *folder :
+         {"/var/log/kelosyslog", "/var/log/kelolog", "/usr/kelo/etc", "/usr/kelo/syslog/schema"})
         std::filesystem::create_directories(root + folder);
     SyslogRootSet(root);
     KELORootSet(root.c_str());
@@ -81,7 +82,7 @@ void Change(const std::string &path, const std::string &root) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     static const std::string root = Root();
     const std::string content = WithHeader({reinterpret_cast<const char *>(data), size});
-    const std::string logs = root + "/var/log/kelolog/logs.db";
+    const std::string logs = root + "/var/log/kelosyslog/logs.db";
     const std::string accounting = root + "/var/log/kelolog/.KELOACCOUNTDB";
     const std::string events = root + "/usr/kelo/etc/kelosyslog.db";
     for (const std::string &path : {logs, accounting, events}) {

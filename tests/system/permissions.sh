@@ -79,6 +79,10 @@ hold adm "$database" "SELECT count(*) FROM logs;"
 syslog_ng_stop "$root" KILL # the write-ahead log stays
 kill_holder
 read_by_adm "after a kill"
+mv "$database-shm" "$root"
+adm "${program[@]}" count 2>"$root/out" || true
+grep -q "without $database-shm, which is missing" "$root/out" || fail "what adm is told: $(<"$root/out")"
+mv "$root/logs.db-shm" "$logs"
 hold service "$database" "SELECT count(*) FROM logs;"
 kill_holder
 syslog_ng_start "$root"

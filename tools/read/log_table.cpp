@@ -48,6 +48,13 @@ bool IsShorterThanItSays(const Header &header, int64_t fileSize) {
     return pages * pageSize > fileSize;
 }
 
+// Whoever may write to the folder creates the index.
+bool HasLogWithoutIndex(const std::string &path) {
+    struct stat status {};
+    return stat((path + "-wal").c_str(), &status) == 0 && status.st_size > 0 &&
+           access((path + "-shm").c_str(), F_OK) != 0;
+}
+
 std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
     struct stat status {};
     if (stat(table.path.c_str(), &status) != 0)
@@ -70,6 +77,9 @@ std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
     const std::string folder = std::filesystem::path(table.path).parent_path().string();
     if (forWriting && (access(table.path.c_str(), W_OK) != 0 || access(folder.c_str(), W_OK) != 0))
         return "no permission to write to it and its folder";
+    if (access(folder.c_str(), W_OK) != 0 && HasLogWithoutIndex(table.path))
+        return "its write-ahead log cannot be read without " + table.path +
+               "-shm, which is missing; syslog-ng creates it, or any reading by root";
     return "no usable table '" + table.name + "' in it, or it is locked or damaged; see the system log";
 }
 
