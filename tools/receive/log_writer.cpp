@@ -7,9 +7,11 @@
 
 #include <cerrno>
 #include <filesystem>
+#include <memory>
 
 #include "base/atomic_file.h"
 #include "base/files.h"
+#include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
 
 namespace kelo::tool {
@@ -112,12 +114,15 @@ void LogWriter::Pause(const SqliteError &error, int64_t now) {
 
 // Returns after how many milliseconds to try again.
 int64_t LogWriter::PutAside() {
-    // Another program may have detected the damage first, and then the file with this name is intact.
+    // Another program may detect the damage first, and then the file with this name is intact. The connection
+    // is that of the damaged file if the store's still has the name afterwards.
+    const std::unique_ptr<DBConnect_tag, decltype(&KELODBClose)> connection(
+        KELODBConnect(nullptr, nullptr, nullptr, path_.c_str()), &KELODBClose);
     const bool isAside = store_ && store_->HasMoved();
     const ino_t damaged = InodeOf(path_);
     store_.reset();
     if (!isAside)
-        DBErrorHandle_SQLITE_CORRUPT(nullptr, path_);
+        DBErrorHandle_SQLITE_CORRUPT(connection.get(), path_);
     // A reader may have made an empty file of that name since.
     return !isAside && damaged != 0 && InodeOf(path_) == damaged ? kRetryDamagedMs : kRetrySoonMs;
 }
