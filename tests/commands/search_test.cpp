@@ -18,7 +18,8 @@ TEST_F(Search, PrintsTheNewestLogsOldestFirstAndTellsMatchFromNoMatch) {
            "100,2020-01-01T00:01:39+00:00\r\n");
     Expect("search -r -n 2 --offset 1 -o csv --fields id", 0, "id\r\n99\r\n95\r\n");
     Expect("search -H nowhere", 1, "");
-    Expect("search -n1 --db $PWD/var/log/kelosyslog/logs.db -o csv --no-header --fields host", 0, "host49\r\n");
+    Expect("search -n1 --db $PWD/var/log/kelosyslog/logs.db -o csv --no-header --fields host", 0,
+           "host49\r\n");
     EXPECT_EQ(RunIn(root_.Path(), "TZ=IST-5:30 kelosyslog --root ./ search -n1 -o short").out.substr(0, 15),
               "Jan 01 05:31:39");
     Expect("count -H delete", 1);

@@ -14,7 +14,8 @@ class ReceiveProgram : public ProgramTest {
 protected:
     // The receiver, after the shell's commands in `before`.
     ChildProgram Start(const std::string &before = "") const {
-        return {root_.Path(), before + kProgram + "receive -v --db var/log/kelosyslog/logs.db --notify-limit 3"};
+        return {root_.Path(),
+                before + kProgram + "receive -v --db var/log/kelosyslog/logs.db --notify-limit 3"};
     }
     // Empty while the database is missing or has no table yet.
     static std::string Query(const std::string &path, const char *sql) {
