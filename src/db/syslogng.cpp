@@ -30,7 +30,8 @@ int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib) {
     if (int64_t{status.st_size} / 1024 > limitKib) {
         {
             const kelo::DatabaseLock lock(dbPath);
-            kelo::RemoveDatabase(dbPath);
+            if (lock.MayGoOn())
+                kelo::RemoveDatabase(dbPath);
         }
         SyslogngHupSignalSend();
     }

@@ -84,7 +84,8 @@ int Logger::LogAddLogClear(std::string dbPath, std::string user) const {
 int Logger::LogClear(std::string dbPath, std::string user) const {
     {
         const kelo::DatabaseLock lock(dbPath);
-        kelo::RemoveDatabase(dbPath);
+        if (lock.MayGoOn())
+            kelo::RemoveDatabase(dbPath);
     }
     if (LogAddLogClear(dbPath, user) < 0) {
         kelo::ReportErrorAt("logger", 638,
