@@ -1,5 +1,7 @@
 #include "cli/completion.h"
 
+#include <CLI/CLI.hpp>
+
 #include <utility>
 
 namespace kelo::tool {
@@ -18,33 +20,33 @@ constexpr std::pair<const char *, const char *> kOffersOfTypes[] = {
     {"TIME", "words now today yesterday 1h 1d 1w"},
 };
 
-CLI::Option *Offer(CLI::Option *option, std::string offer, const std::vector<std::string> &words) {
+Option Offer(Option option, std::string offer, const std::vector<std::string> &words) {
     for (const std::string &word : words)
         offer += " " + word;
-    return option->check(CLI::Validator(offer).name(kOffer).active(false));
+    option.Parsed().check(CLI::Validator(offer).name(kOffer).active(false));
+    return option;
 }
 
 } // namespace
 
-CLI::Option *OfferWords(CLI::Option *option, const std::vector<std::string> &words,
-                        const std::string &after) {
+Option OfferWords(Option option, const std::vector<std::string> &words, const std::string &after) {
     return Offer(option, after.empty() ? "words" : "after " + after + " words", words);
 }
 
-CLI::Option *OfferList(CLI::Option *option, const std::vector<std::string> &words) {
+Option OfferList(Option option, const std::vector<std::string> &words) {
     return Offer(option, "list", words);
 }
 
-CLI::Option *OfferLogs(CLI::Option *option, const std::vector<std::string> &words) {
+Option OfferLogs(Option option, const std::vector<std::string> &words) {
     return Offer(option, "logs", words);
 }
 
-std::string CompletionOf(CLI::Option &option) {
+std::string CompletionOf(const Option &option) {
     try {
-        return CLI::Validator(*option.get_validator(kOffer)).active().get_description();
+        return CLI::Validator(*option.Parsed().get_validator(kOffer)).active().get_description();
     } catch (const CLI::OptionNotFound &) {
         for (const auto &[type, offer] : kOffersOfTypes) {
-            if (option.get_type_name() == type)
+            if (option.Parsed().get_type_name() == type)
                 return offer;
         }
         return "nothing";

@@ -1,5 +1,7 @@
 #include "cli/program.h"
 
+#include <CLI/CLI.hpp>
+
 #include <charconv>
 #include <cstdio>
 
@@ -7,6 +9,7 @@
 #include "base/text_encoding.h"
 #include "cli/command_line.h"
 #include "cli/exit_status.h"
+#include "cli/help_formatter.h"
 #include "keloplatform/root.h"
 #include "kelosyslog/root.h"
 
@@ -38,16 +41,9 @@ void ApplyRoot(std::string &root) {
         throw UsageError("--root: cannot use '" + root + "'");
 }
 
-void RequireValues(const std::string &names, const CLI::results_t &values) {
-    for (const std::string &value : values) {
-        if (value.empty())
-            throw UsageError(names.substr(names.rfind("--")) + ": empty value");
-    }
-}
-
 int RunCommand(Program &program, int argc, const char *const *argv) {
     std::vector<std::string> arguments = SplitEmptyValues(argc, argv);
-    program.app.parse(arguments);
+    program.app->parse(arguments);
     if (!program.run)
         throw UsageError("a command is missing (see --help)");
     ApplyRoot(program.root);
@@ -63,44 +59,28 @@ int RunCommand(Program &program, int argc, const char *const *argv) {
 
 } // namespace
 
-CLI::App *AddSubcommand(Program &program, const std::string &name, const std::string &description,
-                        std::function<int()> run) {
-    return AddSubcommand(program, program.app, name, description, std::move(run));
+Program::Program(const std::string &name, const std::string &description, const std::string &version)
+    : app(std::make_unique<CLI::App>(description, name)) {
+    app->set_version_flag("--version", name + " " + version);
+    app->formatter(std::make_shared<HelpFormatter>());
 }
 
-CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &name,
-                        const std::string &description, std::function<int()> run) {
-    CLI::App *command = parent.add_subcommand(name, description);
-    command->fallthrough();
-    command->callback([&program, run = std::move(run)] { program.run = run; });
+Program::~Program() = default;
+
+Command AddSubcommand(Program &program, const std::string &name, const std::string &description,
+                      std::function<int()> run) {
+    return AddSubcommand(program, program.Top(), name, description, std::move(run));
+}
+
+Command AddSubcommand(Program &program, Command parent, const std::string &name,
+                      const std::string &description, std::function<int()> run) {
+    Command command = parent.AddBelow(name, description);
+    command.WhenChosen([&program, run = std::move(run)] { program.run = run; });
     return command;
 }
 
-CLI::Option *AddTexts(CLI::App &command, const std::string &names, std::vector<std::string> &values,
-                      const std::string &typeName, const std::string &description) {
-    // A vector option would read "{}" as "no value" and "[a]" as a list.
-    const auto take = [&values, names](const CLI::results_t &results) {
-        RequireValues(names, results);
-        values = results;
-        return true;
-    };
-    return command.add_option(names, take, description)
-        ->type_name(typeName)
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
-}
-
-CLI::Option *AddText(CLI::App &command, const std::string &names, std::string &value,
-                     const std::string &typeName, const std::string &description) {
-    const auto take = [&value, names](const CLI::results_t &results) {
-        RequireValues(names, results);
-        value = results.back();
-        return true;
-    };
-    return command.add_option(names, take, description)->type_name(typeName);
-}
-
 void AddRoot(Program &program) {
-    AddText(program.app, "--root", program.root, "DIR", "Look for the system's logs below DIR");
+    program.Top().AddText("--root", program.root, "DIR", "Look for the system's logs below DIR");
 }
 
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum) {
@@ -119,7 +99,7 @@ void PrintMessage(const std::string &text) {
 }
 
 int RunProgram(Program &program, int argc, const char *const *argv) {
-    return RunApp(program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
+    return RunApp(*program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
                   [&] { return RunCommand(program, argc, argv); });
 }
 

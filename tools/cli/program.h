@@ -1,9 +1,11 @@
 #pragma once
 
-#include <CLI/CLI.hpp>
-
+#include <cstdint>
 #include <functional>
+#include <memory>
 #include <string>
+
+#include "cli/command.h"
 
 namespace kelo::tool {
 
@@ -14,36 +16,34 @@ namespace kelo::tool {
 //
 //     void AddCount(Program &program) {
 //         auto options = std::make_shared<Options>();
-//         CLI::App *command = AddSubcommand(program, "count", "Count logs", [options] { return Run(*options);
+//         Command command = AddSubcommand(program, "count", "Count logs", [options] { return Run(*options);
 //         });
 //         ...
 //     }
 //
 // `run` returns an ExitStatus; it may throw the exceptions of errors.h.
 struct Program {
-    CLI::App app;
+    Program(const std::string &name, const std::string &description, const std::string &version);
+    ~Program();
+    Program(const Program &) = delete;
+    Program &operator=(const Program &) = delete;
+
+    Command Top() const { return Command(*app); }
+
+    std::unique_ptr<CLI::App> app;
     std::string root;         // --root, absolute or empty
     std::function<int()> run; // set by the chosen subcommand
 };
 
 // Adds a subcommand; the program runs `run` after the whole command line was read and --root was applied.
-CLI::App *AddSubcommand(Program &program, const std::string &name, const std::string &description,
-                        std::function<int()> run);
+Command AddSubcommand(Program &program, const std::string &name, const std::string &description,
+                      std::function<int()> run);
 // The same below a subcommand, `parent`.
-CLI::App *AddSubcommand(Program &program, CLI::App &parent, const std::string &name,
-                        const std::string &description, std::function<int()> run);
+Command AddSubcommand(Program &program, Command parent, const std::string &name,
+                      const std::string &description, std::function<int()> run);
 
 // Adds --root, which goes with every subcommand.
 void AddRoot(Program &program);
-
-// Adds an option whose values arrive as they were typed, one per occurrence; none is split or interpreted. An
-// empty value is a usage error, because it probably is an unset shell variable.
-CLI::Option *AddTexts(CLI::App &command, const std::string &names, std::vector<std::string> &values,
-                      const std::string &typeName, const std::string &description);
-
-// The same for an option that may occur only once.
-CLI::Option *AddText(CLI::App &command, const std::string &names, std::string &value,
-                     const std::string &typeName, const std::string &description);
 
 // Reads a whole number from `minimum` to `maximum`; throws UsageError naming `option` and `text` otherwise.
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum);

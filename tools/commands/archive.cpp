@@ -247,29 +247,29 @@ int Run(const Options &options, const std::string &root) {
 
 void AddArchive(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "archive", "Copy logs into an archive, and keep the archives",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddText(*command, "--to", options->to, "FOLDER",
-            "Folder of the archives, which must be there (default: /var/log/kelosyslog/archive)");
-    AddText(*command, "--device", options->device, "HOST", "Only the logs of this host (default: all)");
-    command->add_flag("--remove-archived", options->isRemoving,
-                      "Remove the archived logs from the database, once the archive is complete");
-    AddText(*command, "--keep", options->keep, "AGE",
-            "Remove archives whose last log is older, for example 90d");
-    AddText(*command, "--keep-size", options->keepSize, "SIZE",
-            "Remove the oldest archives until all take no more than this, for example 10G");
-    command->add_flag("--prune", options->isPruning, "Archive nothing, only remove old archives");
-    command->add_flag("--list", options->isListing, "List the archives, oldest first");
-    command->add_flag("--dry-run", options->isDryRun, "Only tell what would be archived and removed");
-    command->add_flag("-y,--yes", options->isConfirmed, "Do not ask");
-    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
-                       "--list: text (default), json (one array), jsonl (an object per line), csv, "
-                       "spreadsheet (csv without formulas)"),
+    Command command = AddSubcommand(program, "archive", "Copy logs into an archive, and keep the archives",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    command.AddText("--to", options->to, "FOLDER",
+                    "Folder of the archives, which must be there (default: /var/log/kelosyslog/archive)");
+    command.AddText("--device", options->device, "HOST", "Only the logs of this host (default: all)");
+    command.AddFlag("--remove-archived", options->isRemoving,
+                    "Remove the archived logs from the database, once the archive is complete");
+    command.AddText("--keep", options->keep, "AGE",
+                    "Remove archives whose last log is older, for example 90d");
+    command.AddText("--keep-size", options->keepSize, "SIZE",
+                    "Remove the oldest archives until all take no more than this, for example 10G");
+    command.AddFlag("--prune", options->isPruning, "Archive nothing, only remove old archives");
+    command.AddFlag("--list", options->isListing, "List the archives, oldest first");
+    command.AddFlag("--dry-run", options->isDryRun, "Only tell what would be archived and removed");
+    command.AddFlag("-y,--yes", options->isConfirmed, "Do not ask");
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
+                               "--list: text (default), json (one array), jsonl (an object per line), csv, "
+                               "spreadsheet (csv without formulas)"),
                {"text", "json", "jsonl", "csv", "spreadsheet"});
-    command->add_flag("--no-header", options->noHeader, "--list: no heading in text and csv");
-    AddUtcOption(*command, options->inUtc);
-    AddTableOptions(*command, options->table, false);
+    command.AddFlag("--no-header", options->noHeader, "--list: no heading in text and csv");
+    AddUtcOption(command, options->inUtc);
+    AddTableOptions(command, options->table, false);
 }
 
 } // namespace kelo::tool

@@ -4,8 +4,10 @@
 
 namespace kelo::tool {
 
-// Everything that the command line of kelosyslog knows.
-void DeclareCommandLine(Program &program);
+// kelosyslog with its whole command line.
+struct KelosyslogProgram : Program {
+    KelosyslogProgram();
+};
 
 // The subcommands, each in the file with its name.
 void AddSearch(Program &program);

@@ -9,51 +9,54 @@
 
 namespace kelo::tool {
 
-void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable) {
+void AddTableOptions(Command command, LogTableOptions &options, bool withTable) {
     const std::string group = "Where to look";
-    AddText(command, "--db", options.db, "PATH", "This log database")->group(group);
-    OfferLogs(AddText(command, "--log", options.log, "NAME",
-                      "One of the system's logs: " + KnownLogNames() +
-                          " (default: logs), or an archive by its name"),
+    command.AddText("--db", options.db, "PATH", "This log database").Group(group);
+    OfferLogs(command.AddText("--log", options.log, "NAME",
+                              "One of the system's logs: " + KnownLogNames() +
+                                  " (default: logs), or an archive by its name"),
               LogNames())
-        ->group(group);
+        .Group(group);
     if (withTable)
-        OfferWords(
-            AddText(command, "--table", options.table, "TABLE",
-                    "logs (default), general_log, connection_log or transfer_log; the last three have no "
-                    "facility and take times from ldate and ltime, and a transfer_log has no level and no "
-                    "message"),
-            {"logs", "general_log", "connection_log", "transfer_log"})
-            ->group(group);
+        OfferWords(command.AddText(
+                       "--table", options.table, "TABLE",
+                       "logs (default), general_log, connection_log or transfer_log; the last three have no "
+                       "facility and take times from ldate and ltime, and a transfer_log has no level and no "
+                       "message"),
+                   {"logs", "general_log", "connection_log", "transfer_log"})
+            .Group(group);
 }
 
-void AddFilterOptions(CLI::App &command, LogFilter &filter) {
+void AddFilterOptions(Command command, LogFilter &filter) {
     const std::string group = "Which logs (values separated by commas are alternatives; '!value' excludes)";
-    AddText(command, "-S,--since", filter.since, "TIME", "From this time on")->group(group);
-    AddText(
-        command, "-U,--until", filter.until, "TIME",
-        "Up to this second; a day alone ends before it begins. TIME: 2020-01-02, '2020/01/02 10:11[:12]', "
-        "10:11, today, 'yesterday 18:00', now, 1h or -1h, '2 days ago', @1577836800")
-        ->group(group);
-    OfferList(AddTexts(command, "-p,--priority", filter.severities, "LEVEL",
-                       "Severity by name or number. A single one means it and all more severe; "
-                       "warning..emerg is a range; err..err is err alone, and so is each of several"),
+    command.AddText("-S,--since", filter.since, "TIME", "From this time on").Group(group);
+    command
+        .AddText("-U,--until", filter.until, "TIME",
+                 "Up to this second; a day alone ends before it begins. TIME: 2020-01-02, '2020/01/02 "
+                 "10:11[:12]', "
+                 "10:11, today, 'yesterday 18:00', now, 1h or -1h, '2 days ago', @1577836800")
+        .Group(group);
+    OfferList(command.AddTexts("-p,--priority", filter.severities, "LEVEL",
+                               "Severity by name or number. A single one means it and all more severe; "
+                               "warning..emerg is a range; err..err is err alone, and so is each of several"),
               SeverityNames())
-        ->group(group);
-    OfferList(AddTexts(command, "--facility", filter.facilities, "NAME", "Facility by name or number"),
+        .Group(group);
+    OfferList(command.AddTexts("--facility", filter.facilities, "NAME", "Facility by name or number"),
               FacilityNames())
-        ->group(group);
-    AddTexts(command, "-H,--host", filter.hosts, "HOST", "Sending host; * and ? are wildcards")->group(group);
-    AddTexts(command, "-t,--program", filter.programs, "PROGRAM", "Program; * and ? are wildcards")
-        ->group(group);
-    AddTexts(command, "-g,--grep", filter.keywords, "KEYWORDS",
-             "Message: words that all occur, \"a phrase\", one OR other, -without, wild*card, /regex/; exact "
-             "in case when it has capitals. Given twice, both must match")
-        ->group(group);
+        .Group(group);
+    command.AddTexts("-H,--host", filter.hosts, "HOST", "Sending host; * and ? are wildcards").Group(group);
+    command.AddTexts("-t,--program", filter.programs, "PROGRAM", "Program; * and ? are wildcards")
+        .Group(group);
+    command
+        .AddTexts(
+            "-g,--grep", filter.keywords, "KEYWORDS",
+            "Message: words that all occur, \"a phrase\", one OR other, -without, wild*card, /regex/; exact "
+            "in case when it has capitals. Given twice, both must match")
+        .Group(group);
 }
 
-void AddUtcOption(CLI::App &command, bool &inUtc) {
-    command.add_flag("--utc", inUtc, "Read and print times in UTC, not in local time");
+void AddUtcOption(Command command, bool &inUtc) {
+    command.AddFlag("--utc", inUtc, "Read and print times in UTC, not in local time");
 }
 
 void ApplyUtc(bool inUtc) {
@@ -63,25 +66,26 @@ void ApplyUtc(bool inUtc) {
     tzset();
 }
 
-void AddOutputOptions(CLI::App &command, OutputOptions &options) {
+void AddOutputOptions(Command command, OutputOptions &options) {
     const std::string group = "How to print";
-    OfferWords(AddText(command, "-o,--output", options.format, "FORMAT",
-                       "text (default), short, json (one array), jsonl (an object per line), csv, "
-                       "spreadsheet (csv without formulas)"),
+    OfferWords(command.AddText("-o,--output", options.format, "FORMAT",
+                               "text (default), short, json (one array), jsonl (an object per line), csv, "
+                               "spreadsheet (csv without formulas)"),
                {"text", "short", "json", "jsonl", "csv", "spreadsheet"})
-        ->group(group);
-    OfferList(AddText(command, "--fields", options.fields, "NAMES",
-                      "These fields, in this order: column names, and 'time'. Default: what people read in "
-                      "text, else all"),
-              FieldNames())
-        ->group(group);
-    command.add_flag("--no-header", options.noHeader, "No heading in text, csv and spreadsheet")
-        ->group(group);
-    command.add_flag("--utc", options.inUtc, "Read and print times in UTC, not in local time")->group(group);
-    AddText(command, "--color", options.colour, "WHEN",
-            "auto (default: on a terminal, unless NO_COLOR is set), always, never")
-        ->group(group);
-    command.add_flag("--no-pager", options.noPager, "Do not start PAGER on a terminal")->group(group);
+        .Group(group);
+    OfferList(
+        command.AddText("--fields", options.fields, "NAMES",
+                        "These fields, in this order: column names, and 'time'. Default: what people read in "
+                        "text, else all"),
+        FieldNames())
+        .Group(group);
+    command.AddFlag("--no-header", options.noHeader, "No heading in text, csv and spreadsheet").Group(group);
+    command.AddFlag("--utc", options.inUtc, "Read and print times in UTC, not in local time").Group(group);
+    command
+        .AddText("--color", options.colour, "WHEN",
+                 "auto (default: on a terminal, unless NO_COLOR is set), always, never")
+        .Group(group);
+    command.AddFlag("--no-pager", options.noPager, "Do not start PAGER on a terminal").Group(group);
 }
 
 RecordLayout MakeLayout(const OutputOptions &options, TableKind kind) {
@@ -99,8 +103,8 @@ RecordLayout MakeLayout(const OutputOptions &options, TableKind kind) {
     return layout;
 }
 
-void AddKeyValuesFormat(CLI::App &command, std::string &format) {
-    OfferWords(AddText(command, "-o,--output", format, "FORMAT", "text (default) or json (one object)"),
+void AddKeyValuesFormat(Command command, std::string &format) {
+    OfferWords(command.AddText("-o,--output", format, "FORMAT", "text (default) or json (one object)"),
                {"text", "json"});
 }
 

@@ -14,13 +14,13 @@ namespace kelo::tool {
 // Options that several subcommands share. Each struct must outlive the use of the command line.
 
 // --db, --log and --table.
-void AddTableOptions(CLI::App &command, LogTableOptions &options, bool withTable = true);
+void AddTableOptions(Command command, LogTableOptions &options, bool withTable = true);
 
 // --since, --until, --priority, --facility, --host, --program and --grep.
-void AddFilterOptions(CLI::App &command, LogFilter &filter);
+void AddFilterOptions(Command command, LogFilter &filter);
 
 // --utc. It sets the time zone of the process, so that times are also read as UTC.
-void AddUtcOption(CLI::App &command, bool &inUtc);
+void AddUtcOption(Command command, bool &inUtc);
 void ApplyUtc(bool inUtc);
 
 struct OutputOptions {
@@ -33,13 +33,13 @@ struct OutputOptions {
 };
 
 // --output, --fields, --no-header, --utc, --color and --no-pager.
-void AddOutputOptions(CLI::App &command, OutputOptions &options);
+void AddOutputOptions(Command command, OutputOptions &options);
 
 // The options for a table of this kind. Throws UsageError.
 RecordLayout MakeLayout(const OutputOptions &options, TableKind kind);
 
 // --output of the commands that print text or one JSON object.
-void AddKeyValuesFormat(CLI::App &command, std::string &format);
+void AddKeyValuesFormat(Command command, std::string &format);
 // The format of that name. Throws UsageError for any but text and json.
 OutputFormat ParseKeyValuesFormat(const std::string &format);
 

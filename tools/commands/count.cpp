@@ -41,15 +41,14 @@ int Run(const Options &options, const std::string &root) {
 
 void AddCount(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "count", "Print the number of logs",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddFilterOptions(*command, options->filter);
-    command->add_flag(
-        "--estimate", options->isEstimate,
-        "The largest id instead: instant however large the table is, but deleted logs count too");
-    AddUtcOption(*command, options->inUtc);
-    AddTableOptions(*command, options->table);
+    Command command = AddSubcommand(program, "count", "Print the number of logs",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    AddFilterOptions(command, options->filter);
+    command.AddFlag("--estimate", options->isEstimate,
+                    "The largest id instead: instant however large the table is, but deleted logs count too");
+    AddUtcOption(command, options->inUtc);
+    AddTableOptions(command, options->table);
 }
 
 } // namespace kelo::tool

@@ -16,21 +16,20 @@ constexpr const char *kFooter =
 
 } // namespace
 
-CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
-                       const std::string &description, DbOptions &options, std::function<int()> run) {
-    CLI::App *command = AddSubcommand(program, db, name, description, std::move(run));
+Command AddDbCommand(Program &program, Command db, const std::string &name, const std::string &description,
+                     DbOptions &options, std::function<int()> run) {
+    Command command = AddSubcommand(program, db, name, description, std::move(run));
     options.root = &program.root;
-    AddKeyValuesFormat(*command, options.format);
+    AddKeyValuesFormat(command, options.format);
     return command;
 }
 
 void AddDb(Program &program) {
-    CLI::App *db = program.app.add_subcommand("db", "Create, inspect and maintain a log database");
-    db->fallthrough();
-    db->require_subcommand(1);
-    db->footer(kFooter);
-    AddDbInspection(program, *db);
-    AddDbMaintenance(program, *db);
+    Command db = program.Top().AddBelow("db", "Create, inspect and maintain a log database");
+    db.NeedBelow(1, 1);
+    db.Footer(kFooter);
+    AddDbInspection(program, db);
+    AddDbMaintenance(program, db);
 }
 
 } // namespace kelo::tool

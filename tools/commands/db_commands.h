@@ -19,16 +19,16 @@ struct DbOptions {
 };
 
 // Adds a command of "kelosyslog db" with these options.
-CLI::App *AddDbCommand(Program &program, CLI::App &db, const std::string &name,
-                       const std::string &description, DbOptions &options, std::function<int()> run);
+Command AddDbCommand(Program &program, Command db, const std::string &name, const std::string &description,
+                     DbOptions &options, std::function<int()> run);
 
 // What a check of the whole database finds, a line each; empty for a sound one. Throws DatabaseError: a
 // SqliteError where SQLite cannot go on, for example with the code of a damaged file.
 std::vector<std::string> FindProblems(const LogTable &table);
 
 // Commands that only read: info, check.
-void AddDbInspection(Program &program, CLI::App &db);
+void AddDbInspection(Program &program, Command db);
 // Commands that change a database: create, wal, limit, set-device, quarantine, reopen.
-void AddDbMaintenance(Program &program, CLI::App &db);
+void AddDbMaintenance(Program &program, Command db);
 
 } // namespace kelo::tool

@@ -136,18 +136,17 @@ std::vector<std::string> FindProblems(const LogTable &table) {
     return lines;
 }
 
-void AddDbInspection(Program &program, CLI::App &db) {
+void AddDbInspection(Program &program, Command db) {
     auto infoOptions = std::make_shared<DbOptions>();
-    CLI::App *info =
-        AddDbCommand(program, db, "info", "Tell size, journal mode, rows and times of a database",
-                     *infoOptions, [infoOptions] { return Info(*infoOptions); });
-    AddTableOptions(*info, infoOptions->table, false);
+    Command info = AddDbCommand(program, db, "info", "Tell size, journal mode, rows and times of a database",
+                                *infoOptions, [infoOptions] { return Info(*infoOptions); });
+    AddTableOptions(info, infoOptions->table, false);
 
     auto checkOptions = std::make_shared<DbOptions>();
-    CLI::App *check =
+    Command check =
         AddDbCommand(program, db, "check", "Check every page and row of a database; changes nothing",
                      *checkOptions, [checkOptions] { return Check(*checkOptions); });
-    AddTableOptions(*check, checkOptions->table, false);
+    AddTableOptions(check, checkOptions->table, false);
 }
 
 } // namespace kelo::tool

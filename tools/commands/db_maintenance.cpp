@@ -232,41 +232,37 @@ int Reopen(const DbOptions &options) {
 
 // A command with options of type `Options` that works on the database of --db.
 template <typename Options>
-CLI::App *Add(Program &program, CLI::App &db, const char *name, const char *description,
-              std::shared_ptr<Options> options, int (*run)(const Options &)) {
-    CLI::App *command =
+Command Add(Program &program, Command db, const char *name, const char *description,
+            std::shared_ptr<Options> options, int (*run)(const Options &)) {
+    Command command =
         AddDbCommand(program, db, name, description, *options, [options, run] { return run(*options); });
-    AddText(*command, "--db", options->table.db, "PATH", "This log database (default: the working log)");
+    command.AddText("--db", options->table.db, "PATH", "This log database (default: the working log)");
     return command;
 }
 
 } // namespace
 
-void AddDbMaintenance(Program &program, CLI::App &db) {
+void AddDbMaintenance(Program &program, Command db) {
     auto create = std::make_shared<CreateOptions>();
-    AddText(*Add(program, db, "create", "Create a database, with its folder, that is not there yet", create,
-                 Create),
-            "--schema", create->schema, "FILE",
-            "SQL that creates the tables (default: that of the working log)");
+    Add(program, db, "create", "Create a database, with its folder, that is not there yet", create, Create)
+        .AddText("--schema", create->schema, "FILE",
+                 "SQL that creates the tables (default: that of the working log)");
     Add(program, db, "wal", "Switch to write-ahead logging and empty the log into the database",
         std::make_shared<DbOptions>(), SetWal);
     auto limit = std::make_shared<LimitOptions>();
-    AddText(*Add(program, db, "limit",
-                 "Throw a working database away that is larger than KIB; syslog-ng begins a new one", limit,
-                 Limit),
-            "kib", limit->kib, "", "The largest size that is kept, in KiB")
-        ->required();
+    Add(program, db, "limit",
+        "Throw a working database away that is larger than KIB; syslog-ng begins a new one", limit, Limit)
+        .AddText("kib", limit->kib, "", "The largest size that is kept, in KiB")
+        .Required();
     auto device = std::make_shared<DeviceOptions>();
-    AddText(*Add(program, db, "set-device", "Write the device that an archive's logs came from", device,
-                 SetDevice),
-            "device", device->device, "", "Name of the device")
-        ->required();
+    Add(program, db, "set-device", "Write the device that an archive's logs came from", device, SetDevice)
+        .AddText("device", device->device, "", "Name of the device")
+        .Required();
     auto quarantine = std::make_shared<QuarantineOptions>();
-    CLI::App *command =
-        Add(program, db, "quarantine", "Put a damaged database aside; syslog-ng begins a new one", quarantine,
-            Quarantine);
-    command->add_flag("-y,--yes", quarantine->isConfirmed, "Do not ask");
-    command->add_flag("--force", quarantine->isForced, "Do not check that it is damaged");
+    Command command = Add(program, db, "quarantine",
+                          "Put a damaged database aside; syslog-ng begins a new one", quarantine, Quarantine);
+    command.AddFlag("-y,--yes", quarantine->isConfirmed, "Do not ask");
+    command.AddFlag("--force", quarantine->isForced, "Do not check that it is damaged");
     auto reopen = std::make_shared<DbOptions>();
     AddDbCommand(program, db, "reopen", "Make syslog-ng reopen its files", *reopen,
                  [reopen] { return Reopen(*reopen); });

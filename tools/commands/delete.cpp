@@ -157,15 +157,15 @@ int Run(const Options &options, const std::string &root) {
 
 void AddDelete(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "delete", "Delete logs from table logs",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddFilterOptions(*command, options->filter);
-    command->add_flag("--all", options->all, "Delete all logs");
-    command->add_flag("-y,--yes", options->isConfirmed, "Do not ask");
-    command->add_flag("--dry-run", options->isDryRun, "Only tell how many logs match");
-    AddUtcOption(*command, options->inUtc);
-    AddTableOptions(*command, options->table, false);
+    Command command = AddSubcommand(program, "delete", "Delete logs from table logs",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    AddFilterOptions(command, options->filter);
+    command.AddFlag("--all", options->all, "Delete all logs");
+    command.AddFlag("-y,--yes", options->isConfirmed, "Do not ask");
+    command.AddFlag("--dry-run", options->isDryRun, "Only tell how many logs match");
+    AddUtcOption(command, options->inUtc);
+    AddTableOptions(command, options->table, false);
 }
 
 } // namespace kelo::tool

@@ -120,54 +120,55 @@ int Export(const EventsOptions &options, const std::string &target, const std::s
     return kExitFound;
 }
 
-void AddExport(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+void AddExport(Program &program, Command events, const SharedEventsOptions &options) {
     auto target = std::make_shared<std::string>();
-    CLI::App *command = AddEventsAction(
+    Command command = AddEventsAction(
         events, options, "export", "Write all events to an HTML page; FILE is replaced only by a whole one",
         [state = options.get(), target, &program] { return Export(*state, *target, program.root); });
-    AddText(*command, "file", *target, "FILE", "")->required();
+    command.AddText("file", *target, "FILE", "").Required();
 }
 
-void AddListOptions(CLI::App &command, EventsOptions &options) {
-    AddText(command, "--db", options.db, "PATH", "This event database, not the server's own");
+void AddListOptions(Command command, EventsOptions &options) {
+    command.AddText("--db", options.db, "PATH", "This event database, not the server's own");
     const std::string which = "Which events";
-    AddText(command, "-S,--since", options.filter.since, "TIME", "From this time on")->group(which);
-    AddText(command, "-U,--until", options.filter.until, "TIME",
-            "Up to this second; a day alone ends before it begins")
-        ->group(which);
-    OfferList(
-        AddTexts(command, "-p,--priority", options.filter.severities, "LEVEL",
-                 "information, warning or error. A single one means it and all worse; '!level' excludes"),
-        {"information", "warning", "error"})
-        ->group(which);
+    command.AddText("-S,--since", options.filter.since, "TIME", "From this time on").Group(which);
+    command
+        .AddText("-U,--until", options.filter.until, "TIME",
+                 "Up to this second; a day alone ends before it begins")
+        .Group(which);
+    OfferList(command.AddTexts(
+                  "-p,--priority", options.filter.severities, "LEVEL",
+                  "information, warning or error. A single one means it and all worse; '!level' excludes"),
+              {"information", "warning", "error"})
+        .Group(which);
     const std::string howMany = "How many";
-    AddText(command, "-n,--lines", options.lines, "N", "The newest N events, or 'all' (default)")
-        ->group(howMany);
-    AddText(command, "--offset", options.offset, "N", "Skip the N newest events first")->group(howMany);
+    command.AddText("-n,--lines", options.lines, "N", "The newest N events, or 'all' (default)")
+        .Group(howMany);
+    command.AddText("--offset", options.offset, "N", "Skip the N newest events first").Group(howMany);
     const std::string how = "How to print";
-    OfferWords(AddText(command, "-o,--output", options.output.format, "FORMAT",
-                       "text (default), json (one array), jsonl (an object per line), csv, "
-                       "spreadsheet (csv without formulas)"),
+    OfferWords(command.AddText("-o,--output", options.output.format, "FORMAT",
+                               "text (default), json (one array), jsonl (an object per line), csv, "
+                               "spreadsheet (csv without formulas)"),
                {"text", "json", "jsonl", "csv", "spreadsheet"})
-        ->group(how);
-    command.add_flag("--no-header", options.output.noHeader, "No heading in text, csv and spreadsheet")
-        ->group(how);
-    command.add_flag("--utc", options.output.inUtc, "Read and print times in UTC, not in local time")
-        ->group(how);
-    AddText(command, "--color", options.output.colour, "WHEN",
-            "auto (default: on a terminal, unless NO_COLOR is set), always, never")
-        ->group(how);
-    command.add_flag("--no-pager", options.output.noPager, "Do not start PAGER on a terminal")->group(how);
+        .Group(how);
+    command.AddFlag("--no-header", options.output.noHeader, "No heading in text, csv and spreadsheet")
+        .Group(how);
+    command.AddFlag("--utc", options.output.inUtc, "Read and print times in UTC, not in local time")
+        .Group(how);
+    command
+        .AddText("--color", options.output.colour, "WHEN",
+                 "auto (default: on a terminal, unless NO_COLOR is set), always, never")
+        .Group(how);
+    command.AddFlag("--no-pager", options.output.noPager, "Do not start PAGER on a terminal").Group(how);
 }
 
 } // namespace
 
-CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
-                          const std::string &description, std::function<int()> action) {
-    CLI::App *command = events.add_subcommand(name, description);
-    command->fallthrough();
+Command AddEventsAction(Command events, const SharedEventsOptions &options, const std::string &name,
+                        const std::string &description, std::function<int()> action) {
+    Command command = events.AddBelow(name, description);
     // Runs before the callback of "events" itself.
-    command->callback([options, action = std::move(action)] { options->action = action; });
+    command.WhenChosen([options, action = std::move(action)] { options->action = action; });
     return command;
 }
 
@@ -181,17 +182,17 @@ void RefuseListOptions(const EventsOptions &options, const std::string &action, 
 
 void AddEvents(Program &program) {
     auto options = std::make_shared<EventsOptions>();
-    CLI::App *command = AddSubcommand(
+    Command command = AddSubcommand(
         program, "events", "Show, add, export and count the server's own events",
         [options, &program] { return options->action ? options->action() : List(*options, program.root); });
-    command->footer(kFooter);
-    command->require_subcommand(0, 1);
-    AddEventsAction(*command, options, "count", "Print the number of events",
+    command.Footer(kFooter);
+    command.NeedBelow(0, 1);
+    AddEventsAction(command, options, "count", "Print the number of events",
                     [state = options.get(), &program] { return Count(*state, program.root); });
-    AddEventsAdd(program, *command, options);
-    AddExport(program, *command, options);
-    AddEventsClearLog(program, *command, options);
-    AddListOptions(*command, *options);
+    AddEventsAdd(program, command, options);
+    AddExport(program, command, options);
+    AddEventsClearLog(program, command, options);
+    AddListOptions(command, *options);
 }
 
 } // namespace kelo::tool

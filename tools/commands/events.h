@@ -21,14 +21,14 @@ using SharedEventsOptions = std::shared_ptr<EventsOptions>;
 
 // Adds a subcommand below "events". It inherits the options of "events". `action` is stored
 // in `options` when the subcommand is chosen, so it must not own them.
-CLI::App *AddEventsAction(CLI::App &events, const SharedEventsOptions &options, const std::string &name,
-                          const std::string &description, std::function<int()> action);
+Command AddEventsAction(Command events, const SharedEventsOptions &options, const std::string &name,
+                        const std::string &description, std::function<int()> action);
 
 // Throws UsageError if an option was given that only the list accepts, or with `withDb` --db.
 void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb);
 
 // The subcommands that write: "add" and "clear-log".
-void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions &options);
-void AddEventsClearLog(Program &program, CLI::App &events, const SharedEventsOptions &options);
+void AddEventsAdd(Program &program, Command events, const SharedEventsOptions &options);
+void AddEventsClearLog(Program &program, Command events, const SharedEventsOptions &options);
 
 } // namespace kelo::tool

@@ -134,35 +134,35 @@ int ClearLog(const EventsOptions &options, const ClearOptions &clear, const std:
 
 } // namespace
 
-void AddEventsAdd(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+void AddEventsAdd(Program &program, Command events, const SharedEventsOptions &options) {
     struct AddOptions {
         std::string kind;
         Arguments arguments;
     };
     auto add = std::make_shared<AddOptions>();
-    CLI::App *command = AddEventsAction(events, options, "add", "Add an event of the server's user SYSTEM",
-                                        [state = options.get(), add, &program] {
-                                            return Add(*state, add->kind, add->arguments, program.root);
-                                        });
+    Command command = AddEventsAction(events, options, "add", "Add an event of the server's user SYSTEM",
+                                      [state = options.get(), add, &program] {
+                                          return Add(*state, add->kind, add->arguments, program.root);
+                                      });
     std::string footer = "Kinds and their values:\n";
     std::vector<std::string> names;
     for (const Kind &kind : kKinds) {
         footer += std::string("  ") + kind.name + " " + kind.arguments + "\n";
         names.emplace_back(kind.name);
     }
-    command->footer(footer);
-    OfferWords(AddText(*command, "kind", add->kind, "KIND", ""), names)->required();
-    AddTexts(*command, "value", add->arguments, "VALUE", "")->expected(0, -1)->allow_extra_args();
+    command.Footer(footer);
+    OfferWords(command.AddText("kind", add->kind, "KIND", ""), names).Required();
+    command.AddTexts("value", add->arguments, "VALUE", "").AnyNumberOrNone();
 }
 
-void AddEventsClearLog(Program &program, CLI::App &events, const SharedEventsOptions &options) {
+void AddEventsClearLog(Program &program, Command events, const SharedEventsOptions &options) {
     auto clear = std::make_shared<ClearOptions>();
-    CLI::App *command = AddEventsAction(
+    Command command = AddEventsAction(
         events, options, "clear-log", "Delete a log database and record who did it",
         [state = options.get(), clear, &program] { return ClearLog(*state, *clear, program.root); });
-    AddText(*command, "database", clear->database, "DATABASE", "")->required();
-    AddText(*command, "--user", clear->user, "NAME", "Who clears it (default: the user of this process)");
-    command->add_flag("-y,--yes", clear->isConfirmed, "Do not ask");
+    command.AddText("database", clear->database, "DATABASE", "").Required();
+    command.AddText("--user", clear->user, "NAME", "Who clears it (default: the user of this process)");
+    command.AddFlag("-y,--yes", clear->isConfirmed, "Do not ask");
 }
 
 } // namespace kelo::tool

@@ -8,7 +8,6 @@ int main(int argc, char **argv) {
     // A reader that closes its end is detected by the failing write.
     std::signal(SIGPIPE, SIG_IGN);
 
-    kelo::tool::Program program;
-    kelo::tool::DeclareCommandLine(program);
+    kelo::tool::KelosyslogProgram program;
     return kelo::tool::RunProgram(program, argc, argv);
 }

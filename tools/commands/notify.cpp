@@ -193,17 +193,17 @@ int Run(const Options &options, const std::string &root) try {
 
 void AddNotify(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "notify", "Show and test how notifications go",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    OfferWords(AddText(*command, "action", options->action, "", "status, test, list or retry"),
+    Command command = AddSubcommand(program, "notify", "Show and test how notifications go",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    OfferWords(command.AddText("action", options->action, "", "status, test, list or retry"),
                {"status", "test", "list", "retry"})
-        ->required();
-    OfferWords(AddTexts(*command, "names", options->names, "", "A channel or a tag, or ids"),
+        .Required();
+    OfferWords(command.AddTexts("names", options->names, "", "A channel or a tag, or ids"),
                {std::begin(kChannelNames), std::end(kChannelNames)}, "test")
-        ->expected(-1);
-    command->add_flag("--all", options->isAll, "Take up again everything that was given up");
-    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT", "text (default) or json"),
+        .AnyNumber();
+    command.AddFlag("--all", options->isAll, "Take up again everything that was given up");
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT", "text (default) or json"),
                {"text", "json"});
 }
 

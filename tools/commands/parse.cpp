@@ -244,28 +244,28 @@ int Run(Options options, bool hasDb) {
 
 void AddParse(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command =
-        AddSubcommand(program, "parse", "Turn log text into logs, printed or stored", nullptr);
-    command->footer(kFooter);
-    AddTexts(*command, "FILE", options->files, "FILE", "Files of log text; '-' or none: the standard input")
-        ->expected(-1);
-    AddOutputOptions(*command, options->output);
+    Command command = AddSubcommand(program, "parse", "Turn log text into logs, printed or stored", nullptr);
+    command.Footer(kFooter);
+    command.AddTexts("FILE", options->files, "FILE", "Files of log text; '-' or none: the standard input")
+        .AnyNumber();
+    AddOutputOptions(command, options->output);
     const std::string group = "How to store";
-    CLI::Option *db = AddText(*command, "--db", options->db, "PATH",
-                              "Store into table logs of this database, which is created when missing")
-                          ->group(group)
-                          ->excludes("--output");
+    Option db = command
+                    .AddText("--db", options->db, "PATH",
+                             "Store into table logs of this database, which is created when missing")
+                    .Group(group)
+                    .Excludes("--output");
     command
-        ->add_flag("--resume", options->resume,
-                   "Go on behind what earlier runs stored of the same input, each log once")
-        ->group(group)
-        ->needs(db);
-    command->add_flag("--skip-incomplete", options->skipIncomplete,
-                      "Leave out logs without a message or another mandatory field");
-    command->add_flag("-v,--verbose", options->verbose,
-                      "Name every line that is rejected or incomplete, with the reason");
-    command->callback(
-        [options, db, &program] { program.run = [options, db] { return Run(*options, db->count() > 0); }; });
+        .AddFlag("--resume", options->resume,
+                 "Go on behind what earlier runs stored of the same input, each log once")
+        .Group(group)
+        .Needs(db);
+    command.AddFlag("--skip-incomplete", options->skipIncomplete,
+                    "Leave out logs without a message or another mandatory field");
+    command.AddFlag("-v,--verbose", options->verbose,
+                    "Name every line that is rejected or incomplete, with the reason");
+    command.WhenChosen(
+        [options, db, &program] { program.run = [options, db] { return Run(*options, db.IsGiven()); }; });
 }
 
 } // namespace kelo::tool

@@ -75,20 +75,22 @@ int Run(Options options, const std::string &root) {
 
 void AddReceive(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "receive", "Receive log text from syslog-ng",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddText(*command, "--db", options->receiver.database, "PATH",
-            "Store into table logs of this database, which is created when missing");
-    AddText(*command, "--set-aside", options->receiver.setAside, "FILE",
-            "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
-    AddText(*command, "--notify-limit", options->notifyLimit, "N",
-            "Raise at most N notifications a minute for a keyword, a severity or the rate, 5 N for all of "
-            "them (10)");
-    AddText(*command, "--device-limit", options->deviceLimit, "N",
-            "Count the logs of at most N devices each by its name, those of others as (others) (10000)");
-    command->add_flag("-v,--verbose", options->verbose,
-                      "Write to the standard error, too, what goes to the system log");
+    Command command = AddSubcommand(program, "receive", "Receive log text from syslog-ng",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    command.AddText("--db", options->receiver.database, "PATH",
+                    "Store into table logs of this database, which is created when missing");
+    command.AddText("--set-aside", options->receiver.setAside, "FILE",
+                    "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
+    command.AddText(
+        "--notify-limit", options->notifyLimit, "N",
+        "Raise at most N notifications a minute for a keyword, a severity or the rate, 5 N for all of "
+        "them (10)");
+    command.AddText(
+        "--device-limit", options->deviceLimit, "N",
+        "Count the logs of at most N devices each by its name, those of others as (others) (10000)");
+    command.AddFlag("-v,--verbose", options->verbose,
+                    "Write to the standard error, too, what goes to the system log");
 }
 
 } // namespace kelo::tool

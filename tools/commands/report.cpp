@@ -110,21 +110,22 @@ int Run(const Options &options, const std::string &root) {
 
 void AddReport(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command =
+    Command command =
         AddSubcommand(program, "report", "Write an HTML page about the logs and events of a period",
                       [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddText(*command, "file", options->target, "FILE", "The page; replaced only by a whole one")->required();
+    command.Footer(kFooter);
+    command.AddText("file", options->target, "FILE", "The page; replaced only by a whole one").Required();
     const std::string group = "Which period";
-    AddText(*command, "-S,--since", options->filter.since, "TIME", "From this time on")->group(group);
-    AddText(*command, "-U,--until", options->filter.until, "TIME",
-            "Up to this second; a day alone ends before it begins")
-        ->group(group);
-    AddText(*command, "--events", options->events, "N", "List the newest N events (default: 100)");
-    AddUtcOption(*command, options->inUtc);
-    AddTableOptions(*command, options->table, false);
-    AddText(*command, "--events-db", options->eventsDb, "PATH", "This event database, not the server's own")
-        ->group("Where to look");
+    command.AddText("-S,--since", options->filter.since, "TIME", "From this time on").Group(group);
+    command
+        .AddText("-U,--until", options->filter.until, "TIME",
+                 "Up to this second; a day alone ends before it begins")
+        .Group(group);
+    command.AddText("--events", options->events, "N", "List the newest N events (default: 100)");
+    AddUtcOption(command, options->inUtc);
+    AddTableOptions(command, options->table, false);
+    command.AddText("--events-db", options->eventsDb, "PATH", "This event database, not the server's own")
+        .Group("Where to look");
 }
 
 } // namespace kelo::tool

@@ -162,27 +162,27 @@ int Run(const Options &options, const std::string &root) {
 
 void AddRules(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "rules", "Show, change and test the notification rules",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
+    Command command = AddSubcommand(program, "rules", "Show, change and test the notification rules",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
     OfferWords(
-        AddText(*command, "action", options->action, "", "list, add, set, enable, disable, remove or test"),
+        command.AddText("action", options->action, "", "list, add, set, enable, disable, remove or test"),
         {"list", "add", "set", "enable", "disable", "remove", "test"})
-        ->required();
-    AddTexts(*command, "names", options->names, "", "Names of rules")->expected(-1);
-    OfferWords(AddText(*command, "--severity", options->severity, "LEVEL",
-                       "This severity and all that are more severe"),
+        .Required();
+    command.AddTexts("names", options->names, "", "Names of rules").AnyNumber();
+    OfferWords(command.AddText("--severity", options->severity, "LEVEL",
+                               "This severity and all that are more severe"),
                SeverityNames());
-    AddText(*command, "--eps", options->eps, "N", "N logs or more in one second, up to 2147483647");
-    AddText(*command, "--keyword", options->keyword, "TEXT", "Messages that hold this text, byte for byte");
-    command->add_flag("--disabled", options->isDisabled, "The rule is off");
-    AddText(*command, "--text", options->test.text, "TEXT", "Test this message");
-    AddText(*command, "-n,--lines", options->test.lines, "N", "Test the newest N stored logs (100)");
-    command->add_flag("--notify", options->test.mustNotify,
-                      "Send the notifications of the logs that are tested");
-    OfferWords(AddText(*command, "-o,--output", options->test.format, "FORMAT", "text (default) or json"),
+    command.AddText("--eps", options->eps, "N", "N logs or more in one second, up to 2147483647");
+    command.AddText("--keyword", options->keyword, "TEXT", "Messages that hold this text, byte for byte");
+    command.AddFlag("--disabled", options->isDisabled, "The rule is off");
+    command.AddText("--text", options->test.text, "TEXT", "Test this message");
+    command.AddText("-n,--lines", options->test.lines, "N", "Test the newest N stored logs (100)");
+    command.AddFlag("--notify", options->test.mustNotify,
+                    "Send the notifications of the logs that are tested");
+    OfferWords(command.AddText("-o,--output", options->test.format, "FORMAT", "text (default) or json"),
                {"text", "json"});
-    AddTableOptions(*command, options->test.table, false);
+    AddTableOptions(command, options->test.table, false);
 }
 
 } // namespace kelo::tool

@@ -92,23 +92,23 @@ int Run(const Options &options, const std::string &root) {
 
 void AddSearch(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "search", "Print logs",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddFilterOptions(*command, options->filter);
+    Command command = AddSubcommand(program, "search", "Print logs",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    AddFilterOptions(command, options->filter);
     const std::string group = "How many";
-    AddText(*command, "-n,--lines", options->lines, "N", "The newest N logs, or 'all'")->group(group);
-    AddText(*command, "--offset", options->offset, "N", "Skip the N newest logs first")->group(group);
-    command->add_flag("-r,--reverse", options->newestFirst, "Newest first")->group(group);
+    command.AddText("-n,--lines", options->lines, "N", "The newest N logs, or 'all'").Group(group);
+    command.AddText("--offset", options->offset, "N", "Skip the N newest logs first").Group(group);
+    command.AddFlag("-r,--reverse", options->newestFirst, "Newest first").Group(group);
     command
-        ->add_flag("-f,--follow", options->follow,
-                   "Print the newest 10 logs (or -n; all with --since) and then what arrives, until --until "
-                   "has passed, --idle has, or nobody reads any more")
-        ->group(group);
-    AddText(*command, "--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")
-        ->group(group);
-    AddOutputOptions(*command, options->output);
-    AddTableOptions(*command, options->table);
+        .AddFlag("-f,--follow", options->follow,
+                 "Print the newest 10 logs (or -n; all with --since) and then what arrives, until --until "
+                 "has passed, --idle has, or nobody reads any more")
+        .Group(group);
+    command.AddText("--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")
+        .Group(group);
+    AddOutputOptions(command, options->output);
+    AddTableOptions(command, options->table);
 }
 
 } // namespace kelo::tool

@@ -223,34 +223,34 @@ int Run(const Options &options, const std::string &root) {
 
 void AddStats(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "stats", "Print how many logs were received",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    OfferWords(AddText(*command, "what", options->what, "", "devices, device, total, eps or forget"),
+    Command command = AddSubcommand(program, "stats", "Print how many logs were received",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    OfferWords(command.AddText("what", options->what, "", "devices, device, total, eps or forget"),
                {"devices", "device", "total", "eps", "forget"})
-        ->required();
-    command->add_option(
+        .Required();
+    command.AddArguments(
         "name", options->forget.names,
         "The device of 'stats device'; the devices of 'stats forget', with wildcards * and ?");
-    AddText(*command, "--top", options->top, "N", "devices: the N that sent most");
-    AddText(*command, "-S,--since", options->period.since, "TIME", "eps: from this time on");
-    AddText(*command, "-U,--until", options->period.until, "TIME",
-            "eps: up to this second; a day alone ends before it begins");
-    AddText(*command, "--below", options->forget.below, "N", "forget: only devices with fewer than N logs");
-    command->add_flag("--dry-run", options->forget.isDryRun, "forget: only tell how many devices match");
-    command->add_flag("-y,--yes", options->forget.isConfirmed, "forget: do not ask");
+    command.AddText("--top", options->top, "N", "devices: the N that sent most");
+    command.AddText("-S,--since", options->period.since, "TIME", "eps: from this time on");
+    command.AddText("-U,--until", options->period.until, "TIME",
+                    "eps: up to this second; a day alone ends before it begins");
+    command.AddText("--below", options->forget.below, "N", "forget: only devices with fewer than N logs");
+    command.AddFlag("--dry-run", options->forget.isDryRun, "forget: only tell how many devices match");
+    command.AddFlag("-y,--yes", options->forget.isConfirmed, "forget: do not ask");
     OfferWords(
-        AddText(*command, "--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour"),
+        command.AddText("--by", options->interval, "INTERVAL", "eps: second, minute (default) or hour"),
         {"second", "minute", "hour"});
-    AddText(*command, "--device", options->device, "NAME", "eps: only of this device");
-    command->add_flag("--per-device", options->perDevice, "eps: a row for each device");
-    command->add_flag("--plot", options->plot, "Draw the counts as bars");
-    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
-                       "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
+    command.AddText("--device", options->device, "NAME", "eps: only of this device");
+    command.AddFlag("--per-device", options->perDevice, "eps: a row for each device");
+    command.AddFlag("--plot", options->plot, "Draw the counts as bars");
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
+                               "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
                {"text", "json", "jsonl", "csv", "spreadsheet"});
-    command->add_flag("--no-header", options->noHeader, "No heading in text, csv and spreadsheet");
-    AddUtcOption(*command, options->inUtc);
-    AddText(*command, "--db", options->db, "PATH", "This accounting database");
+    command.AddFlag("--no-header", options->noHeader, "No heading in text, csv and spreadsheet");
+    AddUtcOption(command, options->inUtc);
+    command.AddText("--db", options->db, "PATH", "This accounting database");
 }
 
 } // namespace kelo::tool

@@ -71,32 +71,29 @@ int Run(const Options &options, const std::string &root) {
 }
 
 // "--watch" is allowed with and without a number.
-void AddWatch(CLI::App &command, Options &options) {
-    const auto take = [&options](const CLI::results_t &results) {
-        options.mustWatch = true;
-        options.pause = results.empty() || results.back().empty() ? kUsualPause : results.back();
-        return true;
-    };
-    command
-        .add_option("--watch", take,
-                    std::string("Show it anew every so many seconds (default ") + kUsualPause + ")")
-        ->type_name("[SECONDS]")
-        ->expected(0, 1);
+void AddWatch(Command command, Options &options) {
+    command.AddOptionalText(
+        "--watch",
+        [&options](const std::string &pause) {
+            options.mustWatch = true;
+            options.pause = pause.empty() ? kUsualPause : pause;
+        },
+        "[SECONDS]", std::string("Show it anew every so many seconds (default ") + kUsualPause + ")");
 }
 
 } // namespace
 
 void AddStatus(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command = AddSubcommand(program, "status", "Tell whether the log server is well",
-                                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    AddWatch(*command, *options);
-    AddKeyValuesFormat(*command, options->format);
-    AddText(*command, "--color", options->colour, "WHEN",
-            "auto (default: on a terminal, unless NO_COLOR is set), always, never");
-    AddText(*command, "--control", options->control, "PATH",
-            "This control socket of syslog-ng, not /var/lib/syslog-ng/syslog-ng.ctl");
+    Command command = AddSubcommand(program, "status", "Tell whether the log server is well",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    AddWatch(command, *options);
+    AddKeyValuesFormat(command, options->format);
+    command.AddText("--color", options->colour, "WHEN",
+                    "auto (default: on a terminal, unless NO_COLOR is set), always, never");
+    command.AddText("--control", options->control, "PATH",
+                    "This control socket of syslog-ng, not /var/lib/syslog-ng/syslog-ng.ctl");
 }
 
 } // namespace kelo::tool

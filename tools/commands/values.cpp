@@ -106,21 +106,21 @@ int Run(const Options &options, const std::string &root) {
 
 void AddValues(Program &program) {
     auto options = std::make_shared<Options>();
-    CLI::App *command =
-        AddSubcommand(program, "values", "Print the distinct values of a column of table logs",
-                      [options, &program] { return Run(*options, program.root); });
-    command->footer(kFooter);
-    OfferWords(AddText(*command, "attribute", options->attribute, "",
-                       "host, ip, fac, prio, llevel, tag, utcsec, tzoffset, ldate, ltime, prog, msg or id"),
-               AttributeNames())
-        ->required();
-    AddText(*command, "-n,--lines", options->lines, "N", "The first N values");
-    AddText(*command, "--offset", options->offset, "N", "Skip N values first");
-    OfferWords(AddText(*command, "-o,--output", options->format, "FORMAT",
-                       "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
+    Command command = AddSubcommand(program, "values", "Print the distinct values of a column of table logs",
+                                    [options, &program] { return Run(*options, program.root); });
+    command.Footer(kFooter);
+    OfferWords(
+        command.AddText("attribute", options->attribute, "",
+                        "host, ip, fac, prio, llevel, tag, utcsec, tzoffset, ldate, ltime, prog, msg or id"),
+        AttributeNames())
+        .Required();
+    command.AddText("-n,--lines", options->lines, "N", "The first N values");
+    command.AddText("--offset", options->offset, "N", "Skip N values first");
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
+                               "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),
                {"text", "json", "jsonl", "csv", "spreadsheet"});
-    command->add_flag("--no-header", options->noHeader, "No heading in csv and spreadsheet");
-    AddTableOptions(*command, options->table, false);
+    command.AddFlag("--no-header", options->noHeader, "No heading in csv and spreadsheet");
+    AddTableOptions(command, options->table, false);
 }
 
 } // namespace kelo::tool

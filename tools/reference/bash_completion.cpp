@@ -43,9 +43,9 @@ void AddOption(Tables &tables, CLI::Option &option, const std::string &path) {
     if (option.get_items_expected_min() == 0) // a flag, or a value that may be left out
         return;
     for (const std::string &name : option.get_snames())
-        tables.values += Entry(path + " -" + name, CompletionOf(option));
+        tables.values += Entry(path + " -" + name, CompletionOf(Option(option)));
     for (const std::string &name : option.get_lnames())
-        tables.values += Entry(path + " --" + name, CompletionOf(option));
+        tables.values += Entry(path + " --" + name, CompletionOf(Option(option)));
 }
 
 void AddCommand(Tables &tables, CLI::App &command, CLI::App &app, const std::string &path) {
@@ -59,7 +59,7 @@ void AddCommand(Tables &tables, CLI::App &command, CLI::App &app, const std::str
         }
         const bool isLast = option->get_items_expected_max() > 1;
         const std::string number = isLast ? "+" : std::to_string(++arguments);
-        if (const std::string offer = CompletionOf(*option); offer != kNothing)
+        if (const std::string offer = CompletionOf(Option(*option)); offer != kNothing)
             tables.values += Entry(path + " " + number, offer);
     }
     std::string names;

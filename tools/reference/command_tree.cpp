@@ -23,10 +23,10 @@ bool Has(const OptionList &options, const CLI::Option &wanted) {
                        [&](const CLI::Option *option) { return AreAlike(*option, wanted); });
 }
 
-void ListCommands(const CLI::App &app, const Command &above, std::vector<Command> &commands) {
+void ListCommands(const CLI::App &app, const CommandNode &above, std::vector<CommandNode> &commands) {
     for (const CLI::App *below : app.get_subcommands(nullptr)) {
-        const Command command{below, above.app,
-                              above.path + (above.path.empty() ? "" : " ") + below->get_name()};
+        const CommandNode command{below, above.app,
+                                  above.path + (above.path.empty() ? "" : " ") + below->get_name()};
         commands.push_back(command);
         ListCommands(*below, command, commands);
     }
@@ -67,7 +67,7 @@ bool TakesMany(const CLI::Option &option) {
 
 CommandTree::CommandTree(const CLI::App &app) {
     ListCommands(app, {nullptr, nullptr, ""}, commands_);
-    for (const Command &command : commands_) {
+    for (const CommandNode &command : commands_) {
         for (const CLI::Option *option : OptionsOf(*command.app)) {
             if (IsInGroupOfSeveral(*option) && !IsCommon(*option))
                 CommonGroup(GroupOf(*option)).push_back(option);
@@ -77,7 +77,7 @@ CommandTree::CommandTree(const CLI::App &app) {
 
 bool CommandTree::IsInGroupOfSeveral(const CLI::Option &option) const {
     const std::string group = GroupOf(option);
-    const auto hasIt = [&](const Command &command) {
+    const auto hasIt = [&](const CommandNode &command) {
         const OptionList options = OptionsOf(*command.app);
         return std::any_of(options.begin(), options.end(), [&](const CLI::Option *other) {
             return AreAlike(*other, option) && GroupOf(*other) == group;
@@ -98,18 +98,19 @@ bool CommandTree::IsCommon(const CLI::Option &option) const {
 }
 
 bool CommandTree::IsOfGroup(const CLI::Option &option, const CLI::App *group) const {
-    return group != nullptr && std::count_if(commands_.begin(), commands_.end(), [&](const Command &command) {
-                                   return command.group == group && Has(OptionsOf(*command.app), option);
-                               }) > 1;
+    return group != nullptr &&
+           std::count_if(commands_.begin(), commands_.end(), [&](const CommandNode &command) {
+               return command.group == group && Has(OptionsOf(*command.app), option);
+           }) > 1;
 }
 
-OptionList CommandTree::DescribedWith(const Command &command) const {
+OptionList CommandTree::DescribedWith(const CommandNode &command) const {
     OptionList options;
     for (const CLI::Option *option : OptionsOf(*command.app)) {
         if (!IsCommon(*option) && !IsOfGroup(*option, command.group))
             options.push_back(option);
     }
-    for (const Command &below : commands_) {
+    for (const CommandNode &below : commands_) {
         for (const CLI::Option *option : OptionsOf(*below.app)) {
             if (below.group == command.app && IsOfGroup(*option, below.group) && !IsCommon(*option) &&
                 !Has(options, *option))
@@ -119,7 +120,7 @@ OptionList CommandTree::DescribedWith(const Command &command) const {
     return options;
 }
 
-OptionList CommandTree::DescribedElsewhere(const Command &command) const {
+OptionList CommandTree::DescribedElsewhere(const CommandNode &command) const {
     OptionList options;
     for (const CLI::Option *option : OptionsOf(*command.app)) {
         if (IsCommon(*option) || IsOfGroup(*option, command.group))

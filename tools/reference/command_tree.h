@@ -23,7 +23,7 @@ std::string PlaceholderOf(const CLI::Option &option);
 // Whether it is an argument that may be repeated.
 bool TakesMany(const CLI::Option &option);
 
-struct Command {
+struct CommandNode {
     const CLI::App *app;
     const CLI::App *group; // the command that it is below, or null
     std::string path;      // "db info"
@@ -40,13 +40,13 @@ public:
     explicit CommandTree(const CLI::App &app);
 
     // Each one before its subcommands.
-    const std::vector<Command> &Commands() const { return commands_; }
+    const std::vector<CommandNode> &Commands() const { return commands_; }
 
     // The common options by their groups, of which only what precedes " (" counts as the name.
     const std::vector<std::pair<std::string, OptionList>> &Common() const { return common_; }
 
-    OptionList DescribedWith(const Command &command) const;
-    OptionList DescribedElsewhere(const Command &command) const;
+    OptionList DescribedWith(const CommandNode &command) const;
+    OptionList DescribedElsewhere(const CommandNode &command) const;
 
 private:
     bool IsInGroupOfSeveral(const CLI::Option &option) const;
@@ -55,7 +55,7 @@ private:
     // Whether several commands of that group have it.
     bool IsOfGroup(const CLI::Option &option, const CLI::App *group) const;
 
-    std::vector<Command> commands_;
+    std::vector<CommandNode> commands_;
     std::vector<std::pair<std::string, OptionList>> common_;
 };
 

@@ -3,6 +3,8 @@
 //
 // usage: kelo_reference kelosyslog.1|kelonotify.8|completion TEMPLATE RESULT
 
+#include <CLI/CLI.hpp>
+
 #include <cstdio>
 #include <string>
 
@@ -23,9 +25,8 @@ std::string Fill(const std::string &what, const std::string &text) {
         DeclareCommandLine(app, options);
         return FillManPage(app, text);
     }
-    Program program;
-    DeclareCommandLine(program);
-    return what == "completion" ? FillCompletion(program.app, text) : FillManPage(program.app, text);
+    const KelosyslogProgram program;
+    return what == "completion" ? FillCompletion(*program.app, text) : FillManPage(*program.app, text);
 }
 
 int Run(const std::string &what, const std::string &path, const std::string &result) try {

@@ -100,7 +100,7 @@ private:
         if (tree_.Commands().empty())
             return Usage(app_.get_name(), app_) + "\n";
         std::string text;
-        for (const Command &command : tree_.Commands()) {
+        for (const CommandNode &command : tree_.Commands()) {
             if (command.app->get_require_subcommand_min() == 0)
                 text += (text.empty() ? "" : ".br\n") +
                         Usage(app_.get_name() + " " + command.path, *command.app) + "\n";
@@ -110,13 +110,13 @@ private:
 
     std::string Commands() {
         std::string text;
-        for (const Command &command : tree_.Commands())
+        for (const CommandNode &command : tree_.Commands())
             text += ".SS \"" + Roff(command.path) + "\"\n" + RoffSentence(command.app->get_description()) +
                     About(command) + Arguments(command) + OptionsOf(command);
         return text;
     }
 
-    std::string About(const Command &command) {
+    std::string About(const CommandNode &command) {
         std::string text = template_.Take(command.path);
         constexpr std::string_view kFooter = "@footer\n";
         if (const size_t at = text.find(kFooter); at != std::string::npos)
@@ -124,7 +124,7 @@ private:
         return text;
     }
 
-    std::string Arguments(const Command &command) {
+    std::string Arguments(const CommandNode &command) {
         std::string text;
         for (const CLI::Option *argument : ArgumentsOf(*command.app))
             text += Describe(*argument, template_.Take(command.path + " " + NameOf(*argument)));
@@ -132,7 +132,7 @@ private:
     }
 
     // Describes the options that the command does not share, and names the others.
-    std::string OptionsOf(const Command &command) {
+    std::string OptionsOf(const CommandNode &command) {
         std::string text;
         std::string shared;
         for (const CLI::Option *option : tree_.DescribedWith(command))
