@@ -1,12 +1,15 @@
 // A rollback journal beside a database may name a "super-journal", any file, which is deleted with it.
 // Whoever can write to the folder of a database can put one there.
 
+#include "commands/commands.h"
+#include "reference/command_tree.h"
 #include "support/program_test.h"
 
 namespace kelo::test {
 namespace {
 
 constexpr uint32_t kPageBytes = 4096;
+constexpr char kRecord[] = "INSERT INTO logs (host, utcsec) VALUES ('nas', 1577836800);";
 
 std::string BigEndian(uint32_t number) {
     std::string bytes;
@@ -30,20 +33,132 @@ void WriteHotJournal(const std::string &database, const std::string &victim) {
     WriteFile(database + "-journal", journal);
 }
 
-using SuperJournal = ProgramTest;
+// A command, and the databases whose journals it rolls back or removes: l the working log, a the accounting,
+// e the events, x an archive.
+struct Case {
+    std::string command;
+    const char *arguments;
+    const char *opens;
+};
+const Case kCases[] = {
+    {"search", "", "l"},
+    {"search", "--log nas_2020-01-01_2020-01-02", "x"},
+    {"count", "", "l"},
+    {"delete", "--all -y", "l"},
+    {"values", "host", "l"},
+    {"report", "report.html", "lae"},
+    {"stats", "total", "a"},
+    {"stats", "devices", "a"},
+    {"stats", "forget nas -y", "a"},
+    {"events", "", "e"},
+    {"events count", "", "e"},
+    {"events add", "server-start x", "e"},
+    {"events export", "events.html", "e"},
+    {"events clear-log", "var/log/kelosyslog/logs.db -y", "le"},
+    {"status", "--control none", "lae"},
+    {"parse", "--db var/log/kelosyslog/logs.db lines", "l"},
+    {"receive", "--db var/log/kelosyslog/logs.db <lines", "lae"},
+    {"archive", "--yes", "le"},
+    {"archive", "--list", ""}, // read-only: it is not rolled back
+    {"archive", "--prune --keep 1d --yes", ""},
+    {"db info", "", "l"},
+    {"db check", "", "l"},
+    {"db create", "", ""}, // it is there already
+    {"db wal", "", "l"},
+    {"db limit", "0", "l"},
+    {"db set-device", "nas --db var/log/kelosyslog/archive/nas_2020-01-01_2020-01-02.db", "x"},
+    {"db quarantine", "--yes", "l"},
+    {"db quarantine", "--force --yes", "l"},
+    {"db reopen", "", ""},
+    {"rules", "list", ""},
+    {"notify", "list", ""},
+};
 
-// The programs open databases in two ways, and each for reading and for writing.
-TEST_F(SuperJournal, IsLeftAlone) {
-    const std::string victim = root_.File("victim");
-    for (const std::string &command : {std::string("search"), std::string("delete --all -y"),
-                                       std::string("status"), "parse --db " + logs_}) {
-        fs::remove(logs_);
-        RunSql(logs_, ReadFile(BuildPath("package/schema/logs.sql")));
-        WriteHotJournal(logs_, victim);
-        WriteFile(victim, "precious");
-        const ProgramResult result = Run(command);
-        EXPECT_TRUE(fs::exists(victim)) << command << "\n" << result.out << result.err;
-        EXPECT_FALSE(fs::exists(logs_ + "-journal")) << "it was no hot journal for " << command;
+std::set<std::string> AllCommands() {
+    tool::Program program;
+    tool::DeclareCommandLine(program);
+    std::set<std::string> names;
+    const tool::CommandTree tree(program.app);
+    for (const tool::Command &command : tree.Commands())
+        if (command.app->get_require_subcommand_min() == 0)
+            names.insert(command.path);
+    return names;
+}
+
+// Every database of the server, in folders of two other users if we are root, each with a journal that names
+// the victim.
+class SuperJournal : public ProgramTest {
+protected:
+    struct Database {
+        char letter;
+        std::string path;
+        std::string schema;
+        uid_t owner;
+    };
+
+    void Build(const std::string &mode) const {
+        for (const Database &database : databases_) {
+            fs::remove(Template(database));
+            RunSql(Template(database), ReadFile(BuildPath("package/schema/" + database.schema)) +
+                                           (database.letter == 'l' ? kRecord : "") +
+                                           "PRAGMA journal_mode=" + mode);
+        }
+    }
+
+    void Plant() const {
+        for (const Database &database : databases_) {
+            const fs::path folder = fs::path(database.path).parent_path();
+            fs::remove_all(folder);
+            fs::create_directories(folder);
+            fs::copy_file(Template(database), database.path);
+            WriteHotJournal(database.path, victim_);
+            for (const std::string &path : {folder.string(), database.path, database.path + "-journal"})
+                ASSERT_TRUE(geteuid() != 0 || chown(path.c_str(), database.owner, database.owner) == 0);
+        }
+        WriteFile(victim_, "precious");
+    }
+
+    std::string RolledBack() const {
+        std::string letters;
+        for (const Database &database : databases_)
+            if (!fs::exists(database.path + "-journal"))
+                letters += database.letter;
+        return letters;
+    }
+
+    void Check(const Case &one) {
+        SCOPED_TRACE(one.command + " " + one.arguments);
+        Plant();
+        const ProgramResult result = Run(one.command + " " + one.arguments);
+        EXPECT_TRUE(fs::exists(victim_)) << result.out << result.err;
+        EXPECT_EQ(RolledBack(), one.opens) << result.out << result.err;
+    }
+
+    const std::string victim_ = root_.File("victim");
+    const std::vector<Database> databases_ = {
+        {'l', logs_, "logs.sql", 64203},
+        {'x', archives_ + "/nas_2020-01-01_2020-01-02.db", "archive.sql", 64203}, // in the folder before it
+        {'a', accounting_, "accinfo.sql", 64204},
+        {'e', events_, "kelosyslog.sql", 64204},
+    };
+
+private:
+    std::string Template(const Database &database) const { return templates_.File(database.schema); }
+
+    TempRoot templates_;
+};
+
+TEST_F(SuperJournal, IsLeftAloneByEveryCommand) {
+    std::set<std::string> covered;
+    for (const Case &one : kCases)
+        covered.insert(one.command);
+    EXPECT_EQ(covered, AllCommands());
+    WriteFile(root_.File("lines"), LogLines(1, 2));
+    for (const std::string mode : {"WAL", "DELETE"}) {
+        SCOPED_TRACE(mode);
+        Build(mode);
+        for (const Case &one : kCases)
+            Check(one);
     }
 }
 
