@@ -75,11 +75,10 @@ const Case kCases[] = {
 };
 
 std::set<std::string> AllCommands() {
-    tool::Program program;
-    tool::DeclareCommandLine(program);
+    const tool::KelosyslogProgram program;
     std::set<std::string> names;
-    const tool::CommandTree tree(program.app);
-    for (const tool::Command &command : tree.Commands())
+    const tool::CommandTree tree(*program.app);
+    for (const tool::CommandNode &command : tree.Commands())
         if (command.app->get_require_subcommand_min() == 0)
             names.insert(command.path);
     return names;
