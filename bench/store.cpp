@@ -1,5 +1,6 @@
 // Storing a million records through LogStore, compared with a bare loop of one prepared insert per row in the
-// same batches, each into a fresh database in the current folder.
+// same batches, each into a fresh database in the current folder. Commits are not synced, as in the receiver:
+// the disk would be measured otherwise.
 
 #include <sqlite3.h>
 
@@ -29,7 +30,8 @@ void Require(int status) {
 void StoreBare(const std::string &path, const Logs &logs) {
     sqlite3 *db = nullptr;
     Require(sqlite3_open(path.c_str(), &db));
-    Require(sqlite3_exec(db, "PRAGMA journal_mode=WAL", nullptr, nullptr, nullptr));
+    Require(
+        sqlite3_exec(db, "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL", nullptr, nullptr, nullptr));
     Require(sqlite3_exec(db, kelo::tool::kLogsSchema, nullptr, nullptr, nullptr));
     sqlite3_stmt *insert = nullptr;
     Require(sqlite3_prepare_v2(
@@ -61,7 +63,7 @@ void StoreBare(const std::string &path, const Logs &logs) {
 }
 
 void StoreThrough(const std::string &path, const Logs &logs) {
-    LogStore store(path);
+    LogStore store(path, {.mustSyncCommits = false});
     for (size_t row = 0; row < logs.size(); row += kBatchRows) {
         const size_t count = std::min(kBatchRows, logs.size() - row);
         store.Store({logs.data() + row, count}, {"bench", std::string(4096, 'h'), row + count, row + count});
@@ -91,5 +93,5 @@ int main() {
                                     {"bare loop", [&] { return FreshRunMs(StoreBare, logs); }}},
                                    3);
     PrintHeading("Storing 1000000 records in batches of 5000", "ms");
-    return PrintRatio("LogStore", times[0], "bare prepared inserts", times[1], 1.2) ? 0 : 1;
+    return PrintRatio("LogStore", times[0], "bare prepared inserts", times[1], 0.65) ? 0 : 1;
 }

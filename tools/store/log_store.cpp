@@ -18,10 +18,10 @@
 namespace kelo::tool {
 namespace {
 
-// Columns as in logs.sql; both severity columns get the word.
-constexpr char kInsertLog[] =
+// Columns as in logs.sql.
+constexpr char kInsertLogs[] =
     "INSERT INTO logs(host,ip,fac,prio,llevel,tag,utcsec,tzoffset,ldate,ltime,prog,msg) "
-    "VALUES(?1,?2,?3,?4,?4,?5,?6,?7,?8,?9,?10,?11)";
+    "SELECT host,ip,fac,prio,llevel,tag,utcsec,tzoffset,ldate,ltime,prog,msg FROM kelo_records";
 
 constexpr char kCreateProgress[] = "CREATE TABLE IF NOT EXISTS parse_progress("
                                    "source TEXT PRIMARY KEY, head BLOB, offset INTEGER, lines INTEGER)";
@@ -98,11 +98,12 @@ const std::string &CreateWhereMissing(const std::string &path, int busyTimeoutMs
 LogStore::LogStore(const std::string &path, const LogStoreOptions &options)
     : path_(std::filesystem::absolute(path)),
       db_(CreateWhereMissing(path_, options.busyTimeoutMs),
-          {.mode = SqliteMode::kWrite, .busyTimeoutMs = options.busyTimeoutMs}) {
+          {.mode = SqliteMode::kWrite, .busyTimeoutMs = options.busyTimeoutMs}),
+      batch_(db_) {
     FillEmpty();
     if (!options.mustSyncCommits)
         db_.Run("PRAGMA synchronous=NORMAL");
-    insertLog_.emplace(db_, kInsertLog);
+    insertLogs_.emplace(db_, kInsertLogs);
 }
 
 LogStore::~LogStore() {
@@ -136,16 +137,14 @@ std::optional<StoreProgress> LogStore::ProgressGet(const std::string &source) {
 
 void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
     SqliteTransaction transaction(db_);
-    for (const _SYSLOG_LOG_DATA_tag &log : logs)
-        InsertLog(log);
+    InsertLogs(logs);
     transaction.Commit();
 }
 
 void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs, const StoreProgress &progress) {
     PrepareProgress();
     SqliteTransaction transaction(db_);
-    for (const _SYSLOG_LOG_DATA_tag &log : logs)
-        InsertLog(log);
+    InsertLogs(logs);
     SaveProgress(progress);
     transaction.Commit();
 }
@@ -157,19 +156,10 @@ void LogStore::PrepareProgress() {
     saveProgress_.emplace(db_, kSaveProgress);
 }
 
-void LogStore::InsertLog(const _SYSLOG_LOG_DATA_tag &log) {
-    insertLog_->Bind(1, log.host);
-    insertLog_->Bind(2, log.ip);
-    insertLog_->Bind(3, log.fac);
-    insertLog_->Bind(4, g_MappingSyslogPrior[log.prio]);
-    insertLog_->Bind(5, log.tag);
-    insertLog_->Bind(6, log.utcsec);
-    insertLog_->Bind(7, log.tzoffset);
-    insertLog_->Bind(8, log.ldate);
-    insertLog_->Bind(9, log.ltime);
-    insertLog_->Bind(10, log.prog);
-    insertLog_->Bind(11, log.msg);
-    insertLog_->Run();
+void LogStore::InsertLogs(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
+    batch_.Set(logs);
+    insertLogs_->Run();
+    batch_.Set({});
 }
 
 void LogStore::SaveProgress(const StoreProgress &progress) {

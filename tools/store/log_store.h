@@ -9,6 +9,7 @@
 
 #include "base/sqlite.h"
 #include "kelosyslog/records.h"
+#include "store/record_table.h"
 
 namespace kelo::tool {
 
@@ -58,13 +59,14 @@ public:
 
 private:
     void FillEmpty();
-    void InsertLog(const _SYSLOG_LOG_DATA_tag &log);
+    void InsertLogs(std::span<const _SYSLOG_LOG_DATA_tag> logs);
     void PrepareProgress();
     void SaveProgress(const StoreProgress &progress);
 
     std::string path_; // absolute
     SqliteConnection db_;
-    std::optional<SqliteStatement> insertLog_;
+    RecordTable batch_;
+    std::optional<SqliteStatement> insertLogs_;
     std::optional<SqliteStatement> saveProgress_; // made when it is needed
 };
 
