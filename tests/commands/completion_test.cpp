@@ -28,7 +28,7 @@ TEST(Completion, OffersWhatGoesWithTheCommandLine) {
     const TempRoot root;
     fs::create_directories(root.File("var/log/kelosyslog/archive/nas_2020.db"));
     const std::pair<std::string, Words> cases[] = {
-        {"re", {"report", "receive"}},
+        {"re", {"report", "receive", "retention"}},
         {"--root / db r", {"reopen"}}, // behind an option with its value
         {"db create --", {"--output", "--db", "--schema", "--root", "--help"}},
         {"events clear-log --", {"--user", "--yes", "--root", "--help"}},

@@ -61,6 +61,7 @@ const Case kCases[] = {
     {"archive", "--yes", "le"},
     {"archive", "--list", ""}, // read-only: it is not rolled back
     {"archive", "--prune --keep 1d --yes", ""},
+    {"retention", "--yes", "l"},
     {"db info", "", "l"},
     {"db check", "", "l"},
     {"db create", "", ""}, // it is there already
@@ -153,6 +154,7 @@ TEST_F(SuperJournal, IsLeftAloneByEveryCommand) {
         covered.insert(one.command);
     EXPECT_EQ(covered, AllCommands());
     WriteFile(root_.File("lines"), LogLines(1, 2));
+    WriteFile(root_.File("etc/kelosyslog/retention.conf"), "keep=\"1d\"\n");
     for (const std::string mode : {"WAL", "DELETE"}) {
         SCOPED_TRACE(mode);
         Build(mode);

@@ -11,6 +11,7 @@
 #include "base/time_format.h"
 #include "status/server_status.h"
 #include "status/status_json.h"
+#include "status/status_prometheus.h"
 #include "status/status_screen.h"
 #include "status/storage_folder.h"
 #include "support/program_test.h"
@@ -253,6 +254,34 @@ TEST_F(Status, HasTheKeysThatAreDocumented) {
             documented.insert(line.substr(3, line.find('`', 3) - 3));
     }
     EXPECT_EQ(keys, documented);
+}
+
+TEST_F(Status, HasTheMetricsThatAreDocumented) {
+    const FakeSyslogNg syslogNg(control_, kCounters);
+    WriteFile(logs_ + ".corrupt", "x");
+    ReceiverState state;
+    state.pid = state.started = 1;
+    WriteReceiverState(root_.Path(), state);
+    std::set<std::string> metrics;
+    std::string name;
+    std::istringstream text(StatusPrometheus(Gather()));
+    for (std::string line; std::getline(text, line);) {
+        if (line.starts_with("# HELP ")) {
+            name = line.substr(7, line.find(' ', 7) - 7);
+            EXPECT_TRUE(metrics.insert(name).second) << name << " comes twice";
+        } else if (!line.starts_with("# TYPE " + name + (name.ends_with("_total") ? " counter" : " gauge"))) {
+            EXPECT_THAT(line, MatchesRegex(name + "(\\{[a-z]+=\".*\"\\})? [0-9.e+]+"));
+        }
+    }
+    std::set<std::string> documented;
+    std::istringstream page(ReadFile(SourcePath("docs/status.md")));
+    for (std::string line; std::getline(page, line);) {
+        if (line.starts_with("kelosyslog_"))
+            documented.insert(line.substr(0, line.find_first_of(" {")));
+    }
+    EXPECT_EQ(metrics, documented);
+    // What is special in a label.
+    EXPECT_THAT(StatusPrometheus(Gather()), HasSubstr("instance=\"a;\\\"b\\\"\"} 0\n"));
 }
 
 TEST_F(Status, FitsTheScreenWhateverTheTextsHold) {

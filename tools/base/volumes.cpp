@@ -61,4 +61,12 @@ std::vector<VolumeStatus> GatherVolumes(const std::string &root, const std::stri
     return volumes;
 }
 
+VolumeStatus VolumeOf(const std::string &root, const std::string &folder) {
+    for (const VolumeStatus &volume : GatherVolumes(root, folder)) {
+        if (std::find(volume.folders.begin(), volume.folders.end(), folder) != volume.folders.end())
+            return volume;
+    }
+    return {{folder}, 0, 0};
+}
+
 } // namespace kelo::tool

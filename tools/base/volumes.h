@@ -23,4 +23,7 @@ struct VolumeStatus {
 // of `folder` if it is not empty. Their order is fixed.
 std::vector<VolumeStatus> GatherVolumes(const std::string &root, const std::string &folder = "");
 
+// The one of `folder` among these.
+VolumeStatus VolumeOf(const std::string &root, const std::string &folder);
+
 } // namespace kelo::tool

@@ -19,6 +19,7 @@ KelosyslogProgram::KelosyslogProgram()
     AddReceive(*this);
     AddDb(*this);
     AddArchive(*this);
+    AddRetention(*this);
     AddStatus(*this);
     AddRoot(*this);
 }

@@ -23,6 +23,7 @@ void AddParse(Program &program);
 void AddReceive(Program &program);
 void AddDb(Program &program);
 void AddArchive(Program &program);
+void AddRetention(Program &program);
 void AddStatus(Program &program);
 
 } // namespace kelo::tool

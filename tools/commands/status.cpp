@@ -2,7 +2,9 @@
 
 #include <unistd.h>
 
+#include "base/atomic_file.h"
 #include "base/errors.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "commands/commands.h"
@@ -12,6 +14,7 @@
 #include "print/statistics_table.h"
 #include "status/server_status.h"
 #include "status/status_json.h"
+#include "status/status_prometheus.h"
 #include "status/status_screen.h"
 #include "status/watch.h"
 
@@ -25,7 +28,8 @@ constexpr const char *kFooter =
     "Examples:\n"
     "  kelosyslog status\n"
     "  kelosyslog status --watch 5        every 5 seconds, until q is typed\n"
-    "  kelosyslog status -o json | jq .attention\n\n"
+    "  kelosyslog status -o json | jq .attention\n"
+    "  kelosyslog status -o prometheus --to /var/lib/prometheus/node-exporter/kelosyslog.prom\n\n"
     "Exit status: 0 all is well, 1 something needs attention, 2 usage, 4 output.";
 
 constexpr uint64_t kLongestPauseSec = 86400;
@@ -36,18 +40,31 @@ struct Options {
     std::string format = "text";
     std::string colour = "auto";
     std::string pause;
+    std::string to;
     bool mustWatch = false;
 };
 
-bool IsJson(const std::string &format) {
-    const OutputFormat parsed = ParseOutputFormat(format);
-    if (parsed != OutputFormat::Text && parsed != OutputFormat::Json)
-        throw UsageError("--output: there is no form '" + format + "' of this; forms are text, json");
-    return parsed == OutputFormat::Json;
+enum class Form { kScreen, kJson, kPrometheus };
+
+Form ParseForm(const std::string &name) {
+    if (name == "text")
+        return Form::kScreen;
+    if (name == "json")
+        return Form::kJson;
+    if (name == "prometheus")
+        return Form::kPrometheus;
+    throw UsageError("--output: there is no form '" + name + "' of this; forms are text, json, prometheus");
+}
+
+// What reads the file finds the whole old or new one.
+void WriteTo(const std::string &path, const std::string &text) {
+    AtomicFile file(path);
+    file.Write(text);
+    file.Commit();
 }
 
 int Run(const Options &options, const std::string &root) {
-    const bool isJson = IsJson(options.format);
+    const Form form = ParseForm(options.format);
     const bool hasColour = WantsColour(ParseColourMode(options.colour));
     const uint64_t pause = options.mustWatch ? ParseNumber("--watch", options.pause, 1, kLongestPauseSec) : 0;
     StatusOptions question;
@@ -58,10 +75,19 @@ int Run(const Options &options, const std::string &root) {
         const ServerStatus status = GatherStatus(question);
         result = status.attention.empty() ? kExitFound : kExitNothing;
         const size_t width = isatty(STDOUT_FILENO) == 1 ? OutputWidth() : 0;
-        return isJson ? StatusJson(status) : RenderStatus(status, {width, height, hasColour});
+        return form == Form::kJson         ? StatusJson(status)
+               : form == Form::kPrometheus ? StatusPrometheus(status)
+                                           : RenderStatus(status, {width, height, hasColour});
     };
+    if (options.mustWatch && (form == Form::kPrometheus || !options.to.empty()))
+        throw UsageError("--watch: goes with the forms text and json, and without --to");
     if (options.mustWatch) {
-        Watch({std::chrono::seconds(pause), !isJson, isJson ? "" : "\n"}, draw);
+        const bool isScreen = form == Form::kScreen;
+        Watch({std::chrono::seconds(pause), isScreen, isScreen ? "\n" : ""}, draw);
+        return result;
+    }
+    if (!options.to.empty()) {
+        WriteTo(options.to, draw(0));
         return result;
     }
     Output output(false);
@@ -89,7 +115,10 @@ void AddStatus(Program &program) {
                                     [options, &program] { return Run(*options, program.root); });
     command.Footer(kFooter);
     AddWatch(command, *options);
-    AddKeyValuesFormat(command, options->format);
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
+                               "text (default), json (one object) or prometheus (metrics)"),
+               {"text", "json", "prometheus"});
+    command.AddText("--to", options->to, "FILE", "Write it there; the file is replaced as a whole");
     command.AddText("--color", options->colour, "WHEN",
                     "auto (default: on a terminal, unless NO_COLOR is set), always, never");
     command.AddText("--control", options->control, "PATH",

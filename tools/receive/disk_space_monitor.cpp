@@ -2,7 +2,6 @@
 
 #include <syslog.h>
 
-#include <algorithm>
 #include <cstdint>
 
 #include "base/volumes.h"
@@ -23,11 +22,7 @@ DiskSpaceMonitor::DiskSpaceMonitor(const std::string &root, std::string folder)
     : root_(root), folder_(std::move(folder)), reserve_(root) {}
 
 std::string DiskSpaceMonitor::NameOfVolume() const {
-    for (const VolumeStatus &volume : GatherVolumes(root_, folder_)) {
-        if (std::find(volume.folders.begin(), volume.folders.end(), folder_) != volume.folders.end())
-            return volume.folders.front();
-    }
-    return folder_;
+    return VolumeOf(root_, folder_).folders.front();
 }
 
 void DiskSpaceMonitor::NoteFull() {

@@ -89,6 +89,23 @@ void LookAtDatabases(const ServerStatus &status, Lines &lines) {
         lines.push_back("archives: " + status.archives.problem);
 }
 
+void LookAtRetention(const ServerStatus &status, Lines &lines) {
+    constexpr int64_t kDaySec = 86400;
+    const RetentionStatus &retention = status.retention;
+    if (!retention.problem.empty())
+        lines.push_back("the rule of retention is not followed: " + retention.problem);
+    if (retention.isReceptionStopped)
+        lines.push_back("receiving is stopped, as the rule of retention says for a volume that fills");
+    for (const DatabaseStatus &database : status.databases) {
+        if (database.name == "logs" && retention.problem.empty() && retention.rule &&
+            retention.rule->keepSec > 0 && database.first &&
+            status.time - *database.first > retention.rule->keepSec + kDaySec)
+            lines.push_back("records are " + Duration(status.time - *database.first) +
+                            " old and the rule of retention keeps " + retention.rule->keep +
+                            "; does kelosyslog-retention.timer run?");
+    }
+}
+
 void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &lines) {
     if (!status.problem.empty())
         lines.push_back("notifications: " + status.problem);
@@ -112,6 +129,7 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     LookAtReceiver(status.receiver, status.time, lines);
     lines.insert(lines.end(), status.folderProblems.begin(), status.folderProblems.end());
     LookAtDatabases(status, lines);
+    LookAtRetention(status, lines);
     LookAtNotifications(status.notifications, status.time, lines);
     for (const VolumeStatus &volume : status.volumes) {
         if (volume.FreeLevel() != VolumeStatus::Level::Good)

@@ -55,6 +55,7 @@ ServerStatus GatherStatus(const StatusOptions &options) {
         others.push_back(status.receiver.told.database);
     status.databases = GatherDatabases(options.root, others);
     status.archives = GatherArchives(options.root);
+    status.retention = GatherRetention(options.root);
     WithDatabase(status, "accounting",
                  [&](const std::string &path) { status.accounting = GatherAccounting(path, kDevices); });
     WithDatabase(status, "events",

@@ -11,6 +11,7 @@
 #include "status/notifications.h"
 #include "status/receiver.h"
 #include "status/recent_events.h"
+#include "status/retention.h"
 #include "status/syslog_ng.h"
 
 namespace kelo::tool {
@@ -22,6 +23,7 @@ struct ServerStatus {
     ReceiverStatus receiver;
     std::vector<DatabaseStatus> databases;
     ArchiveStatus archives;
+    RetentionStatus retention;
     std::optional<AccountingStatus> accounting; // nothing without a database that can be read
     NotificationStatus notifications;
     std::vector<Event> events; // newest first

@@ -104,6 +104,14 @@ Value ToJson(const ArchiveStatus &status) {
     return json;
 }
 
+Value ToJson(const RetentionStatus &status) {
+    Value json;
+    json["rule"] = status.rule ? DescribeRetention(*status.rule) : "";
+    json["problem"] = status.problem;
+    json["receiving_stopped"] = status.isReceptionStopped;
+    return json;
+}
+
 Value ToJson(const AccountingStatus &status) {
     Value json;
     json["newest"] = Known(status.newest);
@@ -180,6 +188,7 @@ std::string StatusJson(const ServerStatus &status) {
     json["receiver"] = ToJson(status.receiver);
     json["databases"] = ToArray(status.databases);
     json["archives"] = ToJson(status.archives);
+    json["retention"] = ToJson(status.retention);
     json["accounting"] = status.accounting ? ToJson(*status.accounting) : Value();
     json["notifications"] = ToJson(status.notifications);
     json["events"] = ToArray(status.events);

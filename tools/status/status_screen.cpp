@@ -146,6 +146,17 @@ void AddDatabases(Lines &lines, const ServerStatus &status) {
                        (archives.problem.empty() ? "" : ": " + archives.problem));
 }
 
+void AddRetention(Lines &lines, const RetentionStatus &status) {
+    if (!status.rule && status.problem.empty() && !status.isReceptionStopped)
+        return;
+    AddSection(lines, "retention", status.rule ? DescribeRetention(*status.rule) : "no rule",
+               status.problem.empty() ? kHeading : kBad);
+    if (!status.problem.empty())
+        AddText(lines, status.problem, kBad);
+    if (status.isReceptionStopped)
+        AddText(lines, "receiving is stopped", kBad);
+}
+
 void AddAccounting(Lines &lines, const ServerStatus &status) {
     if (!status.accounting)
         return;
@@ -244,6 +255,7 @@ std::string RenderStatus(const ServerStatus &status, const ScreenLayout &layout)
     AddSyslogNg(lines, status.syslogNg);
     AddReceiver(lines, status.receiver);
     AddDatabases(lines, status);
+    AddRetention(lines, status.retention);
     AddAccounting(lines, status);
     AddNotifications(lines, status.notifications, status.time);
     AddEvents(lines, status.events);
