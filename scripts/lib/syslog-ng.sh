@@ -61,6 +61,8 @@ syslog_ng_configure() {
     define "$root/kelosyslog.conf" kelo_buffer_dir "$root"
     define "$root/kelosyslog.conf" kelo_reserve "$(readlink -f "$(dirname "${BASH_SOURCE[0]}")/../../package/syslog-ng/reserve-buffer")"
     define "$root/kelosyslog.conf" kelo_address 127.0.0.1
+    define "$root/kelosyslog.conf" kelo_listen "$root/listen.con[f]"
+    define "$root/kelosyslog.conf" kelo_tls_dir "$root/tls"
     cat >"$root/syslog-ng.conf" <<END
 @version: 3.38
 options { stats-level(1); stats-freq(0); time-reopen(1); };
