@@ -72,6 +72,7 @@ const Case kCases[] = {
     {"db quarantine", "--force --yes", "l"},
     {"db reopen", "", ""},
     {"rules", "list", ""},
+    {"listen", "", ""},
     {"notify", "list", ""},
 };
 

@@ -20,6 +20,7 @@ KelosyslogProgram::KelosyslogProgram()
     AddDb(*this);
     AddArchive(*this);
     AddRetention(*this);
+    AddListen(*this);
     AddStatus(*this);
     AddRoot(*this);
 }

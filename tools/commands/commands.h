@@ -24,6 +24,7 @@ void AddReceive(Program &program);
 void AddDb(Program &program);
 void AddArchive(Program &program);
 void AddRetention(Program &program);
+void AddListen(Program &program);
 void AddStatus(Program &program);
 
 } // namespace kelo::tool

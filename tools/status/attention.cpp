@@ -126,6 +126,8 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     Lines lines;
     LookAtSyslogNg(status.syslogNg, lines);
     LookAtQueues(status, lines);
+    for (std::string &line : FindNetworkProblems(status.network, status.syslogNg))
+        lines.push_back(std::move(line));
     LookAtReceiver(status.receiver, status.time, lines);
     lines.insert(lines.end(), status.folderProblems.begin(), status.folderProblems.end());
     LookAtDatabases(status, lines);

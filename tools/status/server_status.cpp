@@ -48,6 +48,7 @@ ServerStatus GatherStatus(const StatusOptions &options) {
     ServerStatus status;
     status.time = std::time(nullptr);
     status.syslogNg = GatherSyslogNg(options.root, options.control, options.timeout);
+    status.network = GatherNetwork(options.root, !options.control.empty(), status.syslogNg);
     status.receiver = GatherReceiver(options.root, status.time);
     status.folderProblems = FindFolderProblems(status.syslogNg, status.receiver);
     std::vector<std::string> others;

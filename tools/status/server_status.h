@@ -8,6 +8,7 @@
 #include "base/volumes.h"
 #include "status/accounting.h"
 #include "status/databases.h"
+#include "status/network.h"
 #include "status/notifications.h"
 #include "status/receiver.h"
 #include "status/recent_events.h"
@@ -20,6 +21,7 @@ namespace kelo::tool {
 struct ServerStatus {
     int64_t time = 0; // seconds since the epoch, as all times
     SyslogNgStatus syslogNg;
+    NetworkStatus network;
     ReceiverStatus receiver;
     std::vector<DatabaseStatus> databases;
     ArchiveStatus archives;

@@ -32,6 +32,7 @@ Value ToJson(const SyslogNgStatus &status) {
     const bool areTold = status.state == SyslogNgStatus::State::Running && status.problem.empty();
     json["received"] = areTold ? Count(status.Received()) : Value();
     json["dropped"] = areTold ? Count(status.Dropped()) : Value();
+    json["above_rate"] = areTold ? Count(status.aboveRate) : Value();
     json["sources"] = Json::arrayValue;
     for (const SyslogNgCounters &source : status.sources) {
         Value &item = json["sources"].append(Value());
@@ -51,6 +52,22 @@ Value ToJson(const SyslogNgStatus &status) {
         item["stuck"] = destination.isStuck;
         item["memory_bytes"] = Count(destination.memory);
     }
+    return json;
+}
+
+Value ToJson(const Listener &listener) {
+    Value json;
+    json["protocol"] = listener.isTcp ? "tcp" : "udp";
+    json["address"] = listener.address;
+    json["port"] = Number(listener.port);
+    json["families"] = listener.Families();
+    json["form"] = listener.form;
+    json["encryption"] = listener.isTls ? "TLS" : "";
+    json["configured"] = listener.isConfigured;
+    json["open"] = listener.isOpen;
+    json["connections"] = Count(listener.connections);
+    json["most_connections"] = listener.mostConnections != 0 ? Count(listener.mostConnections) : Value();
+    json["kernel_drops"] = Count(listener.drops);
     return json;
 }
 
@@ -185,6 +202,7 @@ std::string StatusJson(const ServerStatus &status) {
     json["well"] = status.attention.empty();
     json["attention"] = ToArray(status.attention);
     json["syslog_ng"] = ToJson(status.syslogNg);
+    json["listening"] = ToArray(status.network.listeners);
     json["receiver"] = ToJson(status.receiver);
     json["databases"] = ToArray(status.databases);
     json["archives"] = ToJson(status.archives);

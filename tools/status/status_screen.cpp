@@ -8,6 +8,7 @@
 #include "base/time_format.h"
 #include "print/statistics_table.h"
 #include "status/figures.h"
+#include "status/listener_table.h"
 #include "status/state_names.h"
 
 namespace kelo::tool {
@@ -87,6 +88,17 @@ void AddSyslogNg(Lines &lines, const SyslogNgStatus &status) {
                    Bytes(static_cast<int64_t>(counters.memory)), counters.instance});
         colours.push_back(counters.dropped > 0 ? kBad : kPlain);
     }
+    AddTable(lines, table, colours);
+}
+
+void AddNetwork(Lines &lines, const NetworkStatus &status) {
+    if (status.listeners.empty())
+        return;
+    AddSection(lines, "listening", "", kHeading);
+    const StatisticsTable table = TableOfListeners(status.listeners);
+    std::vector<const char *> colours;
+    for (const Listener &listener : status.listeners)
+        colours.push_back(listener.isOpen && listener.drops == 0 ? kPlain : kBad);
     AddTable(lines, table, colours);
 }
 
@@ -253,6 +265,7 @@ std::string RenderStatus(const ServerStatus &status, const ScreenLayout &layout)
     Lines lines;
     AddHead(lines, status, layout.width);
     AddSyslogNg(lines, status.syslogNg);
+    AddNetwork(lines, status.network);
     AddReceiver(lines, status.receiver);
     AddDatabases(lines, status);
     AddRetention(lines, status.retention);

@@ -38,6 +38,7 @@ struct SyslogNgStatus {
     std::string problem; // why there are no counters; "" when there are
     std::vector<SyslogNgCounters> sources;
     std::vector<SyslogNgCounters> destinations;
+    uint64_t aboveRate = 0; // messages that the rate limit of the shipped configuration dropped
 
     uint64_t Received() const;
     uint64_t Dropped() const;
