@@ -49,6 +49,10 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     EXPECT_THAT(quarantine.out, HasSubstr("reloaded  no"));
     EXPECT_TRUE(ReadFile(logs_ + ".corrupt") == content);
     EXPECT_TRUE(fs::exists(logs_ + ".corrupt.1/x")) << "what had the name is kept";
+    Expect("count", 1, "0\n");
+    RunSql(logs_, "DROP TABLE logs; VACUUM; PRAGMA journal_mode = WAL"); // as syslog-ng opens it
+    EXPECT_THAT(Run("count").err, HasSubstr("it has no table yet"));
+    EXPECT_THAT(Run("status --control none").out, HasSubstr("logs        good"));
     Expect("db limit 1000000 --db var/log/kelosyslog/logs.db.corrupt", 1);
     fs::create_symlink(logs_ + ".corrupt", root_.File("link"));
     Expect("db limit 8 --db link", 0);

@@ -138,6 +138,26 @@ class NotifyTest(unittest.TestCase):
         self.assertEqual([mail[1] for mail in server.mails], [[ADMIN], [NIGHT]])
         self.assertIn(f"<{entry}.".encode(), server.mails[0][2])
 
+    def test_a_channel_works_again_after_a_retry_and_when_its_time_has_come(self):
+        server = self.start(MailServer())
+        status = lambda: subprocess.run([BIN + "/kelosyslog", "--root", self.root, "notify", "status"], capture_output=True, text=True).stdout
+        for deliver in (self.retry, lambda: self.deliver("--linger", "30")):
+            server.stop()
+            self.add()
+            self.deliver(status=1)
+            self.assertRegex(status(), "mail +failing: .*next attempt")
+            server.start()
+            path = self.spool + "/channels.json"
+            with open(path) as file:
+                health = json.load(file)
+            self.assertGreater(health["targets"]["mail"]["next"], time.time() + 5)
+            health["targets"]["mail"]["next"] = int(time.time()) + 2  # nobody waits for all of it here
+            with open(path, "w") as file:
+                json.dump(health, file)
+            deliver()
+            self.assertRegex(status(), "mail +on\n")
+        self.assertEqual(len(server.mails), 2)
+
     def test_entries_that_are_old_or_damaged_are_given_up_with_the_reason_and_can_be_retried(self):
         server = self.start(MailServer())
         server.refuse = {ADMIN: "550 no such user"}

@@ -111,6 +111,17 @@ int SetWal(const DbOptions &options) {
     return isComplete ? kExitFound : kExitNothing;
 }
 
+// Puts a fresh database in the place of a working log that is gone, so that it can be read before the first
+// message. Only where nobody else can write the folder, and only there does syslog-ng store.
+void BeginFresh(const LogTable &gone, const std::string &root) {
+    struct stat folder {};
+    if (gone.path != ResolveLogTable({}, root).path ||
+        stat(fs::path(gone.path).parent_path().c_str(), &folder) != 0 || folder.st_uid != geteuid())
+        return;
+    if (DBHandler(gone.path, root + "/usr/kelo/syslog/schema/logs.sql").DBCreate() != 0)
+        PrintMessage("there is no fresh " + gone.path + " before the next message; see the system log");
+}
+
 int Limit(const LimitOptions &options) {
     const OutputFormat format = options.Format();
     const std::string path = options.Table().path;
@@ -126,6 +137,8 @@ int Limit(const LimitOptions &options) {
     const bool isBeyond = before.st_size / 1024 > limit;
     if (isBeyond && !isRemoved)
         throw DatabaseError("cannot remove " + path);
+    if (isRemoved)
+        BeginFresh(options.Table(), *options.root);
     KeyValues values;
     values.Add("path", path);
     values.Add("size_kib", int64_t{before.st_size / 1024});
@@ -214,9 +227,11 @@ int Quarantine(const QuarantineOptions &options) {
     values.Add("to", moved);
     values.AddBool("reloaded", isReloaded);
     Print(values, format);
+    BeginFresh(options.Table(), *options.root);
     if (isReloaded)
         return kExitFound;
-    PrintMessage("syslog-ng was not reloaded and goes on writing into the moved file; reload it yourself");
+    PrintMessage("syslog-ng was not reloaded; if it stores into " + path +
+                 ", it goes on in the moved file until you reload it");
     return kExitDatabase;
 }
 

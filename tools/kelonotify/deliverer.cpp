@@ -34,8 +34,10 @@ int64_t Deliverer::Pass() {
     channels_.clear();
     health_ = spool_.ReadChannels();
     isForced_ = spool_.TakeRetryRequest();
-    if (isForced_)
-        health_.targets.clear();
+    if (isForced_) {
+        for (auto &[channel, attempts] : health_.targets)
+            attempts.failures = 0, attempts.next = 0; // what is known stays until the channel has been tried
+    }
     isAllDelivered_ = true;
     nextTry_ = -1;
     spool_.CleanUp(Now());

@@ -48,7 +48,8 @@ int Run(const NotifierOptions &options) {
     Watcher watcher(spool.File("new"));
     Deliverer deliverer(spool, settings, options.delivery, [&] { return watcher.ShouldStop(); });
     int64_t next = deliverer.Pass();
-    while (options.mustStay && !watcher.ShouldStop()) {
+    const auto mustWait = [&] { return options.mustStay || (next >= 0 && next <= options.lingerSec); };
+    while (mustWait() && !watcher.ShouldStop()) {
         watcher.Wait(next);
         if (!watcher.ShouldStop())
             next = deliverer.Pass();

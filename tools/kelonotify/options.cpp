@@ -8,6 +8,10 @@ void DeclareCommandLine(CLI::App &app, NotifierOptions &options) {
     app.set_version_flag("--version", "kelonotify " KELOSYSLOG_VERSION);
     app.add_option("--root", options.root, "Work on the spool and the settings below DIR")->type_name("DIR");
     app.add_flag("--watch", options.mustStay, "Stay, and deliver what comes");
+    app.add_option("--linger", options.lingerSec,
+                   "Stay as long as the next attempt follows within SECONDS (0)")
+        ->type_name("SECONDS")
+        ->check(CLI::Range(0, 3600));
     app.add_option("--timeout", options.delivery.timeoutSec, "End a step on a network after SECONDS (30)")
         ->type_name("SECONDS")
         ->check(CLI::Range(1, 600));

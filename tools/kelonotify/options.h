@@ -12,6 +12,7 @@ namespace kelo::tool {
 struct NotifierOptions {
     std::string root;
     bool mustStay = false;
+    int64_t lingerSec = 0; // stays while the next attempt follows within these
     DelivererOptions delivery;
 };
 

@@ -48,6 +48,14 @@ bool IsShorterThanItSays(const Header &header, int64_t fileSize) {
     return pages * pageSize > fileSize;
 }
 
+// Whether it holds a header only: syslog-ng opens a fresh file at once, and creates the table with the first
+// message.
+bool IsFresh(const std::string &path, const Header &header) {
+    struct stat log {};
+    const bool hasLog = stat((path + "-wal").c_str(), &log) == 0 && log.st_size > 0;
+    return !hasLog && header[28] == 0 && header[29] == 0 && header[30] == 0 && header[31] == 1;
+}
+
 // Whoever may write to the folder creates the index.
 bool HasLogWithoutIndex(const std::string &path) {
     struct stat status {};
@@ -74,6 +82,8 @@ std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
         return "it is not an SQLite database (or an encrypted one)";
     if (size < static_cast<ssize_t>(kHeaderSize) || IsShorterThanItSays(header, status.st_size))
         return "the file is cut short";
+    if (!forWriting && IsFresh(table.path, header))
+        return "it has no table yet: the first record creates it";
     const std::string folder = std::filesystem::path(table.path).parent_path().string();
     if (forWriting && (access(table.path.c_str(), W_OK) != 0 || access(folder.c_str(), W_OK) != 0))
         return "no permission to write to it and its folder";

@@ -93,6 +93,11 @@ void Read(DatabaseStatus &status) {
     try {
         const ReadOnlyQuery database({status.path, status.table}, kPatience);
         database.RequireTable();
+        if (status.table == "logs" && status.size > 0 &&
+            database.Number("SELECT count(*) AS value FROM sqlite_master") == 0) {
+            status.rows = 0; // syslog-ng creates the table with the first message
+            return;
+        }
         ReadRows(database, status);
         try {
             if (status.table == "transfer_log")
