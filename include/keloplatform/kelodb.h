@@ -4,7 +4,7 @@
 //
 // A connection and its results are used by one thread at a time. Nothing here throws, and nothing writes to
 // the system log: a failure is a null or negative result, and the connection has the cause (KELODBErrorGet,
-// and sqlite3_errcode() on KELODBInternalDBHdlGet).
+// sqlite3_errcode() on KELODBInternalDBHdlGet, and failure.h).
 
 #include <cstddef>
 
@@ -27,8 +27,8 @@ extern "C" {
 // writer with a time-out. SQL reached through the connection can neither load extensions nor attach other
 // files.
 //
-// Returns a connection that the caller closes with KELODBClose, or null: no path, no such file, no
-// permission, out of memory. A file that is not a database is detected only by the first statement.
+// Returns a connection that the caller closes with KELODBClose, or null: no path (errno EINVAL), no such file
+// (ENOENT), no permission (EACCES), a folder (EISDIR), out of memory (ENOMEM). A file that is not a database is detected only by the first statement.
 KELOPLATFORM_API DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path);
 
 // Closes the connection; null is accepted. Results stay valid until they are freed themselves. Returns 0, or

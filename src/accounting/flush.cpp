@@ -3,11 +3,13 @@
 #include <syslog.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <memory>
 #include <new>
 #include <utility>
 
 #include "accounting/device_table.h"
+#include "common/failure.h"
 #include "common/root.h"
 #include "kelosyslog/accounting.h"
 #include "kelosyslog/dbhandler.h"
@@ -42,11 +44,8 @@ public:
     explicit FlushDatabase(const std::string &path)
         : path_(path), db_(path, kelo::RootedPath("/usr/kelo/syslog/schema/accinfo.sql")) {}
     ~FlushDatabase() {
-        try {
-            End();
-        } catch (const std::bad_alloc &) {
-            syslog(LOG_ERR, "Fail to end transaction");
-        }
+        if (!hasEnded_)
+            EndAfterFailure();
         db_.DBDiscon();
     }
     FlushDatabase(const FlushDatabase &) = delete;
@@ -84,6 +83,7 @@ public:
                                        device.c_str(), ullNumberToString(count).c_str());
         if (db_.DBExecute(sql) >= 0)
             return true;
+        const kelo::FailureKeeper keeper;
         db_.DBTranRollback();
         ReportFailedStatement(sql);
         return false;
@@ -94,10 +94,12 @@ public:
     bool Trim() {
         struct stat status {};
         if (stat(path_.c_str(), &status) != 0) {
+            kelo::FailWithErrno(path_, "stat", errno);
             Debuger::MSG(0, "Fail to state file status: " + path_);
             return false;
         }
         if (!S_ISREG(status.st_mode)) {
+            kelo::Fail(KELO_FAILURE_ARGUMENT, path_, "stat", "it is no regular file");
             Debuger::MSG(0, "Working database is not regular file");
             return false;
         }
@@ -108,6 +110,15 @@ public:
     }
 
 private:
+    void EndAfterFailure() {
+        const kelo::FailureKeeper keeper;
+        try {
+            End();
+        } catch (const std::bad_alloc &) {
+            syslog(LOG_ERR, "Fail to end transaction");
+        }
+    }
+
     const std::string &path_;
     DBHandler db_;
     bool isOpen_ = false;

@@ -1,8 +1,10 @@
 #pragma once
 
+#include <cerrno>
 #include <memory>
 #include <string>
 
+#include "common/failure.h"
 #include "keloplatform/kelodb.h"
 
 namespace kelo {
@@ -24,6 +26,17 @@ inline DbConnection Connect(const std::string &path) {
     if (path.find('\0') != std::string::npos)
         return nullptr;
     return DbConnection(KELODBConnect(nullptr, nullptr, nullptr, path.c_str()));
+}
+
+// The same for a public function, which fails with it: a failure becomes the thread's last one.
+inline DbConnection ConnectOrFail(const std::string &path) {
+    errno = 0;
+    DbConnection connection = Connect(path);
+    if (connection == nullptr && path.find('\0') != std::string::npos)
+        Fail(KELO_FAILURE_ARGUMENT, path, "KELODBConnect", "the path holds a NUL byte");
+    else if (connection == nullptr)
+        FailPlatform(path, "KELODBConnect");
+    return connection;
 }
 
 } // namespace kelo

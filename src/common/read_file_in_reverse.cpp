@@ -3,9 +3,12 @@
 #include <syslog.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+
+#include "common/failure.h"
 
 namespace {
 
@@ -87,9 +90,7 @@ int32_t CollectLines(BackwardReader &reader, const char *buffer, long length, Li
     return lines.Add(buffer, static_cast<size_t>(lineEnd)) ? 0 : -1;
 }
 
-} // namespace
-
-int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t max) {
+int32_t ReadInReverse(FILE *stream, char ***lines, int32_t &count, int32_t max) {
     *lines = static_cast<char **>(std::calloc(static_cast<size_t>(max), sizeof(char *)));
     if (*lines == nullptr) {
         syslog(LOG_ERR, "%s:%d calloc failed. %m", "utils", __LINE__);
@@ -115,4 +116,11 @@ int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t m
         return 0;
     BackwardReader reader(stream, buffer.get(), length);
     return CollectLines(reader, buffer.get(), length, target);
+}
+
+} // namespace
+
+int32_t readfileinreverse(FILE *stream, char ***lines, int32_t &count, int32_t max) {
+    const int32_t result = ReadInReverse(stream, lines, count, max);
+    return result == 0 ? 0 : kelo::FailWithErrno("", "readfileinreverse", errno);
 }

@@ -1,5 +1,6 @@
 #include "common/root.h"
 
+#include "common/failure.h"
 #include "kelosyslog/root.h"
 
 namespace {
@@ -15,7 +16,7 @@ std::string &Root() {
 
 int SyslogRootSet(const std::string &root) {
     if (!root.empty() && root.front() != '/')
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, root, "SyslogRootSet", "the root is a relative path");
     Root() = root;
     return 0;
 }

@@ -3,6 +3,7 @@
 #include <cstdlib>
 
 #include "common/db_field.h"
+#include "common/failure.h"
 
 using kelo::FieldText;
 
@@ -36,6 +37,10 @@ int64_t SignedField(DBResult_tag *result, uint32_t row, const char *column) {
     return IsPlainNumber(text, number) ? static_cast<int64_t>(number) : std::strtoll(text, nullptr, 10);
 }
 
+int FailForNull() {
+    return kelo::Fail(KELO_FAILURE_ARGUMENT, "", "convert a row", "a null pointer");
+}
+
 } // namespace
 
 std::string TrimUserName(const std::string &text) {
@@ -45,7 +50,7 @@ std::string TrimUserName(const std::string &text) {
 
 int DBRecToAllLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log, bool trimUser) {
     if (result == nullptr || log == nullptr)
-        return -1;
+        return FailForNull();
     log->id = UnsignedField(result, row, "id");
     log->host = FieldText(result, row, "host");
     log->ip = FieldText(result, row, "ip");
@@ -65,7 +70,7 @@ int DBRecToAllLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *
 
 int DBRecToSysLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log) {
     if (result == nullptr || log == nullptr)
-        return -1;
+        return FailForNull();
     log->id = UnsignedField(result, row, "id");
     log->host = FieldText(result, row, "host");
     log->prio = PriorStrToType(FieldText(result, row, "llevel"));
@@ -80,7 +85,7 @@ int DBRecToSysLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *
 
 int DBRecToXferLogInfo(DBResult_tag *result, uint32_t row, _SYSLOG_LOG_DATA_tag *log) {
     if (result == nullptr || log == nullptr)
-        return -1;
+        return FailForNull();
     log->id = UnsignedField(result, row, "id");
     log->host = FieldText(result, row, "host");
     log->prog = FieldText(result, row, "prog");
@@ -103,5 +108,5 @@ int DBRecToLogInfo(const std::string &table, DBResult_tag *result, uint32_t row,
         return DBRecToSysLogInfo(result, row, log);
     if (table == "transfer_log")
         return DBRecToXferLogInfo(result, row, log);
-    return -1;
+    return kelo::Fail(KELO_FAILURE_ARGUMENT, "", table, "no log table has this name");
 }

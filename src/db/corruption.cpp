@@ -3,6 +3,7 @@
 
 #include <cerrno>
 
+#include "common/failure.h"
 #include "common/report.h"
 #include "common/string_map.h"
 #include "db/database_files.h"
@@ -33,8 +34,10 @@ bool HasName(DBConnect_tag *connection, const std::string &dbPath) {
 bool TellAdministrator(const std::string &dbPath) {
     NotificationManager notifications;
     kelo::SzHash placeholders;
-    if (!placeholders)
+    if (!placeholders) {
+        kelo::FailPlatform(dbPath, "TORVCSzHashAlloc");
         return false;
+    }
     placeholders.Set("%DBPATH%", dbPath);
     if (notifications.NotificationSend("KELOSYSLOG_DB_CORRUPT", placeholders.Address()) < 0) {
         kelo::ReportErrorAt("dbhandler", __LINE__, "Fail to send notification when db corruption");
@@ -51,12 +54,18 @@ Outcome PutAside(DBConnect_tag *connection, const std::string &dbPath, int &erro
     if (!lock.MayGoOn())
         return Outcome::kFailed;
     // Whoever met the damage first has dealt with it, and what has the name now is sound.
-    if (!HasName(connection, dbPath))
+    if (!HasName(connection, dbPath)) {
+        if (connection == nullptr)
+            kelo::FailWithErrno(dbPath, "stat", ENOENT);
         return connection != nullptr ? Outcome::kMovedBefore : Outcome::kFailed;
+    }
     if (!TellAdministrator(dbPath))
         return Outcome::kFailed;
     error = kelo::PutDatabaseAside(dbPath, dbPath + ".corrupt");
-    return error == 0 ? Outcome::kMoved : Outcome::kFailed;
+    if (error == 0)
+        return Outcome::kMoved;
+    kelo::FailWithErrno(dbPath, "rename", error);
+    return Outcome::kFailed;
 }
 
 } // namespace
@@ -69,6 +78,7 @@ int32_t DBErrorHandle_SQLITE_CORRUPT(DBConnect_tag *connection, std::string dbPa
         return outcome == Outcome::kMovedBefore ? 0 : -1;
     }
     if (!KELOSystemdReload("syslog-ng")) {
+        kelo::FailPlatform("", "KELOSystemdReload");
         kelo::ReportErrorAt("dbhandler", __LINE__, "Fail to send HUP signal to syslog-ng");
         return -1;
     }

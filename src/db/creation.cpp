@@ -2,16 +2,19 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <sys/statvfs.h>
 #include <syslog.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <optional>
 #include <tuple>
 #include <vector>
 
 #include "common/db_field.h"
 #include "common/db_handles.h"
+#include "common/failure.h"
 #include "common/report.h"
 #include "db/database_files.h"
 #include "db/database_lock.h"
@@ -41,10 +44,15 @@ bool IsSafeBetweenQuotes(const std::string &path) {
 // Nothing must come into being where a name was mistyped.
 bool IsAcceptable(const std::string &dbPath) {
     if (IsDanglingLink(dbPath)) {
+        Fail(KELO_FAILURE_ARGUMENT, dbPath, "DBCreate", "it is a link to nothing");
         ReportError(dbPath + " is a link to nothing");
         return false;
     }
-    return IsSafeBetweenQuotes(dbPath);
+    if (IsSafeBetweenQuotes(dbPath))
+        return true;
+    Fail(KELO_FAILURE_ARGUMENT, dbPath, "DBCreate",
+         "the path holds a character that a shell takes for its own");
+    return false;
 }
 
 int ReportFailure(const std::string &dbPath, const std::string &schemaPath) {
@@ -101,9 +109,26 @@ void SetWriteAheadLog(const std::string &dbPath) {
         Debuger::MSG(0, "Fail to set jounal mode as WAL, use DELETE by default " + command);
 }
 
+// The sqlite3 tool writes its reason to the standard error; what lies outside of it is looked for here.
+void FailForSchema(const std::string &dbPath, const std::string &schemaPath, const std::string &command) {
+    const std::string folder = dbPath.substr(0, dbPath.rfind('/') + 1);
+    struct statvfs space {};
+    if (access(schemaPath.c_str(), R_OK) != 0)
+        FailWithErrno(schemaPath, command, errno);
+    else if (access(folder.c_str(), W_OK) != 0)
+        FailWithErrno(folder, command, errno);
+    else if (statvfs(folder.c_str(), &space) == 0 && space.f_bavail == 0)
+        FailWithErrno(dbPath, command, ENOSPC);
+    else
+        Fail(KELO_FAILURE_OTHER, dbPath, command, "the sqlite3 tool cannot make it from the schema");
+}
+
 int RunSchema(const std::string &dbPath, const std::string &schemaPath) {
-    if (!RunShell(ToolFor(dbPath) + "< " + schemaPath))
+    const std::string command = ToolFor(dbPath) + "< " + schemaPath;
+    if (!RunShell(command)) {
+        FailForSchema(dbPath, schemaPath, command);
         return ReportFailure(dbPath, schemaPath);
+    }
     syslog(LOG_INFO, "create database: %s by %s", dbPath.c_str(), schemaPath.c_str());
     SetWriteAheadLog(dbPath);
     return 0;
@@ -172,6 +197,7 @@ int CreateDatabase(const std::string &dbPath, const std::string &schemaPath, Cre
         return ReportFailure(dbPath, schemaPath);
     const std::string folder = dbPath.substr(0, dbPath.rfind('/'));
     if (KELOFSMkdirP(folder.c_str(), 0, 1, -1, -1, 0777) < 0) {
+        FailPlatform(folder, "KELOFSMkdirP");
         Debuger::MSG(0, "Fail to create folder: " + folder);
         return -1;
     }

@@ -11,6 +11,7 @@
 #include <thread>
 #include <utility>
 
+#include "common/failure.h"
 #include "common/report.h"
 
 namespace kelo {
@@ -100,6 +101,7 @@ bool DatabaseLock::MayGoOn() const {
     case EROFS:
         return true;
     default:
+        FailWithErrno(path_, "lock the database", error_);
         ReportError("cannot lock " + path_ + ": " + std::strerror(error_));
         return false;
     }

@@ -1,5 +1,6 @@
 #include <ctime>
 
+#include "common/failure.h"
 #include "db/first_row.h"
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/debuger.h"
@@ -70,9 +71,12 @@ int ReadInfo(DBResult_tag *result, void *context) {
 
 int64_t DBHandler::DBLogCountGet() {
     NumberQuery query{"count_result", -1}; // a count whose row cannot be fetched has failed
-    return DBExecute("SELECT COUNT(*) as count_result FROM logs", NumberQuery::Read, &query) == 0
-               ? query.number
-               : -1;
+    constexpr char kCount[] = "SELECT COUNT(*) as count_result FROM logs";
+    if (DBExecute(kCount, NumberQuery::Read, &query) != 0)
+        return -1;
+    if (query.number == -1)
+        kelo::Fail(KELO_FAILURE_OTHER, dbPath_, kCount, "the statement gave no row");
+    return query.number;
 }
 
 int64_t DBHandler::DBLogStartTimeGet() {

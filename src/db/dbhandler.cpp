@@ -1,14 +1,17 @@
 #include "kelosyslog/dbhandler.h"
 
+#include <sqlite3.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstring>
 #include <memory>
 #include <new>
 #include <utility>
 
 #include "common/db_handles.h"
+#include "common/failure.h"
 #include "common/report.h"
 #include "db/catalogue.h"
 #include "db/creation.h"
@@ -24,9 +27,10 @@ namespace {
 constexpr int kConnectTries = 100;
 
 // The platform would run the part in front of a NUL byte: a DELETE without its condition, for example.
-bool IsWhole(const std::string &sql) {
+bool IsWhole(const std::string &dbPath, const std::string &sql) {
     if (sql.find('\0') == std::string::npos)
         return true;
+    kelo::Fail(KELO_FAILURE_ARGUMENT, dbPath, sql, "the statement holds a NUL byte");
     kelo::ReportErrorAt("dbhandler", __LINE__,
                         std::string("Fail to execute SQL command: ") + sql.c_str() +
                             ", it is followed by a NUL byte and " +
@@ -47,14 +51,17 @@ DBHandler::DBHandler(std::string dbPath, std::string schemaPath)
 
 int DBHandler::DBCon() {
     if (connection_ != nullptr) {
+        kelo::Fail(KELO_FAILURE_ARGUMENT, dbPath_, "DBCon", "it is connected already");
         Debuger::MSG(0, "Connection is already existed");
         return -1;
     }
     // What is moved or removed while this connects is no reason to fail: what comes after it is connected to.
+    bool isMoving = true; // whenever this ends without another reason
     for (int tries = 0; tries < kConnectTries; ++tries) {
         const bool isThere = TORVCFileExist(dbPath_.c_str()) && !kelo::IsEmptyFile(dbPath_);
         if (isThere) {
-            if (!kelo::AwaitCreation(dbPath_, schemaPath_))
+            isMoving = kelo::AwaitCreation(dbPath_, schemaPath_);
+            if (!isMoving)
                 break;
         } else {
             Debuger::MSG(2, "Database is not existed: " + dbPath_);
@@ -64,9 +71,11 @@ int DBHandler::DBCon() {
             }
         }
         const ino_t tried = InodeOf(dbPath_);
-        kelo::DbConnection connection = kelo::Connect(dbPath_);
-        if (connection == nullptr && TORVCFileExist(dbPath_.c_str()) && InodeOf(dbPath_) == tried)
+        kelo::DbConnection connection = kelo::ConnectOrFail(dbPath_);
+        if (connection == nullptr && TORVCFileExist(dbPath_.c_str()) && InodeOf(dbPath_) == tried) {
+            isMoving = false;
             break;
+        }
         // What is being created has no tables yet.
         const bool isUnfinished =
             kelo::DatabaseLock::IsTaken(dbPath_) || (isThere && kelo::IsEmptyFile(dbPath_));
@@ -75,6 +84,8 @@ int DBHandler::DBCon() {
             return 0;
         }
     }
+    if (isMoving)
+        kelo::Fail(KELO_FAILURE_BUSY, dbPath_, "DBCon", "others keep creating, moving or removing it");
     Debuger::MSG(0, "Fail to open db: " + dbPath_);
     return -1;
 }
@@ -100,12 +111,14 @@ int32_t DBHandler::isInTran() const {
 int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *context) {
     if (connection_ == nullptr) {
         Debuger::MSG(0, "DB is not connected");
-        return -1;
+        return kelo::FailStatement(nullptr, dbPath_, sql);
     }
-    if (!IsWhole(sql))
+    if (!IsWhole(dbPath_, sql))
         return -1;
     DBResult_tag *raw = nullptr;
     if (KELODBExecute(connection_, sql.c_str(), &raw) < 0) {
+        kelo::FailStatement(connection_, dbPath_, sql);
+        const kelo::FailureKeeper keeper;
         DBErrorHandle(sql);
         return -1;
     }
@@ -117,10 +130,12 @@ int DBHandler::DBExecute(std::string sql, DBHandlerCallback callback, void *cont
 
 int DBHandler::DBExecute(std::string sql) {
     if (connection_ == nullptr)
-        return -1;
-    if (!IsWhole(sql))
+        return kelo::FailStatement(nullptr, dbPath_, sql);
+    if (!IsWhole(dbPath_, sql))
         return -1;
     if (KELODBExecute(connection_, sql.c_str(), nullptr) < 0) {
+        kelo::FailStatement(connection_, dbPath_, sql);
+        const kelo::FailureKeeper keeper;
         DBErrorHandle(sql);
         return -1;
     }
@@ -131,9 +146,16 @@ int DBHandler::RunTransactionStatement(const char *operation, int32_t forbiddenF
                                        const char *failure) {
     if (connection_ == nullptr || inTransaction_ == forbiddenFlag) {
         Debuger::MSG(0, std::string("Fail to check sanity (") + operation + ")");
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, dbPath_, sql,
+                          connection_ == nullptr ? "not connected"
+                                                 : "the in-transaction flag does not allow it");
     }
+    // Where SQLite has rolled back by itself, what made it do so is the failure to know.
+    const bool isOver =
+        forbiddenFlag == 0 && sqlite3_get_autocommit(KELODBInternalDBHdlGet(connection_)) != 0;
     if (KELODBExecute(connection_, sql, nullptr) < 0) {
+        if (!isOver || SyslogFailureGet()->kind == KELO_FAILURE_NONE)
+            kelo::FailStatement(connection_, dbPath_, sql);
         Debuger::MSG(0, failure);
         return -1;
     }
@@ -165,10 +187,13 @@ std::string DBHandler::DBCmdEscape(std::string text) {
     const size_t size = 2 * text.size() + 1;
     const std::unique_ptr<char[]> escaped(new (std::nothrow) char[size]);
     if (escaped == nullptr) {
+        kelo::FailWithErrno(dbPath_, "DBCmdEscape", ENOMEM);
         Debuger::MSG(0, "Fail to allocate memory");
         return "";
     }
+    errno = 0;
     if (KELODBEscapeStringEX(connection_, escaped.get(), size, text.c_str(), text.size()) < 0) {
+        kelo::FailPlatform(dbPath_, "KELODBEscapeStringEX");
         Debuger::MSG(0, "Fail to escapse string");
         return "";
     }
@@ -177,6 +202,7 @@ std::string DBHandler::DBCmdEscape(std::string text) {
 
 int DBHandler::DBWalCheckpoint(bool removeFiles) {
     if (KELODBExecute(connection_, "PRAGMA wal_checkpoint(FULL);", nullptr) < 0) {
+        kelo::FailStatement(connection_, dbPath_, "PRAGMA wal_checkpoint(FULL);");
         Debuger::MSG(0, "Fail to force WAL checkpoint(FULL)");
         return -1;
     }

@@ -1,5 +1,8 @@
 #include <sys/stat.h>
 
+#include <cerrno>
+
+#include "common/failure.h"
 #include "common/report.h"
 #include "common/root.h"
 #include "db/database_files.h"
@@ -13,6 +16,7 @@ int32_t SyslogngHupSignalSend() {
     const bool packageEnabled = TORVCFileExist(kelo::RootedPath("/var/packages/Quillbay/enabled").c_str());
     const std::string service = packageEnabled ? "pkg-Quillbay-syslog" : "syslog-ng";
     if (!KELOSystemdReload(service)) {
+        kelo::FailPlatform("", "KELOSystemdReload");
         kelo::ReportError("Fail to send HUP signal to " + service);
         return -1;
     }
@@ -22,10 +26,10 @@ int32_t SyslogngHupSignalSend() {
 int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib) {
     struct stat status {};
     if (stat(dbPath.c_str(), &status) != 0)
-        return -1;
+        return kelo::FailWithErrno(dbPath, "stat", errno);
     if (!S_ISREG(status.st_mode)) {
         kelo::ReportError("Working database is not regular file");
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, dbPath, "stat", "it is no regular file");
     }
     if (int64_t{status.st_size} / 1024 > limitKib) {
         {
@@ -40,6 +44,7 @@ int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib) {
 
 int32_t SyslogngWorkingDbSetJouWal(std::string dbPath) {
     if (!kelo::RunShell("/usr/bin/sqlite3 " + dbPath + " \"PRAGMA journal_mode=WAL;\"")) {
+        kelo::FailPlatform(dbPath, "TORVCExec");
         kelo::ReportError("Fail to set jounal mode as WAL, use DELETE by default");
         return -1;
     }

@@ -2,6 +2,7 @@
 
 #include <memory>
 
+#include "common/failure.h"
 #include "common/report.h"
 #include "db/database_files.h"
 #include "db/database_lock.h"
@@ -17,6 +18,8 @@ struct StringPut {
 };
 
 int AddServerEvent(const Logger &logger, int level, const char *event) {
+    if (event == nullptr)
+        kelo::FailPlatform("", "TORVCStrGet");
     if (event == nullptr || logger.LogAdd(kelo::ServerEventDatabase(), level, "SYSTEM", event) < 0) {
         Debuger::MSG(0, "Fail to add log");
         return -1;

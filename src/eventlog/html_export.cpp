@@ -1,9 +1,11 @@
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstdio>
 #include <ctime>
 #include <memory>
 
+#include "common/failure.h"
 #include "kelosyslog/logger.h"
 
 namespace {
@@ -56,7 +58,7 @@ void WritePage(FILE *page, const std::list<_SSYSLOG_LOG_LOG_tag> &events) {
 
 int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPath) const {
     if (dbPath.empty() || second.empty() || outPath.empty())
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, outPath, "LogHtmlGen", "an empty argument");
     const std::list<_SSYSLOG_LOG_LOG_tag> events = LogEnum(dbPath, 0, 0);
     if (events.empty())
         return 0;
@@ -68,5 +70,7 @@ int Logger::LogHtmlGen(std::string dbPath, std::string second, std::string outPa
 }
 
 int Logger::LogHtmlRemove(std::string path) const {
-    return path.empty() ? -1 : unlink(path.c_str());
+    if (path.empty())
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, "", "LogHtmlRemove", "an empty path");
+    return unlink(path.c_str()) == 0 ? 0 : kelo::FailWithErrno(path, "LogHtmlRemove", errno);
 }

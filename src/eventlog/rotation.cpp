@@ -2,6 +2,7 @@
 
 #include "common/db_field.h"
 #include "common/db_handles.h"
+#include "common/failure.h"
 #include "eventlog/event_database.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/logger.h"
@@ -37,15 +38,17 @@ std::string RunRotation(DBHandler &db) {
 int Logger::LogCount(std::string dbPath) const {
     if (dbPath.empty() || dbPath.front() != '/') {
         Debuger::MSG(0, "Invalid syslog db path!");
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, dbPath, "", "the path is not absolute");
     }
-    const kelo::DbConnection connection = kelo::Connect(dbPath);
+    const kelo::DbConnection connection = kelo::ConnectOrFail(dbPath);
     if (connection == nullptr) {
         Debuger::MSG(0, "Fail to connect syslog log database");
         return -1;
     }
     DBResult_tag *raw = nullptr;
-    if (KELODBExecute(connection.get(), "SELECT COUNT(*) FROM log", &raw) < 0) {
+    constexpr char kCount[] = "SELECT COUNT(*) FROM log";
+    if (KELODBExecute(connection.get(), kCount, &raw) < 0) {
+        kelo::FailStatement(connection.get(), dbPath, kCount);
         Debuger::MSG(0, "Fail to select syslog log database");
         return -1;
     }
@@ -53,10 +56,12 @@ int Logger::LogCount(std::string dbPath) const {
     uint32_t row = 0;
     if (KELODBFetchRow(result.get(), &row) < 0) {
         Debuger::MSG(0, "Fail to fetch row");
-        return -1;
+        return kelo::Fail(KELO_FAILURE_OTHER, dbPath, kCount, "the statement gave no row");
     }
-    if (KELODBNumRows(result.get()) != 1)
+    if (KELODBNumRows(result.get()) != 1) {
+        kelo::Fail(KELO_FAILURE_OTHER, dbPath, kCount, "the statement gave several rows");
         return -2;
+    }
     return static_cast<int>(std::strtol(kelo::FieldText(result.get(), row, "COUNT(*)"), nullptr, 10));
 }
 

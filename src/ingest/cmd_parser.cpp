@@ -7,9 +7,12 @@
 #include <json/reader.h>
 #include <syslog.h>
 
+#include "common/failure.h"
+
 namespace {
 
-void ReportFailure(const char *reason) {
+void ReportFailure(KELOFAILUREKIND kind, const char *reason) {
+    kelo::Fail(kind, "", "CmdParse", reason);
     syslog(LOG_ERR, "Error: parsing error, reason = %s\n", reason);
 }
 
@@ -17,7 +20,7 @@ bool ParsePiece(Json::Reader &reader, const char *begin, const char *end,
                 std::vector<Json::Value> &commands) {
     Json::Value command;
     if (!reader.parse(begin, end, command, true)) {
-        ReportFailure(reader.getFormattedErrorMessages().c_str());
+        ReportFailure(KELO_FAILURE_FORMAT, reader.getFormattedErrorMessages().c_str());
         return false;
     }
     commands.push_back(std::move(command));
@@ -40,7 +43,10 @@ bool CmdParser::CmdParse(std::string &text, std::vector<Json::Value> &commands) 
         start = end;
     }
     return true;
+} catch (const std::bad_alloc &error) {
+    ReportFailure(KELO_FAILURE_MEMORY, error.what());
+    return false;
 } catch (const std::exception &error) {
-    ReportFailure(error.what()); // nested too deep, or no memory
+    ReportFailure(KELO_FAILURE_FORMAT, error.what()); // nested too deep
     return false;
 }

@@ -2,9 +2,16 @@
 
 #include <utility>
 
+#include "common/failure.h"
 #include "ingest/lines.h"
 #include "ingest/log_entry.h"
 #include "kelosyslog/debuger.h"
+
+namespace {
+
+constexpr char kFewFields[] = "the line has fewer than eleven fields";
+
+} // namespace
 
 LogParser::LogParser() = default;
 LogParser::~LogParser() = default;
@@ -19,16 +26,18 @@ uint32_t LogParser::LogAdd(std::string &text) {
         // Filled in a list of its own, so that the record is never moved, and is discarded if memory runs
         // out.
         std::list<_SYSLOG_LOG_DATA_tag> entry(1);
-        if (kelo::ParseLogEntry(line, entry.front()))
+        if (kelo::ParseLogEntry(line, entry.front())) {
             logList_.splice(logList_.end(), entry);
-        else
+        } else {
+            kelo::Fail(KELO_FAILURE_FORMAT, "", line, kFewFields);
             Debuger::MSG(0, "Fail to parse log");
+        }
     });
     return 0;
 }
 
 int32_t LogParser::ParseSingleEntry(const std::string &line, _SYSLOG_LOG_DATA_tag &record) const {
-    return kelo::ParseLogEntry(line, record) ? 0 : -1;
+    return kelo::ParseLogEntry(line, record) ? 0 : kelo::Fail(KELO_FAILURE_FORMAT, "", line, kFewFields);
 }
 
 std::list<std::string> LogParser::Tokenize(const std::string &text, const std::string &delimiters) const {
@@ -47,6 +56,7 @@ int32_t LogParser::isValidLog(const _SYSLOG_LOG_DATA_tag &record) {
          {&record.host, &record.ip, &record.ldate, &record.ltime, &record.prog, &record.msg}) {
         if (field->empty()) {
             Debuger::MSG(0, "Invalid log!!!!!!!!!!!!! (Attention Please)");
+            kelo::Fail(KELO_FAILURE_FORMAT, "", record.msg, "host, ip, ldate, ltime, prog or msg is empty");
             partialLogList_.push_back(record);
             return 0;
         }

@@ -1,5 +1,6 @@
 #include <algorithm>
 
+#include "common/failure.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/logparser.h"
 
@@ -53,5 +54,6 @@ void LogStream::Keep(std::string_view part) {
     waiting_ = {};
     isSkipping_ = true;
     ++overlongCount_;
+    kelo::Fail(KELO_FAILURE_FORMAT, "", part, "the line is longer than allowed");
     Debuger::MSG(0, "Fail to parse log");
 }

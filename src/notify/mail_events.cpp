@@ -1,3 +1,4 @@
+#include "common/failure.h"
 #include "common/report.h"
 #include "common/string_map.h"
 #include "kelosyslog/notification.h"
@@ -5,24 +6,34 @@
 
 namespace {
 
+int FailForNull() {
+    return kelo::Fail(KELO_FAILURE_ARGUMENT, "", "", "a null pointer");
+}
+
+int FailForMemory() {
+    return kelo::Fail(KELO_FAILURE_MEMORY, "", "TORVCSzHashSetValue", "Fail to allocation memory");
+}
+
 int SendShareEvent(const char *tag, const char *share) {
     if (share == nullptr)
-        return -1;
+        return FailForNull();
     kelo::SzHash values;
     if (!values || !values.Set("%SHARED_FOLDER%", share))
-        return -1;
+        return FailForMemory();
     return SyslogMailSend(tag, values.Address()) < 0 ? -1 : 0;
 }
 
 int SendContentEvent(const char *tag, const char *placeholder, const char *value, const char *content) {
     if (value == nullptr || content == nullptr)
-        return -1;
+        return FailForNull();
     kelo::SzHash values;
     if (!values)
-        return -1;
+        return FailForMemory();
     const std::optional<std::string> escaped = kelo::EscapeContent(content);
-    if (!escaped || !values.Set(placeholder, value) || !values.Set("%SYSLOG_CONTENT%", *escaped))
+    if (!escaped)
         return -1;
+    if (!values.Set(placeholder, value) || !values.Set("%SYSLOG_CONTENT%", *escaped))
+        return FailForMemory();
     return SyslogMailSend(tag, values.Address()) < 0 ? -1 : 0;
 }
 

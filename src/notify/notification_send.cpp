@@ -1,3 +1,4 @@
+#include "common/failure.h"
 #include "common/string_map.h"
 #include "kelosyslog/debuger.h"
 #include "kelosyslog/notification.h"
@@ -14,19 +15,24 @@ int Fail(const std::string &text) {
     return -1;
 }
 
+int FailForMemory() {
+    kelo::Fail(KELO_FAILURE_MEMORY, "", "TORVCSzHashSetValue", kNoMemory);
+    return Fail(kNoMemory);
+}
+
 int SendContent(NotificationManager &manager, const char *tag, const std::string &host,
                 const char *placeholder, const std::string &value, const std::string &content) {
     if (content.find(kFailedMail) != std::string::npos)
         return 0;
     kelo::SzHash values;
     if (!values)
-        return Fail(kNoMemory);
+        return FailForMemory();
     const std::optional<std::string> escaped = kelo::EscapeContent(content.c_str());
     if (!escaped)
         return Fail("Not enough memory");
     if (!values.Set("%HOST%", host) || !values.Set(placeholder, value) ||
         !values.Set("%SYSLOG_CONTENT%", *escaped))
-        return Fail(kNoMemory);
+        return FailForMemory();
     if (manager.NotificationSend(tag, values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;
@@ -37,6 +43,8 @@ int SendContent(NotificationManager &manager, const char *tag, const std::string
 int NotificationManager::NotificationSend(const char *tag, TORVSZHASH **hash) {
     const bool isClassSet =
         TORVCSzHashSetValue(hash, "DESKTOP_NOTIFY_CLASSNAME", "KELO.ZRT.Quillbay.BuiltIn") >= 0;
+    if (!isClassSet)
+        kelo::FailPlatform("", "TORVCSzHashSetValue");
     if (!isClassSet || kelo::SendToService(tag, hash) < 0)
         return Fail(std::string("Fail to send notification: ") + (tag != nullptr ? tag : ""));
     return 0;
@@ -47,7 +55,7 @@ int NotificationManager::NotificationSendEps(uint64_t eps) {
     kelo::SzHash values;
     if (!values || !values.Set("%EPS%", ullNumberToString(eps)) ||
         !values.Set("%TOLERNCE%", ullNumberToString(threshold)))
-        return Fail(kNoMemory);
+        return FailForMemory();
     if (NotificationSend("KELOSYSLOG_EPS_EXCEED", values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;
@@ -56,7 +64,7 @@ int NotificationManager::NotificationSendEps(uint64_t eps) {
 int NotificationManager::NotificationSendVolFull(const std::string &share) {
     kelo::SzHash values;
     if (!values || !values.Set("%SHARED_FOLDER%", share))
-        return Fail(kNoMemory);
+        return FailForMemory();
     if (NotificationSend("KELOSYSLOG_VOL_FULL", values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;

@@ -2,6 +2,7 @@
 #include <memory>
 #include <string>
 
+#include "common/failure.h"
 #include "common/report.h"
 #include "common/root.h"
 #include "keloplatform/kelonotify.h"
@@ -32,6 +33,7 @@ constexpr Switch kPushSwitches[] = {
 bool ReadSwitch(const std::string &path, const Switch &which, bool &on) {
     char value[16] = {};
     if (TORVCFileGetKeyValue(path.c_str(), which.key, value, sizeof value, 0) < 0) {
+        kelo::FailPlatform(path, "TORVCFileGetKeyValue");
         kelo::ReportErrorAt(kSource, which.line, which.message);
         return false;
     }
@@ -45,6 +47,7 @@ bool IsNotificationSet() {
     const std::string settings = kelo::RootedPath("/etc/keloinfo.conf");
     KELOMAIL mail{};
     if (KELOMailGet(&mail) < 0) {
+        kelo::FailPlatform(settings, "KELOMailGet");
         kelo::ReportErrorAt(kSource, 161, "Fail to get mail setting");
         return false;
     }
@@ -55,6 +58,7 @@ bool IsNotificationSet() {
 
     const std::unique_ptr<KELOSMSCONF, SmsConfFreer> sms(KELOSmsConfGet());
     if (sms == nullptr) {
+        kelo::FailPlatform(settings, "KELOSmsConfGet");
         kelo::ReportErrorAt(kSource, 178, "Fail to get sms setting");
         return false;
     }

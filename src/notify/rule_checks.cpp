@@ -1,3 +1,4 @@
+#include "common/failure.h"
 #include "common/root.h"
 #include "common/string_map.h"
 #include "kelosyslog/debuger.h"
@@ -19,6 +20,7 @@ NotificationManager::~NotificationManager() = default;
 int NotificationManager::ConfigLoad(const std::string &path) {
     kelo::SzList sections(TORVCSzListAlloc(kelo::kSzCapacity));
     if (sections == nullptr) {
+        kelo::FailPlatform("", "TORVCSzListAlloc");
         Debuger::MSG(0, "Fail to allocate memory");
         return -1;
     }
@@ -27,6 +29,7 @@ int NotificationManager::ConfigLoad(const std::string &path) {
     const int status = TORVCFileEnumSection(path.c_str(), &list);
     sections.reset(list);
     if (status < 0) {
+        kelo::FailPlatform(path, "TORVCFileEnumSection");
         Debuger::MSG(0, "Fail to do TORVCFileEnumSection");
         return -1;
     }

@@ -1,6 +1,8 @@
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 
+#include "common/failure.h"
 #include "common/report.h"
 #include "common/string_map.h"
 #include "kelosyslog/notification.h"
@@ -36,18 +38,21 @@ bool HoldsNul(const _SYSLOG_NOTIFY_RULES_tag &rule) {
     return rule.name.find('\0') != std::string::npos || rule.pattern.find('\0') != std::string::npos;
 }
 
+// Reports what failed under the line number of its message.
+int FailAt(int line, const char *message, const std::string &path, const char *function) {
+    kelo::FailPlatform(path, function);
+    kelo::ReportErrorAt(kSource, line, message);
+    return -1;
+}
+
 } // namespace
 
 int SyslogNotifyConfGet(const std::string &path, const std::string &section, _SYSLOG_NOTIFY_RULES_tag &rule) {
     kelo::SzHash values;
-    if (!values) {
-        kelo::ReportErrorAt(kSource, 81, "Fail to allocate memory");
-        return -1;
-    }
-    if (TORVCFileGetSection(path.c_str(), section.c_str(), values.Address()) < 0) {
-        kelo::ReportErrorAt(kSource, 85, "Fail to do TORVCFileGetSection");
-        return -1;
-    }
+    if (!values)
+        return FailAt(81, "Fail to allocate memory", "", "TORVCSzHashAlloc");
+    if (TORVCFileGetSection(path.c_str(), section.c_str(), values.Address()) < 0)
+        return FailAt(85, "Fail to do TORVCFileGetSection", path, "TORVCFileGetSection");
     rule.name = section;
     rule.type = NumberOf(values, "notify_type");
     rule.pri = static_cast<_SYSLOG_DB_PRIORITY_tag>(NumberOf(values, "notify_pri"));
@@ -59,15 +64,16 @@ int SyslogNotifyConfGet(const std::string &path, const std::string &section, _SY
 
 int SyslogNotifyConfSet(const std::string &path, const std::string &, const _SYSLOG_NOTIFY_RULES_tag &rule) {
     kelo::SzHash values;
-    if (!values || !FillSection(values, rule)) {
-        kelo::ReportErrorAt(kSource, 124, "Fail to allocate memory");
-        return -1;
-    }
+    if (!values || !FillSection(values, rule))
+        return FailAt(124, "Fail to allocate memory", "",
+                      values ? "TORVCSzHashSetValue" : "TORVCSzHashAlloc");
     // A C string would end at a NUL byte and lose the rest.
-    if (HoldsNul(rule) || TORVCFileSetSection(path.c_str(), rule.name.c_str(), rule.name.c_str(),
-                                              *values.Address(), kLineFormat) < 0) {
+    if (HoldsNul(rule)) {
         kelo::ReportErrorAt(kSource, 139, "Fail set section to file");
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, path, rule.name, "the name or the pattern holds a NUL byte");
     }
+    if (TORVCFileSetSection(path.c_str(), rule.name.c_str(), rule.name.c_str(), *values.Address(),
+                            kLineFormat) < 0)
+        return FailAt(139, "Fail set section to file", path, "TORVCFileSetSection");
     return 0;
 }

@@ -6,6 +6,7 @@
 #include <optional>
 
 #include "common/attributes.h"
+#include "common/failure.h"
 #include "keloplatform/kelodb.h"
 
 namespace kelo {
@@ -88,11 +89,20 @@ bool HoldsNul(const _SYSLOG_SQL_COND_tag &condition) {
     return condition.value.find('\0') != std::string::npos;
 }
 
+bool FailForNul(const _SYSLOG_SQL_COND_tag &condition) {
+    Fail(KELO_FAILURE_ARGUMENT, "", condition.value, "the value of a condition holds a NUL byte");
+    return false;
+}
+
 // False when the condition cannot be rendered.
 bool AppendComparison(const _SYSLOG_SQL_COND_tag &condition, LostValue lost, std::string &out) {
     const std::optional<std::string> value = EscapedValue(condition);
-    if (HoldsNul(condition) || (!value && lost == LostValue::IsFailure))
+    if (HoldsNul(condition))
+        return FailForNul(condition);
+    if (!value && lost == LostValue::IsFailure) {
+        Fail(KELO_FAILURE_MEMORY, "", condition.value, "the value of a condition cannot be escaped");
         return false;
+    }
     out.append("(").append(ColumnText(condition.attr)).append(" ");
     out.append(OperatorText(condition.op)).append(" ");
     if (HasColumn(condition.attr) && IsIntegerAttribute(condition.attr))
@@ -127,7 +137,7 @@ int SyslogSQLCondStrGen(const _SYSLOG_SQL_COND_tag &condition, std::string &out,
     if (!condition.alternatives.empty())
         out.append("(");
     if (IsRaw(condition)) {
-        if (HoldsNul(condition))
+        if (HoldsNul(condition) && !FailForNul(condition))
             return -1;
         out.append("(").append(condition.value).append(")");
     } else if (!AppendComparison(condition, lost, out)) {

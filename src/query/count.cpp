@@ -21,10 +21,12 @@ int SyslogDBSelectCountByTable(const std::string &dbPath, const std::string &tab
 
     const Answer answer = Ask(dbPath, sql, limit);
     uint32_t row = 0;
-    if (!answer.isGood || KELODBFetchRow(answer.result.get(), &row) < 0)
+    if (!answer.isGood || !FetchOrFail(answer.result.get(), dbPath, row))
         return -1;
-    if (KELODBNumRows(answer.result.get()) != 1)
+    if (KELODBNumRows(answer.result.get()) != 1) {
+        Fail(KELO_FAILURE_OTHER, dbPath, sql, "the statement gave several rows");
         return -2;
+    }
     return static_cast<int>(std::strtoll(FieldText(answer.result.get(), row, expression), nullptr, 10));
 }
 

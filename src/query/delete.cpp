@@ -14,6 +14,10 @@ int SyslogDBDelete(const std::string &dbPath, const std::list<_SYSLOG_SQL_COND_t
         return -1;
     const std::string sql = "DELETE FROM logs" + (body.empty() ? "" : " WHERE " + body);
 
-    const DbConnection connection = Connect(dbPath);
-    return connection != nullptr && KELODBExecute(connection.get(), sql.c_str(), nullptr) >= 0 ? 0 : -1;
+    const DbConnection connection = ConnectOrFail(dbPath);
+    if (connection == nullptr)
+        return -1;
+    return KELODBExecute(connection.get(), sql.c_str(), nullptr) >= 0
+               ? 0
+               : FailStatement(connection.get(), dbPath, sql);
 }

@@ -2,6 +2,7 @@
 #include <cstdlib>
 
 #include "common/db_field.h"
+#include "common/failure.h"
 #include "common/report.h"
 #include "query/statement.h"
 
@@ -48,12 +49,13 @@ bool AskLogs(const std::string &dbPath, const NameSource &source, Names &names) 
 int SyslogDBVersionGet(const std::string &dbPath) {
     if (!SyslogDBPathIsValid(dbPath)) {
         ReportErrorAt("dbutil", 863, "Invalid syslog db path! [" + dbPath + "]");
+        FailForPath(dbPath);
         return 1;
     }
-    const DbConnection connection = Connect(dbPath);
+    const DbConnection connection = ConnectOrFail(dbPath);
     if (connection == nullptr)
         return 1;
-    DbResult result;
+    DbResult result; // a query that fails is an answer
     return RunQuery(connection.get(), "SELECT * FROM db_info", nullptr, result) ? 1 : 2;
 }
 
@@ -63,7 +65,7 @@ int SyslogDBAttriValueGet(const std::string &dbPath, const std::string &name, _S
         return -1;
     if (LogAttriType(name) == SYSLOG_ATTRI_NONE) {
         ReportErrorAt("dbutil", 710, "Log attribute type is incorrect!");
-        return -1;
+        return Fail(KELO_FAILURE_COLUMN, dbPath, name, "no log table has this column");
     }
     const std::string sql = "SELECT " + name + " FROM logs GROUP BY " + name + " ORDER BY " + name + " asc";
     const bool isComplete = AskRows(dbPath, sql, limit, [&](DBResult_tag *result, uint32_t row) {
@@ -78,7 +80,7 @@ int SyslogDBExtkeyMapGet(const std::string &dbPath, _SYSLOG_EXTKEY_TB_TYPE_tag t
     if (!CheckDbPath(dbPath, 897))
         return -1;
     if (type < SYSLOG_EXTKEY_HOST || type > SYSLOG_EXTKEY_FAC)
-        return -1;
+        return Fail(KELO_FAILURE_ARGUMENT, dbPath, "", "no such kind of name");
     const NameSource &source = kNameSources[static_cast<size_t>(type)];
     const bool isComplete =
         generation == 1 ? AskKeyTable(dbPath, source, names) : AskLogs(dbPath, source, names);

@@ -1,3 +1,4 @@
+#include "common/failure.h"
 #include "keloplatform/gensqlregexp.h"
 #include "kelosyslog/dbutil.h"
 #include "kelosyslog/utils.h"
@@ -25,6 +26,15 @@ void AppendMultiValue(_SYSLOG_DB_ATTRI_tag attr, const std::string &value,
         conditions.push_back(std::move(condition));
 }
 
+void AppendKeyword(const std::string &keyword, std::list<_SYSLOG_SQL_COND_tag> &conditions) {
+    if (keyword.empty())
+        return;
+    const unsigned int failures = kelo::PlatformFailureCount();
+    conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, GenSQLRegexp(keyword, "msg"), {}});
+    if (kelo::PlatformFailureCount() != failures)
+        kelo::FailPlatform("", "GenSQLRegexp");
+}
+
 bool IsDateSet(const std::string &date) {
     return !date.empty() && date != "0";
 }
@@ -50,7 +60,6 @@ void LogSearchCondListGen(const std::string &host, const std::string &level, con
     AppendMultiValue(SYSLOG_ATTRI_LLEVEL, level, conditions);
     AppendMultiValue(SYSLOG_ATTRI_FAC, facility, conditions);
     AppendMultiValue(SYSLOG_ATTRI_PROG, program, conditions);
-    if (!keyword.empty())
-        conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, GenSQLRegexp(keyword, "msg"), {}});
+    AppendKeyword(keyword, conditions);
     AppendDates(dateFrom, dateTo, conditions);
 }

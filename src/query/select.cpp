@@ -25,13 +25,13 @@ std::string SelectText(const std::string &table, const std::string &body,
 
 // Passes the rows to the callback. Returns 0, also when the callback or a row without a conversion ended the
 // scan, or -1 when a row could not be fetched.
-int WalkRows(DBResult_tag *result, const std::string &table, SyslogDBRowCallback callback, void *context,
-             bool trimUser) {
+int WalkRows(DBResult_tag *result, const std::string &dbPath, const std::string &table,
+             SyslogDBRowCallback callback, void *context, bool trimUser) {
     const int rowCount = KELODBNumRows(result);
     _SYSLOG_LOG_DATA_tag log;
     for (int i = 0; i < rowCount; ++i) {
         uint32_t row = 0;
-        if (KELODBFetchRow(result, &row) < 0)
+        if (!FetchOrFail(result, dbPath, row))
             return -1;
         if (callback == nullptr)
             continue;
@@ -61,17 +61,17 @@ int SyslogDBSelectByTable(const std::string &dbPath, const std::string &table,
     const bool pagesById = isUnfiltered && limit != nullptr && limit->limit != 0;
     const std::string sql = SelectText(table, body, pagesById ? limit : nullptr, order);
 
-    const DbConnection connection = Connect(dbPath);
+    const DbConnection connection = ConnectOrFail(dbPath);
     if (connection == nullptr) {
         ReportError("fail to connect database (" + dbPath + ")");
         return -1;
     }
     DbResult result;
-    if (!RunQuery(connection.get(), sql, isUnfiltered ? nullptr : limit, result)) {
+    if (!RunQueryOrFail(connection.get(), dbPath, sql, isUnfiltered ? nullptr : limit, result)) {
         ReportError("fail to execute database command (" + sql + ")");
         return -1;
     }
-    return WalkRows(result.get(), table, callback, context, trimUser);
+    return WalkRows(result.get(), dbPath, table, callback, context, trimUser);
 }
 
 int SyslogDBSelect(const std::string &dbPath, const std::list<_SYSLOG_SQL_COND_tag> &conditions,

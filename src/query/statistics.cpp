@@ -37,7 +37,7 @@ int32_t Int32Field(DBResult_tag *result, uint32_t row, const char *column) {
 uint64_t AskNumber(const std::string &dbPath, const std::string &sql, const char *column) {
     const Answer answer = Ask(dbPath, sql);
     uint32_t row = 0;
-    if (!answer.isGood || KELODBFetchRow(answer.result.get(), &row) < 0)
+    if (!answer.isGood || !FetchOrFail(answer.result.get(), dbPath, row))
         return 0;
     return UnsignedField(answer.result.get(), row, column);
 }

@@ -79,7 +79,7 @@ TEST_F(Events, TellWhyTheyCannotBeAddedOrRead) {
     EXPECT_THAT(addError(), HasSubstr("kelosyslog.db: no such table: log\n"));
     Expect("events", 3);
     WriteFile(events_, "SQLite format 3" + std::string(1000, '\0'));
-    EXPECT_THAT(addError(), HasSubstr("kelosyslog.db: file is not a database\n"));
+    EXPECT_THAT(addError(), HasSubstr("kelosyslog.db: it is damaged (file is not a database)\n"));
 }
 
 TEST_F(Events, RecordWhoClearedALog) {

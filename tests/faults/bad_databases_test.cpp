@@ -5,6 +5,8 @@
 
 #include "kelosyslog/dbhandler.h"
 #include "kelosyslog/dbutil.h"
+#include "kelosyslog/failure.h"
+#include "read/log_table.h"
 #include "support/doubles.h"
 #include "support/test.h"
 
@@ -63,6 +65,9 @@ TEST(LockedDatabase, FailsAfterWaiting) {
     DatabaseLock lock(path, "BEGIN EXCLUSIVE");
     int rows = 0;
     EXPECT_EQ(SyslogDBSelect(path, kFromHost3, nullptr, nullptr, CountRow, &rows, false), -1);
+    EXPECT_EQ(SyslogFailureGet()->kind, KELO_FAILURE_BUSY);
+    EXPECT_EQ(tool::DescribeDatabaseProblem({path}),
+              "cannot read " + path + ": it is locked by another program (database is locked)");
     EXPECT_EQ(SyslogDBSelectCount(path, kFromHost3, nullptr, nullptr), -1);
     EXPECT_EQ(SyslogDBDelete(path, kFromHost3), -1);
     EXPECT_EQ(rows, 0);

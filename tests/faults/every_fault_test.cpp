@@ -19,7 +19,8 @@ struct FaultSource {
     const char *fault; // as an outcome names it
     bool needsWrites;  // reached only by operations that write
     void (*start)(int first, int times);
-    bool (*stop)(); // ends it; whether something failed
+    bool (*stop)();                  // ends it; whether something failed
+    std::set<KELOFAILUREKIND> kinds; // that a program may read for it; empty: any
 
     friend void PrintTo(const FaultSource &source, std::ostream *out) { *out << source.name; }
 };
@@ -30,12 +31,32 @@ void StartFileFaults(int first, int times) {
 }
 
 using Kind = FileFaults::Kind;
-constexpr FaultSource kFaultSources[] = {
-    {"PlatformCall", "", false, PlatformCalls::FailFrom, PlatformCalls::HasFailed},
-    {"Allocation", "allocation", false, AllocationFaults::Start, AllocationFaults::Stop},
-    {"Write", "write", true, StartFileFaults<Kind::kWrite>, FileFaults::Stop},
-    {"FullDisk", "full disk", true, StartFileFaults<Kind::kFull>, FileFaults::Stop},
-    {"Read", "read", false, StartFileFaults<Kind::kRead>, FileFaults::Stop},
+const FaultSource kFaultSources[] = {
+    {"PlatformCall", "", false, PlatformCalls::FailFrom, PlatformCalls::HasFailed, {}},
+    {"Allocation",
+     "allocation",
+     false,
+     AllocationFaults::Start,
+     AllocationFaults::Stop,
+     {KELO_FAILURE_MEMORY}},
+    {"Write",
+     "write",
+     true,
+     StartFileFaults<Kind::kWrite>,
+     FileFaults::Stop,
+     {KELO_FAILURE_IO, KELO_FAILURE_DAMAGED}},
+    {"FullDisk",
+     "full disk",
+     true,
+     StartFileFaults<Kind::kFull>,
+     FileFaults::Stop,
+     {KELO_FAILURE_FULL, KELO_FAILURE_IO}}, // SQLite loses the cause of some
+    {"Read",
+     "read",
+     false,
+     StartFileFaults<Kind::kRead>,
+     FileFaults::Stop,
+     {KELO_FAILURE_IO, KELO_FAILURE_DAMAGED}},
 };
 
 using Parameters = std::tuple<Operation, FaultSource>;
@@ -84,6 +105,8 @@ protected:
         fileNames_ = FileNames();
         fixture_.seen.clear();
         PlatformCalls::Reset();
+        SyslogFailureClear();
+        KELOFailureClear();
         SyslogCapture capture;
         Outcome outcome;
         source_.start(first, times);
@@ -98,6 +121,9 @@ protected:
         if (hasFailed)
             outcome.fault = PlatformCalls::HasFailed() ? PlatformCalls::FailedFunction() : source_.fault;
         PlatformCalls::FailFrom(1, 0);
+        outcome.kind = SyslogFailureGet()->kind;
+        if (outcome.kind == KELO_FAILURE_NONE) // of an operation of the platform alone
+            outcome.kind = KELOFailureGet()->kind;
         outcome.messages = capture.TakeTexts();
         return outcome;
     }
@@ -112,8 +138,23 @@ protected:
         EXPECT_TRUE(!operation_.keepsFiles || FileNames() == fileNames_);
         EXPECT_TRUE(fixture_.database.empty() || RunSql(fixture_.database, "PRAGMA integrity_check") == "ok");
         operation_.check(fixture_, outcome);
+        ExpectReason(outcome);
         EXPECT_TRUE(!outcome.fault.empty() || outcome.IsDone()) << "failed without a fault";
         return !outcome.fault.empty();
+    }
+
+    // A program can read why an operation failed.
+    void ExpectReason(const Outcome &outcome) const {
+        if (outcome.IsDone() && outcome.messages.empty()) {
+            EXPECT_EQ(outcome.kind, KELO_FAILURE_NONE);
+        } else if (!outcome.IsDone() && !outcome.outOfMemory) {
+            const auto &kinds = source_.kinds;
+            // A double that fails in the test's own call of the platform has no reason.
+            const bool isOwnCall = fixture_.database.empty() && outcome.fault.starts_with("TORVC");
+            EXPECT_TRUE(isOwnCall || outcome.kind != KELO_FAILURE_NONE);
+            EXPECT_TRUE(kinds.empty() || kinds.contains(outcome.kind))
+                << outcome.kind << ": " << SyslogFailureGet()->text;
+        }
     }
 
     const Operation operation_ = std::get<0>(GetParam());

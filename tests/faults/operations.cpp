@@ -118,7 +118,7 @@ void SetUpSection(Fixture &fixture) {
 int SetSection(Fixture &fixture) {
     const std::string path = fixture.root.File("notify.conf");
     TORVSZHASH *hash = TORVCSzHashAlloc(1);
-    int status = TORVCSzHashSetValue(&hash, "key", "new");
+    int status = hash != nullptr ? TORVCSzHashSetValue(&hash, "key", "new") : -1;
     if (status >= 0)
         status = TORVCFileSetSection(path.c_str(), "R", "R", hash, "%s=\"%s\"\n");
     TORVCSzHashFree(hash);

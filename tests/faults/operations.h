@@ -3,6 +3,7 @@
 #include <list>
 
 #include "kelosyslog/dbutil.h"
+#include "kelosyslog/failure.h"
 #include "support/doubles.h"
 #include "support/test.h"
 
@@ -27,6 +28,8 @@ struct Outcome {
     std::string fault;
     bool outOfMemory = false; // std::bad_alloc came out; `result` means nothing
     int result = 0;
+    // The kind of failure that a program can read; KELO_FAILURE_NONE when none was recorded.
+    KELOFAILUREKIND kind = KELO_FAILURE_NONE;
     std::vector<std::string> messages; // the system log
 
     // Whether the operation says that it is done.

@@ -118,12 +118,11 @@ bool WriteDescription(DBHandler &db, const std::string &device, DatabaseCopy &co
 
 void Describe(const std::string &device, DatabaseCopy &copy) {
     DBHandler db(copy.path, "");
+    SyslogFailureClear();
     const bool isWritten = WriteDescription(db, device, copy);
     db.DBDiscon();
-    if (isWritten)
-        return;
-    throw DatabaseError(copy.path + ": cannot write its description: " +
-                        WhyStatementFails(copy.path, "UPDATE db_info SET device = device WHERE id = 1"));
+    if (!isWritten)
+        throw DatabaseError(copy.path + ": cannot write its description: " + WhyFailed(copy.path));
 }
 
 } // namespace

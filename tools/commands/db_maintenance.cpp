@@ -83,7 +83,7 @@ int Create(const CreateOptions &options) {
     if (access(schema.c_str(), R_OK) != 0)
         throw UsageError("--schema: cannot read " + schema);
     if (DBHandler(path, schema).DBCreate() != 0)
-        throw DatabaseError("cannot create " + path + ": " + WhyNotCreated(path, schema));
+        throw DatabaseError("cannot create " + path + ": " + WhyFailed(path));
     const auto mode = ReadOnlyQuery(options.Table()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
     KeyValues values;
     values.Add("created", path);
@@ -161,8 +161,7 @@ int SetDevice(const DeviceOptions &options) {
     const bool isDone = db.DBCon() == 0 && db.DBInfoDevSet(db.DBCmdEscape(options.device)) == 0;
     db.DBDiscon();
     if (!isDone)
-        throw DatabaseError("cannot change " + table.path + ": " +
-                            WhyStatementFails(table.path, "UPDATE db_info SET device = device WHERE id = 1"));
+        throw DatabaseError("cannot change " + table.path + ": " + WhyFailed(table.path));
     KeyValues values;
     values.Add("path", table.path);
     values.Add("device", options.device);

@@ -96,10 +96,9 @@ std::string AddEvent(const std::string &root, const std::function<int(Logger &)>
     Logger logger;
     if (add(logger) == 0)
         return "";
-    if (access(path.c_str(), F_OK) != 0)
-        return hasExisted ? "it was damaged and is " + path + ".corrupt now"
-                          : WhyNotCreated(path, root + "/usr/kelo/syslog/schema/kelosyslog.sql");
-    return WhyStatementFails(path, "INSERT INTO log VALUES (NULL, 0, 0, '', '')");
+    if (hasExisted && access(path.c_str(), F_OK) != 0)
+        return "it was damaged and is " + path + ".corrupt now";
+    return WhyFailed(path);
 }
 
 bool EventFilter::Matches(const Event &event) const {

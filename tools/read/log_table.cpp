@@ -14,6 +14,7 @@
 #include "base/errors.h"
 #include "base/files.h"
 #include "kelosyslog/records.h"
+#include "read/failure_reason.h"
 
 namespace kelo::tool {
 namespace {
@@ -63,6 +64,7 @@ bool HasLogWithoutIndex(const std::string &path) {
            access((path + "-shm").c_str(), F_OK) != 0;
 }
 
+// "" when there is none to be seen.
 std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
     struct stat status {};
     if (stat(table.path.c_str(), &status) != 0)
@@ -90,7 +92,16 @@ std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
     if (access(folder.c_str(), W_OK) != 0 && HasLogWithoutIndex(table.path))
         return "its write-ahead log cannot be read without " + table.path +
                "-shm, which is missing; syslog-ng creates it, or any reading by root";
-    return "no usable table '" + table.name + "' in it, or it is locked or damaged; see the system log";
+    return "";
+}
+
+// The failure may be an older one, of another file.
+std::string ReasonFromInside(const LogTable &table, const KELOFAILURE &failure) {
+    const bool isOfTable = failure.kind == KELO_FAILURE_TABLE || failure.kind == KELO_FAILURE_COLUMN;
+    if (isOfTable || failure.path != table.path)
+        return "no usable table '" + table.name + "' in it" +
+               (isOfTable ? std::string(" (") + failure.text + ")" : "");
+    return WhyFailed(table.path, failure);
 }
 
 // Throws UsageError when there is no archive of this name.
@@ -147,9 +158,10 @@ std::string KnownLogNames() {
     return text;
 }
 
-std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting) {
+std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting, const KELOFAILURE &failure) {
+    const std::string outside = ReasonFromOutside(table, forWriting);
     return std::string(forWriting ? "cannot change " : "cannot read ") + table.path + ": " +
-           ReasonFromOutside(table, forWriting);
+           (outside.empty() ? ReasonFromInside(table, failure) : outside);
 }
 
 } // namespace kelo::tool

@@ -3,6 +3,8 @@
 #include <string>
 #include <vector>
 
+#include "kelosyslog/failure.h"
+
 namespace kelo::tool {
 
 // The row shapes of log tables.
@@ -39,8 +41,10 @@ std::string ArchiveFolderPath(const std::string &root);
 std::vector<std::string> LogNames();
 std::string KnownLogNames();
 
-// One line with the path and the visible reason why it cannot be read (or changed,
-// with `forWriting`): missing, a folder, no permission, empty, not a database, cut short.
-std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting = false);
+// One line with the path and the reason why it cannot be read (or changed, with `forWriting`): what can be
+// seen from outside (missing, a folder, no permission, empty, not a database, cut short), or else what
+// `failure` says (locked, damaged, no such table).
+std::string DescribeDatabaseProblem(const LogTable &table, bool forWriting = false,
+                                    const KELOFAILURE &failure = *SyslogFailureGet());
 
 } // namespace kelo::tool

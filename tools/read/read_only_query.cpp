@@ -24,7 +24,7 @@ void ReadOnlyQuery::Closer::operator()(DBConnect_tag *connection) const {
 ReadOnlyQuery::ReadOnlyQuery(LogTable table)
     : table_(std::move(table)), connection_(KELODBConnect(nullptr, nullptr, nullptr, table_.path.c_str())) {
     if (connection_ == nullptr)
-        throw DatabaseError(DescribeDatabaseProblem(table_));
+        throw DatabaseError(DescribeDatabaseProblem(table_, false, *KELOFailureGet()));
 }
 
 ReadOnlyQuery::ReadOnlyQuery(LogTable table, std::chrono::milliseconds timeout)

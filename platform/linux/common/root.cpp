@@ -2,6 +2,7 @@
 
 #include <new>
 
+#include "common/failure.h"
 #include "keloplatform/root.h"
 
 namespace {
@@ -17,11 +18,12 @@ std::string &Root() {
 int KELORootSet(const char *root) {
     const char *text = root != nullptr ? root : "";
     if (text[0] != '\0' && text[0] != '/')
-        return -1;
+        return kelo::platform::Fail(KELO_FAILURE_ARGUMENT, "KELORootSet", text,
+                                    "the root is a relative path");
     try {
         Root() = text;
     } catch (const std::bad_alloc &) {
-        return -1;
+        return kelo::platform::FailWithErrno("KELORootSet", text, ENOMEM);
     }
     return 0;
 }

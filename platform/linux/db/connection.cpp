@@ -7,6 +7,7 @@
 #include <new>
 #include <thread>
 
+#include "common/failure.h"
 #include "search/regexp_function.h"
 
 using kelo::platform::Database;
@@ -74,25 +75,33 @@ bool OpenLog(sqlite3 *db) {
     return !HasMoved(db);
 }
 
+DBConnect_tag *Refuse(const char *path, int error) {
+    kelo::platform::FailWithErrno("KELODBConnect", path, error);
+    return nullptr;
+}
+
 } // namespace
 
 DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path) {
     if (path == nullptr || path[0] == '\0')
-        return nullptr;
+        return Refuse("", EINVAL);
     try {
         auto connection = std::make_unique<DBConnect_tag>(path);
         Database db;
         do {
             db = connection->file.Open();
-            if (db == nullptr || !Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get()))
+            if (db == nullptr)
+                return Refuse(path, errno);
+            if (!Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get())) {
+                kelo::platform::FailStatement(db.get(), "KELODBConnect");
                 return nullptr;
+            }
         } while (!OpenLog(db.get()));
-        if (sqlite3_busy_handler(db.get(), WaitForLock, nullptr) != SQLITE_OK)
-            return nullptr;
+        sqlite3_busy_handler(db.get(), WaitForLock, nullptr); // fails only without a connection
         connection->db = db.release();
         return connection.release();
     } catch (const std::bad_alloc &) {
-        return nullptr;
+        return Refuse(path, ENOMEM);
     }
 }
 
@@ -101,6 +110,8 @@ int KELODBClose(DBConnect_tag *connection) {
         return 0;
     connection->inserts.Clear();
     const int status = sqlite3_close(connection->db);
+    if (status != SQLITE_OK)
+        kelo::platform::FailStatement(connection->db, "KELODBClose");
     delete connection;
     return status == SQLITE_OK ? 0 : -1;
 }

@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <filesystem>
 #include <system_error>
 #include <utility>
@@ -16,7 +17,12 @@ Database OpenNamed(const char *name, int flags) {
     sqlite3 *db = nullptr;
     const int status = sqlite3_open_v2(name, &db, flags, KELODBVfs());
     Database owner(db);
-    return status == SQLITE_OK ? std::move(owner) : nullptr;
+    if (status == SQLITE_OK)
+        return owner;
+    const int error = db != nullptr ? sqlite3_system_errno(db) : 0;
+    owner.reset();
+    errno = status == SQLITE_NOMEM || error == 0 ? ENOMEM : error;
+    return nullptr;
 }
 
 // Whether SQLite cannot even read the file behind `db`: without its "-shm" it fails to open or to write that.
@@ -41,6 +47,7 @@ std::string UriOf(const std::string &path) {
 DatabaseFile::DatabaseFile(const char *path) {
     std::error_code unresolved;
     path_ = std::filesystem::canonical(path, unresolved).string();
+    unresolvedError_ = unresolved.value();
 }
 
 bool DatabaseFile::IsAtRestInReadOnlyFolder() const {
@@ -63,8 +70,16 @@ Database DatabaseFile::OpenWithoutLocks() {
 
 Database DatabaseFile::Open() {
     struct stat info;
-    if (stat(path_.c_str(), &info) != 0 || !S_ISREG(info.st_mode))
+    if (path_.empty()) {
+        errno = unresolvedError_;
         return nullptr;
+    }
+    if (stat(path_.c_str(), &info) != 0)
+        return nullptr;
+    if (!S_ISREG(info.st_mode)) {
+        errno = S_ISDIR(info.st_mode) ? EISDIR : EINVAL;
+        return nullptr;
+    }
     // SQLite itself falls back to reading if it may not write.
     Database db = OpenNamed(path_.c_str(), SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX);
     if (db != nullptr && IsAtRestInReadOnlyFolder() && CannotRead(db.get()))

@@ -20,8 +20,8 @@ public:
     // Throws std::bad_alloc.
     explicit DatabaseFile(const char *path);
 
-    // Opens the existing file: for writing, else for reading. Null when that is impossible, or when the path
-    // is not a regular file (opening a FIFO would wait for its other end forever).
+    // Opens the existing file: for writing, else for reading. Null, with errno, when that is impossible, or
+    // when the path is not a regular file (opening a FIFO would wait for its other end forever).
     //
     // A database in WAL mode needs its "-shm" file, which a reader without write permission in the folder
     // cannot create. If no "-wal" file has rows either, the database is not open anywhere and the main file
@@ -38,6 +38,7 @@ private:
     // Absolute, as SQLite resolves it to name the companion files; so "file:x" and ":memory:" are only names.
     // Empty if there is no such file.
     std::string path_;
+    int unresolvedError_ = 0;           // why there is no path
     std::optional<struct stat> atRest_; // set when the file is read without locks
 };
 

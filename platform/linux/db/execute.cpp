@@ -4,6 +4,7 @@
 #include <stdexcept>
 #include <string>
 
+#include "common/failure.h"
 #include "db/connection.h"
 #include "db/raise_error.h"
 #include "db/result.h"
@@ -143,17 +144,18 @@ int Guarded(DBConnect_tag *connection, const char *sql, DBResult_tag **result, W
     if (result != nullptr)
         *result = nullptr;
     if (connection == nullptr)
-        return -1;
+        return kelo::platform::Fail(KELO_FAILURE_ARGUMENT, sql != nullptr ? sql : "", "", "not connected");
     try {
-        if (sql != nullptr)
-            return work() ? 0 : -1;
-        RaiseError(connection->db, SQLITE_MISUSE, "no statement text");
+        if (sql != nullptr && work())
+            return 0;
+        if (sql == nullptr)
+            RaiseError(connection->db, SQLITE_MISUSE, "no statement text");
     } catch (const std::bad_alloc &) {
         RaiseError(connection->db, SQLITE_NOMEM, "out of memory");
     } catch (const std::length_error &) {
         RaiseError(connection->db, SQLITE_TOOBIG, "result too big");
     }
-    return -1;
+    return kelo::platform::FailStatement(connection->db, sql != nullptr ? sql : "");
 }
 
 } // namespace

@@ -3,6 +3,8 @@
 #include <new>
 #include <stdexcept>
 
+#include "common/failure.h"
+
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
     : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()) {
     for (int column = 0; column < sqlite3_column_count(statement); ++column) {
@@ -24,7 +26,10 @@ int KELODBNumRows(DBResult_tag *result) {
 }
 
 int KELODBFetchRow(DBResult_tag *result, unsigned int *row) {
-    if (result == nullptr || row == nullptr || result->nextRow >= result->rows.Count())
+    if (result == nullptr || row == nullptr)
+        return kelo::platform::Fail(KELO_FAILURE_ARGUMENT, "KELODBFetchRow", "",
+                                    "no result, or nowhere to put the row");
+    if (result->nextRow >= result->rows.Count())
         return -1;
     *row = result->nextRow++;
     return 0;

@@ -2,6 +2,7 @@
 #include <cstring>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "files/section_cache.h"
 #include "keloplatform/torvc.h"
 
@@ -12,9 +13,9 @@ int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t
         buffer[0] = '\0';
     if (path == nullptr || key == nullptr || buffer == nullptr || size == 0) {
         errno = EINVAL;
-        return -1;
+        return Recorded("TORVCFileGetKeyValue", path, -1);
     }
-    return CatchBadAlloc(-1, [&] {
+    const auto copy = [&] {
         const std::shared_ptr<const SectionText> text = LoadSectionText(path);
         if (text == nullptr)
             return -1;
@@ -27,5 +28,6 @@ int TORVCFileGetKeyValue(const char *path, const char *key, char *buffer, size_t
         std::memcpy(buffer, value->data(), length);
         buffer[length] = '\0';
         return static_cast<int>(value->size()); // below kMaxTextFileBytes
-    });
+    };
+    return Recorded("TORVCFileGetKeyValue", path, CatchBadAlloc(-1, copy));
 }

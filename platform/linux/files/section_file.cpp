@@ -1,6 +1,7 @@
 #include <unordered_set>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "files/refusal.h"
 #include "files/section_cache.h"
 #include "text/sz_hash.h"
@@ -10,7 +11,7 @@ using namespace kelo::platform;
 
 namespace {
 
-int Fail(int cause) {
+int FailWith(int cause) {
     errno = cause;
     return -1;
 }
@@ -38,11 +39,11 @@ int GetSection(const std::string &path, std::string_view name, TORVSZHASH &hash)
         return -1;
     const SectionText::Section *section = text->Find(name);
     if (section == nullptr)
-        return Fail(ENOENT);
+        return FailWith(ENOENT);
     std::vector<SectionEntry> entries;
     if (const size_t line = text->Entries(*section, entries); line > 0) {
         ReportRefusal(path, line, "neither KEY=\"VALUE\" nor a comment");
-        return Fail(EBADMSG);
+        return FailWith(EBADMSG);
     }
     for (const SectionEntry &entry : entries)
         hash.Set(entry.key, entry.value);
@@ -53,12 +54,14 @@ int GetSection(const std::string &path, std::string_view name, TORVSZHASH &hash)
 
 int TORVCFileEnumSection(const char *path, TORVSZLIST **list) {
     if (path == nullptr || list == nullptr || *list == nullptr)
-        return Fail(EINVAL);
-    return CatchBadAlloc(-1, [&] { return EnumSection(path, **list); });
+        return Recorded("TORVCFileEnumSection", path, FailWith(EINVAL));
+    return Recorded("TORVCFileEnumSection", path,
+                    CatchBadAlloc(-1, [&] { return EnumSection(path, **list); }));
 }
 
 int TORVCFileGetSection(const char *path, const char *section, TORVSZHASH **hash) {
     if (path == nullptr || section == nullptr || hash == nullptr || *hash == nullptr)
-        return Fail(EINVAL);
-    return CatchBadAlloc(-1, [&] { return GetSection(path, section, **hash); });
+        return Recorded("TORVCFileGetSection", path, FailWith(EINVAL));
+    return Recorded("TORVCFileGetSection", path,
+                    CatchBadAlloc(-1, [&] { return GetSection(path, section, **hash); }));
 }

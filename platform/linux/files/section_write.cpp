@@ -3,6 +3,7 @@
 #include <memory>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "files/read_file.h"
 #include "files/refusal.h"
 #include "files/replace_file.h"
@@ -13,14 +14,14 @@ using namespace kelo::platform;
 
 namespace {
 
-int Fail(int cause) {
+int FailWith(int cause) {
     errno = cause;
     return -1;
 }
 
 int Refuse(const std::string &path, int cause, const std::string &reason) {
     ReportRefusal(path, 0, reason);
-    return Fail(cause);
+    return FailWith(cause);
 }
 
 struct FreeString {
@@ -100,7 +101,7 @@ int Apply(const std::string &path, const SectionChange &change) {
     std::string edited;
     if (change.newName == nullptr) {
         if (section == nullptr)
-            return Fail(ENOENT);
+            return FailWith(ENOENT);
         edited = RemoveSection(text, *section);
     } else {
         if (change.name != change.newName && text.Find(change.newName) != nullptr)
@@ -115,8 +116,8 @@ int Apply(const std::string &path, const SectionChange &change) {
 int TORVCFileSetSection(const char *path, const char *section, const char *newName, TORVSZHASH *hash,
                         const char *lineFormat) {
     if (path == nullptr || section == nullptr)
-        return Fail(EINVAL);
-    return CatchBadAlloc(-1, [&] {
+        return Recorded("TORVCFileSetSection", path, FailWith(EINVAL));
+    const auto set = [&] {
         SectionChange change{section, newName, {}};
         if (newName == nullptr)
             return Apply(path, change);
@@ -127,5 +128,6 @@ int TORVCFileSetSection(const char *path, const char *section, const char *newNa
         if (!RenderEntries(path, *hash, lineFormat, change.entries))
             return -1;
         return Apply(path, change);
-    });
+    };
+    return Recorded("TORVCFileSetSection", path, CatchBadAlloc(-1, set));
 }

@@ -1,6 +1,8 @@
+#include <cerrno>
 #include <charconv>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "files/refusal.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/settings.h"
@@ -17,6 +19,7 @@ bool CopyPort(const Settings &settings, int &port) {
     if (error == std::errc() && parsed == end && port >= 0 && port <= 65535)
         return true;
     ReportRefusal(settings.Path(), 0, "the value of smtp_port is not a port");
+    errno = EBADMSG;
     return false;
 }
 
@@ -33,10 +36,11 @@ bool Fill(KELOMAIL &mail) {
 
 int KELOMailGet(KELOMAIL *mail) {
     if (mail == nullptr)
-        return -1;
+        return FailWithErrno("KELOMailGet", "", EINVAL);
     *mail = KELOMAIL{};
     if (CatchBadAlloc(false, [&] { return Fill(*mail); }))
         return 0;
+    FailWithErrno("KELOMailGet", "", errno);
     *mail = KELOMAIL{};
     return -1;
 }

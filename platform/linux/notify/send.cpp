@@ -48,6 +48,7 @@ int KELOSysNotifySendNotificationCustomized(const char *tag, const char *textsDi
     });
     if (isSent)
         return 0;
+    FailWithErrno("KELOSysNotifySendNotificationCustomized", "", errno);
     ReportFailure("Cannot put notification \"%s\" into the spool: %m", TextOf(tag));
     return -1;
 }

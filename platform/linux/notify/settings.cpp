@@ -1,5 +1,7 @@
 #include "notify/settings.h"
 
+#include <cerrno>
+
 #include "common/root.h"
 #include "files/refusal.h"
 
@@ -21,6 +23,7 @@ bool Settings::CopyTo(char *field, size_t size, std::string_view key) const {
     field[0] = '\0';
     if (value.size() >= size) {
         ReportRefusal(path_, 0, "the value of " + std::string(key) + " is too long");
+        errno = EBADMSG;
         return false;
     }
     value.copy(field, value.size());

@@ -1,11 +1,12 @@
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 #include "keloplatform/kelonotify.h"
 #include "notify/settings.h"
 
 using namespace kelo::platform;
 
 KELOSMSCONF *KELOSmsConfGet() {
-    return CatchBadAlloc<KELOSMSCONF *>(nullptr, []() -> KELOSMSCONF * {
+    const auto read = []() -> KELOSMSCONF * {
         const Settings settings;
         if (!settings.IsLoaded())
             return nullptr;
@@ -16,7 +17,8 @@ KELOSMSCONF *KELOSmsConfGet() {
                               settings.CopyTo(conf->contentType, "sms_content_type") &&
                               settings.CopyTo(conf->numbers, "sms_to");
         return complete ? conf.release() : nullptr;
-    });
+    };
+    return Recorded("KELOSmsConfGet", nullptr, CatchBadAlloc<KELOSMSCONF *>(nullptr, read));
 }
 
 void KELOSmsConfFree(KELOSMSCONF *conf) {

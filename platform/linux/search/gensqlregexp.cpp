@@ -7,6 +7,7 @@
 #include <string_view>
 #include <vector>
 
+#include "common/failure.h"
 #include "common/utf8.h"
 #include "keloplatform/errors.h"
 #include "search/keyword.h"
@@ -102,8 +103,10 @@ private:
 std::string GenSQLRegexp(std::string pattern, std::string column) {
     kelo::platform::Generator generator(std::move(column));
     std::string sql = generator.Sql(std::move(pattern));
-    for (const std::string &problem : generator.Problems())
+    for (const std::string &problem : generator.Problems()) {
         syslog(LOG_ERR, "%s", problem.c_str());
+        kelo::platform::Fail(KELO_FAILURE_REGEX, "GenSQLRegexp", "", problem);
+    }
     return sql;
 }
 

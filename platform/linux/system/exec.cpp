@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <csignal>
 
+#include "common/failure.h"
 #include "keloplatform/torvc.h"
 
 namespace {
@@ -84,7 +85,7 @@ private:
 
 int TORVCExec(const char *program, const char *arg1, const char *arg2, const char *arg3, const char *arg4) {
     if (program == nullptr)
-        return -1;
+        return kelo::platform::FailWithErrno("TORVCExec", "", EINVAL);
     // An exec makes a child visible to every wait again, so the command runs as the child of one that execs
     // nothing.
     const char *arguments[] = {program, arg1, arg2, arg3, arg4, nullptr};
@@ -98,5 +99,10 @@ int TORVCExec(const char *program, const char *arg1, const char *arg2, const cha
             RunCommand(program, const_cast<char *const *>(arguments));
         }
     }
-    return keeper > 0 && AwaitExitStatus(keeper) == 0 ? 0 : -1;
+    if (keeper < 0)
+        return kelo::platform::FailWithErrno("TORVCExec", program, errno);
+    if (AwaitExitStatus(keeper) != 0)
+        return kelo::platform::Fail(KELO_FAILURE_OTHER, "TORVCExec", program,
+                                    "the command did not run, or did not end with exit status 0");
+    return 0;
 }

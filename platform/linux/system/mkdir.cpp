@@ -5,6 +5,7 @@
 #include <new>
 #include <string>
 
+#include "common/failure.h"
 #include "keloplatform/kelosystem.h"
 
 namespace {
@@ -23,9 +24,7 @@ bool MakeFolder(const std::string &path, int uid, int gid, mode_t mode) {
     return (uid < 0 && gid < 0) || chown(path.c_str(), static_cast<uid_t>(uid), static_cast<gid_t>(gid)) == 0;
 }
 
-} // namespace
-
-int KELOFSMkdirP(const char *folder, int, int, int uid, int gid, unsigned int mode) {
+int MakeFolders(const char *folder, int uid, int gid, mode_t mode) {
     if (folder == nullptr) {
         errno = EINVAL;
         return -1;
@@ -34,7 +33,7 @@ int KELOFSMkdirP(const char *folder, int, int, int uid, int gid, unsigned int mo
         const std::string path = folder;
         // Every prefix that ends before a '/', then the whole path.
         for (size_t end = path.find('/', 1); !path.empty(); end = path.find('/', end + 1)) {
-            if (!MakeFolder(path.substr(0, end), uid, gid, static_cast<mode_t>(mode)))
+            if (!MakeFolder(path.substr(0, end), uid, gid, mode))
                 return -1;
             if (end == std::string::npos)
                 break;
@@ -44,4 +43,11 @@ int KELOFSMkdirP(const char *folder, int, int, int uid, int gid, unsigned int mo
         errno = ENOMEM;
         return -1;
     }
+}
+
+} // namespace
+
+int KELOFSMkdirP(const char *folder, int, int, int uid, int gid, unsigned int mode) {
+    return kelo::platform::Recorded("KELOFSMkdirP", folder,
+                                    MakeFolders(folder, uid, gid, static_cast<mode_t>(mode)));
 }

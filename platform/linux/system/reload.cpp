@@ -36,6 +36,7 @@ bool KELOSystemdReload(const std::string &service) {
     }
     if (problem.empty())
         return true;
+    kelo::platform::Fail(KELO_FAILURE_OTHER, "KELOSystemdReload", "", problem);
     kelo::platform::ReportFailure("cannot reload service %s: %s", service.c_str(), problem.c_str());
     return false;
 }

@@ -4,8 +4,10 @@
 #include <memory>
 
 #include "common/catch_bad_alloc.h"
+#include "common/failure.h"
 
 using kelo::platform::CatchBadAlloc;
+using kelo::platform::Recorded;
 
 namespace {
 
@@ -32,22 +34,24 @@ void TORVSZHASH::Set(std::string_view key, std::string_view value) {
 }
 
 TORVSZHASH *TORVCSzHashAlloc(size_t size) {
-    return CatchBadAlloc<TORVSZHASH *>(nullptr, [&] {
+    const auto make = [&] {
         auto hash = std::make_unique<TORVSZHASH>();
         hash->index.reserve(std::min(size, kMaxReserved));
         return hash.release();
-    });
+    };
+    return Recorded("TORVCSzHashAlloc", nullptr, CatchBadAlloc<TORVSZHASH *>(nullptr, make));
 }
 
 int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, const char *value) {
     if (hash == nullptr || *hash == nullptr || key == nullptr || value == nullptr) {
         errno = EINVAL;
-        return -1;
+        return Recorded("TORVCSzHashSetValue", nullptr, -1);
     }
-    return CatchBadAlloc(-1, [&] {
+    const auto set = [&] {
         (*hash)->Set(key, value);
         return 0;
-    });
+    };
+    return Recorded("TORVCSzHashSetValue", nullptr, CatchBadAlloc(-1, set));
 }
 
 const char *TORVCSzHashGetValue(const TORVSZHASH *hash, const char *key) {

@@ -7,6 +7,8 @@
 #include <cstring>
 #include <new>
 
+#include "common/failure.h"
+
 namespace kelo::platform {
 
 void ListAppend(TORVSZLIST &list, std::string_view text) {
@@ -28,7 +30,9 @@ void ListAppend(TORVSZLIST &list, std::string_view text) {
 
 } // namespace kelo::platform
 
-TORVSZLIST *TORVCSzListAlloc(size_t size) {
+namespace {
+
+TORVSZLIST *AllocateList(size_t size) {
     if (size > INT_MAX / 2) {
         errno = ENOMEM;
         return nullptr;
@@ -43,6 +47,12 @@ TORVSZLIST *TORVCSzListAlloc(size_t size) {
         return nullptr;
     }
     return list;
+}
+
+} // namespace
+
+TORVSZLIST *TORVCSzListAlloc(size_t size) {
+    return kelo::platform::Recorded("TORVCSzListAlloc", nullptr, AllocateList(size));
 }
 
 void TORVCSzListFree(TORVSZLIST *list) {
