@@ -88,6 +88,11 @@ public:
     // anew.
     void EpsHandlerSet(std::function<void(uint64_t eps)> handler);
 
+    // From now on each flush also runs the statements that `statements` returns then, in its transaction and
+    // after its rows. For callers that keep with the counts how far they have counted. One that fails makes
+    // the flush fail and rolls it back; so does a transaction that could not be started.
+    void FlushStatementsSet(std::function<std::vector<std::string>()> statements);
+
     // Writes the figures to the debug channel at level 2.
     void AccountingDump();
 
@@ -116,4 +121,5 @@ private:
     std::list<Sample> samples_;
     NotificationManager notifications_;
     std::function<void(uint64_t)> epsHandler_; // empty: the rules are checked
+    std::function<std::vector<std::string>()> flushStatements_;
 };

@@ -54,12 +54,15 @@ define() {
 syslog_ng_configure() {
     local root=$1
     cp "$2" "$root/kelosyslog.conf"
-    mkdir -p "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelosyslog" "$root/var/log/kelolog"
+    mkdir -p "$root/var/spool/kelosyslog/files" "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelosyslog" "$root/var/log/kelolog"
     ln -sfn "$(readlink -f "$(dirname "$2")/../schema")" "$root/usr/kelo/syslog/schema"
     define "$root/kelosyslog.conf" kelo_receive "exec $3 receive --root $root"
     define "$root/kelosyslog.conf" kelo_db "$root/logs.db"
     define "$root/kelosyslog.conf" kelo_buffer_dir "$root"
     define "$root/kelosyslog.conf" kelo_reserve "$(readlink -f "$(dirname "${BASH_SOURCE[0]}")/../../package/syslog-ng/reserve-buffer")"
+    define "$root/kelosyslog.conf" kelo_spool "$root/var/spool/kelosyslog"
+    define "$root/kelosyslog.conf" kelo_spool_done "$root/run/kelosyslog"
+    define "$root/kelosyslog.conf" kelo_keep_spool "$(dirname "$3")/keep-spool"
     define "$root/kelosyslog.conf" kelo_address 127.0.0.1
     define "$root/kelosyslog.conf" kelo_listen "$root/listen.con[f]"
     define "$root/kelosyslog.conf" kelo_tls_dir "$root/tls"
@@ -71,6 +74,23 @@ destination d_internal { file("$root/syslog-ng.log"); };
 log { source(s_internal); destination(d_internal); };
 @include "$root/kelosyslog.conf"
 END
+}
+
+defined() { sed -n "s|^@define $2  *\"\([^\"]*\)\".*|\1|p" "$1"; } # FILE NAME
+
+# With the store "spool" the receiver is a service of its own, which starts again when it ended: as long as ROOT/pid exists.
+# Its messages go to ROOT/receiver.err.
+spool_receiver_start() {
+    local root=$1 conf=$1/kelosyslog.conf
+    [[ $(defined "$conf" kelo_store) == spool ]] || return 0
+    (
+        while [[ -e $root/pid ]]; do
+            # shellcheck disable=SC2046 # words
+            $(defined "$conf" kelo_receive | sed 's/^exec //') --verbose --spool "$(defined "$conf" kelo_spool)" \
+                --db "$(defined "$conf" kelo_db)" </dev/null >>"$root/receiver.err" 2>&1
+        done
+    ) 2>/dev/null &
+    disown
 }
 
 syslog_ng_alive() { [[ -s $1/pid ]] && kill -0 "$(<"$1/pid")" 2>/dev/null; }
@@ -89,6 +109,7 @@ syslog_ng_launch() {
         --pidfile="$root/syslog-ng.pid" --control="$root/syslog-ng.ctl" </dev/null >>"$root/syslog-ng.err" 2>&1 &
     echo $! >"$root/pid"
     disown # no notice of the shell when the daemon is killed
+    spool_receiver_start "$root"
     wait_until 30 syslog_ng_settled "$root" && syslog_ng_ready "$root"
 }
 syslog_ng_gone() { ! syslog_ng_alive "$1"; }
@@ -122,8 +143,9 @@ syslog_ng_stop() {
         kill -s "${2:-TERM}" "$(<"$1/pid")" || true
         wait_until 20 syslog_ng_gone "$1" || { kill -s KILL "$(<"$1/pid")" && wait_until 5 syslog_ng_gone "$1"; } || true
     fi
-    wait_until 60 receiver_gone "$1" || true
     rm -f "$1/pid"
+    receiver_gone "$1" || ! grep -q '"spool"' "$1/run/kelosyslog/receive.json" || kill "$(receiver_pid "$1")" || true
+    wait_until 60 receiver_gone "$1" || true
 }
 
 # One file is sent unchanged: as lines over TCP, as frames that are already counted, as one datagram.

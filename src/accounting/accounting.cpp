@@ -74,6 +74,10 @@ void AccountingManager::EpsHandlerSet(std::function<void(uint64_t eps)> handler)
     epsHandler_ = std::move(handler);
 }
 
+void AccountingManager::FlushStatementsSet(std::function<std::vector<std::string>()> statements) {
+    flushStatements_ = std::move(statements);
+}
+
 void AccountingManager::NotifyEps(uint64_t eps) {
     if (notifications_.NotificationSendEps(eps) < 0)
         Debuger::MSG(0, "Fail to send syslog notification");

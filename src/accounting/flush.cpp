@@ -7,6 +7,7 @@
 #include <memory>
 #include <new>
 #include <utility>
+#include <vector>
 
 #include "accounting/device_table.h"
 #include "common/failure.h"
@@ -89,6 +90,18 @@ public:
         return false;
     }
 
+    // A failure rolls the whole flush back. Without a transaction nothing runs: it would be no part of one.
+    bool Run(const std::vector<std::string> &statements) {
+        const auto fails = [this](const std::string &sql) { return db_.DBExecute(sql) < 0; };
+        const auto failed =
+            isOpen_ ? std::find_if(statements.begin(), statements.end(), fails) : statements.begin();
+        if (failed == statements.end())
+            return true;
+        db_.DBTranRollback();
+        ReportFailedStatement(*failed);
+        return false;
+    }
+
     // Deletes old samples from a file that has grown large. Only a file whose size is unknown is a
     // failure.
     bool Trim() {
@@ -146,6 +159,8 @@ int AccountingManager::AccoutingFlush2DB() {
         if (!db.WriteHistogram((*devices_)[i].name, (*devices_)[i].total))
             return -1;
     }
+    if (flushStatements_ && !db.Run(flushStatements_()))
+        return -1;
     if (!db.Trim() || !db.End())
         return -1;
     samples_.clear();

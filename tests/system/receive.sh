@@ -1,7 +1,6 @@
 # shellcheck shell=bash
-# Messages sent to syslog-ng in both formats and framings are stored, counted and checked, each once, with either of syslog-ng and
-# the receiver storing them.
-# usage: receive.sh database|receiver
+# Messages sent to syslog-ng in both formats and framings are stored, counted and checked, each once, in every way of storing.
+# usage: receive.sh database|receiver|spool
 source "$(dirname "$0")/support.sh"
 define "$root/kelosyslog.conf" kelo_store "$1"
 mkdir -p "$root/etc/kelosyslog"
@@ -34,8 +33,8 @@ kelosyslog() { "$KELO_BIN_DIR/kelosyslog" "$1" --root "$root" "${@:2}"; }
 has_counted() { kelosyslog status -o json --control "$root/syslog-ng.ctl" >"$root/status" && grep -q "\"written\":$total}" "$root/status"; }
 wait_until 20 has_counted || fail "not well: $(<"$root/status")"
 
-if [[ $1 == receiver ]]; then
-    # What comes while the database is locked waits. A reload then makes syslog-ng send one message again at most.
+if [[ $1 != database ]]; then
+    # What comes while the database is locked waits. A reload then makes syslog-ng send one message again at most, into a pipe.
     lock_database
     make_messages 20000 new 10001 >"$root/lines"
     send_lines "$root/lines"

@@ -1,6 +1,7 @@
 #include "base/event_loop.h"
 
 #include <sys/epoll.h>
+#include <systemd/sd-daemon.h>
 #include <systemd/sd-event.h>
 
 #include <cerrno>
@@ -149,6 +150,11 @@ bool EventLoop::Run(uint64_t timeoutUsec) {
         std::rethrow_exception(std::exchange(failure_, nullptr));
     Require(result);
     return result > 0;
+}
+
+void EventLoop::NotifyServiceManager() {
+    Require(sd_event_set_watchdog(loop_, 1));
+    Require(sd_notify(0, "READY=1"));
 }
 
 } // namespace kelo::tool

@@ -59,6 +59,10 @@ public:
     // not handled by then is discarded. A signal has one source at a time.
     EventSource AddSignal(int signal, Handler handler);
 
+    // Tells the service manager that the program has started and, where that asks for it, regularly that it
+    // still handles events. Without a service manager nothing happens.
+    void NotifyServiceManager();
+
     // Waits for an event and handles it; may also return without one. Throws what the handler throws.
     void Wait();
 

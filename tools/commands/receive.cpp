@@ -16,6 +16,7 @@
 #include "cli/program.h"
 #include "commands/commands.h"
 #include "receive/receiver.h"
+#include "receive/spool_receiver.h"
 
 namespace kelo::tool {
 namespace {
@@ -25,7 +26,9 @@ constexpr const char *kFooter =
     "SIGHUP reopens the files and loads the rules anew; SIGTERM ends when the input pauses.\n\n"
     "Examples:\n"
     "  kelosyslog receive                                  count the logs and check them against the rules\n"
-    "  kelosyslog receive --db /var/log/kelosyslog/logs.db    store them too\n\n"
+    "  kelosyslog receive --db /var/log/kelosyslog/logs.db    store them too\n"
+    "  kelosyslog receive --spool /var/spool/kelosyslog --db /var/log/kelosyslog/logs.db\n"
+    "                                                      the same out of the message spool\n\n"
     "Exit status: 0 the input ended, 2 usage, 4 the input cannot be read.";
 
 struct Options {
@@ -54,6 +57,18 @@ FileHandle LockAgainstOthers(const std::string &root) {
     return file;
 }
 
+int RunOnSpool(const ReceiverOptions &options) {
+    if (options.database.empty())
+        throw UsageError("--spool needs --db");
+    try {
+        SpoolReceiver(options).Run();
+    } catch (const std::system_error &error) {
+        syslog(LOG_ERR, "%s", error.what());
+        throw OutputError(error.what());
+    }
+    return kExitFound;
+}
+
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
@@ -62,6 +77,8 @@ int Run(Options options, const std::string &root) {
     std::signal(SIGXFSZ, SIG_IGN);
     openlog("kelosyslog", LOG_PID | (options.verbose ? LOG_PERROR : 0), LOG_DAEMON);
     const FileHandle lock = LockAgainstOthers(root);
+    if (!options.receiver.spool.empty())
+        return RunOnSpool(options.receiver);
     try {
         Receiver(options.receiver).Run(STDIN_FILENO);
     } catch (const std::system_error &error) {
@@ -80,6 +97,8 @@ void AddReceive(Program &program) {
     command.Footer(kFooter);
     command.AddText("--db", options->receiver.database, "PATH",
                     "Store into table logs of this database, which is created when missing");
+    command.AddText("--spool", options->receiver.spool, "FOLDER",
+                    "Receive from the files of this message spool, not the standard input; needs --db");
     command.AddText("--set-aside", options->receiver.setAside, "FILE",
                     "Keep lines that give no log here (/var/log/kelolog/set-aside.log)");
     command.AddText(

@@ -50,14 +50,24 @@ void AccountingFlusher::Load() {
         syslog(LOG_ERR, "devices are not forgotten: %s", error.what());
         return;
     }
+    MakeManager();
+    names_.Load(manager_->HistogramGet());
+}
+
+void AccountingFlusher::MakeManager() {
     manager_.emplace();
     manager_->EpsHandlerSet(onSample_);
-    names_.Load(manager_->HistogramGet());
+    manager_->FlushStatementsSet(hooks_.statements);
+}
+
+void AccountingFlusher::HooksSet(Hooks hooks) {
+    hooks_ = std::move(hooks);
+    manager_->FlushStatementsSet(hooks_.statements);
 }
 
 void AccountingFlusher::Tick(int64_t now) {
     manager_->CurEpsUpdate();
-    if (now < nextFlush_)
+    if (now < nextFlush_ || (hooks_.statements && manager_->CurrentEpsGet() != 0))
         return;
     nextFlush_ = now + kFlushSec;
     // False when its clock was set back: the next answer is right again.
@@ -91,6 +101,8 @@ bool AccountingFlusher::Flush() {
     } else if (isFailing_) {
         syslog(LOG_NOTICE, "the accounting has been written");
     }
+    if (isFlushed && hooks_.onFlushed)
+        hooks_.onFlushed();
     isFailing_ = !isFlushed;
     isIdle_ = isFlushed && manager_->CurrentEpsGet() == 0;
     return isFlushed;

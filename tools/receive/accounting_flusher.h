@@ -4,6 +4,7 @@
 #include <functional>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "kelosyslog/accounting.h"
 #include "receive/device_names.h"
@@ -25,6 +26,14 @@ public:
         isIdle_ = false;
         manager_->LogInc(names_.NameFor(host));
     }
+
+    // How a caller that knows how far it has counted keeps that with the counts. A flush then happens only
+    // when all counts belong to closed samples, so Tick has to be called before the first record of a second.
+    struct Hooks {
+        std::function<std::vector<std::string>()> statements; // run in the transaction of a flush
+        std::function<void()> onFlushed;
+    };
+    void HooksSet(Hooks hooks);
 
     // Records that were not counted for their host but as DeviceNames::kOthers.
     uint64_t Others() const { return names_.Others(); }
@@ -52,9 +61,11 @@ public:
 private:
     bool Flush();
     void Load();
+    void MakeManager();
 
     std::string path_;
     std::function<void(uint64_t)> onSample_;
+    Hooks hooks_;
     DeviceNames names_;
     std::optional<AccountingManager> manager_;
     bool isReloadDue_ = true;

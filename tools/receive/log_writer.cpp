@@ -1,5 +1,6 @@
 #include "receive/log_writer.h"
 
+#include <fcntl.h>
 #include <sqlite3.h>
 #include <sys/stat.h>
 #include <syslog.h>
@@ -24,7 +25,7 @@ constexpr int64_t kRetrySoonMs = 100;
 constexpr int64_t kRetryMs = 1000;
 constexpr int64_t kRetryDamagedMs = 60'000; // each try notifies the administrator
 
-bool IsFull(const SqliteError &error) {
+bool IsForLackOfSpace(const SqliteError &error) {
     return error.code == SQLITE_FULL || error.systemError == ENOSPC || error.systemError == EDQUOT ||
            error.systemError == EFBIG;
 }
@@ -63,12 +64,14 @@ bool LogWriter::Advance(int64_t now, bool isUrgent) {
 bool LogWriter::Write(int64_t now) {
     try {
         Open();
-        store_->Store(batch_.Records());
+        Store(batch_.Records());
     } catch (const SqliteError &error) {
         Pause(error, now);
         return false;
     }
     stored_ += batch_.Size();
+    if (hooks_.onStored)
+        hooks_.onStored(batch_.Records());
     batch_.Clear();
     if (!reason_.empty()) {
         syslog(LOG_NOTICE, "storing into %s goes on after %lld s", path_.c_str(),
@@ -77,6 +80,32 @@ bool LogWriter::Write(int64_t now) {
         volume_.NoteWritten();
     }
     return true;
+}
+
+void LogWriter::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
+    if (hooks_.alongside)
+        store_->Store(logs, hooks_.alongside);
+    else
+        store_->Store(logs);
+}
+
+bool LogWriter::WriteAlongside() {
+    if (!reason_.empty())
+        return false;
+    try {
+        Open();
+        Store({});
+    } catch (const SqliteError &) {
+        store_.reset(); // the next batch says why
+        return false;
+    }
+    return true;
+}
+
+// What has left the write-ahead log was synced by a checkpoint.
+bool LogWriter::Sync() const {
+    const FileHandle log(open((path_ + "-wal").c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW));
+    return log ? fdatasync(log.Get()) == 0 : errno == ENOENT;
 }
 
 // The file that has the name of the database now.
@@ -104,7 +133,7 @@ void LogWriter::Pause(const SqliteError &error, int64_t now) {
     if (reason_ != error.what())
         syslog(LOG_ERR, "receiving waits, as logs cannot be stored: %s", error.what());
     reason_ = error.what();
-    if (IsFull(error))
+    if (IsForLackOfSpace(error))
         volume_.NoteFull();
     if (error.code == SQLITE_CORRUPT)
         retryTime_ = now + PutAside();

@@ -1,8 +1,11 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <optional>
+#include <span>
 #include <string>
+#include <utility>
 
 #include "receive/disk_space_monitor.h"
 #include "store/log_store.h"
@@ -20,11 +23,21 @@ namespace kelo::tool {
 // Times are milliseconds of any clock that does not go back.
 class LogWriter {
 public:
+    // What happens with each batch.
+    struct Hooks {
+        // Writes something into the database in the transaction of the batch.
+        std::function<void(SqliteConnection &database)> alongside;
+        // The batch has been stored.
+        std::function<void(std::span<const _SYSLOG_LOG_DATA_tag> logs)> onStored;
+    };
+
     // Opens nothing yet. `volume`, which is notified of a full disk, must outlive the writer.
     LogWriter(const std::string &path, DiskSpaceMonitor &volume);
 
     // Takes the record, and may leave the content of another in it.
     void Take(_SYSLOG_LOG_DATA_tag &log, int64_t now);
+
+    void HooksSet(Hooks hooks) { hooks_ = std::move(hooks); }
 
     // Writes the batch when it is time, or immediately if `isUrgent`. Returns false while the database cannot
     // be written: no further records should be taken then.
@@ -33,10 +46,17 @@ public:
     // When Advance has something to do next.
     int64_t NextTime() const;
 
+    // Writes only what Hooks::alongside writes. Returns false, without effect, if that is not possible now.
+    bool WriteAlongside();
+
+    // Makes durable what was written: commits are not synced one by one. Returns false when that failed.
+    bool Sync() const;
+
     // Closes the database. The next batch is written to the file that has its name then.
     void Reopen() { store_.reset(); }
 
     size_t Waiting() const { return batch_.Size(); }
+    bool IsFull() const { return batch_.IsFull(); }
     uint64_t Stored() const { return stored_; }
     // Why the database cannot be written; empty when it can.
     const std::string &Reason() const { return reason_; }
@@ -44,12 +64,14 @@ public:
 
 private:
     bool Write(int64_t now);
+    void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs);
     void Open();
     void Pause(const SqliteError &error, int64_t now);
     int64_t PutAside();
 
     std::string path_; // absolute
     DiskSpaceMonitor &volume_;
+    Hooks hooks_;
     std::optional<LogStore> store_;
     RecordBatch batch_;
     int64_t batchTime_ = 0; // of the batch's first record

@@ -41,6 +41,15 @@ std::string FolderOf(const ReceiverOptions &options) {
 
 } // namespace
 
+bool TellOtherDevices(const ReceiverOptions &options, uint64_t others) {
+    if (others == 0)
+        return false;
+    const std::string text = "Records of more than " + std::to_string(options.deviceLimit) +
+                             " devices were received; those of further ones are counted as " +
+                             DeviceNames::kOthers + ".";
+    return Logger().LogAdd(options.root + kEventDatabase, kWarning, "SYSTEM", text) == 0;
+}
+
 Receiver::Receiver(ReceiverOptions options)
     : options_(std::move(options)), rules_(options_.notifyLimit),
       accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
@@ -177,20 +186,11 @@ void Receiver::TickSecond() {
         FireAt(secondTimer_, next);
 }
 
-// One event, however long the flood of names lasts.
-void Receiver::TellOthers() {
-    if (areOthersTold_ || accounting_.Others() == 0)
-        return;
-    const std::string text = "Records of more than " + std::to_string(options_.deviceLimit) +
-                             " devices were received; those of further ones are counted as " +
-                             DeviceNames::kOthers + ".";
-    areOthersTold_ = Logger().LogAdd(options_.root + kEventDatabase, kWarning, "SYSTEM", text) == 0;
-}
-
 void Receiver::TickState() {
     now_ = NowMs();
     volume_.Tick();
-    TellOthers();
+    if (!areOthersTold_) // one event, however long the flood of names lasts
+        areOthersTold_ = TellOtherDevices(options_, accounting_.Others());
     WriteState();
     FireAt(stateTimer_, now_ + kBeatMs);
 }

@@ -20,11 +20,15 @@ namespace kelo::tool {
 
 struct ReceiverOptions {
     std::string root;          // of the system's files, absolute or empty
+    std::string spool;         // folder of the message spool, for SpoolReceiver
     std::string database;      // to store into; empty: records are only counted and checked
     std::string setAside;      // file for lines that are not valid records; empty: the default below the root
     uint64_t notifyLimit = 10; // notifications a minute for each rule
     size_t deviceLimit = 10'000; // devices that are counted each by its name
 };
+
+// Adds an event when records were counted as those of other devices. Returns whether it was added.
+bool TellOtherDevices(const ReceiverOptions &options, uint64_t others);
 
 // Receives log text from a pipe: counts the records, checks them against the rules and stores them.
 //
@@ -56,7 +60,6 @@ private:
     void TickSecond();
     void Repair();
     void TickState();
-    void TellOthers();
     void WriteState();
     void Finish();
     uint64_t Received() const;

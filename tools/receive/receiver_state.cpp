@@ -29,6 +29,15 @@ Json::Value ToJson(const ReceiverState &state) {
     root["other_devices"] = Json::UInt64{state.others};
     root["waiting"] = state.waiting;
     root["eps"] = state.eps;
+    if (!state.spool.folder.empty()) {
+        Json::Value &spool = root["spool"];
+        spool["folder"] = state.spool.folder;
+        spool["bytes"] = Json::UInt64{state.spool.bytes};
+        spool["limit"] = Json::UInt64{state.spool.limit};
+        spool["unread"] = Json::UInt64{state.spool.unread};
+        spool["behind_sec"] = Json::Int64{state.spool.behindSec};
+        spool["growth"] = state.spool.growth;
+    }
     return root;
 }
 
@@ -52,6 +61,13 @@ ReceiverState FromJson(const Json::Value &root) {
     state.others = root["other_devices"].asUInt64();
     state.waiting = root["waiting"].asString();
     state.eps = root["eps"].asDouble();
+    const Json::Value &spool = root["spool"];
+    state.spool.folder = spool["folder"].asString();
+    state.spool.bytes = spool["bytes"].asUInt64();
+    state.spool.limit = spool["limit"].asUInt64();
+    state.spool.unread = spool["unread"].asUInt64();
+    state.spool.behindSec = spool["behind_sec"].asInt64();
+    state.spool.growth = spool["growth"].asDouble();
     return state;
 }
 

@@ -27,6 +27,17 @@ struct ReceiverState {
     std::string waiting;                        // why reading pauses; empty when it does not
     double eps = 0;                             // complete records a second, between the last two updates
 
+    // The message spool, if it receives from that.
+    struct Spool {
+        std::string folder;    // empty: it receives from a pipe
+        uint64_t bytes = 0;    // of all files
+        uint64_t limit = 0;    // what they are held to; 0 when unknown
+        uint64_t unread = 0;   // bytes not stored yet
+        int64_t behindSec = 0; // age of the first record among them
+        double growth = 0;     // of the unread bytes a second, between the last two updates
+        bool operator==(const Spool &) const = default;
+    } spool;
+
     bool operator==(const ReceiverState &) const = default;
 };
 

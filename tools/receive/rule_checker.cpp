@@ -106,6 +106,7 @@ void RuleChecker::Tell(const RateLimiter::Counts &counts) {
 }
 
 void RuleChecker::Raise(const Match &match, const std::string &content) {
+    ++raised_;
     // After others that wait, so that they arrive in order.
     if (!waiting_.empty() || !Notify(match, content)) {
         if (waiting_.size() == kMostWaiting)

@@ -44,6 +44,9 @@ public:
     // Whether the last event failed.
     bool IsFailing() const { return lostEvents_ > 0; }
 
+    // Notifications that were raised, delivered or not.
+    uint64_t Raised() const { return raised_; }
+
     // Matches without a notification of their own.
     uint64_t Suppressed() const { return suppressed_; }
 
@@ -77,6 +80,7 @@ private:
     std::optional<NotificationManager> rules_;
     RateLimiter limit_;
     std::map<std::string, Match> lastSuppressed_; // by rule, with the highest number of records
+    uint64_t raised_ = 0;
     uint64_t suppressed_ = 0;
     std::deque<Notification> waiting_; // those that failed, oldest first
     int64_t nextNotify_ = 0;           // when they are tried again

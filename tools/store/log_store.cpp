@@ -149,6 +149,14 @@ void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs, const StoreProg
     transaction.Commit();
 }
 
+void LogStore::Store(std::span<const _SYSLOG_LOG_DATA_tag> logs,
+                     const std::function<void(SqliteConnection &)> &alongside) {
+    SqliteTransaction transaction(db_);
+    InsertLogs(logs);
+    alongside(db_);
+    transaction.Commit();
+}
+
 void LogStore::PrepareProgress() {
     if (saveProgress_)
         return;

@@ -3,6 +3,7 @@
 // Storing records into table "logs" of a log database.
 
 #include <cstdint>
+#include <functional>
 #include <optional>
 #include <span>
 #include <string>
@@ -50,6 +51,10 @@ public:
 
     // The same, and `progress` in the same transaction.
     void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs, const StoreProgress &progress);
+
+    // The same, and what `alongside` writes, in the same transaction.
+    void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs,
+               const std::function<void(SqliteConnection &)> &alongside);
 
     // Whether the file was removed or renamed since it was opened. Records that are stored then are not found
     // at the path.

@@ -1,0 +1,23 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "receive/receiver.h"
+#include "receive/spool_place.h"
+
+namespace kelo::tool {
+
+// The places in the database at `path`, which may be missing or damaged and has none then. Returns why they
+// are unknown, else "".
+std::string TryLoadPlaces(const std::string &path, SpoolReader reader, std::vector<SpoolPlace> &places);
+
+// Replaces the file /run/kelosyslog/spool-done, in which keep-spool finds the files of the message spool that
+// all readers have read: a line "INODE BYTES NAME" for each. Returns false with errno set.
+bool WriteSpoolDone(const std::string &root, const std::string &content);
+
+// The size that keep-spool holds the message spool to; 0 when it never ran.
+uint64_t SpoolLimit(const std::string &spool);
+
+} // namespace kelo::tool
