@@ -2,9 +2,10 @@
 
 // The appliance's database layer: connections and statements over SQLite.
 //
-// A connection and its results are used by one thread at a time. Nothing here throws, and nothing writes to
-// the system log: a failure is a null or negative result, and the connection has the cause (KELODBErrorGet,
-// sqlite3_errcode() on KELODBInternalDBHdlGet, and failure.h).
+// A connection and its results are used by one thread at a time. Nothing here throws: a failure is a null or
+// negative result, and the connection has the cause (KELODBErrorGet, sqlite3_errcode() on
+// KELODBInternalDBHdlGet, and failure.h). Nothing writes to the system log but a search that removes a
+// damaged skip index (skip_index.h).
 
 #include <cstddef>
 
@@ -28,7 +29,8 @@ extern "C" {
 // files.
 //
 // Returns a connection that the caller closes with KELODBClose, or null: no path (errno EINVAL), no such file
-// (ENOENT), no permission (EACCES), a folder (EISDIR), out of memory (ENOMEM). A file that is not a database is detected only by the first statement.
+// (ENOENT), no permission (EACCES), a folder (EISDIR), out of memory (ENOMEM). A file that is not a database
+// is detected only by the first statement.
 KELOPLATFORM_API DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const char *path);
 
 // Closes the connection; null is accepted. Results stay valid until they are freed themselves. Returns 0, or

@@ -19,6 +19,8 @@ namespace {
 // writer's transaction, which ends with its deletion by this name, and SQLite deletes one beside an empty
 // file.
 constexpr const char *kFiles[] = {"", "-wal", "-shm"};
+// The platform's index for searches fits no other database, and a moved one does without.
+constexpr const char *kSkipIndex = "-skip";
 
 bool Exists(const std::string &path) {
     struct stat status {};
@@ -83,6 +85,8 @@ int MoveDatabase(const std::string &from, const std::string &to) {
     const int error = std::rename(from.c_str(), to.c_str()) == 0 ? 0 : errno;
     for (const CompanionMove &companion : companions)
         error == 0 ? companion.Finish() : companion.TakeBack();
+    if (error == 0)
+        unlink((from + kSkipIndex).c_str());
     return error;
 }
 
@@ -117,7 +121,7 @@ void RemoveDatabase(const std::string &dbPath) {
     if (!Exists(dbPath))
         return;
     const CompanionGuard guard(dbPath);
-    for (const char *suffix : {"", "-wal", "-shm", "-journal"})
+    for (const char *suffix : {"", "-wal", "-shm", "-journal", kSkipIndex})
         unlink((dbPath + suffix).c_str());
 }
 

@@ -238,7 +238,7 @@ void SqliteTransaction::Commit() {
 }
 
 void RemoveDatabase(const std::string &path) {
-    for (const char *suffix : {"", "-journal", "-wal", "-shm"})
+    for (const char *suffix : {"", "-journal", "-wal", "-shm", "-skip"})
         unlink((path + suffix).c_str());
 }
 

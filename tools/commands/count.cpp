@@ -6,6 +6,7 @@
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
+#include "commands/index_upkeep.h"
 #include "read/log_reader.h"
 
 namespace kelo::tool {
@@ -34,6 +35,8 @@ int Run(const Options &options, const std::string &root) {
     Output output(false);
     output.Write(std::to_string(count) + "\n");
     output.Finish();
+    if (!options.filter.keywords.empty())
+        ExtendIndexLater(table);
     return count > 0 ? kExitFound : kExitNothing;
 }
 

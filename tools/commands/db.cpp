@@ -30,6 +30,7 @@ void AddDb(Program &program) {
     db.Footer(kFooter);
     AddDbInspection(program, db);
     AddDbMaintenance(program, db);
+    AddDbIndex(program, db);
 }
 
 } // namespace kelo::tool

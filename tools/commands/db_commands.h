@@ -30,5 +30,7 @@ std::vector<std::string> FindProblems(const LogTable &table);
 void AddDbInspection(Program &program, Command db);
 // Commands that change a database: create, wal, limit, set-device, quarantine, reopen.
 void AddDbMaintenance(Program &program, Command db);
+// index.
+void AddDbIndex(Program &program, Command db);
 
 } // namespace kelo::tool

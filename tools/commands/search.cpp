@@ -7,6 +7,7 @@
 #include "commands/commands.h"
 #include "commands/common_options.h"
 #include "commands/follow.h"
+#include "commands/index_upkeep.h"
 #include "read/log_reader.h"
 
 namespace kelo::tool {
@@ -85,6 +86,8 @@ int Run(const Options &options, const std::string &root) {
     writer->End(text);
     print();
     output.Finish();
+    if (!options.filter.keywords.empty() && !options.follow)
+        ExtendIndexLater(table);
     return count > 0 ? kExitFound : kExitNothing;
 }
 

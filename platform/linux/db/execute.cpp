@@ -3,15 +3,19 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <utility>
 
 #include "common/failure.h"
 #include "db/connection.h"
+#include "db/indexed_search.h"
 #include "db/raise_error.h"
 #include "db/result.h"
 #include "db/row_sink.h"
 #include "db/statement.h"
 
+using kelo::platform::PageBounds;
 using kelo::platform::RaiseError;
+using kelo::platform::RunIndexedSearch;
 using kelo::platform::SingleStatement;
 using kelo::platform::Statement;
 
@@ -26,17 +30,6 @@ constexpr unsigned int kSinkRows = 200;
 constexpr int kCheapSteps = 100000;
 
 enum class Delivery { kByRow, kBySink };
-
-void TakeRow(sqlite3_stmt *statement, DBResult_tag &result) {
-    for (size_t i = 0; i < result.cells.size(); ++i) {
-        const int column = static_cast<int>(i);
-        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
-        if (text == nullptr && sqlite3_column_type(statement, column) != SQLITE_NULL)
-            throw std::bad_alloc();
-        result.cells[i] = {text, static_cast<size_t>(sqlite3_column_bytes(statement, column))};
-    }
-    result.AddRow();
-}
 
 bool StepToEnd(sqlite3_stmt *statement) {
     int status;
@@ -53,7 +46,7 @@ Progress TakeRows(sqlite3_stmt *statement, DBResult_tag &result, uint64_t most) 
         const int status = sqlite3_step(statement);
         if (status != SQLITE_ROW)
             return status == SQLITE_DONE ? Progress::kDone : Progress::kFailed;
-        TakeRow(statement, result);
+        result.AddRowOf(statement);
     }
     return Progress::kMore;
 }
@@ -101,12 +94,8 @@ bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
     return Deliver(db, single, delivery, rows);
 }
 
-bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
-    if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
-        return *isInserted;
-    std::unique_ptr<DBResult_tag> rows;
-    if (!RunSingle(connection.db, sql, delivery, result != nullptr, rows))
-        return false;
+// Hands the rows of a statement that succeeded to the caller.
+bool HandOver(DBConnect_tag &connection, std::unique_ptr<DBResult_tag> rows, DBResult_tag **result) {
     // The error is raised after the last statement is finalised: finalising a successful one would clear it.
     if (connection.file.HasChanged()) {
         RaiseError(connection.db, SQLITE_BUSY, "database changed while it was read without locks");
@@ -117,9 +106,18 @@ bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult
     return true;
 }
 
+bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+    if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
+        return *isInserted;
+    std::unique_ptr<DBResult_tag> rows;
+    const std::optional<bool> isFound =
+        RunIndexedSearch(connection.db, sql, nullptr, result != nullptr, rows);
+    const bool isDone = isFound ? *isFound : RunSingle(connection.db, sql, delivery, result != nullptr, rows);
+    return isDone && HandOver(connection, std::move(rows), result);
+}
+
 // The one SELECT of `sql` with its bounds, "" if the text has no statement.
-bool BoundedText(sqlite3 *db, const char *sql, unsigned int limit, unsigned int offset,
-                 std::string &bounded) {
+bool BoundedText(sqlite3 *db, const char *sql, const PageBounds &page, std::string &bounded) {
     SingleStatement single;
     if (!PrepareSingle(db, sql, single))
         return false;
@@ -131,10 +129,20 @@ bool BoundedText(sqlite3 *db, const char *sql, unsigned int limit, unsigned int 
         return false;
     }
     bounded.append(single.text).append(kelo::platform::kCommentEnd).append("LIMIT ");
-    bounded.append(limit != 0 ? std::to_string(limit) : "-1")
+    bounded.append(page.limit != 0 ? std::to_string(page.limit) : "-1")
         .append(" OFFSET ")
-        .append(std::to_string(offset));
+        .append(std::to_string(page.offset));
     return true;
+}
+
+bool RunPage(DBConnect_tag &connection, const char *sql, const PageBounds &page, DBResult_tag **result) {
+    std::unique_ptr<DBResult_tag> rows;
+    if (const auto isFound = RunIndexedSearch(connection.db, sql, &page, result != nullptr, rows))
+        return *isFound && HandOver(connection, std::move(rows), result);
+    std::string bounded;
+    const bool isShort = page.limit != 0 && page.limit < kSinkRows;
+    return BoundedText(connection.db, sql, page, bounded) &&
+           Run(connection, bounded.c_str(), isShort ? Delivery::kByRow : Delivery::kBySink, result);
 }
 
 // Runs `work` for a statement of the caller and converts its outcome to the result code. On failure the
@@ -167,9 +175,6 @@ int KELODBExecute(DBConnect_tag *connection, const char *sql, DBResult_tag **res
 int KELODBSelectLimit(DBConnect_tag *connection, const char *sql, unsigned int limit, unsigned int offset,
                       DBResult_tag **result) {
     return Guarded(connection, sql, result, [&] {
-        std::string bounded;
-        const bool isPage = limit != 0 && limit < kSinkRows;
-        return BoundedText(connection->db, sql, limit, offset, bounded) &&
-               Run(*connection, bounded.c_str(), isPage ? Delivery::kByRow : Delivery::kBySink, result);
+        return RunPage(*connection, sql, {limit, offset}, result);
     });
 }

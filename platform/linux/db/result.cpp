@@ -21,6 +21,17 @@ void DBResult_tag::AddRow() {
     rows.Add(cells);
 }
 
+void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
+    for (size_t i = 0; i < cells.size(); ++i) {
+        const int column = static_cast<int>(i);
+        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
+        if (text == nullptr && sqlite3_column_type(statement, column) != SQLITE_NULL)
+            throw std::bad_alloc();
+        cells[i] = {text, static_cast<size_t>(sqlite3_column_bytes(statement, column))};
+    }
+    AddRow();
+}
+
 int KELODBNumRows(DBResult_tag *result) {
     return result != nullptr ? static_cast<int>(result->rows.Count()) : 0;
 }

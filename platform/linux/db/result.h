@@ -22,6 +22,9 @@ struct DBResult_tag {
     // Appends the row in `cells`. Throws std::bad_alloc, or std::length_error when the result is full.
     void AddRow();
 
+    // The same with the row that a statement with as many columns is at.
+    void AddRowOf(sqlite3_stmt *statement);
+
     kelo::platform::ColumnIndex columns;
     kelo::platform::RowBlock rows;
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column

@@ -1,0 +1,73 @@
+#include "skip_index/piece.h"
+
+#include <cstring>
+
+namespace kelo::platform {
+namespace {
+
+constexpr uint64_t kMultiplier = 0x9FB21C651E98DF25;
+
+uint64_t Mixed(uint64_t hash, uint64_t word) {
+    hash = (hash ^ word) * kMultiplier;
+    return hash ^ (hash >> 32);
+}
+
+using Tile = std::array<uint64_t, 64>;
+
+// Exchanges rows and columns of 64 x 64 bits, by halves of halves.
+void Transpose(Tile &tile) {
+    uint64_t mask = 0x00000000FFFFFFFF;
+    for (size_t half = 32; half != 0; half /= 2, mask ^= mask << half) {
+        for (size_t row = 0; row < tile.size(); row = (row + half + 1) & ~half) {
+            const uint64_t swapped = ((tile[row] >> half) ^ tile[row + half]) & mask;
+            tile[row] ^= swapped << half;
+            tile[row + half] ^= swapped;
+        }
+    }
+}
+
+} // namespace
+
+uint64_t HashOf(std::string_view bytes, uint64_t seed) {
+    uint64_t hash = Mixed(seed, bytes.size());
+    while (!bytes.empty()) {
+        uint64_t word = 0;
+        const size_t size = bytes.copy(reinterpret_cast<char *>(&word), sizeof word);
+        hash = Mixed(hash, word);
+        bytes.remove_prefix(size);
+    }
+    return Mixed(hash, seed);
+}
+
+uint32_t ChecksumOf(const Slice &slice, uint64_t fileNumber, int64_t piece, size_t gram) {
+    uint64_t hash = Mixed(fileNumber, static_cast<uint64_t>(piece) * kGramBits + gram);
+    for (const uint64_t word : slice.blocks)
+        hash = Mixed(hash, word);
+    return static_cast<uint32_t>(Mixed(hash, fileNumber));
+}
+
+Piece::Piece() : blocks_(std::make_unique<std::array<GramBits, kBlocksPerPiece>>()) {}
+
+void Piece::Clear() {
+    for (GramBits &block : *blocks_)
+        block.fill(0);
+}
+
+std::unique_ptr<Slice[]> Piece::Slices(uint64_t fileNumber, int64_t piece) const {
+    auto slices = std::make_unique<Slice[]>(kGramBits);
+    for (size_t word = 0; word < kWordsPerSlice; ++word) {
+        for (size_t grams = 0; grams < kGramBits / 64; ++grams) {
+            Tile tile;
+            for (size_t block = 0; block < tile.size(); ++block)
+                tile[block] = (*blocks_)[word * 64 + block][grams];
+            Transpose(tile);
+            for (size_t gram = 0; gram < tile.size(); ++gram)
+                slices[grams * 64 + gram].blocks[word] = tile[gram];
+        }
+    }
+    for (size_t gram = 0; gram < kGramBits; ++gram)
+        slices[gram].checksum = ChecksumOf(slices[gram], fileNumber, piece, gram);
+    return slices;
+}
+
+} // namespace kelo::platform

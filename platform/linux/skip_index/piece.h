@@ -1,0 +1,53 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string_view>
+
+#include "skip_index/grams.h"
+
+namespace kelo::platform {
+
+// How ids are divided. A block is what the index accepts or rules out; a piece is what is built at once; a
+// segment is what is read at once.
+inline constexpr int64_t kIdsPerBlock = 32;
+inline constexpr int64_t kIdsPerPiece = 16'384;
+inline constexpr int64_t kPiecesPerSegment = 8;
+inline constexpr int64_t kIdsPerSegment = kIdsPerPiece * kPiecesPerSegment;
+
+inline constexpr size_t kBlocksPerPiece = kIdsPerPiece / kIdsPerBlock;
+inline constexpr size_t kWordsPerSlice = kBlocksPerPiece / 64;
+
+// One bit of every block of a piece, and a check sum, as it is in the file.
+struct [[gnu::packed]] Slice {
+    std::array<uint64_t, kWordsPerSlice> blocks;
+    uint32_t checksum;
+};
+inline constexpr size_t kPieceBytes = kGramBits * sizeof(Slice);
+inline constexpr size_t kSegmentBytes = kPieceBytes * kPiecesPerSegment;
+
+// The check sum of the slice of bit `gram` in `piece`. It depends on where the slice is and on the file's own
+// number, so that nothing that is left of another file or place passes for it.
+uint32_t ChecksumOf(const Slice &slice, uint64_t fileNumber, int64_t piece, size_t gram);
+
+// 64-bit hash of bytes, the same on every machine of the same byte order.
+uint64_t HashOf(std::string_view bytes, uint64_t seed);
+
+// The bits of a piece that is being built.
+class Piece {
+public:
+    // Throws std::bad_alloc.
+    Piece();
+    void Clear();
+    // Adds the text of the row with this number in the piece.
+    void Add(size_t row, std::string_view text) { AddGrams(text, (*blocks_)[row / kIdsPerBlock]); }
+    // The slices with their check sums: those of gram 0, 1 and so on.
+    std::unique_ptr<Slice[]> Slices(uint64_t fileNumber, int64_t piece) const;
+
+private:
+    std::unique_ptr<std::array<GramBits, kBlocksPerPiece>> blocks_;
+};
+
+} // namespace kelo::platform

@@ -1,0 +1,57 @@
+#pragma once
+
+#include <cstdint>
+#include <limits>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace kelo::platform {
+
+// What a row must have in its grams for a condition to be true: sufficient to rule a row out, never to
+// accept it.
+struct Need {
+    enum class Kind {
+        kNothing, // the condition says nothing about grams
+        kGrams,   // all of these bits
+        kAll,     // all of the parts
+        kAny      // one of the parts
+    };
+    Kind kind = Kind::kNothing;
+    std::vector<uint16_t> grams;
+    std::vector<Need> parts;
+};
+
+struct IdRange {
+    int64_t first = std::numeric_limits<int64_t>::min();
+    int64_t last = std::numeric_limits<int64_t>::max(); // included
+};
+
+// A statement that the skip index can serve: it reads or deletes the rows of table "logs" for which all of
+// some conditions are true.
+struct SearchText {
+    enum class Kind { kSelect, kCount, kDelete };
+    enum class Order { kNone, kAscending, kDescending }; // by id
+
+    Kind kind = Kind::kSelect;
+    std::string_view head; // "SELECT * FROM logs"
+    // Conditions joined by AND, without those of the id, which are in `ids`. Each is complete in itself.
+    std::vector<std::string_view> conditions;
+    IdRange ids;
+    Order order = Order::kNone;
+    Need need; // never kNothing
+    // Whether the grams say something about every condition: no index of SQLite serves any of them.
+    bool isTextOnly = true;
+};
+
+// Takes a statement apart. Nothing for any text that is not known to be one of these, or whose grams say
+// nothing. The result refers to `sql`.
+std::optional<SearchText> ReadSearchText(std::string_view sql);
+
+// The conditions, joined: of the one index that EXPLAIN QUERY PLAN names, those on `column` alone; "" if
+// there is none.
+std::string ConditionsOn(const SearchText &search, std::string_view column);
+std::string AllConditions(const SearchText &search);
+
+} // namespace kelo::platform

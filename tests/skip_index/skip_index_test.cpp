@@ -1,0 +1,266 @@
+// The skip index seen from outside: which statements use it, whom it trusts, and what is left after a
+// failure.
+
+#include "keloplatform/skip_index.h"
+
+#include <dlfcn.h>
+#include <sys/file.h>
+
+#include "platform/db_fixture.h"
+
+namespace {
+
+// The calls that change files, counted down: the last one fails, or is the last thing that the process does.
+struct Fault {
+    int callsLeft = -1;
+    int error = 0; // 0: the process ends, with half of what it was to write
+};
+Fault fault;
+
+bool IsDue() {
+    if (fault.callsLeft < 0 || fault.callsLeft-- > 0)
+        return false;
+    fault.callsLeft = 0; // a full disk stays full
+    errno = fault.error;
+    return true;
+}
+
+bool Fails() {
+    const bool isDue = IsDue();
+    if (isDue && fault.error == 0)
+        _exit(0);
+    return isDue;
+}
+
+template <typename Function>
+Function Real(const char *name) {
+    return reinterpret_cast<Function>(dlsym(RTLD_NEXT, name));
+}
+
+} // namespace
+
+extern "C" {
+ssize_t pwrite(int fd, const void *bytes, size_t size, off_t offset) {
+    static const auto real = Real<ssize_t (*)(int, const void *, size_t, off_t)>("pwrite");
+    if (!IsDue())
+        return real(fd, bytes, size, offset);
+    if (fault.error != 0)
+        return -1;
+    real(fd, bytes, size / 2, offset);
+    _exit(0);
+}
+int ftruncate(int fd, off_t size) noexcept {
+    static const auto real = Real<int (*)(int, off_t)>("ftruncate");
+    return Fails() ? -1 : real(fd, size);
+}
+int fchmod(int fd, mode_t mode) noexcept {
+    static const auto real = Real<int (*)(int, mode_t)>("fchmod");
+    return Fails() ? -1 : real(fd, mode);
+}
+}
+
+namespace kelo::test {
+namespace {
+
+constexpr int kRows = 160'000; // a segment and a piece
+
+class SkipIndexTest : public testing::Test {
+protected:
+    SkipIndexTest() {
+        CreateLogDatabase(path_);
+        RunSql(path_,
+               "PRAGMA synchronous=OFF; WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < " +
+                   std::to_string(kRows) +
+                   ") INSERT INTO logs(host, llevel, msg) SELECT 'host' || (i % 3), 'info', "
+                   "'request ' || i || iif(i % 20000 = 7, ' Segfault', '') FROM n");
+    }
+    std::string Count(const std::string &where) const {
+        const Outcome outcome =
+            Execute(ConnectTo(path_), "SELECT COUNT(*) FROM logs WHERE " + where, {"COUNT(*)"});
+        return outcome.status == 0 ? outcome.rows.at(0).at(0).value_or("NULL") : outcome.error;
+    }
+    int64_t EndId() const {
+        KELODBSkipIndex index;
+        return KELODBSkipIndexGet(path_.c_str(), &index) == 0 ? index.endId : -1;
+    }
+
+    TempRoot root_;
+    SyslogCapture log_;
+    const std::string path_ = root_.File("logs.db");
+    const std::string index_ = path_ + "-skip";
+};
+
+// A changed message, which the index does not notice, shows whether a statement uses it.
+TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    RunSql(path_, "UPDATE logs SET msg = 'hidden Needle [a] 100%' WHERE id = 5000");
+    const struct {
+        const char *where;
+        bool isServed;
+    } examples[] = {
+        {"(msg GLOB '*Needle*')", true},
+        {"(msg LIKE '%needle%')", true},
+        {"(msg LIKE '%needle [a] 100\\%%' ESCAPE '\\')", true},
+        {"(msg GLOB '*Needle [[]a]*')", true},
+        {"(instr(msg, 'Needle') > 0)", true},
+        {"msg LIKE '%needle%' AND id >= 1 AND (id <= 9223372036854775807)", true},
+        {"((msg LIKE '%needle%') AND host = 'host2')", true},
+        {"(msg LIKE '%needle%' OR msg LIKE '%absent%')", true},
+        {"(msg LIKE '%needle%' OR host = 'absent')", false},
+        {"(msg LIKE '%need%le%' AND ifnull(NOT msg LIKE '%absent%', 1))", true},
+        {"(msg LIKE '%edl%')", false},
+        {"NOT (NOT msg LIKE '%needle%')", false},
+        {"msg LIKE '%needle%' IS NOT 0", false},
+        {"msg LIKE '%needle%' /* comment */", false},
+        {"msg LIKE '%needle%' AND id IN (5000)", false},
+        {"msg LIKE '%needle%' AND id BETWEEN 1 AND 160000", false},
+        {"msg LIKE '%needlX%' ESCAPE 'X'", false},
+        {"(SELECT count(*) FROM logs l WHERE l.msg LIKE '%needle%')", false},
+        {"msg LIKE '%needle%' COLLATE NOCASE", false},
+    };
+    for (const auto &[where, isServed] : examples)
+        EXPECT_EQ(Count(where) != Count(std::string(where) + " OR 0"), isServed) << where;
+    const Connection connection = ConnectTo(path_);
+    Execute(connection,
+            "BEGIN"); // an older snapshot may have rows that were deleted before the index saw them
+    EXPECT_EQ(Execute(connection, "SELECT * FROM logs WHERE (msg GLOB '*Needle*')").rows.size(), 1U);
+}
+
+TEST_F(SkipIndexTest, TrustsNoFileThatSomebodyElseMayHavePutThere) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    const std::string bytes = ReadFile(index_);
+    const auto link = [&](const std::string &target) {
+        fs::remove(index_);
+        fs::create_symlink(target, index_);
+    };
+    WriteFile(root_.File("victim"), "untouched");
+    const struct {
+        const char *name;
+        std::function<void()> place;
+    } cases[] = {
+        {"link", [&] { link(root_.File("victim")); }},
+        {"link to an index", [&] { fs::copy_file(index_, root_.File("other")), link(root_.File("other")); }},
+        {"link to nothing", [&] { link(root_.File("new")); }},
+        {"FIFO", [&] { fs::remove(index_), mkfifo(index_.c_str(), 0600); }},
+        {"folder", [&] { fs::remove(index_), fs::create_directory(index_); }},
+        {"others may write", [&] { WriteFile(index_, bytes), fs::permissions(index_, fs::perms(0666)); }},
+        {"other owner",
+         [&] {
+             WriteFile(index_, bytes);
+             if (chown(index_.c_str(), 12345, 0) != 0)
+                 fs::permissions(index_, fs::perms(0666));
+         }},
+    };
+    RunSql(path_, "UPDATE logs SET msg = 'Needle' WHERE id = 5000");
+    for (const auto &[name, place] : cases) {
+        fs::remove(index_);
+        WriteFile(index_, bytes);
+        place();
+        EXPECT_EQ(Count("(msg GLOB '*Needle*')"), "1") << name;
+        EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_NOT_ALLOWED) << name;
+    }
+    EXPECT_EQ(ReadFile(root_.File("victim")), "untouched");
+    EXPECT_FALSE(fs::exists(root_.File("new")));
+    EXPECT_THAT(log_.TakeTexts(), IsEmpty());
+}
+
+TEST_F(SkipIndexTest, HasOwnerAndModeOfTheDatabase) {
+    fs::permissions(path_, fs::perms(0640));
+    const bool isRoot = geteuid() == 0 && chown(path_.c_str(), 12345, 54321) == 0;
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    struct stat index {};
+    ASSERT_EQ(stat(index_.c_str(), &index), 0);
+    EXPECT_EQ(index.st_mode & 07777, 0640U);
+    EXPECT_EQ(index.st_uid, isRoot ? 12345U : geteuid());
+    EXPECT_EQ(index.st_gid, isRoot ? 54321U : getegid());
+}
+
+TEST_F(SkipIndexTest, IsReplacedWithOneLineWhenItIsDamagedOrAnotherOnes) {
+    const struct {
+        const char *reason;
+        std::function<void(std::string &)> change;
+    } cases[] = {
+        {"it is damaged", [](std::string &bytes) { bytes[100] ^= 1; }},
+        {"it is damaged", [](std::string &bytes) { bytes.resize(bytes.size() - 1); }},
+        {"it has another version", [](std::string &bytes) { ++bytes[16]; }},
+        {"it is damaged", [](std::string &bytes) { bytes = "text"; }},
+    };
+    for (const auto &[reason, change] : cases) {
+        ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+        std::string bytes = ReadFile(index_);
+        change(bytes);
+        WriteFile(index_, bytes);
+        EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
+        EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+        EXPECT_THAT(log_.TakeTexts(),
+                    ElementsAre("skip index " + index_ + ": " + reason + "; it is removed and built again"));
+        EXPECT_EQ(EndId(), kRows / 16'384 * 16'384);
+    }
+    std::string bytes = ReadFile(index_);
+    for (size_t at = 4096; at < bytes.size(); at += 68) // a bit of every slice, which only reading finds
+        bytes[at] ^= 1;
+    WriteFile(index_, bytes);
+    EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
+    EXPECT_EQ(log_.TakeTexts().size(), 1U);
+    EXPECT_FALSE(fs::exists(index_));
+}
+
+TEST_F(SkipIndexTest, IsNotMadeWhereIdsMayComeBack) {
+    const std::string rows = "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 40000) ";
+    const std::string insert = rows + "INSERT INTO logs(msg) SELECT 'x' FROM n;";
+    for (const std::string &sql :
+         {"CREATE TABLE logs(id INTEGER PRIMARY KEY, msg TEXT);" + insert,
+          "CREATE TABLE logs(id, msg TEXT);" + insert,
+          "CREATE TABLE t(id INTEGER PRIMARY KEY AUTOINCREMENT, msg TEXT); CREATE VIEW logs AS SELECT * FROM "
+          "t;" +
+              rows + "INSERT INTO t(msg) SELECT 'x' FROM n;",
+          "CREATE VIRTUAL TABLE logs USING fts4(id, msg);" + insert,
+          "PRAGMA encoding='UTF-16';CREATE TABLE logs(id INTEGER PRIMARY KEY AUTOINCREMENT, msg TEXT);" +
+              insert}) {
+        const std::string path = root_.File("other.db");
+        fs::remove(path);
+        RunSql(path, sql);
+        EXPECT_EQ(KELODBSkipIndexBuild(path.c_str(), 0), KELODB_SKIP_NO_TABLE) << sql;
+        EXPECT_FALSE(fs::exists(path + "-skip"));
+    }
+}
+
+TEST_F(SkipIndexTest, IsBuiltByOneAtATime) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    const int other = open(index_.c_str(), O_RDONLY);
+    ASSERT_EQ(flock(other, LOCK_EX | LOCK_NB), 0);
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_BUSY);
+    close(other);
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+}
+
+// Whatever was built before is good, and the next one builds the rest without a word.
+TEST_F(SkipIndexTest, SurvivesAKillAndAFullDiskAtEveryWrite) {
+    for (const int error : {0, ENOSPC}) {
+        for (int call = 0;; ++call) {
+            fs::remove(index_);
+            const pid_t child = fork();
+            if (child == 0) {
+                fault = {call, error};
+                const int result = KELODBSkipIndexBuild(path_.c_str(), 0);
+                _exit(result == KELODB_SKIP_COMPLETE ? 1 : result == KELODB_SKIP_NO_ROOM ? 0 : 2);
+            }
+            int status = 0;
+            waitpid(child, &status, 0);
+            if (WEXITSTATUS(status) == 1) {
+                EXPECT_GT(call, 4);
+                break;
+            }
+            EXPECT_TRUE(WEXITSTATUS(status) == 0 || call == 0) << call << " " << error;
+            EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8") << call << " " << error;
+            EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE) << call << " " << error;
+            EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8") << call << " " << error;
+            EXPECT_EQ(EndId(), kRows / 16'384 * 16'384);
+        }
+        // Only half of a head is damage.
+        EXPECT_LE(log_.TakeTexts().size(), error == 0 ? 2U : 0U);
+    }
+}
+
+} // namespace
+} // namespace kelo::test
