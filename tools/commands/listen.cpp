@@ -31,7 +31,7 @@ constexpr const char *kFooter =
     "Exit status: 0 done, 1 nothing to change, 2 refused, 4 syslog-ng does not take it over.";
 
 constexpr uint64_t kMostPorts = 65535;
-constexpr uint64_t kMostConnections = 10000;
+constexpr uint64_t kMostConnections = 1000; // three ports, and 4096 descriptors of syslog-ng
 constexpr uint64_t kHighestRate = 1000000;
 
 struct Options {

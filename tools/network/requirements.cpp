@@ -76,6 +76,8 @@ void RequireOneUseEach(const NetworkSettings &settings) {
 
 void RequireFreePorts(const NetworkSettings &settings, pid_t syslogNg) {
     const auto own = SocketsOf(syslogNg);
+    if (!own && syslogNg != 0)
+        return; // its own sockets cannot be told from others'
     const std::vector<InetSocket> sockets = ReadInetSockets(syslogNg);
     for (const Listener &listener : ConfiguredListeners(settings)) {
         for (const InetSocket &socket : sockets) {
