@@ -163,6 +163,8 @@ int Run(const Options &options, const std::string &root) {
     NetworkSettings before;
     try {
         before = ReadNetworkSettings(root);
+        if (options.IsChange())
+            RequireInclude(root);
     } catch (const SettingsError &error) {
         throw UsageError(error.what());
     }

@@ -15,6 +15,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr const char *kFolder = "/etc/kelosyslog/syslog-ng/";
+constexpr const char *kInclude = "kelo_listen"; // defined by a configuration that includes the settings
 
 // The values of lines "@define NAME VALUE", and the file that each is from.
 struct Definition {
@@ -105,22 +106,34 @@ bool IsIpv6(const std::string &address) {
     return address.find(':') != std::string::npos;
 }
 
-NetworkSettings ReadNetworkSettings(const std::string &root) {
+namespace {
+
+Definitions ReadBoth(const std::string &root) {
     Definitions definitions;
     const std::string configuration = ConfigurationPath(root);
     const std::optional<std::string> text = ReadWhole(configuration);
     if (!text)
         throw SettingsError(configuration + ": " + std::strerror(errno));
     ReadDefinitions(*text, configuration, definitions);
-    if (!definitions.contains("kelo_listen"))
-        throw SettingsError(configuration + " does not include " + ListenPath(root) +
-                            ": it is of an earlier version; take the shipped one over");
-    const std::optional<std::string> listen = ReadWhole(ListenPath(root));
-    if (listen)
-        ReadDefinitions(*listen, ListenPath(root), definitions);
-    else if (errno != ENOENT)
-        throw SettingsError(ListenPath(root) + ": " + std::strerror(errno));
+    if (definitions.contains(kInclude)) {
+        const std::optional<std::string> listen = ReadWhole(ListenPath(root));
+        if (!listen && errno != ENOENT)
+            throw SettingsError(ListenPath(root) + ": " + std::strerror(errno));
+        ReadDefinitions(listen.value_or(""), ListenPath(root), definitions);
+    }
+    return definitions;
+}
 
+} // namespace
+
+void RequireInclude(const std::string &root) {
+    if (!ReadBoth(root).contains(kInclude))
+        throw SettingsError(ConfigurationPath(root) + " does not include " + ListenPath(root) +
+                            ": it is of an earlier version; take the shipped one over");
+}
+
+NetworkSettings ReadNetworkSettings(const std::string &root) {
+    const Definitions definitions = ReadBoth(root);
     const Values values(definitions);
     NetworkSettings settings;
     values.Read("kelo_address", settings.address);

@@ -35,8 +35,11 @@ std::string ListenPath(const std::string &root);
 // Whether syslog-ng reads the configuration: whether the link is there.
 bool IsConfigurationUsed(const std::string &root);
 
+// Throws SettingsError if the first does not include the second, as in earlier versions.
+void RequireInclude(const std::string &root);
+
 // The settings of both files; what neither sets has its default. Throws SettingsError for a configuration
-// that is missing or includes no settings, and for a value that makes no sense.
+// that is missing and for a value that makes no sense.
 NetworkSettings ReadNetworkSettings(const std::string &root);
 
 // The content of the second file.
