@@ -69,6 +69,8 @@ void AddSyslogNg(Metrics &metrics, const SyslogNgStatus &status) {
                    status.state == SyslogNgStatus::State::Running);
     if (status.since != 0)
         metrics.Single("syslog_ng_start_time_seconds", "Start of syslog-ng.", status.since);
+    metrics.Single("syslog_ng_above_rate_messages_total", "Messages that the rate limit dropped.",
+                   status.aboveRate);
     using Counters = SyslogNgCounters;
     const auto source = [](const Counters &one) { return Labels{{"source", one.id}}; };
     const auto destination = [](const Counters &one) {
@@ -89,6 +91,27 @@ void AddSyslogNg(Metrics &metrics, const SyslogNgStatus &status) {
          [](const Counters &one) { return one.queued; });
     each("syslog_ng_stuck", "Whether a destination of syslog-ng writes nothing although messages wait.",
          [](const Counters &one) { return one.isStuck; });
+}
+
+void AddListeners(Metrics &metrics, const std::vector<Listener> &listeners) {
+    const auto add = [&](const char *name, const char *help, bool isOfTcp, bool isOfUdp, auto value) {
+        metrics.Begin(name, help);
+        for (const Listener &one : listeners) {
+            if (one.isTcp ? isOfTcp : isOfUdp)
+                metrics.Add({{"protocol", one.isTcp ? "tcp" : "udp"},
+                             {"address", one.address},
+                             {"port", std::to_string(one.port)}},
+                            value(one));
+        }
+    };
+    add("listener_open", "Whether syslog-ng listens.", true, true,
+        [](const Listener &one) { return one.isOpen; });
+    add("listener_connections", "Connections of devices.", true, false,
+        [](const Listener &one) { return one.connections; });
+    add("listener_most_connections", "Connections above which devices are turned away; 0 for unknown.", true,
+        false, [](const Listener &one) { return one.mostConnections; });
+    add("listener_dropped_datagrams_total", "Datagrams that the kernel dropped.", false, true,
+        [](const Listener &one) { return one.drops; });
 }
 
 void AddReceiver(Metrics &metrics, const ReceiverStatus &status) {
@@ -160,6 +183,7 @@ std::string StatusPrometheus(const ServerStatus &status) {
     metrics.Single("status_time_seconds", "Time of this check.", status.time);
     metrics.Single("attention", "Number of things that need attention.", uint64_t{status.attention.size()});
     AddSyslogNg(metrics, status.syslogNg);
+    AddListeners(metrics, status.network.listeners);
     AddReceiver(metrics, status.receiver);
     AddDatabases(metrics, status);
     metrics.Single("retention_followed", "Whether there is a rule of retention and it is followed.",
