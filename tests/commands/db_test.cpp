@@ -25,6 +25,23 @@ TEST_F(DbCommand, CreatesDescribesAndNamesADatabase) {
     EXPECT_EQ(RunSql(logs_, "SELECT count(*) FROM logs"), "0");
 }
 
+TEST_F(DbCommand, CreatesAsTheOwnerOfTheFolder) {
+    if (geteuid() != 0)
+        GTEST_SKIP() << "only root acts for others";
+    // The sqlite3 tool obeys what is beside a database, so in a folder of another user it must not be root's.
+    constexpr uid_t kOther = 64203;
+    const std::string own = root_.File("own");
+    fs::create_directories(own);
+    ASSERT_EQ(chmod(root_.Path().c_str(), 0755), 0);
+    ASSERT_EQ(chown(own.c_str(), kOther, kOther), 0);
+    WriteFile(root_.File("schema.sql"), ".shell id -u >" + own + "/user\nCREATE TABLE logs (id);");
+    Expect("db create --db own/sub/x.db --schema " + root_.File("schema.sql"), 0);
+    EXPECT_EQ(ReadFile(own + "/user"), "64203\n");
+    Expect("db create --db own/y.db", 0); // from the schema that only its creator can read otherwise
+    ASSERT_EQ(chown(fs::path(events_).parent_path().c_str(), kOther, kOther), 0);
+    Expect("events add server-start x", 0);
+}
+
 TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     CreateLogDatabase(logs_);
     InsertSampleLogs(logs_, 500);

@@ -154,6 +154,7 @@ TEST_F(SuperJournal, IsLeftAloneByEveryCommand) {
     for (const Case &one : kCases)
         covered.insert(one.command);
     EXPECT_EQ(covered, AllCommands());
+    ASSERT_EQ(chmod(root_.Path().c_str(), 0755), 0); // for the other users
     WriteFile(root_.File("lines"), LogLines(1, 2));
     WriteFile(root_.File("etc/kelosyslog/retention.conf"), "keep=\"1d\"\n");
     for (const std::string mode : {"WAL", "DELETE"}) {

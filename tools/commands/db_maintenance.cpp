@@ -13,6 +13,7 @@
 
 #include "base/errors.h"
 #include "base/files.h"
+#include "base/folder_owner.h"
 #include "base/sqlite.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
@@ -76,14 +77,17 @@ int Create(const CreateOptions &options) {
     if (schema.empty()) {
         shipped.emplace((fs::temp_directory_path() / "kelosyslog-schema-XXXXXX").string(), kLogsSchema);
         schema = shipped->Path();
-        if (!shipped->IsWritten())
+        // Whoever creates the database reads it.
+        if (!shipped->IsWritten() || chmod(schema.c_str(), S_IRUSR | S_IRGRP | S_IROTH) != 0)
             throw DatabaseError("cannot create " + schema);
     }
     RequirePlainPaths(path, schema);
     if (access(schema.c_str(), R_OK) != 0)
         throw UsageError("--schema: cannot read " + schema);
-    if (DBHandler(path, schema).DBCreate() != 0)
-        throw DatabaseError("cannot create " + path + ": " + WhyFailed(path));
+    const std::string reason = AsOwnerOfFolder(
+        path, [&] { return DBHandler(path, schema).DBCreate() == 0 ? std::string() : WhyFailed(path); });
+    if (!reason.empty())
+        throw DatabaseError("cannot create " + path + ": " + reason);
     const auto mode = ReadOnlyQuery(options.Table()).FirstRow("PRAGMA journal_mode", {"journal_mode"});
     KeyValues values;
     values.Add("created", path);

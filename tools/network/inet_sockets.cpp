@@ -54,8 +54,7 @@ void ReadTable(const std::string &path, bool isTcp, std::vector<InetSocket> &soc
 }
 
 // The inode of a link "socket:[123]"; 0 for other links.
-uint64_t InodeOf(const fs::path &link) {
-    std::error_code error;
+uint64_t InodeOf(const fs::path &link, std::error_code &error) {
     const std::string target = fs::read_symlink(link, error).string();
     constexpr std::string_view kStart = "socket:[";
     return target.starts_with(kStart) ? std::strtoull(target.c_str() + kStart.size(), nullptr, 10) : 0;
@@ -77,8 +76,12 @@ std::optional<std::set<uint64_t>> SocketsOf(pid_t pid) {
     fs::directory_iterator files("/proc/" + std::to_string(pid) + "/fd", error);
     if (error)
         return std::nullopt;
-    for (; !error && files != fs::directory_iterator(); files.increment(error))
-        inodes.insert(InodeOf(files->path()));
+    for (; !error && files != fs::directory_iterator(); files.increment(error)) {
+        std::error_code unread;
+        inodes.insert(InodeOf(files->path(), unread));
+        if (unread == std::errc::permission_denied) // root without privileges may list them alone
+            return std::nullopt;
+    }
     inodes.erase(0);
     return inodes;
 }

@@ -7,6 +7,7 @@
 #include <filesystem>
 
 #include "base/errors.h"
+#include "base/folder_owner.h"
 #include "read/failure_reason.h"
 #include "read/log_table.h"
 #include "read/read_only_query.h"
@@ -93,12 +94,13 @@ std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add) {
     const std::string path = EventDatabasePath("", root);
     const bool hasExisted = access(path.c_str(), F_OK) == 0;
-    Logger logger;
-    if (add(logger) == 0)
-        return "";
-    if (hasExisted && access(path.c_str(), F_OK) != 0)
+    const std::string reason = AsOwnerOfFolder(path, [&] {
+        Logger logger;
+        return add(logger) == 0 ? std::string() : WhyFailed(path);
+    });
+    if (!reason.empty() && hasExisted && access(path.c_str(), F_OK) != 0)
         return "it was damaged and is " + path + ".corrupt now";
-    return WhyFailed(path);
+    return reason;
 }
 
 bool EventFilter::Matches(const Event &event) const {

@@ -8,8 +8,8 @@
 #include "archive/retention.h"
 #include "base/errors.h"
 #include "base/time_format.h"
-#include "kelosyslog/logger.h"
 #include "kelosyslog/notification.h"
+#include "read/event_log.h"
 #include "read/log_table.h"
 #include "retention/retention_state.h"
 
@@ -109,7 +109,9 @@ void RetentionRun::ReportLowVolume(bool isLow) const {
            isLow ? "too little free space for the rule of retention" : "enough free space again");
     if (!isLow)
         return;
-    Logger().LogAddVolFull();
+    const std::string reason = AddEvent(root_, [](Logger &logger) { return logger.LogAddVolFull(); });
+    if (!reason.empty())
+        syslog(LOG_ERR, "cannot add the event of this: %s", reason.c_str());
     NotificationManager().NotificationSendVolFull(volume_.folders.front());
 }
 
