@@ -62,6 +62,7 @@ const Case kCases[] = {
     {"archive", "--list", ""}, // read-only: it is not rolled back
     {"archive", "--prune --keep 1d --yes", ""},
     {"retention", "--yes", "l"},
+    {"db index", "--build", "l"},
     {"db info", "", "l"},
     {"db check", "", "l"},
     {"db create", "", ""}, // it is there already
