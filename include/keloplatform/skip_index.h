@@ -11,6 +11,8 @@
 
 #include "keloplatform/export.h"
 
+struct DBConnect_tag;
+
 extern "C" {
 
 // What an index knows.
@@ -43,8 +45,9 @@ enum {
 // (warning).
 KELOPLATFORM_API int KELODBSkipIndexBuild(const char *path, int maxMs);
 
-// Tells what the index of the database at `path` knows. Returns 0, or -1 if the database cannot be read.
-KELOPLATFORM_API int KELODBSkipIndexGet(const char *path, KELODBSkipIndex *index);
+// Tells what the index of the database of a connection, which is in no transaction, knows. Returns 0, or -1
+// if the database cannot be read; the connection has the cause.
+KELOPLATFORM_API int KELODBSkipIndexGet(DBConnect_tag *connection, KELODBSkipIndex *index);
 
 // Removes the index of the database at `path`, which may be gone itself. Returns 0, 1 if there is none, or -1
 // (errno). Searches that use it go on.

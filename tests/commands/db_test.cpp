@@ -77,5 +77,20 @@ TEST_F(DbCommand, ChecksAndPutsAsideWhatIsDamaged) {
     EXPECT_TRUE(fs::is_symlink(root_.File("link"))) << "the database is removed, not the way to it";
 }
 
+TEST_F(DbCommand, ShowsBuildsAndRemovesTheIndexForKeywords) {
+    CreateLogDatabase(logs_);
+    InsertSampleLogs(logs_, 17'000);
+    Expect("db index", 1);
+    Expect("db index --build", 0);
+    EXPECT_THAT(Run("db index -o json").out, HasSubstr("\"last_id\": 16383"));
+    EXPECT_THAT(Run("status -o json").out, HasSubstr("\"unindexed_rows\":617"));
+    Expect("db index --remove", 0);
+    Expect("db index --remove", 1);
+    Expect("db index --build --remove", 2);
+    RunSql(root_.File("plain.db"), "CREATE TABLE logs(id INTEGER PRIMARY KEY, msg)");
+    Expect("db index --build --db plain.db", 3);
+    EXPECT_FALSE(fs::exists(logs_ + "-skip"));
+}
+
 } // namespace
 } // namespace kelo::test

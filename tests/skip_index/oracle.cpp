@@ -9,6 +9,7 @@
 #include <cstdlib>
 
 #include "keloplatform/skip_index.h"
+#include "platform/db_fixture.h"
 #include "random_database.h"
 #include "random_search.h"
 #include "support/log_database.h"
@@ -69,7 +70,8 @@ public:
     void Change() {
         last_ = database_.Change();
         KELODBSkipIndex index;
-        indexed_ += KELODBSkipIndexGet(database_.Path().c_str(), &index) == 0 && index.endId > index.firstId;
+        indexed_ +=
+            KELODBSkipIndexGet(ConnectTo(database_.Path()).get(), &index) == 0 && index.endId > index.firstId;
     }
     size_t Rows() const { return rows_; }
     size_t Indexed() const { return indexed_; }

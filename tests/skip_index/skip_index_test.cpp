@@ -81,7 +81,7 @@ protected:
     }
     int64_t EndId() const {
         KELODBSkipIndex index;
-        return KELODBSkipIndexGet(path_.c_str(), &index) == 0 ? index.endId : -1;
+        return KELODBSkipIndexGet(ConnectTo(path_).get(), &index) == 0 ? index.endId : -1;
     }
 
     TempRoot root_;
@@ -108,6 +108,10 @@ TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
         {"(msg LIKE '%needle%' OR msg LIKE '%absent%')", true},
         {"(msg LIKE '%needle%' OR host = 'absent')", false},
         {"(msg LIKE '%need%le%' AND ifnull(NOT msg LIKE '%absent%', 1))", true},
+        {"regexpi('needle|absent', msg)", true},
+        {"regexp('(Need(le|ing)|x+Absent) ', msg)", true},
+        {"regexpi('ne+dle', msg)", false},
+        {"regexpi('needle|x', msg)", false},
         {"(msg LIKE '%edl%')", false},
         {"NOT (NOT msg LIKE '%needle%')", false},
         {"msg LIKE '%needle%' IS NOT 0", false},

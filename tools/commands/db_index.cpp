@@ -9,6 +9,7 @@
 #include "cli/exit_status.h"
 #include "commands/db_commands.h"
 #include "keloplatform/skip_index.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -23,13 +24,6 @@ struct IndexOptions : DbOptions {
     bool mustBuild = false;
     bool mustRemove = false;
 };
-
-KELODBSkipIndex Look(const LogTable &table) {
-    KELODBSkipIndex index;
-    if (KELODBSkipIndexGet(table.path.c_str(), &index) != 0)
-        throw DatabaseError(DescribeDatabaseProblem(table));
-    return index;
-}
 
 void Build(const LogTable &table) {
     const std::string problem = "cannot build the index of " + table.path + ": ";
@@ -71,10 +65,10 @@ int Run(const IndexOptions &options) {
     if (options.mustRemove)
         return Remove(table, format);
     if (options.mustBuild) {
-        Look(table); // names what is wrong with the database
+        const ReadOnlyQuery database(table); // names what is wrong with it
         Build(table);
     }
-    const KELODBSkipIndex index = Look(table);
+    const KELODBSkipIndex index = ReadOnlyQuery(table).SkipIndex();
     struct stat file {};
     const bool hasSize = stat(table.path.c_str(), &file) == 0 && file.st_size > 0;
     KeyValues values;

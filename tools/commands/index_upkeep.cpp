@@ -7,7 +7,9 @@
 
 #include <cstdlib>
 
+#include "base/errors.h"
 #include "keloplatform/skip_index.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -15,9 +17,12 @@ namespace {
 constexpr int64_t kManyRows = 20'000; // a search reads them in some milliseconds
 
 bool IsBehind(const LogTable &table) {
-    KELODBSkipIndex index;
-    return KELODBSkipIndexGet(table.path.c_str(), &index) == 0 && index.isPossible != 0 &&
-           index.newestId - (index.isThere != 0 ? index.endId : 0) >= kManyRows;
+    try {
+        const KELODBSkipIndex index = ReadOnlyQuery(table).SkipIndex();
+        return index.isPossible != 0 && index.newestId - (index.isThere != 0 ? index.endId : 0) >= kManyRows;
+    } catch (const DatabaseError &) { // the search has found what is wrong, or another one will
+        return false;
+    }
 }
 
 bool MayWriteBeside(const std::string &path) {

@@ -87,6 +87,15 @@ void ReadOnlyQuery::RequireTable() const {
         throw DatabaseError(table_.path + ": '" + table_.name + "' in it is no table");
 }
 
+KELODBSkipIndex ReadOnlyQuery::SkipIndex() const {
+    KELODBSkipIndex index;
+    deadline_ = std::chrono::steady_clock::now() + timeout_;
+    if (KELODBSkipIndexGet(connection_.get(), &index) != 0)
+        throw SqliteError(table_.path + ": " + KELODBErrorGet(connection_.get()),
+                          sqlite3_errcode(KELODBInternalDBHdlGet(connection_.get())) & 0xff, 0);
+    return index;
+}
+
 bool ReadOnlyQuery::HasTable(const std::string &table) const {
     return Number("SELECT count(*) AS value FROM sqlite_master WHERE type = 'table' AND name = '" + table +
                   "'") != 0;

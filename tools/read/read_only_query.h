@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "base/sqlite.h"
+#include "keloplatform/skip_index.h"
 #include "read/log_table.h"
 
 struct DBConnect_tag;
@@ -34,6 +35,8 @@ public:
     // The first row's column "value" as a number; 0 without one.
     int64_t Number(const std::string &sql) const;
     bool HasTable(const std::string &table) const;
+    // What the index for keywords knows.
+    KELODBSkipIndex SkipIndex() const;
     // Throws DatabaseError if the connection's table is a view or virtual: reading it can take any time, and
     // nothing of ours creates one.
     void RequireTable() const;

@@ -83,6 +83,14 @@ void ReadTimes(const ReadOnlyQuery &database, DatabaseStatus &status) {
     status.last = row ? NumberOf(row->back()) : std::nullopt;
 }
 
+void ReadIndex(const ReadOnlyQuery &database, DatabaseStatus &status) {
+    const KELODBSkipIndex index = database.SkipIndex();
+    if (index.isThere == 0)
+        return;
+    status.indexSize = index.diskBytes;
+    status.unindexed = index.newestId + 1 - index.endId;
+}
+
 State StateAfter(int code) {
     if (code == SQLITE_BUSY || code == SQLITE_LOCKED || code == SQLITE_INTERRUPT)
         return State::Locked;
@@ -99,6 +107,7 @@ void Read(DatabaseStatus &status) {
             return;
         }
         ReadRows(database, status);
+        ReadIndex(database, status);
         try {
             if (status.table == "transfer_log")
                 ReadTransferTimes(database, status);

@@ -23,6 +23,8 @@ struct DatabaseStatus {
     bool isEstimate = false;      // `rows` includes rows that were deleted in between
     std::optional<int64_t> first; // seconds since the epoch
     std::optional<int64_t> last;
+    std::optional<int64_t> indexSize;   // bytes of the index for keywords; nothing without one, as the next
+    std::optional<int64_t> unindexed;   // rows, at most, that it does not know and every search reads
     std::optional<int64_t> quarantined; // bytes of PATH.corrupt, if it exists
 };
 

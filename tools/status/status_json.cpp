@@ -108,6 +108,8 @@ Value ToJson(const DatabaseStatus &status) {
     json["rows_estimated"] = status.isEstimate;
     json["first"] = Known(status.first);
     json["last"] = Known(status.last);
+    json["index_bytes"] = Known(status.indexSize);
+    json["unindexed_rows"] = Known(status.unindexed);
     json["quarantined_bytes"] = Known(status.quarantined);
     return json;
 }

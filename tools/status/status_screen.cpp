@@ -153,6 +153,12 @@ void AddDatabases(Lines &lines, const ServerStatus &status) {
         colours.push_back(isGood ? kPlain : kBad);
     }
     AddTable(lines, table, colours);
+    for (const DatabaseStatus &database : status.databases) {
+        if (database.indexSize)
+            AddText(lines, "index for keywords of " + database.name + ": " + Bytes(*database.indexSize) +
+                               ", " + Grouped(static_cast<uint64_t>(*database.unindexed)) +
+                               " rows not yet in it");
+    }
     const ArchiveStatus &archives = status.archives;
     AddText(lines, Counted(static_cast<uint64_t>(archives.files), "archive") + ", " + Bytes(archives.size) +
                        (archives.problem.empty() ? "" : ": " + archives.problem));

@@ -87,7 +87,7 @@ bool RunOver(SearchPlan &plan, RangeStatement &statement, int64_t most, Take tak
         take(row);
     };
     std::vector<IdRange> ranges;
-    while (plan.Next(ranges)) {
+    while (taken < most && plan.Next(ranges)) {
         for (const IdRange &range : ranges) {
             if (taken == most)
                 return true;

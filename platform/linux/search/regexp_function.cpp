@@ -1,6 +1,5 @@
 #include "search/regexp_function.h"
 
-#include <re2/re2.h>
 #include <sqlite3.h>
 
 #include <exception>
@@ -62,12 +61,16 @@ bool Register(sqlite3 *db, const char *name, void (*function)(sqlite3_context *,
 
 } // namespace
 
-std::unique_ptr<re2::RE2> CompileRegex(const std::string &regex, bool ignoreCase) {
+re2::RE2::Options RegexOptions(bool ignoreCase) {
     RE2::Options options;
     options.set_case_sensitive(!ignoreCase);
     options.set_log_errors(false);
     options.set_max_mem(kMaxMemory);
-    return std::make_unique<RE2>(regex, options);
+    return options;
+}
+
+std::unique_ptr<re2::RE2> CompileRegex(const std::string &regex, bool ignoreCase) {
+    return std::make_unique<RE2>(regex, RegexOptions(ignoreCase));
 }
 
 bool RegisterSearchFunctions(sqlite3 *db) {

@@ -1,14 +1,16 @@
 #pragma once
 
+#include <re2/re2.h>
+
 #include <memory>
 #include <string>
 
 struct sqlite3;
-namespace re2 {
-class RE2;
-}
 
 namespace kelo::platform {
+
+// How all regular expressions are read.
+re2::RE2::Options RegexOptions(bool ignoreCase);
 
 // Compiles a regular expression (RE2 syntax, UTF-8) with bounded memory. Check ok() and error() of the
 // result; nothing is logged.

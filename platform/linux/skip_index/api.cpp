@@ -22,6 +22,10 @@ Connection Connect(const char *path) {
     return {KELODBConnect(nullptr, nullptr, nullptr, path), &KELODBClose};
 }
 
+void EndReading(sqlite3 *db) {
+    sqlite3_exec(db, "ROLLBACK", nullptr, nullptr, nullptr);
+}
+
 int ResultOf(BuildResult result) {
     switch (result) {
     case BuildResult::kComplete:
@@ -61,14 +65,14 @@ int KELODBSkipIndexBuild(const char *path, int maxMs) {
     }
 }
 
-int KELODBSkipIndexGet(const char *path, KELODBSkipIndex *index) {
+int KELODBSkipIndexGet(DBConnect_tag *connection, KELODBSkipIndex *index) {
+    *index = {};
     try {
-        *index = {};
-        const Connection connection = Connect(path);
-        sqlite3 *db = KELODBInternalDBHdlGet(connection.get());
-        if (db == nullptr || sqlite3_exec(db, "BEGIN", nullptr, nullptr, nullptr) != SQLITE_OK)
-            return -1;
+        sqlite3 *db = KELODBInternalDBHdlGet(connection);
         const auto opened = SkipIndex::Open(db);
+        if (sqlite3_exec(db, "BEGIN", nullptr, nullptr, nullptr) != SQLITE_OK)
+            return -1;
+        const std::unique_ptr<sqlite3, decltype(&EndReading)> transaction(db, &EndReading);
         index->isPossible = HasIndexableTable(db) ? 1 : 0;
         index->newestId = LargestIdEver(db);
         if (opened && opened->Fits(db)) {
@@ -77,7 +81,7 @@ int KELODBSkipIndexGet(const char *path, KELODBSkipIndex *index) {
             index->endId = opened->Header().EndId();
             index->diskBytes = opened->File().DiskBytes();
         }
-        return sqlite3_exec(db, "COMMIT", nullptr, nullptr, nullptr) == SQLITE_OK ? 0 : -1;
+        return 0;
     } catch (const std::bad_alloc &) {
         return -1;
     }

@@ -9,6 +9,7 @@
 #include "common/utf8.h"
 #include "skip_index/grams.h"
 #include "skip_index/literals.h"
+#include "skip_index/regex_literals.h"
 #include "skip_index/sql_tokens.h"
 
 namespace kelo::platform {
@@ -101,6 +102,16 @@ Need NeedOf(const std::vector<std::string> &literals) {
     return need;
 }
 
+Need NeedOfRegex(const std::string &regex, bool ignoreCase) {
+    Need any{Need::Kind::kAny, {}, {}};
+    for (const std::vector<std::string> &literals : LiteralsOfRegex(regex, ignoreCase)) {
+        any.parts.push_back(NeedOf(literals));
+        if (any.parts.back().kind == Need::Kind::kNothing)
+            return {};
+    }
+    return any.parts.empty() ? Need{} : any;
+}
+
 // Of a condition without AND and OR.
 Need NeedOfComparison(Tokens tokens) {
     const auto string = [&](size_t at) { return StringValue(tokens[at]); };
@@ -114,6 +125,10 @@ Need NeedOfComparison(Tokens tokens) {
         return NeedOf({string(4)});
     if (AreLike(tokens, {"instr", "(", "lower", "(", "msg", ")", ",", "'", ")", ">", "0"}))
         return NeedOf({string(7)});
+    if (AreLike(tokens, {"regexp", "(", "'", ",", "msg", ")"}))
+        return NeedOfRegex(string(2), false);
+    if (AreLike(tokens, {"regexpi", "(", "'", ",", "msg", ")"}))
+        return NeedOfRegex(string(2), true);
     return {};
 }
 

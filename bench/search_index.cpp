@@ -1,0 +1,176 @@
+// Searches for keywords with the skip index: in the library against the scan, and from start to exit of the
+// program against grep, ripgrep and the sqlite3 shell.
+//
+//   bench_search_index [ROWS]      1,000,000 unless given
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+#include <cstdio>
+#include <cstdlib>
+#include <list>
+#include <memory>
+#include <string>
+
+#include "keloplatform/gensqlregexp.h"
+#include "keloplatform/kelodb.h"
+#include "keloplatform/skip_index.h"
+#include "kelosyslog/dbutil.h"
+#include "real_text.h"
+#include "support/measure.h"
+
+using namespace kelo::bench;
+
+namespace {
+
+constexpr int kRounds = 7;
+constexpr int kFullSize = 5'000'000; // the rows for which the bounds of rare words are meant
+
+struct Search {
+    const char *name;
+    const char *keyword;
+    const char *host;
+    const char *from; // day
+    bool isPage;      // the newest 50, otherwise a count
+    double atMost;    // of the time of the scan
+};
+constexpr Search kSearches[] = {
+    {"count, rare word", "Segfault", "", "", false, 0.01},
+    {"count, absent word", "zorglub", "", "", false, 0.01},
+    {"count, absent address", "\"SRC=10.300.1.2 \"", "", "", false, 0.01},
+    {"count, rare phrase", "\"Segfault at 0\"", "", "", false, 0.01},
+    {"count, rare regex", "/Seg(fault|mentation) at [0-9]/", "", "", false, 0.01},
+    {"count, rare word without another", "Segfault -publickey", "", "", false, 0.01},
+    {"count, rare words in either", "Segfault OR zorglub", "", "", false, 0.02},
+    {"count, word of a thousandth", "unverändert", "", "", false, 0.25},
+    {"count, rare word of a host", "Segfault", "server7", "", false, 0.05},
+    {"count, rare word from a day on", "Segfault", "", "2020/01/03", false, 0.05},
+    {"page, rare word", "Segfault", "", "", true, 0.02},
+    {"page, rare word of a host", "Segfault", "server7", "", true, 0.05},
+    {"page, common word", "publickey", "", "", true, 1.5},
+    {"count, common word", "publickey", "", "", false, 1.05},
+    {"count, short word", "ssh", "", "", false, 1.05},
+    {"count, regex without literals", "/[0-9]{9}/", "", "", false, 1.05},
+    {"count, excluded word", "-publickey", "", "", false, 1.05},
+};
+
+int Count(_SYSLOG_LOG_DATA_tag &, void *rows) {
+    ++*static_cast<int *>(rows);
+    return 0;
+}
+
+// The number of rows, or of those on the page.
+int Find(const std::string &database, const Search &search) {
+    std::list<_SYSLOG_SQL_COND_tag> conditions;
+    LogSearchCondListGen(search.host, "", "", "", search.keyword, search.from, "", conditions);
+    if (!search.isPage)
+        return SyslogDBSelectCount(database, conditions, nullptr, nullptr);
+    _SYSLOG_SQL_LIMIT_tag page{50, 0};
+    _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
+    int rows = 0;
+    return SyslogDBSelect(database, conditions, &page, &newestFirst, Count, &rows, false) == 0 ? rows : -1;
+}
+
+int FindByScan(const std::string &database, const Search &search) {
+    setenv("KELO_SKIP_INDEX", "off", 1);
+    const int found = Find(database, search);
+    unsetenv("KELO_SKIP_INDEX");
+    return found;
+}
+
+bool CompareWithScan(const std::string &database, int rows) {
+    bool allKept = true;
+    PrintHeading("Keywords in " + std::to_string(rows) + " rows, with the skip index", "ms");
+    for (const Search &search : kSearches) {
+        if (Find(database, search) != FindByScan(database, search))
+            Fail(std::string(search.name) + ": another result than the scan");
+        const auto times =
+            MedianTimes({{"index", [&] { return Time([&] { Find(database, search); }); }},
+                         {"scan", [&] { return Time([&] { FindByScan(database, search); }); }}},
+                        kRounds);
+        // What a search costs at least is the same for a smaller table, the scan is not.
+        const double atMost =
+            search.atMost < 0.5 ? search.atMost * kFullSize / std::min(rows, kFullSize) : search.atMost;
+        allKept = PrintRatio(search.name, times[0], "scan", times[1], atMost) && allKept;
+    }
+    return allKept;
+}
+
+bool IsInstalled(const std::string &program) {
+    return std::system(("command -v " + program + " >/dev/null").c_str()) == 0;
+}
+
+// Through a pipe: grep stops at the first match if it writes to /dev/null.
+double TimeOf(const std::string &command) {
+    return Time([&] {
+        if (std::system((command + " | cat >/dev/null").c_str()) == -1)
+            Fail("cannot run " + command);
+    });
+}
+
+bool CompareProgram(const std::string &database, int rows) {
+    bool allKept = true;
+    PrintHeading("kelosyslog count -g WORD in " + std::to_string(rows) + " rows, from start to exit", "ms");
+    for (const std::string word : {"Segfault", "zorglub", "publickey"}) {
+        const bool isCommon = word == "publickey";
+        const std::string text = "'" + database + ".txt'";
+        const double scale = static_cast<double>(kFullSize) / std::min(rows, kFullSize);
+        const struct {
+            const char *program;
+            std::string command;
+            double atMost;
+        } others[] = {
+            {"rg", "rg -c -F -e " + word + " " + text, 0.1 * scale},
+            {"grep", "env LC_ALL=C grep -c -F -e " + word + " " + text, 0.1 * scale},
+            {"sqlite3",
+             "sqlite3 '" + database + "' \"SELECT COUNT(*) FROM logs WHERE " + GenSQLRegexp(word, "msg") +
+                 "\"",
+             0.02 * scale},
+        };
+        for (const auto &[program, command, atMost] : others) {
+            if (!IsInstalled(program))
+                continue;
+            const auto times = MedianTimes(
+                {{"ours",
+                  [&] { return TimeOf(KELO_PROGRAM " count -g " + word + " --db '" + database + "'"); }},
+                 {program, [&, &other = command] { return TimeOf(other); }}},
+                kRounds);
+            // Nothing is promised where all rows are read.
+            allKept = PrintRatio(word, times[0], program, times[1], isCommon ? 100 : atMost) && allKept;
+        }
+    }
+    return allKept;
+}
+
+bool Build(const std::string &database) {
+    KELODBSkipIndexRemove(database.c_str());
+    const double ms = Time([&] {
+        if (KELODBSkipIndexBuild(database.c_str(), 0) != KELODB_SKIP_COMPLETE)
+            Fail("no index for " + database);
+    });
+    KELODBSkipIndex index;
+    struct stat file {};
+    const std::unique_ptr<DBConnect_tag, decltype(&KELODBClose)> connection(
+        KELODBConnect(nullptr, nullptr, nullptr, database.c_str()), &KELODBClose);
+    if (KELODBSkipIndexGet(connection.get(), &index) != 0 || stat(database.c_str(), &file) != 0)
+        Fail("no index of " + database);
+    const double share = static_cast<double>(index.diskBytes) / static_cast<double>(file.st_size);
+    std::printf(
+        "Building took %.0f ms, %.2f µs a row; the index has %.1f %% of the database's size, which is at "
+        "most 7: %s\n",
+        ms, 1000 * ms / static_cast<double>(index.endId - index.firstId), 100 * share,
+        share <= 0.07 ? "kept" : "MISSED");
+    return share <= 0.07;
+}
+
+} // namespace
+
+int main(int argc, char **argv) {
+    const int rows = argc > 1 ? std::atoi(argv[1]) : 1'000'000;
+    const std::string database = RealTextDatabase(rows);
+    const bool isSmall = Build(database);
+    const bool isFast = CompareWithScan(database, rows);
+    return CompareProgram(database, rows) && isFast && isSmall ? 0 : 1;
+}
