@@ -3,6 +3,7 @@
 #include <random>
 #include <sstream>
 
+#include "db/killed_process.h"
 #include "receive/receiver_state.h"
 #include "support/program_test.h"
 
@@ -156,4 +157,48 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     ExpectEnd(receiver);
     EXPECT_TRUE(Has(kMessages)) << Counted();
     EXPECT_EQ(Notifications(), kMessages / 1000) << "each rule once";
+}
+
+// A turn and an orderly end: SIGTERM waits for the receiver from its start.
+TEST_F(SpoolProgram, DoublesAndLosesNothingAtAnyCall) {
+    const std::string command =
+        InFolder(root_.Path(), kProgram + kReceive + " 2>>" + root_.File("err") + " </dev/null");
+    const auto run = [&command] {
+        sigset_t term;
+        sigemptyset(&term);
+        sigaddset(&term, SIGTERM);
+        sigprocmask(SIG_BLOCK, &term, nullptr);
+        raise(SIGTERM);
+        execl("/bin/sh", "sh", "-c", command.c_str(), nullptr);
+    };
+    const auto runAll = [&run] {
+        for (int runs = 0; runs < 2; ++runs) {
+            const pid_t process = fork();
+            if (process == 0)
+                run();
+            int status = 0;
+            waitpid(process, &status, 0);
+        }
+        return 0;
+    };
+    runAll(); // creates the databases
+    int sent = 0;
+    int rounds = 0;
+    for (int number = 1;; number += 13) {
+        Append("20200102-10111",
+               Messages(sent, 50) + Message(sent + 50, "an error " + std::to_string(number), "err"));
+        sent += 51;
+        ++rounds;
+        const bool wasKilled = KillAtCall(number, Victim::kProcess, run, runAll).has_value();
+        if (!wasKilled)
+            runAll();
+        ASSERT_TRUE(Has(sent)) << "killed at call " << number << ": " << Rows() << ", " << Counted() << "\n"
+                               << ReadFile(root_.File("err"));
+        if (!wasKilled) {
+            // A kill between a notification and the note of it sends that again.
+            EXPECT_GE(Notifications(), rounds);
+            EXPECT_LE(Notifications(), rounds + rounds / 4);
+            break;
+        }
+    }
 }

@@ -113,6 +113,18 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
         WriteReceiverState(root_.Path(), state);
         ExpectAttention(named);
     }
+    const std::tuple<ReceiverState::Spool, int64_t, const char *> spools[] = {
+        {{"/spool", 10, 100, 10, 59, 0}, 0, ""},
+        {{"/spool", 10, 100, 10, 60, 2}, 0, "the receiver is 1 min behind; /spool is full in 45 s"},
+        {{"/spool", 100, 100, 10, 0, 2}, 0, "/spool is full"},
+        {{"/spool", 10, 100, 10, 0, 0}, now, "the receiver is stopped: messages wait in /spool"},
+    };
+    state.waiting = "";
+    for (const auto &[spool, ended, named] : spools) {
+        state.spool = spool, state.ended = ended, state.pid = ended != 0 ? dead : pid;
+        WriteReceiverState(root_.Path(), state);
+        ExpectAttention(named);
+    }
     fs::remove_all(root_.File("run/kelosyslog/receive.json"));
     // A file, its content (nothing: there is no such file), and what is named then.
     const std::tuple<std::string, std::optional<std::string>, const char *> files[] = {

@@ -73,6 +73,12 @@ ReceiverState FromJson(const Json::Value &root) {
 
 } // namespace
 
+std::optional<int64_t> ReceiverState::Spool::LastsSec() const {
+    if (growth < 1 || limit == 0)
+        return std::nullopt;
+    return bytes < limit ? static_cast<int64_t>(static_cast<double>(limit - bytes) / growth) : 0;
+}
+
 std::string ReceiverStatePath(const std::string &root) {
     return root + "/run/kelosyslog/receive.json";
 }

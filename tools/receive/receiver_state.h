@@ -35,6 +35,8 @@ struct ReceiverState {
         uint64_t unread = 0;   // bytes not stored yet
         int64_t behindSec = 0; // age of the first record among them
         double growth = 0;     // of the unread bytes a second, between the last two updates
+        // In how many seconds they reach the limit at this rate; nothing if they do not grow.
+        std::optional<int64_t> LastsSec() const;
         bool operator==(const Spool &) const = default;
     } spool;
 

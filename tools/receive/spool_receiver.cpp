@@ -389,7 +389,7 @@ void SpoolReceiver::WriteState() {
     const uint64_t unread = folder_.Unread();
     state_.spool = {.folder = options_.spool,
                     .bytes = folder_.Bytes(),
-                    .limit = SpoolLimit(options_.spool),
+                    .limit = SpoolLimit(options_.spool, folder_.Bytes()),
                     .unread = unread,
                     .behindSec =
                         unread > 0 && lastUtc_ > 0 ? std::max<int64_t>(state_.updated - lastUtc_, 0) : 0};

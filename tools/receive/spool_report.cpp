@@ -1,11 +1,13 @@
 #include "receive/spool_report.h"
 
 #include <sqlite3.h>
+#include <sys/statvfs.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
-#include <cstdlib>
 #include <filesystem>
+#include <sstream>
 
 #include "base/folder.h"
 
@@ -30,9 +32,15 @@ bool WriteSpoolDone(const std::string &root, const std::string &content) {
     return folder.Write("spool-done", content, folder, "spool-done.new");
 }
 
-uint64_t SpoolLimit(const std::string &spool) {
-    const std::optional<std::string> text = ReadWhole(spool + "/limit");
-    return text ? std::strtoull(text->c_str(), nullptr, 10) : 0;
+uint64_t SpoolLimit(const std::string &spool, uint64_t bytes) {
+    std::istringstream text(ReadWhole(spool + "/limit").value_or(""));
+    uint64_t limit = 0;
+    uint64_t spare = 0;
+    struct statvfs volume {};
+    if (!(text >> limit >> spare) || statvfs(spool.c_str(), &volume) != 0)
+        return limit;
+    const uint64_t free = static_cast<uint64_t>(volume.f_bavail) * volume.f_frsize;
+    return std::min(limit, bytes + (free > spare ? free - spare : 0));
 }
 
 } // namespace kelo::tool

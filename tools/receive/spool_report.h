@@ -17,7 +17,8 @@ std::string TryLoadPlaces(const std::string &path, SpoolReader reader, std::vect
 // all readers have read: a line "INODE BYTES NAME" for each. Returns false with errno set.
 bool WriteSpoolDone(const std::string &root, const std::string &content);
 
-// The size that keep-spool holds the message spool to; 0 when it never ran.
-uint64_t SpoolLimit(const std::string &spool);
+// The size that the message spool, which has `bytes` now, can reach: where keep-spool closes it, or less if
+// its volume has less room; 0 when that is unknown.
+uint64_t SpoolLimit(const std::string &spool, uint64_t bytes);
 
 } // namespace kelo::tool

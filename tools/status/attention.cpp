@@ -68,6 +68,21 @@ void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
         lines.push_back("the receiver waits: " + status.told.waiting);
 }
 
+void LookAtSpool(const ReceiverStatus &status, Lines &lines) {
+    constexpr int64_t kLongSec = 60;
+    const ReceiverState::Spool &spool = status.told.spool;
+    if (spool.folder.empty())
+        return;
+    const auto lasts = spool.LastsSec();
+    if (status.state == ReceiverStatus::State::Stopped)
+        lines.push_back("the receiver is stopped: messages wait in " + spool.folder);
+    else if (spool.limit > 0 && spool.bytes >= spool.limit)
+        lines.push_back(spool.folder + " is full: senders over TCP have to wait");
+    else if (spool.behindSec >= kLongSec)
+        lines.push_back("the receiver is " + Duration(spool.behindSec) + " behind" +
+                        (lasts ? "; " + spool.folder + " is full in " + Duration(*lasts) : ""));
+}
+
 void LookAtDatabases(const ServerStatus &status, Lines &lines) {
     using State = DatabaseStatus::State;
     const std::string &ofReceiver = status.receiver.told.database;
@@ -129,6 +144,7 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     for (std::string &line : FindNetworkProblems(status.network, status.syslogNg))
         lines.push_back(std::move(line));
     LookAtReceiver(status.receiver, status.time, lines);
+    LookAtSpool(status.receiver, lines);
     lines.insert(lines.end(), status.folderProblems.begin(), status.folderProblems.end());
     LookAtDatabases(status, lines);
     LookAtRetention(status, lines);

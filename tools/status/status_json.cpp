@@ -92,6 +92,14 @@ Value ToJson(const ReceiverStatus &status) {
     json["lost_notifications"] = Count(told.lostNotifications);
     json["other_devices"] = Count(told.others);
     json["waiting"] = told.waiting;
+    Value &spool = json["spool"];
+    spool["folder"] = told.spool.folder;
+    spool["bytes"] = Count(told.spool.bytes);
+    spool["limit_bytes"] = Count(told.spool.limit);
+    spool["unread_bytes"] = Count(told.spool.unread);
+    spool["behind_sec"] = Json::Int64{told.spool.behindSec};
+    spool["growth"] = told.spool.growth;
+    spool["full_in_sec"] = Known(told.spool.LastsSec());
     return json;
 }
 

@@ -125,6 +125,10 @@ void AddReceiver(Metrics &metrics, const ReceiverStatus &status) {
     metrics.Single("receiver_waiting", "Whether the receiver cannot go on.", !told.waiting.empty());
     metrics.Single("receiver_records_total", "Complete records.", told.received);
     metrics.Single("receiver_stored_records_total", "Records that the receiver stored itself.", told.stored);
+    metrics.Single("receiver_spool_unread_bytes", "Bytes of the message spool that are not stored yet.",
+                   told.spool.unread);
+    metrics.Single("receiver_spool_limit_bytes", "Size from which on the message spool is closed.",
+                   told.spool.limit);
     metrics.Begin("receiver_set_aside_lines_total", "Lines that gave no record.");
     uint64_t incomplete = 0;
     for (const auto &[field, count] : told.incomplete)

@@ -102,6 +102,22 @@ void AddNetwork(Lines &lines, const NetworkStatus &status) {
     AddTable(lines, table, colours);
 }
 
+// "12 MiB of 2 GiB, 3 MiB not stored yet, 12 s behind, growing, full in 30 min"
+std::string TextOf(const ReceiverState::Spool &spool) {
+    std::string text = "spool: " + Bytes(static_cast<int64_t>(spool.bytes)) +
+                       (spool.limit > 0 ? " of " + Bytes(static_cast<int64_t>(spool.limit)) : "");
+    if (spool.unread == 0)
+        return text + ", all stored";
+    text += ", " + Bytes(static_cast<int64_t>(spool.unread)) + " not stored yet, " +
+            Duration(spool.behindSec) + " behind";
+    if (const auto lasts = spool.LastsSec())
+        return text + ", growing, full in " + Duration(*lasts);
+    if (spool.growth > -1)
+        return text;
+    const double seconds = static_cast<double>(spool.unread) / -spool.growth;
+    return text + ", shrinking, empty in " + Duration(static_cast<int64_t>(seconds));
+}
+
 void AddReceiver(Lines &lines, const ReceiverStatus &status) {
     using State = ReceiverStatus::State;
     const ReceiverState &told = status.told;
@@ -128,6 +144,8 @@ void AddReceiver(Lines &lines, const ReceiverStatus &status) {
     AddText(lines, Grouped(sum) + " incomplete" + incomplete + (incomplete.empty() ? ", " : "), ") +
                        Grouped(told.rejected) + " rejected, " + Grouped(told.overlong) + " too long, " +
                        Grouped(told.suppressed) + " notifications suppressed");
+    if (!told.spool.folder.empty())
+        AddText(lines, TextOf(told.spool));
     if (!told.waiting.empty() && status.state != State::Stopped)
         AddText(lines, "waits: " + told.waiting, kBad);
 }
