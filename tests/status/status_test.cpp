@@ -155,9 +155,9 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     status.volumes = {{{"/x"}, 1000 * kMiB, 100 * kMiB}, {{"/y"}, 100 * kMiB, 16 * kMiB}};
     EXPECT_TRUE(FindAttention(status).empty());
     // Where it listens: not, with nearly all connections in use, with datagrams that were lost.
-    status.syslogNg.pid = 1;
     status.syslogNg.aboveRate = 3;
     status.network.listeners = ConfiguredListeners({});
+    status.network.listeners[0].isKnown = true;
     status.network.listeners[1].isOpen = status.network.listeners[2].isOpen = true;
     status.network.listeners[1].connections = 229, status.network.listeners[2].connections = 231;
     status.network.listeners[0].drops = 5;

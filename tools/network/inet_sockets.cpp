@@ -53,6 +53,10 @@ void ReadTable(const std::string &path, bool isTcp, std::vector<InetSocket> &soc
     }
 }
 
+std::string NetworkFolder(pid_t pid) {
+    return "/proc/" + (pid > 0 ? std::to_string(pid) : std::string("self")) + "/net/";
+}
+
 // The inode of a link "socket:[123]"; 0 for other links.
 uint64_t InodeOf(const fs::path &link, std::error_code &error) {
     const std::string target = fs::read_symlink(link, error).string();
@@ -62,8 +66,12 @@ uint64_t InodeOf(const fs::path &link, std::error_code &error) {
 
 } // namespace
 
+bool AreSocketsReadable(pid_t pid) {
+    return access((NetworkFolder(pid) + "tcp").c_str(), R_OK) == 0;
+}
+
 std::vector<InetSocket> ReadInetSockets(pid_t pid) {
-    const std::string folder = "/proc/" + (pid > 0 ? std::to_string(pid) : std::string("self")) + "/net/";
+    const std::string folder = NetworkFolder(pid);
     std::vector<InetSocket> sockets;
     for (const char *name : {"udp", "udp6", "tcp", "tcp6"})
         ReadTable(folder + name, name[0] == 't', sockets);

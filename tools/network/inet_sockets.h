@@ -25,6 +25,9 @@ struct InetSocket {
 // All sockets in the network of a process, or of the caller's for 0.
 std::vector<InetSocket> ReadInetSockets(pid_t pid);
 
+// Whether they can be read: a sandbox may hide the process.
+bool AreSocketsReadable(pid_t pid);
+
 // The inodes of the sockets that the process has open; nothing without permission to look.
 std::optional<std::set<uint64_t>> SocketsOf(pid_t pid);
 

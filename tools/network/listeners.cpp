@@ -88,6 +88,8 @@ std::vector<Listener> FindListeners(const NetworkSettings &settings, pid_t syslo
     std::vector<Listener> listeners = ConfiguredListeners(settings);
     const Ownership ownership(settings, syslogNg);
     const std::vector<InetSocket> sockets = ReadInetSockets(syslogNg);
+    for (Listener &listener : listeners)
+        listener.isKnown = AreSocketsReadable(syslogNg);
     for (const InetSocket &socket : sockets) {
         if (!socket.isListening || !ownership.Has(socket))
             continue;
@@ -98,6 +100,7 @@ std::vector<Listener> FindListeners(const NetworkSettings &settings, pid_t syslo
         if (listener == listeners.end()) {
             listener = listeners.emplace(listeners.end());
             listener->isTcp = socket.isTcp;
+            listener->isKnown = true;
             listener->address = socket.address;
             listener->port = socket.port;
         }

@@ -19,6 +19,7 @@ struct Listener {
     const char *form = "";     // "datagrams", "lines", "frames"; "" for a socket that is not of our settings
     bool isTls = false;        // of our settings
     bool isConfigured = false; // by our settings
+    bool isKnown = false;      // the sockets of syslog-ng could be read
     bool isOpen = false;
     uint64_t connections = 0;
     uint64_t mostConnections = 0; // 0 for a socket that is not of our settings

@@ -9,6 +9,12 @@ std::string FormOf(const Listener &listener) {
     return std::string(listener.form) + (listener.isTls ? ", TLS" : ", no encryption");
 }
 
+const char *StateOf(const Listener &listener) {
+    if (!listener.isKnown)
+        return "-";
+    return listener.isOpen ? "open" : "not open";
+}
+
 } // namespace
 
 StatisticsTable TableOfListeners(const std::vector<Listener> &listeners) {
@@ -22,7 +28,7 @@ StatisticsTable TableOfListeners(const std::vector<Listener> &listeners) {
                            {"dropped", true}});
     for (const Listener &listener : listeners)
         table.Add({listener.isTcp ? "tcp" : "udp", listener.address, std::to_string(listener.port),
-                   listener.Families(), FormOf(listener), listener.isOpen ? "open" : "not open",
+                   listener.Families(), FormOf(listener), StateOf(listener),
                    std::to_string(listener.connections), std::to_string(listener.drops)});
     return table;
 }

@@ -12,9 +12,8 @@ namespace {
 constexpr uint64_t kReceiveBuffer = 4194304; // that the configuration asks for
 constexpr uint64_t kNearlyAllPercent = 90;
 
-void LookAtListener(const Listener &listener, const SyslogNgStatus &syslogNg,
-                    std::vector<std::string> &lines) {
-    if (!listener.isOpen && syslogNg.pid != 0)
+void LookAtListener(const Listener &listener, std::vector<std::string> &lines) {
+    if (listener.isKnown && !listener.isOpen)
         lines.push_back("syslog-ng does not listen on " + listener.Name() +
                         ", as its configuration says: systemctl restart syslog-ng");
     if (listener.mostConnections > 0 &&
@@ -60,7 +59,7 @@ std::vector<std::string> FindNetworkProblems(const NetworkStatus &status, const 
     if (!status.problem.empty())
         lines.push_back(status.problem);
     for (const Listener &listener : status.listeners)
-        LookAtListener(listener, syslogNg, lines);
+        LookAtListener(listener, lines);
     if (syslogNg.aboveRate > 0)
         lines.push_back("syslog-ng dropped " + Counted(syslogNg.aboveRate, "message") +
                         " of addresses that sent more than " + Grouped(status.settings.rate) +

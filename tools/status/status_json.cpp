@@ -64,7 +64,7 @@ Value ToJson(const Listener &listener) {
     json["form"] = listener.form;
     json["encryption"] = listener.isTls ? "TLS" : "";
     json["configured"] = listener.isConfigured;
-    json["open"] = listener.isOpen;
+    json["open"] = listener.isKnown ? Value(listener.isOpen) : Value();
     json["connections"] = Count(listener.connections);
     json["most_connections"] = listener.mostConnections != 0 ? Count(listener.mostConnections) : Value();
     json["kernel_drops"] = Count(listener.drops);

@@ -98,7 +98,7 @@ void AddNetwork(Lines &lines, const NetworkStatus &status) {
     const StatisticsTable table = TableOfListeners(status.listeners);
     std::vector<const char *> colours;
     for (const Listener &listener : status.listeners)
-        colours.push_back(listener.isOpen && listener.drops == 0 ? kPlain : kBad);
+        colours.push_back((listener.isOpen || !listener.isKnown) && listener.drops == 0 ? kPlain : kBad);
     AddTable(lines, table, colours);
 }
 
