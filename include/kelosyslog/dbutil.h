@@ -102,6 +102,16 @@ KELOSYSLOG_API void LogSearchCondListGen(const std::string &host, const std::str
                                          const std::string &dateTo,
                                          std::list<_SYSLOG_SQL_COND_tag> &conditions);
 
+// Appends the condition that `conditions` become, ANDed, to `clause`, for a WHERE of one's own; nothing when
+// there are none. The statements of the library have exactly this text.
+//
+//     std::string clause;
+//     LogSearchClauseGet({{SYSLOG_ATTRI_HOST, SYSLOG_OP_EQ, "nas", {}}}, clause); // (host = 'nas')
+//
+// Returns 0, or -1 with an unchanged clause when a condition cannot be rendered exactly: its value holds a
+// NUL byte, or memory ran out.
+KELOSYSLOG_API int LogSearchClauseGet(const std::list<_SYSLOG_SQL_COND_tag> &conditions, std::string &clause);
+
 // Generation of a database's format: 1 when it has the readable table "db_info", else 2. A bad path (reported
 // in the system log) and a failed connection count as 1.
 KELOSYSLOG_API int SyslogDBVersionGet(const std::string &dbPath);

@@ -109,6 +109,7 @@ int KELODBClose(DBConnect_tag *connection) {
     if (connection == nullptr)
         return 0;
     connection->inserts.Clear();
+    connection->selects.Clear();
     const int status = sqlite3_close(connection->db);
     if (status != SQLITE_OK)
         kelo::platform::FailStatement(connection->db, "KELODBClose");

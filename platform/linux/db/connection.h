@@ -4,6 +4,7 @@
 
 #include "db/database_file.h"
 #include "db/insert_cache.h"
+#include "db/select_cache.h"
 #include "keloplatform/kelodb.h"
 
 struct DBConnect_tag {
@@ -12,4 +13,5 @@ struct DBConnect_tag {
     kelo::platform::DatabaseFile file;
     sqlite3 *db = nullptr; // closed by KELODBClose
     kelo::platform::InsertCache inserts = {};
+    kelo::platform::SelectCache selects = {};
 };

@@ -16,6 +16,7 @@
 using kelo::platform::PageBounds;
 using kelo::platform::RaiseError;
 using kelo::platform::RunIndexedSearch;
+using kelo::platform::SelectCache;
 using kelo::platform::SingleStatement;
 using kelo::platform::Statement;
 
@@ -37,6 +38,30 @@ bool StepToEnd(sqlite3_stmt *statement) {
     }
     return status == SQLITE_DONE;
 }
+
+// The parameter for the offset of a page whose statement is kept.
+constexpr char kOffset[] = ":kelo_offset";
+
+bool IsShort(const PageBounds &page) {
+    return page.limit != 0 && page.limit < kSinkRows;
+}
+
+void BindOffset(sqlite3_stmt *statement, const PageBounds *page) {
+    if (page != nullptr)
+        sqlite3_bind_int64(statement, sqlite3_bind_parameter_index(statement, kOffset), page->offset);
+}
+
+// Ends the run of a kept statement, and with it its transaction.
+class Reset {
+public:
+    explicit Reset(sqlite3_stmt *statement) : statement_(statement) {}
+    ~Reset() { sqlite3_reset(statement_); }
+    Reset(const Reset &) = delete;
+    Reset &operator=(const Reset &) = delete;
+
+private:
+    sqlite3_stmt *statement_;
+};
 
 enum class Progress { kDone, kFailed, kMore };
 
@@ -81,14 +106,42 @@ bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
     return sink != nullptr ? StepToEnd(sink.get()) : TakeAllRows(statement, *result);
 }
 
-// Runs the one statement of `sql`; `rows` stays null if it has no columns or they are not wanted.
-bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, bool wantsRows,
-               std::unique_ptr<DBResult_tag> &rows) {
-    SingleStatement single;
+using Rows = std::unique_ptr<DBResult_tag>;
+
+// The number of times that SQLite has compiled a statement again.
+int CompilationsOf(sqlite3_stmt *statement) {
+    return sqlite3_stmt_status(statement, SQLITE_STMTSTATUS_REPREPARE, 0);
+}
+
+// Runs the statement that the connection keeps for the key, row by row; nothing if there is none of use.
+std::optional<bool> RunKept(DBConnect_tag &connection, const SelectCache::Key &key, const PageBounds *page,
+                            Rows &rows) {
+    sqlite3_stmt *statement = connection.selects.Find(key);
+    if (statement == nullptr)
+        return std::nullopt;
+    BindOffset(statement, page);
+    const int compilations = CompilationsOf(statement);
+    const Reset reset(statement);
+    rows = std::make_unique<DBResult_tag>(statement);
+    const Progress progress = TakeRows(statement, *rows, page != nullptr ? UINT64_MAX : kSinkRows);
+    if (progress == Progress::kFailed)
+        return false;
+    if (progress == Progress::kDone && CompilationsOf(statement) == compilations)
+        return true;
+    // The table has other columns now, or there are too many rows for this way.
+    rows.reset();
+    return std::nullopt;
+}
+
+// Runs the one statement of `sql`; `rows` stays null if it has no columns or they are not wanted. The
+// statement is left in `single`.
+bool RunSingle(sqlite3 *db, const char *sql, Delivery delivery, const PageBounds *page, bool wantsRows,
+               SingleStatement &single, Rows &rows) {
     if (!PrepareSingle(db, sql, single))
         return false;
     if (single.prepared == nullptr)
         return true;
+    BindOffset(single.prepared.get(), page);
     if (wantsRows && sqlite3_column_count(single.prepared.get()) > 0)
         rows = std::make_unique<DBResult_tag>(single.prepared.get());
     return Deliver(db, single, delivery, rows);
@@ -106,17 +159,36 @@ bool HandOver(DBConnect_tag &connection, std::unique_ptr<DBResult_tag> rows, DBR
     return true;
 }
 
+// Runs `sql`, which stands for the key, and keeps it where it can be used again.
+bool RunAndKeep(DBConnect_tag &connection, const char *sql, const SelectCache::Key &key,
+                const PageBounds *page, Delivery delivery, DBResult_tag **result) {
+    Rows rows;
+    {
+        SingleStatement single;
+        if (!RunSingle(connection.db, sql, delivery, page, result != nullptr, single, rows))
+            return false;
+        if (rows != nullptr && rows->rows.Count() <= kSinkRows)
+            connection.selects.Keep(key, std::move(single.prepared));
+    }
+    return HandOver(connection, std::move(rows), result);
+}
+
 bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
     if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
         return *isInserted;
-    std::unique_ptr<DBResult_tag> rows;
-    const std::optional<bool> isFound =
-        RunIndexedSearch(connection.db, sql, nullptr, result != nullptr, rows);
-    const bool isDone = isFound ? *isFound : RunSingle(connection.db, sql, delivery, result != nullptr, rows);
-    return isDone && HandOver(connection, std::move(rows), result);
+    Rows rows;
+    if (const auto isFound = RunIndexedSearch(connection.db, sql, nullptr, result != nullptr, rows))
+        return *isFound && HandOver(connection, std::move(rows), result);
+    const SelectCache::Key key{sql, SelectCache::kNoLimit};
+    if (result != nullptr) {
+        if (const auto isDone = RunKept(connection, key, nullptr, rows))
+            return *isDone && HandOver(connection, std::move(rows), result);
+    }
+    return RunAndKeep(connection, sql, key, nullptr, delivery, result);
 }
 
-// The one SELECT of `sql` with its bounds, "" if the text has no statement.
+// The one SELECT of `sql` with its bounds, "" if the text has no statement. The limit is a part of the text,
+// because it helps SQLite to choose a plan.
 bool BoundedText(sqlite3 *db, const char *sql, const PageBounds &page, std::string &bounded) {
     SingleStatement single;
     if (!PrepareSingle(db, sql, single))
@@ -129,20 +201,26 @@ bool BoundedText(sqlite3 *db, const char *sql, const PageBounds &page, std::stri
         return false;
     }
     bounded.append(single.text).append(kelo::platform::kCommentEnd).append("LIMIT ");
-    bounded.append(page.limit != 0 ? std::to_string(page.limit) : "-1")
-        .append(" OFFSET ")
-        .append(std::to_string(page.offset));
+    bounded.append(page.limit != 0 ? std::to_string(page.limit) : "-1").append(" OFFSET ");
+    bounded.append(IsShort(page) ? kOffset : std::to_string(page.offset));
     return true;
 }
 
 bool RunPage(DBConnect_tag &connection, const char *sql, const PageBounds &page, DBResult_tag **result) {
-    std::unique_ptr<DBResult_tag> rows;
+    Rows rows;
     if (const auto isFound = RunIndexedSearch(connection.db, sql, &page, result != nullptr, rows))
         return *isFound && HandOver(connection, std::move(rows), result);
+    const SelectCache::Key key{sql, page.limit};
+    if (result != nullptr && IsShort(page)) {
+        if (const auto isDone = RunKept(connection, key, &page, rows))
+            return *isDone && HandOver(connection, std::move(rows), result);
+    }
     std::string bounded;
-    const bool isShort = page.limit != 0 && page.limit < kSinkRows;
-    return BoundedText(connection.db, sql, page, bounded) &&
-           Run(connection, bounded.c_str(), isShort ? Delivery::kByRow : Delivery::kBySink, result);
+    if (!BoundedText(connection.db, sql, page, bounded))
+        return false;
+    if (IsShort(page))
+        return RunAndKeep(connection, bounded.c_str(), key, &page, Delivery::kByRow, result);
+    return Run(connection, bounded.c_str(), Delivery::kBySink, result);
 }
 
 // Runs `work` for a statement of the caller and converts its outcome to the result code. On failure the

@@ -1,5 +1,6 @@
 #include "db/result.h"
 
+#include <charconv>
 #include <new>
 #include <stdexcept>
 
@@ -15,6 +16,11 @@ DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
     }
 }
 
+kelo::platform::Cell DBResult_tag::TextOf(int64_t number, Digits &digits) {
+    char *end = std::to_chars(digits.begin(), digits.end(), number).ptr;
+    return {digits.data(), static_cast<size_t>(end - digits.data())};
+}
+
 void DBResult_tag::AddRow() {
     if (rows.Count() == kMaxRows)
         throw std::length_error("too many rows");
@@ -24,8 +30,13 @@ void DBResult_tag::AddRow() {
 void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
     for (size_t i = 0; i < cells.size(); ++i) {
         const int column = static_cast<int>(i);
+        const int type = sqlite3_column_type(statement, column);
+        if (type == SQLITE_INTEGER) {
+            cells[i] = TextOf(sqlite3_column_int64(statement, column), digits[i]);
+            continue;
+        }
         const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
-        if (text == nullptr && sqlite3_column_type(statement, column) != SQLITE_NULL)
+        if (text == nullptr && type != SQLITE_NULL)
             throw std::bad_alloc();
         cells[i] = {text, static_cast<size_t>(sqlite3_column_bytes(statement, column))};
     }

@@ -19,6 +19,10 @@ struct DBResult_tag {
     // Takes the column names of a statement. Throws std::bad_alloc.
     explicit DBResult_tag(sqlite3_stmt *statement);
 
+    using Digits = std::array<char, 20>; // -9223372036854775808
+    // An integer as a text in `digits`, which is faster than SQLite's conversion. The text has no NUL.
+    static kelo::platform::Cell TextOf(int64_t number, Digits &digits);
+
     // Appends the row in `cells`. Throws std::bad_alloc, or std::length_error when the result is full.
     void AddRow();
 
@@ -28,7 +32,6 @@ struct DBResult_tag {
     kelo::platform::ColumnIndex columns;
     kelo::platform::RowBlock rows;
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
-    using Digits = std::array<char, 20>;     // -9223372036854775808
     std::vector<Digits> digits;              // of the integers in `cells`
     uint32_t nextRow = 0;
 };

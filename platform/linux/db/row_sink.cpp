@@ -1,6 +1,5 @@
 #include "db/row_sink.h"
 
-#include <charconv>
 #include <new>
 #include <stdexcept>
 #include <string>
@@ -10,13 +9,11 @@ namespace {
 
 constexpr char kPointerType[] = "kelo-result";
 
-// Makes `cell` the text of a value; an integer is written to `digits`, which is faster than SQLite's
-// conversion. False when there is no memory.
+// Makes `cell` the text of a value; an integer is written to `digits`. False when there is no memory.
 bool TakeValue(sqlite3_value *value, DBResult_tag::Digits &digits, Cell &cell) {
     const int type = sqlite3_value_type(value);
     if (type == SQLITE_INTEGER) {
-        char *end = std::to_chars(digits.begin(), digits.end(), sqlite3_value_int64(value)).ptr;
-        cell = {digits.data(), static_cast<size_t>(end - digits.data())};
+        cell = DBResult_tag::TextOf(sqlite3_value_int64(value), digits);
         return true;
     }
     const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
