@@ -8,6 +8,8 @@ inline std::string text;
 inline FILE *input = nullptr;
 inline DBResult_tag *result = nullptr;
 inline uint32_t row = 0;
+inline std::list<_SYSLOG_SQL_COND_tag> conditions;
+inline _SYSLOG_SQL_LIMIT_tag page{50, 0};
 namespace reader {
 inline const _SYSLOG_LOG_DATA_tag log;
 }
