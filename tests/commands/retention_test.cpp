@@ -123,6 +123,7 @@ TEST_F(RetentionProgram, AnswersAVolumeThatFills) {
     Follow("min_free=\"60M\"\nwhen_full=\"remove\"\n", 3, ""); // nearly all would have to go
     EXPECT_EQ(Records(), left);
     fs::remove(root_.File("var/log/kelosyslog/other"));
+    fs::create_symlink("target", link_ + ".stopped"); // when the link was created again
     Follow(stop, 1, "");
     EXPECT_EQ(RunSql(events_, events), "Volume space is not enough.");
     EXPECT_EQ(std::distance(fs::directory_iterator(spool_ + "new"), {}), 1);

@@ -28,15 +28,27 @@ bool Reception::IsStopped() const {
     return IsThere(stopped_) && !IsThere(link_);
 }
 
-bool Reception::Rename(const std::string &from, const std::string &to) {
-    if (!IsThere(from))
-        return false;
-    if (!RenameToFreeName(from, to) || !SyncFolderOf(to))
+bool Reception::Stop() const {
+    const bool isReceiving = IsThere(link_);
+    if (isReceiving)
+        Rename(link_, stopped_);
+    return isReceiving;
+}
+
+bool Reception::Resume() const {
+    const bool isStopped = IsStopped();
+    if (isStopped)
+        Rename(stopped_, link_);
+    return isStopped;
+}
+
+void Reception::Rename(const std::string &from, const std::string &to) {
+    if (std::rename(from.c_str(), to.c_str()) != 0 || !SyncFolderOf(to))
         throw OutputError("cannot rename " + from + " to " + to + ": " + std::strerror(errno));
     if (KELOSystemdReload("syslog-ng"))
-        return true;
+        return;
     const std::string reason = KELOErrorGet();
-    RenameToFreeName(to, from);
+    std::rename(to.c_str(), from.c_str());
     throw OutputError(reason);
 }
 

@@ -15,11 +15,11 @@ public:
 
     // Renames the link and reloads syslog-ng. Returns whether it had to. Throws OutputError, which names the
     // link or syslog-ng; then the link is as before.
-    bool Stop() const { return Rename(link_, stopped_); }
-    bool Resume() const { return Rename(stopped_, link_); }
+    bool Stop() const;
+    bool Resume() const;
 
 private:
-    static bool Rename(const std::string &from, const std::string &to);
+    static void Rename(const std::string &from, const std::string &to);
 
     std::string link_;
     std::string stopped_;
