@@ -9,7 +9,7 @@ namespace kelo::test {
 namespace {
 
 constexpr long long kIdsPerSegment = 131'072;
-constexpr size_t kMostRows = 60'000;
+constexpr size_t kMostRows = 40'000;
 
 std::string Quoted(const std::string &text) {
     std::string quoted = "'";
@@ -31,8 +31,8 @@ std::string Hex(const std::string &text) {
 } // namespace
 
 RandomDatabase::RandomDatabase(Random &random) : random_(random) {
-    Begin(path_, kIdsPerSegment * 3 - 30'000);
-    Append(40'000);
+    Begin(path_, kIdsPerSegment * 3 - 18'000);
+    Append(25'000);
 }
 
 void RandomDatabase::Begin(const std::string &path, long long firstId) {
@@ -90,7 +90,8 @@ void RandomDatabase::Delete() {
         db.Run("DELETE FROM logs WHERE id < " + first + "+" +
                std::to_string(size > kMostRows ? size - kMostRows / 2 : random_.Below(size)));
     else if (random_.OneIn(2))
-        db.Run("DELETE FROM logs WHERE id % 7 = " + std::to_string(random_.Below(7)));
+        db.Run("DELETE FROM logs WHERE id % 7 = 3 AND id - " + first + " BETWEEN " +
+               std::to_string(random_.Below(size)) + " AND " + std::to_string(random_.Below(size)));
     else
         db.Run("DELETE FROM logs WHERE id > (SELECT max(id) FROM logs) - " +
                std::to_string(random_.Below(size)));
@@ -100,7 +101,7 @@ void RandomDatabase::Replace() {
     for (const char *suffix : {"", "-wal", "-shm"})
         unlink((path_ + suffix).c_str());
     Begin(path_, static_cast<long long>(random_.Below(kIdsPerSegment * 2)) + 1);
-    Append(5'000 + random_.Below(30'000));
+    Append(5'000 + random_.Below(20'000));
 }
 
 // An older copy takes the place of the database, or of its content.
@@ -117,7 +118,7 @@ void RandomDatabase::Restore(bool inPlace) {
         fs::copy_file(copy_, path_ + ".new");
         fs::rename(path_ + ".new", path_);
     }
-    Append(random_.OneIn(2) ? random_.Below(40'000) : 0);
+    Append(random_.OneIn(2) ? random_.Below(25'000) : 0);
 }
 
 void RandomDatabase::DamageIndex() {

@@ -70,7 +70,12 @@ std::string Keyword(Random &random, const std::function<std::string()> &part) {
 // Conditions as a caller writes them by hand.
 _SYSLOG_SQL_COND_tag RandomCondition(Random &random, const std::function<std::string()> &part) {
     const std::string id = std::to_string(131'072 * 3 - 40'000 + random.Below(100'000));
-    switch (random.Below(7)) {
+    switch (random.Below(8)) {
+    case 7:
+        return {SYSLOG_ATTRI_UTCSEC,
+                random.OneIn(2) ? SYSLOG_OP_GE : SYSLOG_OP_LE,
+                std::to_string(1'600'000'000 + random.Below(100'000)),
+                {}};
     case 0:
         return {SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*" + part() + "*", {}};
     case 1:
@@ -102,7 +107,7 @@ RandomSearch MakeRandomSearch(Random &random, const std::function<std::string()>
     search.keyword = random.OneIn(10) ? "" : Keyword(random, part);
     const auto sometimes = [&](const char *text) { return random.OneIn(8) ? text : ""; };
     LogSearchCondListGen(sometimes("host3,host5"), sometimes("err"), "", sometimes("prog2"), search.keyword,
-                         sometimes("2020/01/03"), sometimes("2020/01/04"), search.conditions);
+                         sometimes("2020/01/03"), sometimes("2020/01/06"), search.conditions);
     while (random.OneIn(4))
         search.conditions.push_back(RandomCondition(random, part));
     if (random.OneIn(2))

@@ -166,10 +166,11 @@ std::optional<bool> RunIndexedSearch(sqlite3 *db, const char *sql, const PageBou
     const bool fits = page != nullptr ? plan->Text().kind == Kind::kSelect : isDeletion || wantsRows;
     if (!fits)
         return std::nullopt;
+    const int64_t pageRows = page != nullptr && page->limit != 0 ? int64_t{page->limit} + page->offset : 0;
     bool isInterrupted = false;
     {
         Transaction transaction(db, isDeletion ? "BEGIN IMMEDIATE" : "BEGIN");
-        if (!transaction.IsOpen() || !plan->IsWorthwhile(page != nullptr && page->limit != 0))
+        if (!transaction.IsOpen() || !plan->IsWorthwhile(pageRows))
             return std::nullopt;
         if (RunPlan(db, *plan, page != nullptr ? *page : PageBounds{0, 0}, rows) && transaction.Commit())
             return true;

@@ -15,8 +15,9 @@ struct PageBounds {
     unsigned int offset;
 };
 
-// Runs a search, count or deletion by the skip index of the database, with the result of the statement as it
-// is. `page` is null for a statement without bounds, and `rows` receives the result if it is wanted.
+// Runs a search, count or deletion by the skip index of the database, or a page of a range of times without a
+// sort, with the result of the statement as it is. `page` is null for a statement without bounds, and `rows`
+// receives the result if it is wanted.
 //
 // Nothing if the statement has to run as it is: it is another one, there is no index, or it did not help.
 // Otherwise whether it succeeded; on failure the connection's error is set. Throws std::bad_alloc, and

@@ -75,7 +75,7 @@ int KELODBSkipIndexGet(DBConnect_tag *connection, KELODBSkipIndex *index) {
         const std::unique_ptr<sqlite3, decltype(&EndReading)> transaction(db, &EndReading);
         index->isPossible = HasIndexableTable(db) ? 1 : 0;
         index->newestId = LargestIdEver(db);
-        if (opened && opened->Fits(db)) {
+        if (index->isPossible != 0 && opened && opened->Fits(db)) {
             index->isThere = 1;
             index->firstId = opened->Header().FirstId();
             index->endId = opened->Header().EndId();

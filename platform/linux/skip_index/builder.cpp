@@ -141,12 +141,12 @@ bool Builder::BuildPiece() {
         const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(rows.Get(), 1));
         if (text == nullptr && sqlite3_column_type(rows.Get(), 1) != SQLITE_NULL)
             return false; // no memory
-        if (text != nullptr)
-            piece_.Add(static_cast<size_t>(sqlite3_column_int64(rows.Get(), 0) - first),
-                       {text, static_cast<size_t>(sqlite3_column_bytes(rows.Get(), 1))});
+        piece_.Add(static_cast<size_t>(sqlite3_column_int64(rows.Get(), 0) - first),
+                   {text != nullptr ? text : "", static_cast<size_t>(sqlite3_column_bytes(rows.Get(), 1))});
     }
     if (rows.Status() != SQLITE_DONE)
         return false;
+    piece_.FillGaps();
     loose_.push_back(piece_.Slices(header_.fileNumber, piece));
     return true;
 }

@@ -51,6 +51,19 @@ Piece::Piece() : blocks_(std::make_unique<std::array<GramBits, kBlocksPerPiece>>
 void Piece::Clear() {
     for (GramBits &block : *blocks_)
         block.fill(0);
+    rows_.fill(0);
+}
+
+void Piece::Add(size_t row, std::string_view text) {
+    AddGrams(text, (*blocks_)[row / kIdsPerBlock]);
+    ++rows_[row / kIdsPerBlock];
+}
+
+void Piece::FillGaps() {
+    for (size_t block = 0; block < rows_.size(); ++block) {
+        if (rows_[block] < kIdsPerBlock)
+            (*blocks_)[block].fill(~uint64_t{0});
+    }
 }
 
 std::unique_ptr<Slice[]> Piece::Slices(uint64_t fileNumber, int64_t piece) const {

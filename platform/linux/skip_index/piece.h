@@ -41,13 +41,17 @@ public:
     // Throws std::bad_alloc.
     Piece();
     void Clear();
-    // Adds the text of the row with this number in the piece.
-    void Add(size_t row, std::string_view text) { AddGrams(text, (*blocks_)[row / kIdsPerBlock]); }
+    // Adds the text of the row with this number in the piece, each row once; "" if it has none.
+    void Add(size_t row, std::string_view text);
+    // Makes a block with fewer rows than ids fit every search: the others were deleted, and come back when
+    // somebody copies an older database over the content of this one.
+    void FillGaps();
     // The slices with their check sums: those of gram 0, 1 and so on.
     std::unique_ptr<Slice[]> Slices(uint64_t fileNumber, int64_t piece) const;
 
 private:
     std::unique_ptr<std::array<GramBits, kBlocksPerPiece>> blocks_;
+    std::array<uint8_t, kBlocksPerPiece> rows_{}; // of each block
 };
 
 } // namespace kelo::platform

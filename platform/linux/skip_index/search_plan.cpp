@@ -12,6 +12,10 @@ constexpr int64_t kFewIds = 4096;
 constexpr int64_t kWindowIds = 1024;
 // More rows are not looked up one by one where SQLite has an index for other conditions.
 constexpr int64_t kManyIds = 100'000;
+// Fewer rows are quickly found by an index of SQLite, and sorted.
+constexpr int64_t kFewRows = 512;
+// Ids for each row of a range of times: with more, it is better to read only the rows.
+constexpr int64_t kMostGaps = 3;
 
 int64_t SpanOf(const IdRange &ids) {
     return CountIds({ids}, std::numeric_limits<int64_t>::max());
@@ -21,12 +25,18 @@ int64_t SpanOf(const IdRange &ids) {
 
 std::optional<SearchPlan> SearchPlan::Read(sqlite3 *db, std::string_view sql) {
     auto text = ReadSearchText(sql);
-    if (!text || sqlite3_get_autocommit(db) == 0 || sqlite3_txn_state(db, "main") != SQLITE_TXN_NONE)
+    if (!text || IsSwitchedOff() || sqlite3_get_autocommit(db) == 0 ||
+        sqlite3_txn_state(db, "main") != SQLITE_TXN_NONE)
         return std::nullopt;
-    auto index = SkipIndex::Open(db);
-    if (!index || text->ids.first >= index->Header().EndId())
+    std::optional<SkipIndex> index;
+    if (text->need.kind != Need::Kind::kNothing)
+        index = SkipIndex::Open(db);
+    if (index && text->ids.first >= index->Header().EndId())
+        index.reset();
+    const bool mayBeSorted = !text->times.empty() && text->order != SearchText::Order::kNone;
+    if (!index && !mayBeSorted)
         return std::nullopt;
-    return SearchPlan(db, sql, std::move(*text), std::move(*index));
+    return SearchPlan(db, sql, std::move(*text), std::move(index));
 }
 
 // Narrows the ids to those that the table has. False if there are few.
@@ -39,23 +49,52 @@ bool SearchPlan::BoundIds() {
     return text_.ids.first <= text_.ids.last && SpanOf(text_.ids) > kFewIds;
 }
 
-// Whether SQLite would read the statement's rows one after the other; otherwise the first column that it uses
-// an index of.
-bool SearchPlan::IsScan(std::string &column) const {
+// How SQLite would find the rows of the statement as it is.
+SearchPlan::Access SearchPlan::AccessOfStatement(int64_t pageRows) const {
+    Access access;
     if (text_.isTextOnly)
-        return true;
-    Query plan(db_, "EXPLAIN QUERY PLAN " + std::string(sql_));
+        return {true, false, ""};
+    const std::string limit = pageRows != 0 ? " LIMIT " + std::to_string(pageRows) : "";
+    Query plan(db_, "EXPLAIN QUERY PLAN " + std::string(sql_) + limit);
     while (plan.Step()) {
         const auto *bytes = reinterpret_cast<const char *>(sqlite3_column_text(plan.Get(), 3));
         const std::string_view detail(bytes != nullptr ? bytes : "");
         if (detail == "SCAN logs" || detail.find("INTEGER PRIMARY KEY") != std::string_view::npos)
-            return true;
+            access.isScan = true;
+        if (detail.starts_with("USE TEMP B-TREE"))
+            access.isSorted = true;
         const size_t bracket = detail.find('(');
-        if (bracket == std::string_view::npos)
+        if (bracket == std::string_view::npos || !access.column.empty())
             continue;
         const std::string_view rest = detail.substr(bracket + 1);
-        column = rest.substr(0, rest.find_first_of("=<> "));
-        return false;
+        access.column = rest.substr(0, rest.find_first_of("=<> "));
+    }
+    return access;
+}
+
+// Narrows the ids to those of the rows that meet the conditions on a column of times, as an index of SQLite
+// has them. Rows arrive in the order of their times, more or less. False if that does not help.
+bool SearchPlan::NarrowByTimes() {
+    for (const std::string_view column : text_.times) {
+        const std::string sql =
+            "SELECT min(id), max(id), count(*) FROM main.logs WHERE " + ConditionsOn(text_, column);
+        Query plan(db_, "EXPLAIN QUERY PLAN " + sql);
+        if (!plan.Step() ||
+            std::string_view(reinterpret_cast<const char *>(sqlite3_column_text(plan.Get(), 3)))
+                    .find("USING COVERING INDEX") == std::string_view::npos)
+            continue;
+        Query ends(db_, sql);
+        if (!ends.Step())
+            return false;
+        const IdRange ids = {std::max<int64_t>(text_.ids.first, sqlite3_column_int64(ends.Get(), 0)),
+                             std::min<int64_t>(text_.ids.last, sqlite3_column_int64(ends.Get(), 1))};
+        const int64_t count = sqlite3_column_int64(ends.Get(), 2);
+        if (count > 0 && ids.first > ids.last)
+            continue; // no row; the statement finds that out
+        if (count == 0 || SpanOf(ids) / count > kMostGaps)
+            return false;
+        text_.ids = ids;
+        return true;
     }
     return false;
 }
@@ -71,41 +110,44 @@ bool SearchPlan::HasManyRows(const std::string &column, int64_t count) const {
 }
 
 bool SearchPlan::CollectAll() {
-    if (!index_.Fits(db_))
+    if (!index_ || !index_->Fits(db_))
         return false;
-    Candidates candidates(index_.File(), index_.Header(), text_.need, text_.ids);
+    Candidates candidates(index_->File(), index_->Header(), text_.need, text_.ids);
     while (candidates.Next(IsAscending(), all_)) {
     }
     if (!candidates.IsGood())
-        index_.Discard();
+        index_->Discard();
     return candidates.IsGood();
 }
 
-bool SearchPlan::IsWorthwhile(bool isPage) {
-    if (!BoundIds())
+bool SearchPlan::IsWorthwhile(int64_t pageRows) {
+    if (!HasIndexableTable(db_) || !BoundIds())
         return false;
-    std::string column;
-    const bool isScan = IsScan(column);
-    if (isScan && isPage)
+    const bool isPage = pageRows != 0;
+    const Access access = AccessOfStatement(pageRows);
+    if (access.isScan && isPage)
+        return isByStep_ = index_.has_value();
+    if (!access.isScan && text_.kind == SearchText::Kind::kSelect && text_.order == SearchText::Order::kNone)
+        return false;
+    if (!access.isScan && !HasManyRows(access.column, kFewRows))
+        return false;
+    if (access.isSorted && isPage && NarrowByTimes())
         return isByStep_ = true;
-    if (!isScan && text_.kind == SearchText::Kind::kSelect && text_.order == SearchText::Order::kNone)
-        return false;
-    if (!isScan && !HasManyRows(column, kIdsPerBlock * 16))
-        return false;
     if (!CollectAll())
         return false;
     const int64_t count = CountIds(all_, std::numeric_limits<int64_t>::max());
-    return isScan ? count <= SpanOf(text_.ids) / 2 : count <= kManyIds && HasManyRows(column, count);
+    return access.isScan ? count <= SpanOf(text_.ids) / 2
+                         : count <= kManyIds && HasManyRows(access.column, count);
 }
 
 // Takes the ids that a page is likely to be in off the range.
 IdRange SearchPlan::TakeWindow() {
     IdRange window = text_.ids;
     if (IsAscending()) {
-        window.last = window.first + kWindowIds - 1;
+        window.last = std::min(window.last, window.first + kWindowIds - 1);
         text_.ids.first = window.last + 1;
     } else {
-        window.first = window.last - kWindowIds + 1;
+        window.first = std::max(window.first, window.last - kWindowIds + 1);
         text_.ids.last = window.first - 1;
     }
     return window;
@@ -123,18 +165,18 @@ bool SearchPlan::Next(std::vector<IdRange> &ranges) {
         return true;
     }
     if (step_ == Step::kOpen) {
-        const bool isUsable = index_.Fits(db_);
+        const bool isUsable = index_ && index_->Fits(db_);
         step_ = isUsable ? Step::kCandidates : Step::kDone;
         if (!isUsable) {
             ranges.push_back(text_.ids);
             return true;
         }
-        candidates_.emplace(index_.File(), index_.Header(), text_.need, text_.ids);
+        candidates_.emplace(index_->File(), index_->Header(), text_.need, text_.ids);
     }
     if (step_ == Step::kDone || !candidates_->Next(IsAscending(), ranges))
         return false;
     if (!candidates_->IsGood()) {
-        index_.Discard();
+        index_->Discard();
         // What was not handed out yet.
         ranges.assign(1, candidates_->Rest(IsAscending()));
         step_ = Step::kDone;

@@ -239,7 +239,8 @@ void TakeOrder(Tokens &tokens, SearchText &search) {
 bool MayBeSearch(std::string_view sql) {
     return (sql.starts_with("SELECT *") || sql.starts_with("SELECT COUNT(*)") ||
             sql.starts_with("DELETE ")) &&
-           sql.find("msg") != std::string_view::npos;
+           (sql.find("msg") != std::string_view::npos || sql.find("ldate") != std::string_view::npos ||
+            sql.find("utcsec") != std::string_view::npos);
 }
 
 std::string Joined(const std::vector<std::string_view> &conditions) {
@@ -280,7 +281,13 @@ std::optional<SearchText> ReadSearchText(std::string_view sql) {
         else if (Bare(condition).size() > 1)
             search.isTextOnly = false;
     }
-    if (search.need.parts.empty() || CountGrams(search.need) > kMostGramsOfAll)
+    for (const std::string_view column : {"ldate", "utcsec"}) {
+        if (!ConditionsOn(search, column).empty())
+            search.times.push_back(column);
+    }
+    if (search.need.parts.empty())
+        search.need.kind = Need::Kind::kNothing;
+    if ((search.need.parts.empty() && search.times.empty()) || CountGrams(search.need) > kMostGramsOfAll)
         return std::nullopt;
     return search;
 }

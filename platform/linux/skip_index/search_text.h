@@ -40,18 +40,19 @@ struct SearchText {
     std::vector<std::string_view> conditions;
     IdRange ids;
     Order order = Order::kNone;
-    Need need; // never kNothing
+    Need need; // kNothing if `times` is not empty
+    // The columns of times that have conditions of their own: "ldate", "utcsec".
+    std::vector<std::string_view> times;
     // Whether the grams say something about every condition: no index of SQLite serves any of them.
     bool isTextOnly = true;
 };
 
-// Takes a statement apart. Nothing for any text that is not known to be one of these, or whose grams say
-// nothing. The result refers to `sql`.
+// Takes a statement apart. Nothing for any text that is not known to be one of these, or that neither grams
+// nor times say anything about. The result refers to `sql`.
 std::optional<SearchText> ReadSearchText(std::string_view sql);
 
-// The conditions, joined: of the one index that EXPLAIN QUERY PLAN names, those on `column` alone; "" if
-// there is none.
-std::string ConditionsOn(const SearchText &search, std::string_view column);
+// The conditions, joined: all, or those on `column` alone; "" if there is none.
 std::string AllConditions(const SearchText &search);
+std::string ConditionsOn(const SearchText &search, std::string_view column);
 
 } // namespace kelo::platform

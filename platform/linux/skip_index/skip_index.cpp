@@ -7,14 +7,11 @@
 #include "skip_index/builder.h"
 
 namespace kelo::platform {
-namespace {
 
 bool IsSwitchedOff() {
     const char *setting = std::getenv("KELO_SKIP_INDEX");
     return setting != nullptr && std::string_view(setting) == "off";
 }
-
-} // namespace
 
 std::optional<SkipIndex> SkipIndex::Open(sqlite3 *db) {
     if (IsSwitchedOff())

@@ -10,6 +10,9 @@
 
 namespace kelo::platform {
 
+// Whether the environment variable KELO_SKIP_INDEX is "off": all statements run as they are then.
+bool IsSwitchedOff();
+
 // The index of an open database, as it was when it was opened.
 //
 // It knows rows that were committed before; those that came after have ids beyond the ones that it knows. So
@@ -17,11 +20,12 @@ namespace kelo::platform {
 // older snapshot still has may have been deleted before the index saw it.
 class SkipIndex {
 public:
-    // Nothing without a good index, or if the environment variable KELO_SKIP_INDEX is "off".
+    // Nothing without a good index, or if it is switched off.
     static std::optional<SkipIndex> Open(sqlite3 *db);
 
-    // Whether it is the index of the database as this is now. Call it in the transaction that reads.
-    bool Fits(sqlite3 *db) const { return HasIndexableTable(db) && FitsDatabase(db, header_, identity_); }
+    // Whether it is the index of the database as this is now, whose table is an indexable one. Call it in the
+    // transaction that reads.
+    bool Fits(sqlite3 *db) const { return FitsDatabase(db, header_, identity_); }
     // Throws it away, because reading found it damaged.
     void Discard() const;
 
