@@ -1,6 +1,7 @@
 #pragma once
 
-// The appliance's notification service, and its mail and SMS settings.
+// The appliance's notification service, and its mail and SMS settings. All of it may be called from any
+// thread.
 //
 // The settings are in the key/value file /etc/keloinfo.conf (keloinfo.conf(5)) under the platform's root.
 

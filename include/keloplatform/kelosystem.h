@@ -1,6 +1,6 @@
 #pragma once
 
-// File system and service manager of the appliance.
+// File system and service manager of the appliance. All of it may be called from any thread.
 
 #include <string>
 

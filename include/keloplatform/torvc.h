@@ -2,6 +2,8 @@
 
 // The appliance's core library: files, section files, and maps and lists of strings.
 //
+// Threads: functions may be called from any thread; a map or a list is used by one at a time.
+//
 // Nothing here throws. A failed call says so by its result and sets errno. Only a file or value that is
 // refused for its content is also named in the system log (priority LOG_WARNING, with path and line),
 // because errno cannot say which line it was.
@@ -89,6 +91,13 @@ KELOPLATFORM_API int TORVCSzHashSetValue(TORVSZHASH **hash, const char *key, con
 // The value of `key`, or null when there is none or an argument is null. It belongs to the map and is valid
 // until the key is set again or the map freed.
 KELOPLATFORM_API const char *TORVCSzHashGetValue(const TORVSZHASH *hash, const char *key);
+
+// Calls `handle` with every key and value, in the order in which the keys were first set, until it returns
+// non-zero. It may not change the map. Returns the last result of `handle`; 0 for a map that is empty or
+// null. An addition of this platform.
+KELOPLATFORM_API int TORVCSzHashWalk(const TORVSZHASH *hash,
+                                     int (*handle)(const char *key, const char *value, void *context),
+                                     void *context);
 
 // Frees a map; null is accepted.
 KELOPLATFORM_API void TORVCSzHashFree(TORVSZHASH *hash);

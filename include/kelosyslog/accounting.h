@@ -49,6 +49,8 @@ public:
     // Loads the stored histogram and the notification rules. A database that is missing or cannot be read
     // is taken as empty.
     AccountingManager();
+    // The same on the accounting database at `dbPath`, an absolute path.
+    explicit AccountingManager(std::string dbPath);
     // Flushes the closed samples once more; a failure is only reported. The open sample is not closed.
     ~AccountingManager();
     AccountingManager(const AccountingManager &) = delete;

@@ -1,6 +1,7 @@
 #pragma once
 
-// Commands written as JSON objects, one after the other.
+// Commands written as JSON objects, one after the other. A parser holds no state and may be used from any
+// thread.
 
 #include <json/value.h>
 

@@ -51,16 +51,18 @@ public:
     // Closes the connection, if there is one. Always 0. The in-transaction flag stays as it is.
     int DBDiscon();
     bool isConnected() const;
-    // 1 from a successful DBTranStart to the next successful DBTranEnd or DBTranRollback, else 0.
+    // 1 from a successful DBTranStart to the next successful DBTranEnd or DBTranRollback, else 0. When SQLite
+    // itself has rolled back (a full disk, for example) it stays 1 for good, also after DBDiscon and DBCon:
+    // make a new handler.
     int32_t isInTran() const;
 
     // Creates the database with the sqlite3 tool: its folder (with parents), the file from the schema,
     // write-ahead logging. A failure to set write-ahead logging is reported and tolerated. On a database that
     // is there the schema runs once more.
     //
-    // The paths go through a shell: the database path in double quotes, so one with " $ ` \ or a line feed is
-    // refused, the schema path bare. A path without '/' is taken for the folder, which is created, and fails;
-    // a symbolic link to nothing is refused.
+    // Security: the paths go through a shell, so never take them from outside. The database path is put in
+    // double quotes, so one with " $ ` \ or a line feed is refused, the schema path bare. A path without '/'
+    // is taken for the folder, which is created, and fails; a symbolic link to nothing is refused.
     //
     // What a failed creation leaves is removed, unless it has records: another program was faster then.
     // Despite an error in the schema the rest of it runs, and the creation fails at the end. A process that
@@ -170,6 +172,6 @@ KELOSYSLOG_API int32_t SyslogngHupSignalSend();
 // -1 when it cannot be (silently) or is no regular file (reported).
 KELOSYSLOG_API int64_t SyslogngWorkingDbCheck(std::string dbPath, int32_t limitKib);
 
-// Switches a database to write-ahead logging with the sqlite3 tool. The path goes through a shell without
-// quotes, so it must hold no blanks. Returns 0, or -1 after a report.
+// Switches a database to write-ahead logging with the sqlite3 tool. Security: the path goes through a shell
+// without quotes, so it must hold no blanks and never come from outside. Returns 0, or -1 after a report.
 KELOSYSLOG_API int32_t SyslogngWorkingDbSetJouWal(std::string dbPath);

@@ -8,6 +8,9 @@
 //     _SYSLOG_SQL_ORDER_tag newestFirst{0, SYSLOG_ATTRI_ID};
 //     SyslogDBSelect("/var/log/logs.db", conditions, &page, &newestFirst, PrintLog, nullptr, false);
 //
+// Threads: every function may be called from any thread, also for the same database. Reasons of failures are
+// in failure.h; for searches on a kept connection see dbreader.h.
+//
 // Every function takes the absolute path of an existing database, opens a connection of its own, runs one
 // statement and closes the connection before it returns. (SyslogDBExtkeyMapGet and SyslogDBExtkeyLookupByName
 // ask for the generation first: two statements on two connections.) None throws on a database error; when
@@ -56,7 +59,9 @@ using SyslogDBRowCallback = int (*)(_SYSLOG_LOG_DATA_tag &log, void *context);
 //
 // A null `limit` means all rows, a null `order` no order. Without a filter, a page is taken by row id: the
 // rows whose id lies in (largest - offset - limit, largest - offset]; after deletions such a page may have
-// fewer rows. `trimUser` removes the user name from the messages of table "logs".
+// fewer rows. The order sorts only within such a page: "oldest first" gives the newest page turned round. For
+// the oldest rows add a condition that all meet, such as `id >= 0`, which makes it a filtered page.
+// `trimUser` removes the user name from the messages of table "logs".
 //
 // Returns 0, also when the callback ended the scan, or -1 with a message in the system log: a path that is
 // not absolute, a database that cannot be opened, a statement that failed.

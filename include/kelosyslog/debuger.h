@@ -1,6 +1,6 @@
 #pragma once
 
-// The debug channel that the library reports through.
+// The debug channel that the library reports through. May be used from any thread.
 
 #include <cstdint>
 #include <string>

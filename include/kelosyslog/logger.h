@@ -7,10 +7,10 @@
 //     for (const _SSYSLOG_LOG_LOG_tag &event : logger.LogEnum("/usr/kelo/etc/kelosyslog.db", 0, 50))
 //         printf("%s\n", event.event.c_str());
 //
-// A Logger holds no state: every operation opens its database, works and closes it. Operations return 0 or -1
-// unless stated otherwise, and report a failure in the system log. Silent are LogHtmlGen and LogHtmlRemove, a
-// LogCount of -2, and in LogClear a file that could not be deleted. When memory runs out they throw
-// std::bad_alloc, with everything closed.
+// Threads: a Logger may be used from any thread, and by several at a time. It holds no state: every operation
+// opens its database, works and closes it. Operations return 0 or -1 unless stated otherwise, and report a
+// failure in the system log. Silent are LogHtmlGen and LogHtmlRemove, a LogCount of -2, and in LogClear a
+// file that could not be deleted. When memory runs out they throw std::bad_alloc, with everything closed.
 
 #include <cstdint>
 #include <list>

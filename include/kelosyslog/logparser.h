@@ -51,9 +51,13 @@ public:
     std::list<std::string> Tokenize(const std::string &text, const std::string &delimiters) const;
 
     // Returns 1 when host, ip, ldate, ltime, prog and msg are all non-empty. Otherwise reports it in the
-    // system log, keeps a copy of the record for PartialLogDump and returns 0. The copies stay until the
-    // parser is destroyed.
+    // system log, keeps a copy of the record for PartialLogDump and returns 0. The copies stay until
+    // RejectedClear.
     int32_t isValidLog(const _SYSLOG_LOG_DATA_tag &record);
+
+    // Discards the records that isValidLog has kept. A program that reads forever calls it from time to time.
+    // Returns how many there were.
+    size_t RejectedClear();
 
     // Number of records in the list, and a copy of the list in the order of the input.
     int32_t LogGetCount() const;
@@ -105,6 +109,10 @@ public:
     // Ends the stream: parses the waiting line, if there is one. The stream may then be used again.
     void Finish();
 
+    // Bytes of the stream whose lines the parser has got, or that were dropped with an overlong line: where
+    // to go on reading after a restart. The line that waits for its rest is not among them.
+    uint64_t TakenBytes() const;
+
     // Lines dropped because of their length.
     uint64_t OverlongCount() const;
 
@@ -118,4 +126,6 @@ private:
     std::string waiting_;
     bool isSkipping_ = false; // within an overlong line
     uint64_t overlongCount_ = 0;
+    uint64_t addedBytes_ = 0;
+    uint64_t openLineBytes_ = 0; // since the last line feed
 };

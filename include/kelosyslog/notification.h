@@ -32,7 +32,8 @@ struct _SYSLOG_NOTIFY_RULES_tag {
     bool enable = false;
 };
 
-// The rules of the rule file at the time when the object was created. Used by one thread at a time.
+// The rules of the rule file at the time when the object was created. Used by one thread at a time; the free
+// functions below may be called from any.
 class KELOSYSLOG_API NotificationManager {
 public:
     // Loads the rules of /etc/kelosyslog/notify.conf. If that fails, the manager can be used with the rules
@@ -74,7 +75,8 @@ public:
                                 const std::string &content);
 
     int NotificationSendSev(const std::string &, int, const std::string &) = delete; // 0 is no text
-    // The same with the severity's word (`pri` is 0 to 7, not checked) and the message of `log`.
+    // The same with the severity's word (`pri` is 0 to 7; the word of any other is empty) and the message of
+    // `log`.
     int NotificationSendSev(const std::string &host, _SYSLOG_DB_PRIORITY_tag pri,
                             const _SYSLOG_LOG_DATA_tag &log);
     int NotificationSendKeyword(const std::string &host, const std::string &keyword,

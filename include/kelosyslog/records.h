@@ -106,7 +106,7 @@ KELOSYSLOG_API extern const char *const g_MappingSyslogOP[11];
 KELOSYSLOG_API extern const _SYSLOG_XFERLOG_INFO_tag g_xferlog_info[7];
 KELOSYSLOG_API extern const int32_t g_xferlog_info_count;
 
-// Column name of an attribute, 0 to 18 (not checked). The text is constant.
+// Column name of an attribute, 0 to 18; "" for any other. The text is constant.
 KELOSYSLOG_API const char *LogAttriStrGet(_SYSLOG_DB_ATTRI_tag attr);
 
 // The first attribute whose column has exactly this name, else SYSLOG_ATTRI_NONE.
@@ -115,7 +115,7 @@ KELOSYSLOG_API _SYSLOG_DB_ATTRI_tag LogAttriType(std::string name);
 // Severity of an exact severity word; null and unknown words give SYSLOG_PRIO_DEBUG.
 KELOSYSLOG_API _SYSLOG_DB_PRIORITY_tag PriorStrToType(const char *word);
 
-// Severity word of a severity, 0 to 7 (not checked).
+// Severity word of a severity, 0 to 7; "" for any other.
 KELOSYSLOG_API std::string PriorTypeToStr(_SYSLOG_DB_PRIORITY_tag prio);
 
 // The text after the first colon of `text` (including a blank after it), or all of it without a colon.

@@ -1,6 +1,6 @@
 #pragma once
 
-// Small text and file utilities. They keep no state.
+// Small text and file utilities. They keep no state and may be called from any thread.
 
 #include <cstdint>
 #include <cstdio>

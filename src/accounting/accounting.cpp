@@ -18,8 +18,11 @@ constexpr int32_t kFlushBeatSec = 5;
 
 } // namespace
 
-AccountingManager::AccountingManager() : devices_(std::make_unique<kelo::DeviceTable>()) {
-    ConfigLoad();
+AccountingManager::AccountingManager()
+    : AccountingManager(kelo::RootedPath("/var/log/kelolog/.KELOACCOUNTDB")) {}
+
+AccountingManager::AccountingManager(std::string dbPath)
+    : dbPath_(std::move(dbPath)), devices_(std::make_unique<kelo::DeviceTable>()) {
     for (const auto &[device, count] : SyslogDBHistGet(dbPath_, 0))
         devices_->Find(device).total = count;
 }

@@ -41,7 +41,7 @@ static_assert(kAttributes[SYSLOG_ATTRI_UTCSEC].isInteger == 1 &&
 } // namespace
 
 const char *LogAttriStrGet(_SYSLOG_DB_ATTRI_tag attr) {
-    return kAttributes[static_cast<size_t>(attr)].column;
+    return attr >= 0 && attr < SYSLOG_ATTRI_NONE ? kAttributes[static_cast<size_t>(attr)].column : "";
 }
 
 _SYSLOG_DB_ATTRI_tag LogAttriType(std::string name) {
@@ -64,7 +64,7 @@ _SYSLOG_DB_PRIORITY_tag PriorStrToType(const char *word) {
 }
 
 std::string PriorTypeToStr(_SYSLOG_DB_PRIORITY_tag prio) {
-    return g_MappingSyslogPrior[prio];
+    return prio >= SYSLOG_PRIO_EMERG && prio <= SYSLOG_PRIO_DEBUG ? g_MappingSyslogPrior[prio] : "";
 }
 
 const char *XferlogDBPathGet(const char *name) {

@@ -64,6 +64,10 @@ int32_t LogParser::isValidLog(const _SYSLOG_LOG_DATA_tag &record) {
     return 1;
 }
 
+size_t LogParser::RejectedClear() {
+    return std::exchange(partialLogList_, {}).size();
+}
+
 int32_t LogParser::LogGetCount() const {
     return static_cast<int32_t>(logList_.size());
 }

@@ -15,16 +15,24 @@ void LogStream::Add(std::string_view piece) {
 
 void LogStream::TakePart(std::string_view piece) {
     const size_t firstLineFeed = piece.find('\n');
+    addedBytes_ += piece.size();
+    openLineBytes_ += piece.size();
     Keep(piece.substr(0, firstLineFeed));
     if (firstLineFeed == std::string_view::npos)
         return;
     const size_t lastLineFeed = piece.rfind('\n');
     ParseLines(piece.substr(firstLineFeed, lastLineFeed + 1 - firstLineFeed));
+    openLineBytes_ = piece.size() - lastLineFeed - 1;
     Keep(piece.substr(lastLineFeed + 1));
 }
 
 void LogStream::Finish() {
     ParseLines({});
+    openLineBytes_ = 0;
+}
+
+uint64_t LogStream::TakenBytes() const {
+    return addedBytes_ - openLineBytes_;
 }
 
 uint64_t LogStream::OverlongCount() const {

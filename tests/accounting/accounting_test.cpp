@@ -119,6 +119,17 @@ TEST_F(Accounting, KeepsNamesAndCountsAcrossRestarts) {
     EXPECT_THAT(TakeTexts(), IsEmpty());
 }
 
+TEST_F(Accounting, TakesADatabaseByItsPath) {
+    const std::string other = root_.File("other.db");
+    CreateLogDatabase(other, "accinfo.sql");
+    RunSql(other, "INSERT INTO histogram VALUES(NULL, 'a', 40)");
+    AccountingManager accounting(other);
+    CountLogs(accounting);
+    EXPECT_EQ(accounting.AccoutingFlush2DB(), 0);
+    EXPECT_EQ(RunSql(other, "SELECT count > 40 FROM histogram WHERE device = 'a'"), "1");
+    EXPECT_EQ(Samples(), "");
+}
+
 TEST_F(Accounting, CountsManyDevicesExactly) {
     AccountingManager accounting;
     std::map<std::string, uint64_t> counted;

@@ -1,3 +1,5 @@
+#include <limits>
+
 #include "kelosyslog/dbutil.h"
 #include "support/test.h"
 
@@ -20,6 +22,15 @@ int TakeText(_SYSLOG_LOG_DATA_tag &log, void *context) {
           &log.luser, &log.event, &log.xferip, &log.fname, &log.fsize})
         text += *field + "|";
     return 0;
+}
+
+TEST(Vocabulary, HasAnAnswerForEveryNumber) {
+    EXPECT_STREQ(LogAttriStrGet(SYSLOG_ATTRI_XFERIP), "ip");
+    EXPECT_EQ(PriorTypeToStr(SYSLOG_PRIO_DEBUG), "debug");
+    for (const int32_t number : {-1, 19, 20, std::numeric_limits<int32_t>::max()}) {
+        EXPECT_STREQ(LogAttriStrGet(static_cast<_SYSLOG_DB_ATTRI_tag>(number)), "");
+        EXPECT_EQ(PriorTypeToStr(static_cast<_SYSLOG_DB_PRIORITY_tag>(number)), "");
+    }
 }
 
 TEST(DBRecToLogInfo, FillsWhatTheTableHas) {

@@ -77,6 +77,7 @@ TEST(isValidLog, NamesARecordIncompleteWhicheverOfItsFieldsIsEmpty) {
                                  &_SYSLOG_LOG_DATA_tag::ldate, &_SYSLOG_LOG_DATA_tag::ltime,
                                  &_SYSLOG_LOG_DATA_tag::prog,  &_SYSLOG_LOG_DATA_tag::msg};
     SyslogCapture log;
+    LogParser parser;
     _SYSLOG_LOG_DATA_tag record;
     for (const Field field : kFields)
         record.*field = "set";
@@ -84,8 +85,10 @@ TEST(isValidLog, NamesARecordIncompleteWhicheverOfItsFieldsIsEmpty) {
     for (const Field field : kFields) {
         _SYSLOG_LOG_DATA_tag bare = record;
         (bare.*field).clear();
-        EXPECT_EQ(LogParser().isValidLog(bare), 0);
+        EXPECT_EQ(parser.isValidLog(bare), 0);
     }
+    EXPECT_EQ(parser.RejectedClear(), 6U);
+    EXPECT_EQ(parser.RejectedClear(), 0U);
     EXPECT_EQ(log.TakeTexts(), std::vector<std::string>(6, "Invalid log!!!!!!!!!!!!! (Attention Please)"));
 }
 
@@ -97,9 +100,13 @@ TEST(LogStream, DropsOverlongLinesAsAWhole) {
         SyslogCapture log;
         LogParser parser;
         LogStream stream(parser, entry.size() + 20);
-        for (size_t at = 0; at < text.size(); at += cut)
+        for (size_t at = 0; at < text.size(); at += cut) {
             stream.Add(std::string_view(text).substr(at, cut));
+            // A restart would go on behind the last line feed.
+            EXPECT_EQ(stream.TakenBytes(), text.substr(0, at + cut).rfind('\n') + 1);
+        }
         stream.Finish();
+        EXPECT_EQ(stream.TakenBytes(), text.size());
         EXPECT_EQ(stream.OverlongCount(), 2U) << cut;
         const std::list<_SYSLOG_LOG_DATA_tag> records = parser.LogListGet();
         ASSERT_EQ(records.size(), 2U) << cut;

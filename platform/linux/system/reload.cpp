@@ -1,5 +1,3 @@
-#include <systemd/sd-daemon.h>
-
 #include <new>
 
 #include "common/failure.h"
@@ -22,7 +20,7 @@ bool IsServiceName(const std::string &service) {
 
 // A process under another root is not a service of this machine.
 bool IsManagedBySystemd() {
-    return kelo::platform::RootedPath("/") == "/" && sd_booted() > 0;
+    return kelo::platform::RootedPath("/") == "/" && kelo::platform::IsSystemdRunning();
 }
 
 } // namespace

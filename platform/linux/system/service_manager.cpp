@@ -1,6 +1,7 @@
 #include "system/service_manager.h"
 
 #include <systemd/sd-bus.h>
+#include <systemd/sd-daemon.h>
 
 #include <chrono>
 #include <cstdlib>
@@ -102,6 +103,10 @@ int AskForReload(sd_bus *bus, const std::string &unit, BusError &error, std::str
 }
 
 } // namespace
+
+bool IsSystemdRunning() {
+    return sd_booted() > 0;
+}
 
 std::string ReloadUnit(const std::string &unit) {
     sd_bus *rawBus = nullptr;

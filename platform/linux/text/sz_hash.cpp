@@ -61,6 +61,17 @@ const char *TORVCSzHashGetValue(const TORVSZHASH *hash, const char *key) {
     return entry != nullptr ? entry->value.c_str() : nullptr;
 }
 
+int TORVCSzHashWalk(const TORVSZHASH *hash, int (*handle)(const char *key, const char *value, void *context),
+                    void *context) {
+    if (hash == nullptr || handle == nullptr)
+        return 0;
+    for (const TORVSZHASH::Entry &entry : hash->entries) {
+        if (const int result = handle(entry.key.c_str(), entry.value.c_str(), context); result != 0)
+            return result;
+    }
+    return 0;
+}
+
 void TORVCSzHashFree(TORVSZHASH *hash) {
     delete hash;
 }
