@@ -3,7 +3,7 @@
 cd "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")/.." || exit
 . scripts/lib/syslog-ng.sh
 
-programs=$PWD/build/release/bin
+programs=${KELO_BIN_DIR:-$PWD/build/release/bin}
 root=$(mktemp -d)
 clean_up() {
     local kind
@@ -15,8 +15,8 @@ clean_up() {
 trap clean_up EXIT
 trap 'exit 1' INT TERM HUP
 
-# configure KIND: the shipped configuration in $root/KIND, which is empty before. KIND is "database" or "receiver", who
-# stores, or "file": a flat file that gets what the columns get, and nothing else is done.
+# configure KIND: the shipped configuration in $root/KIND, which is empty before. KIND is "database", "receiver" or "spool",
+# the way of storing, or "file": a flat file that gets what the columns get, and nothing else is done.
 configure() {
     local kind=$1
     rm -rf "${root:?}/$kind"
@@ -24,6 +24,7 @@ configure() {
     syslog_ng_configure "$root/$kind" package/syslog-ng/kelosyslog.conf "$programs/kelosyslog"
     if [[ $kind == file ]]; then
         cat >>"$root/file/kelosyslog.conf" <<END
+source s_kelo_keeper_file { };
 destination d_kelo_file {
   file("$root/file/logs.txt" template("\${HOST} \${SOURCEIP} \${FACILITY} \${LEVEL} \${LEVEL} \${TAG} \${R_UNIXTIME} \
 \${R_TZOFFSET} \${R_YEAR}/\${R_MONTH}/\${R_DAY} \${R_HOUR}:\${R_MIN}:\${R_SEC} \${PROGRAM} \${MESSAGE}\n"));

@@ -113,6 +113,18 @@ TEST_F(SpoolProgram, StoresEveryByteAndSetsAsideWhatIsNoRecord) {
                             HasSubstr("10114\n")));
 }
 
+TEST_F(SpoolProgram, StoresAMessageWhenItComes) {
+    ChildProgram receiver = Start();
+    Append("20200102-10111", Messages(0, 1));
+    ASSERT_TRUE(AwaitRows(receiver, 1));
+    const auto start = std::chrono::steady_clock::now();
+    for (int number = 1; number <= 10; ++number) {
+        Append("20200102-10111", Messages(number, 1));
+        ASSERT_TRUE(AwaitRows(receiver, number + 1));
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
+}
+
 // Another file under the same name, then with the same inode, then one that has become shorter.
 TEST_F(SpoolProgram, TellsFilesByWhatTheyAre) {
     {

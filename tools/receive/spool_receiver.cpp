@@ -97,8 +97,8 @@ void SpoolReceiver::Run() {
     loop_.NotifyServiceManager();
     while (!mustEnd_) {
         now_ = NowMs();
-        changes.SetEnabled(!hasNews_);
         Work();
+        changes.SetEnabled(!hasNews_);
         loop_.Wait();
     }
     Finish();
