@@ -1,6 +1,8 @@
 // kelosyslog listen: what it refuses before anything changes, what it writes, and what it finds.
 
+#include <fcntl.h>
 #include <netinet/in.h>
+#include <sys/file.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -77,6 +79,12 @@ TEST_F(Listen, RefusesWhatCannotBeAndChangesNothing) {
         EXPECT_EQ(result.status, 2) << words;
         EXPECT_THAT(result.err, HasSubstr(named)) << words;
         EXPECT_FALSE(fs::exists(listen_)) << words;
+    }
+    {
+        const FileHandle lock(
+            open(root_.File("etc/kelosyslog/syslog-ng/.listen.conf.lock").c_str(), O_RDWR | O_CREAT, 0600));
+        ASSERT_EQ(flock(lock.Get(), LOCK_EX), 0);
+        EXPECT_THAT(Run("listen --address any").err, HasSubstr("another kelosyslog listen"));
     }
     Expect("listen --address 127.0.0.2 --dry-run", 0);
     EXPECT_FALSE(fs::exists(listen_));

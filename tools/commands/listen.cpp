@@ -1,9 +1,16 @@
 // kelosyslog listen: shows and changes where syslog-ng receives.
 
+#include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+
 #include "base/errors.h"
+#include "base/files.h"
 #include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
@@ -15,6 +22,8 @@
 
 namespace kelo::tool {
 namespace {
+
+namespace fs = std::filesystem;
 
 constexpr const char *kFooter =
     "Without options of a change it prints where syslog-ng receives. A change is checked before anything is\n"
@@ -130,7 +139,20 @@ const char *NameOf(Step step) {
     return "leave syslog-ng alone, as it does not run";
 }
 
-int Change(const NetworkSettings &before, const Options &options, const std::string &root) {
+// Only one change at a time, as each may have to be undone. Nobody else can open the file.
+FileHandle LockChanges(const std::string &root) {
+    const std::string path = fs::path(ListenPath(root)).replace_filename(".listen.conf.lock");
+    FileHandle file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600));
+    if (!file)
+        throw OutputError("cannot open " + path + ": " + std::strerror(errno));
+    if (flock(file.Get(), LOCK_EX | LOCK_NB) != 0)
+        throw UsageError("another kelosyslog listen is changing " + ListenPath(root));
+    return file;
+}
+
+int Change(const Options &options, const std::string &root) {
+    const FileHandle lock = options.isDryRun ? FileHandle() : LockChanges(root);
+    const NetworkSettings before = ReadNetworkSettings(root);
     if (!IsConfigurationUsed(root))
         throw UsageError("syslog-ng does not read " + ConfigurationPath(root) + ": " +
                          ConfigurationLink(root) + " is missing");
@@ -160,22 +182,18 @@ int Change(const NetworkSettings &before, const Options &options, const std::str
 
 int Run(const Options &options, const std::string &root) {
     umask(022); // members of adm read the settings
-    NetworkSettings before;
+    if (options.isDryRun && !options.IsChange())
+        throw UsageError("--dry-run: goes with a change only");
+    if (options.IsChange() && geteuid() != 0 && root.empty())
+        throw UsageError("a change needs root");
     try {
-        before = ReadNetworkSettings(root);
-        if (options.IsChange())
-            RequireInclude(root);
+        if (!options.IsChange())
+            return Show(ReadNetworkSettings(root), root, options.format);
+        RequireInclude(root);
+        return Change(options, root);
     } catch (const SettingsError &error) {
         throw UsageError(error.what());
     }
-    if (!options.IsChange()) {
-        if (options.isDryRun)
-            throw UsageError("--dry-run: goes with a change only");
-        return Show(before, root, options.format);
-    }
-    if (geteuid() != 0 && root.empty())
-        throw UsageError("a change needs root");
-    return Change(before, options, root);
 }
 
 } // namespace
