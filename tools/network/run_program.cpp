@@ -23,7 +23,7 @@ std::string PathOf(const std::string &program) {
     const char *path = std::getenv("PATH");
     const std::string folders = std::string(path != nullptr ? path : "") + ":/usr/sbin:/sbin:/usr/bin:/bin:";
     for (size_t begin = 0, end; (end = folders.find(':', begin)) != std::string::npos; begin = end + 1) {
-        const std::string file = folders.substr(begin, end - begin) + "/" + program;
+        std::string file = folders.substr(begin, end - begin) + "/" + program;
         if (end > begin && access(file.c_str(), X_OK) == 0)
             return file;
     }
@@ -69,6 +69,7 @@ ProgramRun RunAndWait(const std::vector<std::string> &arguments) {
     const FileHandle reader(ends[0]);
     FileHandle writer(ends[1]);
     std::vector<char *> words;
+    words.reserve(arguments.size() + 1);
     for (const std::string &argument : arguments)
         words.push_back(const_cast<char *>(argument.c_str()));
     words.push_back(nullptr);

@@ -63,7 +63,7 @@ public:
 
     // A folder like that one, with links to its files and what is still missing there.
     std::string CopyTlsFiles(const std::string &folder) const {
-        const std::string copy = path_ + "/tls";
+        std::string copy = path_ + "/tls";
         fs::create_directory(copy);
         for (const char *name : {"/server.pem", "/server.key", "/ca.pem", "/crl.pem"})
             fs::create_symlink(fs::absolute(folder + name), copy + name);
@@ -147,7 +147,7 @@ std::string AwaitListeners(const TakeOver &change) {
     constexpr std::chrono::milliseconds kPause{50};
     for (const auto deadline = Clock::now() + kPatience;;) {
         const pid_t pid = change.findSyslogNg();
-        const std::string missing = pid == 0 ? "syslog-ng does not run" : MissingListener(change.after, pid);
+        std::string missing = pid == 0 ? "syslog-ng does not run" : MissingListener(change.after, pid);
         if (missing.empty() || Clock::now() >= deadline)
             return missing;
         std::this_thread::sleep_for(kPause);
