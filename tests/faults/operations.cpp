@@ -5,6 +5,7 @@
 #include "keloplatform/root.h"
 #include "keloplatform/torvc.h"
 #include "kelosyslog/accounting.h"
+#include "kelosyslog/dbreader.h"
 #include "kelosyslog/root.h"
 
 namespace kelo::test {
@@ -85,6 +86,17 @@ Operation Delete(const char *name, std::function<void(Fixture &)> setUp, int lef
 int SelectNewest(Fixture &fixture) {
     _SYSLOG_SQL_LIMIT_tag page{10, 5};
     return SyslogDBSelect(fixture.database, fixture.conditions, &page, nullptr, TakeId, &fixture, true);
+}
+
+// The second search runs through the statement that the first one has left.
+int SelectOnKeptConnection(Fixture &fixture) {
+    SyslogDBReader reader(fixture.database);
+    const _SYSLOG_SQL_LIMIT_tag page{2, 5};
+    for (int search = 0; search < 2; ++search) {
+        if (reader.Select(fixture.conditions, &page, nullptr, TakeId, &fixture, true) != 0)
+            return -1;
+    }
+    return 0;
 }
 
 int Count(Fixture &fixture) {
@@ -189,6 +201,8 @@ const std::vector<Operation> &Operations() {
     static const std::vector<Operation> operations = [] {
         std::vector<Operation> all = {
             Ask("SelectPage", SelectNewest, {"26", "27", "28", "29", "30", "31", "32", "33", "34", "35"}, {},
+                "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
+            Ask("SelectOnKeptConnection", SelectOnKeptConnection, {"34", "35", "34", "35"}, {},
                 "SELECT *, (SELECT max(rowid) FROM logs) totalCount FROM logs"),
             Ask("CountAll", Count, {std::to_string(kRows)}, {}),
             Ask("CountByForm", CountByForm, {"1"}, {"0"}),
