@@ -29,7 +29,7 @@ inline constexpr std::string_view kWords[] = {
     "\"quoted\"", "-minus",    "OR",     "\x01\x02", "aaaa", "aaaaaaaa",    "the",    "ABCD",     "abcd"};
 // Words with bytes that are not UTF-8, and some that SQLite or RE2 finds as these.
 inline constexpr std::string_view kFoundInOddWords[] = {"abcd", "secret", "kelvin", "denied"};
-inline constexpr std::string_view kOddWords[] = {"\xc1\241bcd",        "ſecret",  "Kelvin", "\xff\xfe secret",
-                                                 "\xed\xa0\200denied", "sshd\xe9"};
+inline constexpr std::string_view kOddWords[] = {"a\xc1\242cd",     "A\xc1\202CD",        "ſecret",  "Kelvin",
+                                                 "\xff\xfe secret", "\xed\xa0\200denied", "sshd\xe9"};
 
 } // namespace kelo::test

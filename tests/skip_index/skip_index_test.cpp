@@ -130,6 +130,36 @@ TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
     EXPECT_EQ(Execute(connection, "SELECT * FROM logs WHERE (msg GLOB '*Needle*')").rows.size(), 1U);
 }
 
+TEST_F(SkipIndexTest, FindsMessagesThatMatchByOtherBytesThanTheKeywords) {
+    const struct {
+        const char *hex; // of the message
+        const char *where;
+    } examples[] = {
+        {"c5bf656372657431", "regexpi('secret1', msg)"},     // a long s
+        {"e284aa656c76696e", "regexpi('kelvin', msg)"},      // the sign of kelvin
+        {"ff736372616d626c65", "regexpi('ÿscramble', msg)"}, // Latin-1
+        {"6265666f72650061667465726e756c", "(msg LIKE '%before%')"},
+        {"6265666f72650061667465726e756c", "(instr(msg, 'afternul') > 0)"},
+    };
+    for (const auto &[hex, where] : examples)
+        RunSql(path_, std::string("INSERT INTO logs(msg) VALUES(CAST(x'") + hex + "' AS TEXT))");
+    RunSql(path_, "PRAGMA synchronous=OFF; INSERT INTO logs(msg) SELECT msg FROM logs WHERE id <= 30000");
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    for (const auto &[hex, where] : examples) {
+        EXPECT_NE(Count(where), "0") << where;
+        EXPECT_EQ(Count(where), Count(std::string(where) + " OR 0")) << where;
+    }
+}
+
+TEST_F(SkipIndexTest, FindsRecordsThatComeBackFromACopy) {
+    fs::copy_file(path_, root_.File("copy"));
+    RunSql(path_, "DELETE FROM logs WHERE msg GLOB '*Segfault*'");
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    std::ofstream(path_, std::ios::binary | std::ios::trunc)
+        << std::ifstream(root_.File("copy"), std::ios::binary).rdbuf();
+    EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
+}
+
 TEST_F(SkipIndexTest, TrustsNoFileThatSomebodyElseMayHavePutThere) {
     ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
     const std::string bytes = ReadFile(index_);
