@@ -124,14 +124,14 @@ TEST_F(Refusals, NameTheWordOfAWrongCommandLine) {
 
 TEST_F(Refusals, SayWhyADatabaseCannotBeRead) {
     std::vector<Case> cases;
-    for (const auto &[path, reason] :
-         std::map<std::string, std::string>{{"missing", "no such file"},
-                                            {".", "folder"},
-                                            {"text", "not an SQLite database"},
-                                            {"empty", "empty"},
-                                            {"cut", "cut short"},
-                                            {"other\x1b.db", "no usable table 'logs' in it (no such table: logs)"},
-                                            {"damaged.db", "it is damaged (database disk image is malformed)"}}) {
+    for (const auto &[path, reason] : std::map<std::string, std::string>{
+             {"missing", "no such file"},
+             {".", "folder"},
+             {"text", "not an SQLite database"},
+             {"empty", "empty"},
+             {"cut", "cut short"},
+             {"other\x1b.db", "no usable table 'logs' in it (no such table: logs)"},
+             {"damaged.db", "it is damaged (database disk image is malformed)"}}) {
         for (const char *words : {"search", "count", "values host", "delete --all --yes", "search -f"})
             cases.push_back({std::string(words) + " --db '" + path + "'", 3, reason});
     }

@@ -31,7 +31,8 @@ bool SpoolKeeper::Prepare() {
     if (mkdir((path_ + "/files").c_str(), 0750) != 0 && errno != EEXIST)
         return false;
     const Folder folder(path_);
-    return folder.Write("limit", std::to_string(limits_.bytes) + " " + std::to_string(limits_.spare) + "\n", folder, "limit.new");
+    return folder.Write("limit", std::to_string(limits_.bytes) + " " + std::to_string(limits_.spare) + "\n",
+                        folder, "limit.new");
 }
 
 std::string SpoolKeeper::Step(int64_t now) {
