@@ -125,7 +125,7 @@ Candidates::Bitmap Candidates::EvaluateGrams(const Need &need, int64_t segment, 
             const size_t piece = word / kWordsPerSlice;
             // Rows behind the last piece are no concern of this step.
             among[word] &=
-                piece < static_cast<size_t>(pieces) ? slices[piece].blocks[word % kWordsPerSlice] : 0;
+                piece < static_cast<size_t>(pieces) ? slices[piece].Word(word % kWordsPerSlice) : 0;
         }
     }
     return among;

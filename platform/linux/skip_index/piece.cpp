@@ -41,8 +41,8 @@ uint64_t HashOf(std::string_view bytes, uint64_t seed) {
 
 uint32_t ChecksumOf(const Slice &slice, uint64_t fileNumber, int64_t piece, size_t gram) {
     uint64_t hash = Mixed(fileNumber, static_cast<uint64_t>(piece) * kGramBits + gram);
-    for (const uint64_t word : slice.blocks)
-        hash = Mixed(hash, word);
+    for (size_t word = 0; word < kWordsPerSlice; ++word)
+        hash = Mixed(hash, slice.Word(word));
     return static_cast<uint32_t>(Mixed(hash, fileNumber));
 }
 
@@ -75,7 +75,7 @@ std::unique_ptr<Slice[]> Piece::Slices(uint64_t fileNumber, int64_t piece) const
                 tile[block] = (*blocks_)[word * 64 + block][grams];
             Transpose(tile);
             for (size_t gram = 0; gram < tile.size(); ++gram)
-                slices[grams * 64 + gram].blocks[word] = tile[gram];
+                slices[grams * 64 + gram].SetWord(word, tile[gram]);
         }
     }
     for (size_t gram = 0; gram < kGramBits; ++gram)

@@ -3,6 +3,7 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <memory>
 #include <string_view>
 
@@ -21,10 +22,20 @@ inline constexpr size_t kBlocksPerPiece = kIdsPerPiece / kIdsPerBlock;
 inline constexpr size_t kWordsPerSlice = kBlocksPerPiece / 64;
 
 // One bit of every block of a piece, and a check sum, as it is in the file.
-struct [[gnu::packed]] Slice {
-    std::array<uint64_t, kWordsPerSlice> blocks;
+struct Slice {
+    // The bits of 64 blocks, the first one in the lowest bit. In the file they begin at multiples of four
+    // bytes.
+    uint64_t Word(size_t index) const {
+        uint64_t word = 0;
+        std::memcpy(&word, &halves[2 * index], sizeof word);
+        return word;
+    }
+    void SetWord(size_t index, uint64_t word) { std::memcpy(&halves[2 * index], &word, sizeof word); }
+
+    std::array<uint32_t, 2 * kWordsPerSlice> halves;
     uint32_t checksum;
 };
+static_assert(sizeof(Slice) == 8 * kWordsPerSlice + 4);
 inline constexpr size_t kPieceBytes = kGramBits * sizeof(Slice);
 inline constexpr size_t kSegmentBytes = kPieceBytes * kPiecesPerSegment;
 
