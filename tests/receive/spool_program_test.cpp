@@ -152,8 +152,9 @@ TEST_F(SpoolProgram, TellsFilesByWhatTheyAre) {
 TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     std::mt19937 random(7);
     constexpr int kMessages = 60'000;
+    constexpr int kKills = 12;
     int sent = 0;
-    for (int kills = 0; kills < 12; ++kills) {
+    for (int kills = 0; kills < kKills; ++kills) {
         ChildProgram receiver = Start();
         ASSERT_TRUE(receiver.AwaitName("kelosyslog"));
         const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(random() % 1500);
@@ -168,7 +169,9 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     EXPECT_TRUE(AwaitRows(receiver, kMessages)) << Rows() << " " << Counted() << receiver.Err();
     ExpectEnd(receiver);
     EXPECT_TRUE(Has(kMessages)) << Counted();
-    EXPECT_EQ(Notifications(), kMessages / 1000) << "each rule once";
+    // A kill between a notification and the note of it sends that again.
+    EXPECT_GE(Notifications(), kMessages / 1000);
+    EXPECT_LE(Notifications(), kMessages / 1000 + kKills);
 }
 
 // A turn and an orderly end: SIGTERM waits for the receiver from its start.
