@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstring>
 #include <ctime>
@@ -15,6 +16,7 @@
 
 #include "kelosyslog/logger.h"
 #include "receive/complete_databases.h"
+#include "receive/loop_time.h"
 
 namespace kelo::tool {
 namespace {
@@ -74,14 +76,6 @@ std::vector<EventSource> Receiver::AddSignals() {
     sources.push_back(loop_.AddSignal(SIGINT, stop));
     sources.push_back(loop_.AddSignal(SIGHUP, [this] { Reload(); }));
     return sources;
-}
-
-int64_t Receiver::NowMs() {
-    return std::chrono::duration_cast<std::chrono::milliseconds>(Clock::now().time_since_epoch()).count();
-}
-
-void Receiver::FireAt(EventSource &timer, int64_t time) {
-    timer.FireAt(Clock::time_point(std::chrono::milliseconds(time)));
 }
 
 void Receiver::Run(int input) {

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <chrono>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -47,8 +46,6 @@ public:
     void Run(int input);
 
 private:
-    using Clock = std::chrono::steady_clock;
-
     std::vector<EventSource> AddSignals();
     void ReceiveUntilEnd(int input);
     void Read(BlockReader &input);
@@ -63,8 +60,6 @@ private:
     void WriteState();
     void Finish();
     uint64_t Received() const;
-    static int64_t NowMs();
-    static void FireAt(EventSource &timer, int64_t time);
 
     ReceiverOptions options_;
     // First, as they load files, which may take seconds: a signal ends the program until then.

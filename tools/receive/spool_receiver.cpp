@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstring>
 #include <ctime>
@@ -15,6 +16,7 @@
 #include "base/folder.h"
 #include "kelosyslog/logger.h"
 #include "receive/complete_databases.h"
+#include "receive/loop_time.h"
 #include "receive/spool_report.h"
 
 namespace kelo::tool {
@@ -72,14 +74,6 @@ std::vector<EventSource> SpoolReceiver::AddSignals() {
     sources.push_back(loop_.AddSignal(SIGINT, stop));
     sources.push_back(loop_.AddSignal(SIGHUP, [this] { Reload(); }));
     return sources;
-}
-
-int64_t SpoolReceiver::NowMs() {
-    return std::chrono::duration_cast<std::chrono::milliseconds>(Clock::now().time_since_epoch()).count();
-}
-
-void SpoolReceiver::FireAt(EventSource &timer, int64_t time) {
-    timer.FireAt(Clock::time_point(std::chrono::milliseconds(time)));
 }
 
 void SpoolReceiver::Run() {

@@ -41,12 +41,9 @@ public:
     void Run();
 
 private:
-    using Clock = std::chrono::steady_clock;
     using Places = std::vector<SpoolPlace>;
 
     std::vector<EventSource> AddSignals();
-    static int64_t NowMs();
-    static void FireAt(EventSource &timer, int64_t time);
 
     bool LoadAll();
     void Restore(SpoolFile &file);
