@@ -74,6 +74,37 @@ TEST_F(Search, SelectsByEveryOption) {
     }
 }
 
+TEST_F(Search, PagesByIdFromBothEnds) {
+    InsertSampleLogs(logs_, 20);
+    RunSql(logs_, "DELETE FROM logs WHERE id BETWEEN 8 AND 12;"
+                  "INSERT INTO logs(id, utcsec) VALUES (9223372036854775807, 1577836900)");
+    const std::string largest = "9223372036854775807";
+    const std::pair<std::string, std::string> cases[] = {
+        {"-n 3 --before-id 14", "6 7 13 "},
+        {"-n 3 --before-id 14 -r", "13 7 6 "},
+        {"-n 3 --after-id 6 --oldest", "7 13 14 "},
+        {"-n 3 --after-id 6", "19 20 " + largest + " "},
+        {"-n 3 --after-id 6 --oldest -r", "14 13 7 "},
+        {"-n 2 --oldest --offset 6", "7 13 "},
+        {"--after-id 6 --before-id 14", "7 13 "},
+        {"--after-id 20", largest + " "},
+        {"--after-id " + largest, ""},
+        {"--before-id " + largest + " -n 1", "20 "},
+        {"--before-id 1", ""},
+        {"--before-id 14 -n 2 -H host03,host12 --oldest", "4 13 "},
+        {"--follow --after-id 20 --idle 0", largest + " "},
+        {"--follow --after-id 3 -n 2 --idle 0", "20 " + largest + " "},
+    };
+    for (const auto &[options, ids] : cases) {
+        std::string found = Run("search -o csv --no-header --fields id " + options).out;
+        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
+            found.replace(at, 2, " ");
+        EXPECT_EQ(found, ids) << options;
+    }
+    Expect("search --before-id 9223372036854775808", 2);
+    Expect("search --follow --before-id 5", 2);
+}
+
 TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
     const std::string japanese = "\xe6\x97\xa5\xe6\x9c\xac", prog = "\x1b]0;owned\x07", bad = "\xef\xbf\xbd";
     const std::string msg = "a\\b\r\nc\td \xff\xc3( \xed\xa0\x80 \xc2\x9b"

@@ -56,6 +56,18 @@ TEST_F(LogReaderTest, GivesExactPagesAndCountsOverChunksAndGaps) {
             EXPECT_TRUE(Collect(reader, {limit, offset}, true) == expected);
         }
     }
+    // Between two ids, the first that is left out and the last, from both ends.
+    for (const bool fromOldest : {false, true}) {
+        for (const uint64_t limit : {0U, 3U, 20000U}) {
+            const Page page{limit, 1, {99001, 150000}, fromOldest};
+            Ids expected;
+            for (uint64_t i = 1; i <= (limit == 0 ? 50999 : limit); ++i)
+                expected.push_back(fromOldest ? 99001 + i : 150000 - i);
+            EXPECT_TRUE(Collect(reader, page, fromOldest) == expected) << limit;
+            std::reverse(expected.begin(), expected.end());
+            EXPECT_TRUE(Collect(reader, page, !fromOldest) == expected) << limit;
+        }
+    }
     PlatformCalls::Reset();
     EXPECT_EQ(reader.Count(), newestFirst.size());
     EXPECT_LT(PlatformCalls::Texts().size(), 20U); // gaps are not searched bit by bit

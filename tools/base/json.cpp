@@ -45,6 +45,12 @@ void JsonObject::AddName(std::string_view name) {
     out_ += layout_ == Layout::kLineEach ? ": " : ":";
 }
 
+void JsonObject::End() {
+    if (separator_ == '{')
+        out_ += '{';
+    out_ += layout_ == Layout::kLineEach ? "\n}\n" : "}";
+}
+
 void JsonObject::Add(std::string_view name, std::string_view text) {
     AddName(name);
     AppendJsonString(out_, text);

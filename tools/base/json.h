@@ -17,7 +17,7 @@ enum class JsonTexts { kUtf8, kAscii };
 // UTF-8 become U+FFFD, and fractions have up to two decimals.
 std::string WriteJsonLine(const Json::Value &value, JsonTexts texts = JsonTexts::kUtf8);
 
-// Appends an object of at least one member, in the order of the calls; Json::Value would sort them.
+// Appends an object with its members in the order of the calls; Json::Value would sort them.
 class JsonObject {
 public:
     enum class Layout { kOneLine, kLineEach };
@@ -26,7 +26,7 @@ public:
     void Add(std::string_view name, std::string_view text);
     // A value that is JSON: a number, true, null.
     void AddJson(std::string_view name, std::string_view json);
-    void End() { out_ += layout_ == Layout::kLineEach ? "\n}\n" : "}"; }
+    void End();
 
 private:
     void AddName(std::string_view name);

@@ -43,7 +43,8 @@ public:
             format_(log);
             lastId_ = std::max(lastId_, log.id);
         };
-        return reader_.ReadPage({options.showAll ? 0 : options.lines, 0}, true, format, print_);
+        const Page page{options.showAll ? 0 : options.lines, 0, {.first = options.firstId}};
+        return reader_.ReadPage(page, true, format, print_);
     }
 
     uint64_t PrintNews() {

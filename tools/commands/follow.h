@@ -11,6 +11,7 @@ namespace kelo::tool {
 struct FollowOptions {
     bool showAll = false;              // of the records that exist at the start
     uint64_t lines = 10;               // else this many of the newest
+    uint64_t firstId = 1;              // and none with a smaller id
     std::optional<uint64_t> idleSec;   // stop after so many seconds without a new record
     std::optional<int64_t> until = {}; // stop when this second (of the epoch) has passed
 };

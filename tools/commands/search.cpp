@@ -1,6 +1,7 @@
 // kelosyslog search: prints records.
 
 #include <ctime>
+#include <limits>
 
 #include "base/errors.h"
 #include "cli/exit_status.h"
@@ -15,18 +16,23 @@ namespace {
 
 constexpr const char *kFooter =
     "Logs are printed in the order in which they arrived, oldest first. Without -n all are printed;\n"
-    "-n takes the newest.\n\n"
+    "-n takes the newest, or with --oldest the oldest.\n\n"
+    "To page through logs while more arrive, ask for those before the smallest id of the page before:\n"
+    "ids stay, while --offset counts from a newest log that changes. The logs around log 4711 are\n"
+    "--before-id 4712 -n 10 and --after-id 4711 --oldest -n 10.\n\n"
     "Examples:\n"
     "  kelosyslog search -n 20                              the newest 20 logs\n"
     "  kelosyslog search -p err --since yesterday           errors and worse since yesterday\n"
     "  kelosyslog search -H 'nas*,!nas3' -g 'disk -smart'   all NAS but one, \"disk\" without \"smart\"\n"
     "  kelosyslog search -p '!debug' -f                     follow, without debug logs\n"
+    "  kelosyslog search -p err -n 100 --before-id 4711     the page before log 4711\n"
     "  kelosyslog search --log smbxfer -n 50 -r             the newest file transfers first\n"
     "  kelosyslog search --since today -o csv > today.csv   everything of today, for a spreadsheet\n\n"
     "Exit status: 0 found, 1 nothing matched, 2 usage, 3 database, 4 output.";
 
 // A page and its sum stay below what one statement can skip.
 constexpr uint64_t kMaxLines = 2000000000;
+constexpr uint64_t kMaxId = std::numeric_limits<int64_t>::max();
 
 struct Options {
     LogTableOptions table;
@@ -34,10 +40,17 @@ struct Options {
     OutputOptions output;
     std::string lines;
     std::string offset;
+    std::string beforeId;
+    std::string afterId;
     std::string idle;
+    bool fromOldest = false;
     bool newestFirst = false;
     bool follow = false;
 };
+
+uint64_t FirstId(const Options &options) {
+    return options.afterId.empty() ? 1 : ParseNumber("--after-id", options.afterId, 0, kMaxId) + 1;
+}
 
 Page ParsePage(const Options &options) {
     Page page;
@@ -45,14 +58,20 @@ Page ParsePage(const Options &options) {
         page.limit = ParseNumber("--lines", options.lines, 1, kMaxLines);
     if (!options.offset.empty())
         page.offset = ParseNumber("--offset", options.offset, 0, kMaxLines);
+    if (!options.beforeId.empty())
+        page.range.last = ParseNumber("--before-id", options.beforeId, 1, kMaxId) - 1;
+    page.range.first = FirstId(options);
+    page.fromOldest = options.fromOldest;
     return page;
 }
 
 FollowOptions ParseFollow(const Options &options, int64_t now) {
-    if (options.newestFirst || !options.offset.empty())
-        throw UsageError("--follow: goes neither with --reverse nor with --offset");
+    if (options.newestFirst || options.fromOldest || !options.offset.empty() || !options.beforeId.empty())
+        throw UsageError("--follow: goes neither with --reverse, --oldest, --offset nor --before-id");
     FollowOptions follow;
-    follow.showAll = options.lines == "all" || (options.lines.empty() && !options.filter.since.empty());
+    follow.showAll = options.lines == "all" ||
+                     (options.lines.empty() && !(options.filter.since + options.afterId).empty());
+    follow.firstId = FirstId(options);
     if (!options.lines.empty() && options.lines != "all")
         follow.lines = ParseNumber("--lines", options.lines, 0, kMaxLines);
     if (!options.idle.empty())
@@ -102,10 +121,18 @@ void AddSearch(Program &program) {
     const std::string group = "How many";
     command.AddText("-n,--lines", options->lines, "N", "The newest N logs, or 'all'").Group(group);
     command.AddText("--offset", options->offset, "N", "Skip the N newest logs first").Group(group);
+    command
+        .AddText("--before-id", options->beforeId, "ID", "Only logs that arrived before the log with this id")
+        .Group(group);
+    command.AddText("--after-id", options->afterId, "ID", "Only logs that arrived after the log with this id")
+        .Group(group);
+    command.AddFlag("--oldest", options->fromOldest, "-n and --offset count from the oldest log")
+        .Group(group);
     command.AddFlag("-r,--reverse", options->newestFirst, "Newest first").Group(group);
     command
         .AddFlag("-f,--follow", options->follow,
-                 "Print the newest 10 logs (or -n; all with --since) and then what arrives, until --until "
+                 "Print the newest 10 logs (or -n; all with --since or --after-id) and then what arrives, "
+                 "until --until "
                  "has passed, --idle has, or nobody reads any more")
         .Group(group);
     command.AddText("--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")

@@ -70,8 +70,9 @@ LogReader::Scanned LogReader::Select(const IdRange &range, bool oldestFirst, con
     return {walker.rows, walker.lastId};
 }
 
-uint64_t LogReader::IdFromNewest(uint64_t index) const {
-    return Select({}, false, {1, index}, [](const Log &) {}).lastId;
+// The id of the first log of a page of one.
+uint64_t LogReader::IdAt(const Page &page) const {
+    return Select(page.range, page.fromOldest, page, [](const Log &) {}).lastId;
 }
 
 uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
@@ -121,21 +122,25 @@ uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandle
                              const ChunkHandler &chunkDone) const {
     if (page.limit != 0 && page.limit <= kPageRows) {
         std::vector<Log> logs;
-        Select({}, false, page, [&](const Log &log) { logs.push_back(log); });
-        if (oldestFirst)
+        Select(page.range, page.fromOldest, page, [&](const Log &log) { logs.push_back(log); });
+        if (oldestFirst != page.fromOldest)
             std::reverse(logs.begin(), logs.end());
         std::for_each(logs.begin(), logs.end(), handle);
         chunkDone();
         return logs.size();
     }
-    const uint64_t last = IdFromNewest(page.offset);
-    if (last == 0)
+    const auto idAt = [&](uint64_t index) { return IdAt({1, index, page.range, page.fromOldest}); };
+    const uint64_t near = idAt(page.offset);
+    if (near == 0)
         return 0;
-    if (!oldestFirst)
-        return Scan({1, last}, false, page.limit, handle, chunkDone);
-    // Too many to reverse in memory: find where the page begins and scan forward.
-    const uint64_t first = page.limit == 0 ? 1 : IdFromNewest(page.offset + page.limit - 1);
-    return Scan({std::max<uint64_t>(first, 1), last}, true, 0, handle, chunkDone);
+    IdRange rest = page.range;
+    (page.fromOldest ? rest.first : rest.last) = near;
+    if (oldestFirst == page.fromOldest)
+        return Scan(rest, oldestFirst, page.limit, handle, chunkDone);
+    // Too many to reverse in memory: find where the page ends and scan from there.
+    if (const uint64_t far = page.limit == 0 ? 0 : idAt(page.offset + page.limit - 1); far != 0)
+        (page.fromOldest ? rest.last : rest.first) = far;
+    return Scan(rest, oldestFirst, 0, handle, chunkDone);
 }
 
 uint64_t LogReader::CountWith(Conditions conditions) const {

@@ -22,11 +22,13 @@ struct IdRange {
     uint64_t last = std::numeric_limits<int64_t>::max();
 };
 
-// A page counted from the newest log: `limit` logs (0 for all) after skipping the `offset` newest. Both, and
-// their sum, are below 2^32.
+// A page of the logs with an id in `range`, counted from the newest or the oldest of them: `limit` logs (0
+// for all) after skipping `offset`. Both, and their sum, are below 2^32.
 struct Page {
     uint64_t limit = 0;
     uint64_t offset = 0;
+    IdRange range = {};
+    bool fromOldest = false;
 };
 
 // Reads the logs of one table that meet the conditions; in the order of their ids, which is the order in
@@ -52,9 +54,11 @@ public:
     const Conditions &Selected() const { return conditions_; }
 
     // The id of the `index`-th newest selected log (0 is the newest); 0 when there are not that many.
-    uint64_t IdFromNewest(uint64_t index) const;
+    uint64_t IdFromNewest(uint64_t index) const { return IdAt({1, index}); }
     // The smallest selected id in `range`; 0 when there is none.
     uint64_t FirstId(const IdRange &range) const { return EndId(range, true); }
+    // And the largest.
+    uint64_t LastId(const IdRange &range) const { return EndId(range, false); }
 
     // Hands the logs with an id in `range` to `handle`, oldest first or newest first, up to `limit` (0 for
     // all), and calls `chunkDone` after each statement. Returns how many.
@@ -79,6 +83,7 @@ private:
     };
 
     Scanned Select(const IdRange &range, bool oldestFirst, const Page &page, const LogHandler &handle) const;
+    uint64_t IdAt(const Page &page) const;
     uint64_t EndId(const IdRange &range, bool isFirst) const;
     uint64_t CountWith(Conditions conditions) const;
 

@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 
 #include <cstdlib>
+#include <exception>
 #include <utility>
 
 #include "keloplatform/kelodb.h"
@@ -13,6 +14,27 @@ namespace {
 
 struct ResultFreer {
     void operator()(DBResult_tag *result) const { KELODBFreeResult(result); }
+};
+
+// The aggregate function that hands rows out.
+constexpr const char *kEach = "kelo_each";
+
+struct RowTaker {
+    const ReadOnlyQuery::RowHandler &handle;
+    std::exception_ptr exception = nullptr;
+
+    static void Take(sqlite3_context *context, int, sqlite3_value **values) {
+        auto &taker = *static_cast<RowTaker *>(sqlite3_user_data(context));
+        if (taker.exception != nullptr)
+            return;
+        try {
+            taker.handle(ReadOnlyQuery::Values(values));
+        } catch (...) {
+            taker.exception = std::current_exception();
+            sqlite3_result_error(context, "stopped", -1);
+        }
+    }
+    static void End(sqlite3_context *) {}
 };
 
 } // namespace
@@ -74,6 +96,35 @@ std::vector<std::string> ReadOnlyQuery::Column(const std::string &sql, const std
     for (Row &row : Rows(sql, {column}))
         values.push_back(std::move(row.front()));
     return values;
+}
+
+void ReadOnlyQuery::ForEach(const std::string &columns, const std::string &from,
+                            const RowHandler &handle) const {
+    RowTaker taker{handle};
+    sqlite3 *db = KELODBInternalDBHdlGet(connection_.get());
+    sqlite3_create_function(db, kEach, -1, SQLITE_UTF8, &taker, nullptr, RowTaker::Take, RowTaker::End);
+    try {
+        Rows(std::string("SELECT ") + kEach + "(" + columns + ") FROM " + from, {});
+    } catch (const SqliteError &) {
+        if (taker.exception == nullptr)
+            throw;
+    }
+    if (taker.exception != nullptr)
+        std::rethrow_exception(taker.exception);
+}
+
+std::string_view ReadOnlyQuery::Values::Text(int column) const {
+    const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(values_[column]));
+    return text == nullptr
+               ? std::string_view()
+               : std::string_view(text, static_cast<size_t>(sqlite3_value_bytes(values_[column])));
+}
+
+std::optional<int64_t> ReadOnlyQuery::Values::Number(int column) const {
+    const int type = sqlite3_value_type(values_[column]);
+    return type == SQLITE_INTEGER || type == SQLITE_FLOAT
+               ? std::optional(sqlite3_value_int64(values_[column]))
+               : std::nullopt;
 }
 
 int64_t ReadOnlyQuery::Number(const std::string &sql) const {

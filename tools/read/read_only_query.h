@@ -2,9 +2,11 @@
 
 #include <chrono>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "base/sqlite.h"
@@ -12,6 +14,7 @@
 #include "read/log_table.h"
 
 struct DBConnect_tag;
+struct sqlite3_value;
 
 namespace kelo::tool {
 
@@ -35,6 +38,11 @@ public:
     // The first row's column "value" as a number; 0 without one.
     int64_t Number(const std::string &sql) const;
     bool HasTable(const std::string &table) const;
+    // Passes each row of "SELECT `columns` FROM `from`" to `handle` while the statement runs, so that no
+    // result is kept. What `handle` throws ends it and is passed on.
+    class Values;
+    using RowHandler = std::function<void(const Values &row)>;
+    void ForEach(const std::string &columns, const std::string &from, const RowHandler &handle) const;
     // What the index for keywords knows.
     KELODBSkipIndex SkipIndex() const;
     // Throws DatabaseError if the connection's table is a view or virtual: reading it can take any time, and
@@ -51,6 +59,20 @@ private:
     std::chrono::milliseconds timeout_{0};
     mutable std::chrono::steady_clock::time_point deadline_; // of the statement that runs
     std::unique_ptr<DBConnect_tag, Closer> connection_;
+};
+
+// The values of a row while its handler runs.
+class ReadOnlyQuery::Values {
+public:
+    explicit Values(sqlite3_value **values) : values_(values) {}
+
+    // The bytes of a text, and a number as text; "" for NULL.
+    std::string_view Text(int column) const;
+    // A number, without its fraction; nothing for other types.
+    std::optional<int64_t> Number(int column) const;
+
+private:
+    sqlite3_value **values_;
 };
 
 } // namespace kelo::tool

@@ -201,26 +201,29 @@ std::optional<Moment> ParseCalendar(std::string_view text, int64_t now) {
     return Moment{isUtc ? timegm(&*day) : LocalSecond(*day, now), !clock.has_value()};
 }
 
+// The number and unit at the front of a text, in seconds.
+std::optional<int64_t> TakeSpan(Scanner &scanner) {
+    const std::optional<int64_t> number = scanner.TakeNumber(1, 10);
+    scanner.SkipBlanks();
+    const std::string_view name = scanner.TakeWord();
+    int64_t unit = 0;
+    for (const Unit &known : kUnits)
+        unit = known.name == name ? known.seconds : unit;
+    scanner.SkipBlanks();
+    return number && unit != 0 && *number <= kLargestSec / unit ? std::optional(*number * unit)
+                                                                : std::nullopt;
+}
+
 std::optional<Moment> ParseRelative(std::string_view text, int64_t now) {
     Scanner scanner(text);
     const bool isFuture = scanner.Take("+");
     const bool hasSign = isFuture || scanner.Take("-");
     int64_t sum = 0;
     bool isAgo = false;
-    for (scanner.SkipBlanks(); !scanner.AtEnd() && !isAgo; scanner.SkipBlanks()) {
-        const std::optional<int64_t> number = scanner.TakeNumber(1, 10);
-        scanner.SkipBlanks();
-        const std::string_view name = scanner.TakeWord();
-        int64_t unit = 0;
-        for (const Unit &known : kUnits)
-            unit = known.name == name ? known.seconds : unit;
-        if (!number || unit == 0 || *number > kLargestSec / unit)
+    for (scanner.SkipBlanks(); !scanner.AtEnd() && !isAgo; isAgo = !hasSign && scanner.Take("ago")) {
+        const std::optional<int64_t> span = TakeSpan(scanner);
+        if (!span || (sum += *span) > kLargestSec)
             return std::nullopt;
-        sum += *number * unit;
-        if (sum > kLargestSec)
-            return std::nullopt;
-        scanner.SkipBlanks();
-        isAgo = !hasSign && scanner.Take("ago");
     }
     scanner.SkipBlanks();
     if (sum == 0 || !scanner.AtEnd())
@@ -253,6 +256,17 @@ Moment ParseTimeExpression(const std::string &option, const std::string &text, i
     throw UsageError(option + ": '" + text +
                      "' is not a time; write for example 2020-01-02, '2020-01-02 10:11', yesterday, 1h, "
                      "'2 days ago' or @1577836800");
+}
+
+std::optional<int64_t> ParseTimeSpan(const std::string &text) {
+    Scanner scanner(text);
+    int64_t sum = 0;
+    for (scanner.SkipBlanks(); !scanner.AtEnd();) {
+        const std::optional<int64_t> span = TakeSpan(scanner);
+        if (!span || (sum += *span) > kLargestSec)
+            return std::nullopt;
+    }
+    return sum > 0 ? std::optional(sum) : std::nullopt;
 }
 
 } // namespace kelo::tool

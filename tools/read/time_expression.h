@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 
 namespace kelo::tool {
@@ -25,5 +26,9 @@ struct Moment {
 // Throws UsageError that names `option` and `text` for anything else, a day that its month does not have
 // included.
 Moment ParseTimeExpression(const std::string &option, const std::string &text, int64_t now);
+
+// Reads a length of time in the same units ("60s", "15min", "1h 30min", "1d"), in seconds. Nothing for
+// anything else, 0 included.
+std::optional<int64_t> ParseTimeSpan(const std::string &text);
 
 } // namespace kelo::tool
