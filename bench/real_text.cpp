@@ -88,7 +88,9 @@ void Make(const std::string &path, int rows) {
         const std::string host = std::to_string(writer.Below(50));
         const std::string values[] = {"server" + host,
                                       "192.168.1." + host,
-                                      writer.Below(40) == 0 ? "err" : "info",
+                                      number % 20'000 == 3    ? "emerg"
+                                      : writer.Below(40) == 0 ? "err"
+                                                              : "info",
                                       std::to_string(moment),
                                       FormattedTime(moment, "%Y/%m/%d"),
                                       FormattedTime(moment, "%H:%M:%S"),

@@ -124,5 +124,41 @@ TEST_F(Executing, InsertsTheSameByARepeatedFormAsSQLite) {
     EXPECT_EQ(Run(inserts.back()).error, "no such table: t");
 }
 
+// The values of an indexed column are found by jumps; they and their order must be as without.
+TEST_F(Executing, FindsTheSameDifferentValuesAsSQLite) {
+    const std::string rows = "WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 500) "
+                             "INSERT INTO logs(host) SELECT ";
+    const struct {
+        const char *column;
+        const char *index;
+    } tables[] = {{"host TEXT", "host"},     {"host TEXT", "host DESC"},
+                  {"host TEXT", "host, id"}, {"host TEXT COLLATE NOCASE", "host"},
+                  {"host INTEGER", "host"},  {"host", "host"},
+                  {"host TEXT", "msg"}};
+    for (const auto &[column, index] : tables) {
+        const std::string path = root_.File("values.db");
+        fs::remove(path);
+        RunSql(path, std::string("CREATE TABLE logs(id INTEGER PRIMARY KEY, ") + column +
+                         ", msg TEXT); CREATE INDEX i ON logs(" + index + ");" + rows +
+                         "iif(i % 7 = 0, NULL, iif(i % 5 = 0, i % 3, 'b' || (i % 3))) FROM n;" + rows +
+                         "iif(i % 2, 'B1', iif(i % 3, x'6231', '')) FROM n;" + rows + "i / 3.0 FROM n");
+        const Connection connection = ConnectTo(path);
+        for (const char *sql :
+             {"SELECT host FROM logs GROUP BY host ORDER BY host asc", "SELECT DISTINCT host FROM logs"}) {
+            for (const auto &page : std::vector<std::optional<std::pair<unsigned, unsigned>>>{
+                     {}, {{3, 1}}, {{0, 4}}, {{9, 9999}}}) {
+                const Outcome jumping = Execute(connection, sql, {"host"}, page);
+                const Outcome reading = Execute(connection, std::string(sql) + " LIMIT 100000", {"host"});
+                Rows expected = reading.rows;
+                const size_t skipped = page ? std::min<size_t>(page->second, expected.size()) : 0;
+                expected.erase(expected.begin(), expected.begin() + static_cast<std::ptrdiff_t>(skipped));
+                if (page && page->first != 0)
+                    expected.resize(std::min<size_t>(page->first, expected.size()));
+                EXPECT_EQ(jumping.rows, expected) << column << ", " << index << ": " << sql;
+            }
+        }
+    }
+}
+
 } // namespace
 } // namespace kelo::test

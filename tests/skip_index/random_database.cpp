@@ -40,6 +40,22 @@ void RandomDatabase::Begin(const std::string &path, long long firstId) {
     RunSql(path, "INSERT INTO sqlite_sequence VALUES('logs', " + std::to_string(firstId - 1) + ")");
 }
 
+// Rows come in the order of their times, but for a clock that is set, and odd values.
+std::string RandomDatabase::Times() {
+    time_ += random_.OneIn(200) ? random_.Below(4'000) : random_.Below(3);
+    if (random_.OneIn(3'000))
+        time_ -= std::min<size_t>(time_ - 1'600'000'000, random_.Below(20'000));
+    const size_t day = (time_ - 1'600'000'000) / 5'000;
+    std::string second = std::to_string(time_);
+    std::string date =
+        "'2020/0" + std::to_string(1 + day / 28 % 9) + "/" + std::to_string(10 + day % 28 % 20) + "'";
+    if (random_.OneIn(20'000))
+        second = random_.OneIn(2) ? "NULL" : random_.OneIn(2) ? "'soon'" : "1600000000.5";
+    if (random_.OneIn(20'000))
+        date = random_.OneIn(2) ? "NULL" : random_.OneIn(2) ? "'2020/1/3'" : "x'323032302f30312f3131'";
+    return date + "," + second;
+}
+
 std::string RandomDatabase::Message() {
     std::string text;
     for (size_t words = random_.Below(5); words > 0; --words)
@@ -63,15 +79,14 @@ void RandomDatabase::Append(size_t count) {
             value = random_.OneIn(2) ? "x'" + Hex(text) + "'" : std::to_string(random_.Below(1u << 31));
         values.append(values.empty() ? "" : ",").append("('host").append(std::to_string(random_.Below(20)));
         values.append("','prog").append(std::to_string(random_.Below(9))).append("','");
-        values.append(random_.OneIn(9) ? "err" : "info").append("','2020/01/0");
-        values.append(std::to_string(random_.Below(9)))
-            .append("',")
-            .append(std::to_string(++time_))
+        values.append(random_.OneIn(3'000) ? "emerg" : random_.OneIn(9) ? "err" : "info");
+        values.append(random_.OneIn(900) ? "','kern'," : "','daemon',")
+            .append(Times())
             .append(",")
             .append(value)
             .append(")");
         if (i % 200 == 199 || i + 1 == count) {
-            db.Run("INSERT INTO logs(host,prog,llevel,ldate,utcsec,msg) VALUES" + values);
+            db.Run("INSERT INTO logs(host,prog,llevel,fac,ldate,utcsec,msg) VALUES" + values);
             values.clear();
             topic_ = {random_.Of(kWords), random_.Of(kWords), random_.Of(kWords)};
         }
@@ -136,8 +151,16 @@ void RandomDatabase::DamageIndex() {
     WriteFile(index_, bytes);
 }
 
+// Most searches are to have an index.
 std::string RandomDatabase::Change() {
-    switch (random_.Below(18)) {
+    std::string done = ChangeSomething();
+    if (random_.OneIn(2))
+        KELODBSkipIndexBuild(path_.c_str(), random_.OneIn(8) ? 1 : 0);
+    return done;
+}
+
+std::string RandomDatabase::ChangeSomething() {
+    switch (random_.Below(13)) {
     case 0:
         Delete();
         return "delete";
@@ -168,15 +191,12 @@ std::string RandomDatabase::Change() {
         KELODBSkipIndexBuild(path_.c_str(), 1);
         return "build a part";
     case 9:
-    case 10:
-    case 11:
-    case 12:
-    case 13:
         KELODBSkipIndexBuild(path_.c_str(), 0);
         return "build";
     default:
-        Append(random_.Below(random_.OneIn(4) ? 20'000 : 500));
-        Delete();
+        Append(random_.Below(random_.OneIn(3) ? 20'000 : 500));
+        if (random_.OneIn(2))
+            Delete();
         return "append";
     }
 }

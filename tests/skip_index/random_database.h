@@ -21,7 +21,9 @@ public:
     std::string PartOfMessage();
 
 private:
+    std::string ChangeSomething();
     std::string Message();
+    std::string Times();
     void Append(size_t count);
     void Begin(const std::string &path, long long firstId);
     void Delete();

@@ -70,12 +70,14 @@ std::string Keyword(Random &random, const std::function<std::string()> &part) {
 // Conditions as a caller writes them by hand.
 _SYSLOG_SQL_COND_tag RandomCondition(Random &random, const std::function<std::string()> &part) {
     const std::string id = std::to_string(131'072 * 3 - 40'000 + random.Below(100'000));
-    switch (random.Below(8)) {
+    switch (random.Below(9)) {
     case 7:
         return {SYSLOG_ATTRI_UTCSEC,
                 random.OneIn(2) ? SYSLOG_OP_GE : SYSLOG_OP_LE,
-                std::to_string(1'600'000'000 + random.Below(100'000)),
+                std::to_string(1'600'000'000 + random.Below(200'000)),
                 {}};
+    case 8:
+        return {SYSLOG_ATTRI_LLEVEL, SYSLOG_OP_EQ, "emerg", {{SYSLOG_ATTRI_FAC, SYSLOG_OP_EQ, "kern", {}}}};
     case 0:
         return {SYSLOG_ATTRI_MSG, SYSLOG_OP_LIKE, "*" + part() + "*", {}};
     case 1:
@@ -106,8 +108,11 @@ RandomSearch MakeRandomSearch(Random &random, const std::function<std::string()>
     RandomSearch search;
     search.keyword = random.OneIn(10) ? "" : Keyword(random, part);
     const auto sometimes = [&](const char *text) { return random.OneIn(8) ? text : ""; };
-    LogSearchCondListGen(sometimes("host3,host5"), sometimes("err"), "", sometimes("prog2"), search.keyword,
-                         sometimes("2020/01/03"), sometimes("2020/01/06"), search.conditions);
+    const std::string from = "2020/01/" + std::to_string(10 + random.Below(20));
+    const std::string to = "2020/0" + std::to_string(1 + random.Below(3)) + "/15";
+    LogSearchCondListGen(sometimes("host3,host5"), sometimes(random.OneIn(2) ? "emerg,crit" : "err"),
+                         sometimes(random.OneIn(2) ? "kern" : "daemon,lpr"), sometimes("prog2"),
+                         search.keyword, sometimes(from.c_str()), sometimes(to.c_str()), search.conditions);
     while (random.OneIn(4))
         search.conditions.push_back(RandomCondition(random, part));
     if (random.OneIn(2))

@@ -68,11 +68,13 @@ class SkipIndexTest : public testing::Test {
 protected:
     SkipIndexTest() {
         CreateLogDatabase(path_);
-        RunSql(path_,
-               "PRAGMA synchronous=OFF; WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < " +
-                   std::to_string(kRows) +
-                   ") INSERT INTO logs(host, llevel, msg) SELECT 'host' || (i % 3), 'info', "
-                   "'request ' || i || iif(i % 20000 = 7, ' Segfault', '') FROM n");
+        RunSql(
+            path_,
+            "PRAGMA synchronous=OFF; WITH n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < " +
+                std::to_string(kRows) +
+                ") INSERT INTO logs(host, llevel, fac, utcsec, ldate, msg) SELECT 'host' || (i % 3), 'info', "
+                "'daemon', i, printf('2020/01/%02d', i / 10000), "
+                "'request ' || i || iif(i % 20000 = 7, ' Segfault', '') FROM n");
     }
     std::string Count(const std::string &where) const {
         const Outcome outcome =
@@ -93,7 +95,8 @@ protected:
 // A changed message, which the index does not notice, shows whether a statement uses it.
 TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
     ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
-    RunSql(path_, "UPDATE logs SET msg = 'hidden Needle [a] 100%' WHERE id = 5000");
+    RunSql(path_, "UPDATE logs SET msg = 'hidden Needle [a] 100%', llevel = 'alert', fac = 'lpr', "
+                  "utcsec = 500000, ldate = '2021/01/01' WHERE id = 5000");
     const struct {
         const char *where;
         bool isServed;
@@ -107,6 +110,10 @@ TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
         {"((msg LIKE '%needle%') AND host = 'host2')", true},
         {"(msg LIKE '%needle%' OR msg LIKE '%absent%')", true},
         {"(msg LIKE '%needle%' OR host = 'absent')", false},
+        {"(llevel = 'alert') AND (1)", true},
+        {"(fac = 'lpr' OR llevel = 'crit' OR msg LIKE '%needle%')", true},
+        {"host = 'host2' AND fac = 'lpr'", true},
+        {"llevel IS 'alert'", false},
         {"(msg LIKE '%need%le%' AND ifnull(NOT msg LIKE '%absent%', 1))", true},
         {"regexpi('needle|absent', msg)", true},
         {"regexp('(Need(le|ing)|x+Absent) ', msg)", true},
@@ -124,7 +131,19 @@ TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
     };
     for (const auto &[where, isServed] : examples)
         EXPECT_EQ(Count(where) != Count(std::string(where) + " OR 0"), isServed) << where;
+    const struct {
+        const char *where;
+        bool isServed;
+    } pages[] = {
+        {"(utcsec > 400000)", true},   {"(ldate = '2021/01/01' OR utcsec >= 400000)", true},
+        {"(ldate >= '2021')", false},  {"utcsec + 0 >= 400000", false},
+        {"utcsec >= '400000'", false},
+    };
     const Connection connection = ConnectTo(path_);
+    for (const auto &[where, isServed] : pages) {
+        const std::string sql = std::string("SELECT * FROM logs WHERE ") + where + " ORDER BY id DESC";
+        EXPECT_EQ(Execute(connection, sql, {}, {{10, 0}}).rows.empty(), isServed) << where;
+    }
     Execute(connection,
             "BEGIN"); // an older snapshot may have rows that were deleted before the index saw them
     EXPECT_EQ(Execute(connection, "SELECT * FROM logs WHERE (msg GLOB '*Needle*')").rows.size(), 1U);
@@ -249,6 +268,9 @@ TEST_F(SkipIndexTest, IsNotMadeWhereIdsMayComeBack) {
           "t;" +
               rows + "INSERT INTO t(msg) SELECT 'x' FROM n;",
           "CREATE VIRTUAL TABLE logs USING fts4(id, msg);" + insert,
+          "CREATE TABLE logs(id INTEGER PRIMARY KEY AUTOINCREMENT, llevel TEXT COLLATE NOCASE, fac TEXT, "
+          "utcsec INTEGER, ldate TEXT, msg TEXT);" +
+              insert,
           "PRAGMA encoding='UTF-16';CREATE TABLE logs(id INTEGER PRIMARY KEY AUTOINCREMENT, msg TEXT);" +
               insert}) {
         const std::string path = root_.File("other.db");

@@ -7,6 +7,7 @@
 
 #include "common/failure.h"
 #include "db/connection.h"
+#include "db/distinct_values.h"
 #include "db/indexed_search.h"
 #include "db/raise_error.h"
 #include "db/result.h"
@@ -15,6 +16,7 @@
 
 using kelo::platform::PageBounds;
 using kelo::platform::RaiseError;
+using kelo::platform::RunDistinctValues;
 using kelo::platform::RunIndexedSearch;
 using kelo::platform::SelectCache;
 using kelo::platform::SingleStatement;
@@ -173,11 +175,18 @@ bool RunAndKeep(DBConnect_tag &connection, const char *sql, const SelectCache::K
     return HandOver(connection, std::move(rows), result);
 }
 
+// Runs a statement in another way than SQLite would, with the same result; nothing if none is known.
+std::optional<bool> RunInOtherWay(sqlite3 *db, const char *sql, const PageBounds *page, bool wantsRows,
+                                  Rows &rows) {
+    const auto isFound = RunIndexedSearch(db, sql, page, wantsRows, rows);
+    return isFound || !wantsRows ? isFound : RunDistinctValues(db, sql, page, rows);
+}
+
 bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
     if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
         return *isInserted;
     Rows rows;
-    if (const auto isFound = RunIndexedSearch(connection.db, sql, nullptr, result != nullptr, rows))
+    if (const auto isFound = RunInOtherWay(connection.db, sql, nullptr, result != nullptr, rows))
         return *isFound && HandOver(connection, std::move(rows), result);
     const SelectCache::Key key{sql, SelectCache::kNoLimit};
     if (result != nullptr) {
@@ -208,7 +217,7 @@ bool BoundedText(sqlite3 *db, const char *sql, const PageBounds &page, std::stri
 
 bool RunPage(DBConnect_tag &connection, const char *sql, const PageBounds &page, DBResult_tag **result) {
     Rows rows;
-    if (const auto isFound = RunIndexedSearch(connection.db, sql, &page, result != nullptr, rows))
+    if (const auto isFound = RunInOtherWay(connection.db, sql, &page, result != nullptr, rows))
         return *isFound && HandOver(connection, std::move(rows), result);
     const SelectCache::Key key{sql, page.limit};
     if (result != nullptr && IsShort(page)) {

@@ -8,6 +8,7 @@
 
 #include "db/raise_error.h"
 #include "db/statement.h"
+#include "db/transaction.h"
 #include "skip_index/search_plan.h"
 
 namespace kelo::platform {
@@ -18,30 +19,6 @@ using Order = SearchText::Order;
 
 // More rows are deleted by the statement as it is.
 constexpr size_t kMostDeleted = 50'000;
-
-// A transaction that is rolled back unless it is committed.
-class Transaction {
-public:
-    Transaction(sqlite3 *db, const char *begin) : db_(db), isOpen_(Run(begin)) {}
-    ~Transaction() {
-        if (isOpen_)
-            Run("ROLLBACK");
-    }
-    Transaction(const Transaction &) = delete;
-    Transaction &operator=(const Transaction &) = delete;
-
-    bool IsOpen() const { return isOpen_; }
-    bool Commit() {
-        isOpen_ = !Run("COMMIT");
-        return !isOpen_;
-    }
-
-private:
-    bool Run(const char *sql) { return sqlite3_exec(db_, sql, nullptr, nullptr, nullptr) == SQLITE_OK; }
-
-    sqlite3 *db_;
-    bool isOpen_;
-};
 
 // A statement over ranges of ids: ?1 and ?2 are the range, ?3 the most rows.
 class RangeStatement {

@@ -5,15 +5,10 @@
 #include <memory>
 #include <optional>
 
+#include "db/page_bounds.h"
 #include "db/result.h"
 
 namespace kelo::platform {
-
-// Rows to skip, and then to take at most; a limit of 0 means all.
-struct PageBounds {
-    unsigned int limit;
-    unsigned int offset;
-};
 
 // Runs a search, count or deletion by the skip index of the database, or a page of a range of times without a
 // sort, with the result of the statement as it is. `page` is null for a statement without bounds, and `rows`

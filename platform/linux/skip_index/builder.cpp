@@ -73,6 +73,41 @@ void Report(const std::string &dbPath, const char *reason) {
            reason);
 }
 
+// False if there is no memory.
+bool ReadText(sqlite3_stmt *rows, int column, std::string_view &text) {
+    const auto *bytes = reinterpret_cast<const char *>(sqlite3_column_text(rows, column));
+    text = {bytes != nullptr ? bytes : "", static_cast<size_t>(sqlite3_column_bytes(rows, column))};
+    return bytes != nullptr || sqlite3_column_type(rows, column) == SQLITE_NULL;
+}
+
+// No condition finds a NULL, and other values than the usual ones may be found by any.
+TimeSpan SecondOf(sqlite3_stmt *rows, int column) {
+    const int type = sqlite3_column_type(rows, column);
+    if (type != SQLITE_INTEGER)
+        return type == SQLITE_NULL ? TimeSpan{} : kAllTimes;
+    const int64_t second = sqlite3_column_int64(rows, column);
+    return {second, second};
+}
+
+// The same for a day. False if there is no memory.
+bool ReadDay(sqlite3_stmt *rows, int column, TimeSpan &span) {
+    const int type = sqlite3_column_type(rows, column);
+    std::string_view text;
+    if (type == SQLITE_TEXT && !ReadText(rows, column, text))
+        return false;
+    const std::optional<int64_t> day = NumberOfDay(text);
+    span = type == SQLITE_NULL ? TimeSpan{} : day ? TimeSpan{*day, *day} : kAllTimes;
+    return true;
+}
+
+// The row of "id, msg, llevel, fac, utcsec, ldate". False if there is no memory.
+bool ReadRow(sqlite3_stmt *rows, IndexedRow &row) {
+    row.times[static_cast<size_t>(TimeColumn::kSecond)] = SecondOf(rows, 4);
+    return ReadDay(rows, 5, row.times[static_cast<size_t>(TimeColumn::kDay)]) &&
+           ReadText(rows, 1, row.message) && ReadText(rows, 2, row.severity) &&
+           ReadText(rows, 3, row.facility);
+}
+
 class Builder {
 public:
     Builder(sqlite3 *db, IndexFile file, const IndexHeader &header)
@@ -82,8 +117,6 @@ public:
     BuildResult Run(steady_clock::time_point deadline);
 
 private:
-    using Slices = std::unique_ptr<Slice[]>;
-
     bool HasPiece() const { return NextPiece() < newest_ / kIdsPerPiece; }
     int64_t NextPiece() const { return header_.basePiece + Published() + Fresh(); }
     int64_t Published() const { return header_.pieceCount; }
@@ -102,7 +135,7 @@ private:
     int64_t newest_;
     int64_t databaseBytes_;
     Piece piece_;
-    std::vector<Slices> loose_; // pieces of the segment that is not complete
+    std::vector<BuiltPiece> loose_; // pieces of the segment that is not complete
     int64_t looseOnDisk_ = 0;
 };
 
@@ -119,44 +152,50 @@ BuildResult Builder::Refusal() const {
 bool Builder::ReadLoose() {
     looseOnDisk_ = header_.pieceCount % kPiecesPerSegment;
     for (int64_t i = 0; i < looseOnDisk_; ++i)
-        loose_.push_back(std::make_unique<Slice[]>(kGramBits));
+        loose_.push_back({std::make_unique<Slice[]>(kGramBits), {}});
     std::array<Slice, kPiecesPerSegment> slices;
     for (size_t gram = 0; looseOnDisk_ != 0 && gram < kGramBits; ++gram) {
         if (file_.ReadSlices(header_, header_.pieceCount / kPiecesPerSegment, gram, slices) != looseOnDisk_)
             return false;
         for (size_t i = 0; i < loose_.size(); ++i)
-            loose_[i][gram] = slices[i];
+            loose_[i].slices[gram] = slices[i];
     }
+    std::array<ZoneMap, kPiecesPerSegment> zones;
+    if (looseOnDisk_ != 0 &&
+        file_.ReadZones(header_, header_.pieceCount / kPiecesPerSegment, zones) != looseOnDisk_)
+        return false;
+    for (size_t i = 0; i < loose_.size(); ++i)
+        loose_[i].zones = zones[i];
     return true;
 }
 
 bool Builder::BuildPiece() {
     const int64_t piece = NextPiece();
     const int64_t first = piece * kIdsPerPiece;
-    Query rows(db_, "SELECT id, msg FROM main.logs NOT INDEXED WHERE id BETWEEN ?1 AND ?2");
+    Query rows(db_, "SELECT id, msg, llevel, fac, utcsec, ldate FROM main.logs NOT INDEXED "
+                    "WHERE id BETWEEN ?1 AND ?2");
     rows.Bind(1, first);
     rows.Bind(2, first + kIdsPerPiece - 1);
     piece_.Clear();
     while (rows.Step()) {
-        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(rows.Get(), 1));
-        if (text == nullptr && sqlite3_column_type(rows.Get(), 1) != SQLITE_NULL)
-            return false; // no memory
-        piece_.Add(static_cast<size_t>(sqlite3_column_int64(rows.Get(), 0) - first),
-                   {text != nullptr ? text : "", static_cast<size_t>(sqlite3_column_bytes(rows.Get(), 1))});
+        IndexedRow row;
+        if (!ReadRow(rows.Get(), row))
+            return false;
+        piece_.Add(static_cast<size_t>(sqlite3_column_int64(rows.Get(), 0) - first), row);
     }
     if (rows.Status() != SQLITE_DONE)
         return false;
     piece_.FillGaps();
-    loose_.push_back(piece_.Slices(header_.fileNumber, piece));
+    loose_.push_back(piece_.Build(header_.fileNumber, piece));
     return true;
 }
 
 bool Builder::Publish() {
     header_.pieceCount += Fresh();
     looseOnDisk_ = static_cast<int64_t>(loose_.size());
+    RowSampler sampler(db_);
     for (int64_t step = kSamplesPerPiece; step > 0; --step) {
-        const auto sample =
-            SampleUpTo(db_, header_.EndId() - 1 - (step - 1) * kIdsPerPiece / kSamplesPerPiece);
+        const auto sample = sampler.UpTo(header_.EndId() - 1 - (step - 1) * kIdsPerPiece / kSamplesPerPiece);
         if (!sample)
             return false;
         AddSample(header_, *sample);
@@ -169,8 +208,15 @@ bool Builder::WriteSegment() {
     const auto slices = std::make_unique<Slice[]>(kGramBits * kPiecesPerSegment);
     for (size_t gram = 0; gram < kGramBits; ++gram)
         for (size_t piece = 0; piece < loose_.size(); ++piece)
-            slices[gram * kPiecesPerSegment + piece] = loose_[piece][gram];
-    if (!file_.Write(slices.get(), kSegmentBytes, OffsetOfSegment(segment)) || !Publish())
+            slices[gram * kPiecesPerSegment + piece] = loose_[piece].slices[gram];
+    std::array<ZoneMap, kPiecesPerSegment> zones;
+    for (size_t piece = 0; piece < loose_.size(); ++piece)
+        zones[piece] = loose_[piece].zones;
+    constexpr size_t kSliceBytes = kZonesAt * kPiecesPerSegment;
+    if (!file_.Write(slices.get(), kSliceBytes, OffsetOfSegment(segment)) ||
+        !file_.Write(zones.data(), sizeof zones,
+                     OffsetOfSegment(segment) + static_cast<int64_t>(kSliceBytes)) ||
+        !Publish())
         return false;
     loose_.clear();
     looseOnDisk_ = 0;
@@ -182,7 +228,10 @@ bool Builder::WriteLoose() {
         return true;
     const int64_t segment = header_.pieceCount / kPiecesPerSegment;
     for (int64_t i = looseOnDisk_; i < static_cast<int64_t>(loose_.size()); ++i) {
-        if (!file_.Write(loose_[static_cast<size_t>(i)].get(), kPieceBytes, OffsetOfLoosePiece(segment, i)))
+        const BuiltPiece &piece = loose_[static_cast<size_t>(i)];
+        const int64_t offset = OffsetOfLoosePiece(segment, i);
+        if (!file_.Write(piece.slices.get(), kZonesAt, offset) ||
+            !file_.Write(&piece.zones, sizeof piece.zones, offset + static_cast<int64_t>(kZonesAt)))
             return false;
     }
     return Publish();

@@ -93,6 +93,8 @@ Candidates::Bitmap Candidates::Evaluate(const Need &need, int64_t segment, const
         return among;
     case Need::Kind::kGrams:
         return EvaluateGrams(need, segment, among);
+    case Need::Kind::kTimes:
+        return EvaluateTimes(need, segment, among);
     case Need::Kind::kAll: {
         Bitmap all = among;
         for (const Need &part : need.parts)
@@ -127,6 +129,29 @@ Candidates::Bitmap Candidates::EvaluateGrams(const Need &need, int64_t segment, 
             among[word] &=
                 piece < static_cast<size_t>(pieces) ? slices[piece].Word(word % kWordsPerSlice) : 0;
         }
+    }
+    return among;
+}
+
+bool Candidates::ReadZonesOf(int64_t segment) {
+    if (zonesOf_ == segment)
+        return true;
+    zonePieceCount_ = file_.ReadZones(header_, segment, zones_);
+    zonesOf_ = zonePieceCount_ >= 0 ? segment : -1;
+    return zonePieceCount_ >= 0;
+}
+
+Candidates::Bitmap Candidates::EvaluateTimes(const Need &need, int64_t segment, Bitmap among) {
+    if (!ReadZonesOf(segment)) {
+        isGood_ = false;
+        return {};
+    }
+    const auto column = static_cast<size_t>(need.column);
+    for (size_t word = 0; word < among.size(); ++word) {
+        const size_t piece = word / kZonesPerPiece;
+        const bool isPossible = piece < static_cast<size_t>(zonePieceCount_) &&
+                                zones_[piece].zones[word % kZonesPerPiece][column].Touches(need.times);
+        among[word] = isPossible ? among[word] : 0;
     }
     return among;
 }

@@ -35,6 +35,8 @@ private:
     void AddSegment(int64_t segment, bool isAscending, std::vector<IdRange> &ranges);
     Bitmap Evaluate(const Need &need, int64_t segment, const Bitmap &among);
     Bitmap EvaluateGrams(const Need &need, int64_t segment, Bitmap among);
+    Bitmap EvaluateTimes(const Need &need, int64_t segment, Bitmap among);
+    bool ReadZonesOf(int64_t segment);
 
     const IndexFile &file_;
     const IndexHeader &header_;
@@ -43,6 +45,9 @@ private:
     int64_t firstSegment_; // of those that the range of ids touches, in the file
     int64_t endSegment_;
     int64_t step_ = 0; // the next one
+    std::array<ZoneMap, kPiecesPerSegment> zones_{};
+    int64_t zonesOf_ = -1;   // the segment
+    int zonePieceCount_ = 0; // that it has
     bool isGood_ = true;
 };
 

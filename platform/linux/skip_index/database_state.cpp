@@ -33,14 +33,27 @@ std::string FileOf(sqlite3 *db) {
 }
 
 bool HasIndexableTable(sqlite3 *db) {
-    const auto hasColumn = [db](const char *schema, const char *column, int *isAutoincrement) {
+    const auto hasColumn = [db](const char *column, const char *type) {
+        const char *declared = nullptr;
+        const char *collation = nullptr;
+        return sqlite3_table_column_metadata(db, "main", "logs", column, &declared, &collation, nullptr,
+                                             nullptr, nullptr) == SQLITE_OK &&
+               sqlite3_stricmp(declared, type) == 0 && sqlite3_stricmp(collation, "BINARY") == 0;
+    };
+    const auto hasTable = [db](const char *schema, const char *column, int *isAutoincrement) {
         return sqlite3_table_column_metadata(db, schema, "logs", column, nullptr, nullptr, nullptr, nullptr,
                                              isAutoincrement) == SQLITE_OK;
     };
     int isAutoincrement = 0;
     // A temporary table would have the name first.
-    if (!hasColumn("main", "id", &isAutoincrement) || isAutoincrement == 0 ||
-        !hasColumn("main", "msg", nullptr) || hasColumn("temp", nullptr, nullptr))
+    if (!hasTable("main", "id", &isAutoincrement) || isAutoincrement == 0 ||
+        hasTable("temp", nullptr, nullptr))
+        return false;
+    for (const char *column : {"msg", "llevel", "fac", "ldate"}) {
+        if (!hasColumn(column, "TEXT"))
+            return false;
+    }
+    if (!hasColumn("utcsec", "INTEGER"))
         return false;
     Query encoding(db, "PRAGMA encoding");
     return encoding.Step() &&
@@ -53,14 +66,17 @@ int64_t LargestIdEver(sqlite3 *db) {
     return sequence.Step() ? sqlite3_column_int64(sequence.Get(), 0) : 0;
 }
 
-std::optional<RowSample> SampleUpTo(sqlite3 *db, int64_t upTo) {
-    Query row(db, "SELECT id, * FROM main.logs WHERE id <= ?1 ORDER BY id DESC LIMIT 1");
-    row.Bind(1, upTo);
-    if (row.Step())
-        return RowSample{upTo, sqlite3_column_int64(row.Get(), 0), HashOfRow(row.Get())};
-    if (row.Status() != SQLITE_DONE)
+RowSampler::RowSampler(sqlite3 *db)
+    : row_(db, "SELECT id, * FROM main.logs WHERE id <= ?1 ORDER BY id DESC LIMIT 1") {}
+
+std::optional<RowSample> RowSampler::UpTo(int64_t id) {
+    row_.Reset();
+    row_.Bind(1, id);
+    if (row_.Step())
+        return RowSample{id, sqlite3_column_int64(row_.Get(), 0), HashOfRow(row_.Get())};
+    if (row_.Status() != SQLITE_DONE)
         return std::nullopt;
-    return RowSample{upTo, std::numeric_limits<int64_t>::min(), 0};
+    return RowSample{id, std::numeric_limits<int64_t>::min(), 0};
 }
 
 bool FitsDatabase(sqlite3 *db, const IndexHeader &header, const DatabaseIdentity &identity) {
@@ -68,8 +84,9 @@ bool FitsDatabase(sqlite3 *db, const IndexHeader &header, const DatabaseIdentity
         header.birthNsec != identity.birthNsec || header.EndId() - 1 > LargestIdEver(db))
         return false;
     const auto *end = header.samples.begin() + header.sampleCount;
-    return std::all_of(header.samples.begin(), end, [db](const RowSample &sample) {
-        const auto now = SampleUpTo(db, sample.upTo);
+    RowSampler sampler(db);
+    return std::all_of(header.samples.begin(), end, [&](const RowSample &sample) {
+        const auto now = sampler.UpTo(sample.upTo);
         return now && (now->id < sample.id || *now == sample);
     });
 }

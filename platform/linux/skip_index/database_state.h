@@ -36,15 +36,23 @@ private:
 // The file of a connection, as long as it has its name; "" otherwise.
 std::string FileOf(sqlite3 *db);
 
-// Whether ids of table "logs" never come back and its texts are what the index needs: an ordinary table with
-// AUTOINCREMENT in a UTF-8 database, with a column "msg".
+// Whether ids of table "logs" never come back and its values are what the index needs: an ordinary table with
+// AUTOINCREMENT in a UTF-8 database, whose columns have the types and the collation of the shipped schema.
 bool HasIndexableTable(sqlite3 *db);
 
 // The largest id that table "logs" ever had; 0 if it never had one.
 int64_t LargestIdEver(sqlite3 *db);
 
-// The newest row up to an id now. Nothing if it cannot be read.
-std::optional<RowSample> SampleUpTo(sqlite3 *db, int64_t upTo);
+// Reads samples of table "logs".
+class RowSampler {
+public:
+    explicit RowSampler(sqlite3 *db);
+    // The newest row up to an id now. Nothing if it cannot be read.
+    std::optional<RowSample> UpTo(int64_t id);
+
+private:
+    Query row_;
+};
 
 // Whether the index is that of this file with this content: the remembered rows are the same or gone, and no
 // others have come.

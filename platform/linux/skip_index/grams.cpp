@@ -51,6 +51,18 @@ void AddGrams(std::string_view text, GramBits &bits) {
     }
 }
 
+std::array<uint16_t, kBitsPerToken> BitsOfToken(TokenColumn column, std::string_view value) {
+    uint64_t hash = 0xCBF29CE484222325U + static_cast<uint64_t>(column); // FNV-1a
+    for (const char byte : value)
+        hash = (hash ^ static_cast<uint8_t>(byte)) * 0x100000001B3U;
+    std::array<uint16_t, kBitsPerToken> bits;
+    for (uint16_t &bit : bits) {
+        hash = (hash ^ (hash >> 32)) * 0x9E3779B97F4A7C15U;
+        bit = static_cast<uint16_t>(hash >> 52);
+    }
+    return bits;
+}
+
 std::vector<uint16_t> GramsOfLiteral(std::string_view literal, size_t most) {
     std::vector<uint16_t> bits;
     uint32_t gram = kNotAscii;

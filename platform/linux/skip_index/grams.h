@@ -19,6 +19,11 @@ using GramBits = std::array<uint64_t, kGramBits / 64>;
 // ASCII letter.
 void AddGrams(std::string_view text, GramBits &bits);
 
+// The bits of a value of another column. A row with it has all of them.
+enum class TokenColumn : uint8_t { kSeverity, kFacility };
+inline constexpr size_t kBitsPerToken = 8;
+std::array<uint16_t, kBitsPerToken> BitsOfToken(TokenColumn column, std::string_view value);
+
 // The bits of the grams of a literal, without repetition: any text of a row that contains the literal,
 // whatever its letter case, has them. At most `most`, spread over the literal.
 std::vector<uint16_t> GramsOfLiteral(std::string_view literal, size_t most);

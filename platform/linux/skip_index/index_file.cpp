@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::array<char, 16> kMagic = {'k', 'e', 'l', 'o', ' ', 's', 'k', 'i',
                                          'p', ' ', 'i', 'n', 'd', 'e', 'x', '\n'};
-constexpr uint32_t kVersion = 1;
+constexpr uint32_t kVersion = 2;
 constexpr uint32_t kByteOrder = 0x01020304;
 constexpr int64_t kHeaderBytes = 4096;
 constexpr int64_t kLeastFreeShare = 20; // of a volume: 1/20 stays free
@@ -137,25 +137,43 @@ IndexFile::State IndexFile::ReadHeader(IndexHeader &header) const {
     return info.st_size >= PublishedSize(header) ? State::kGood : State::kDamaged;
 }
 
+// Reads the parts at an offset of each complete piece of a segment. Returns how many, -1 on failure.
+template <typename Part>
+int64_t IndexFile::ReadParts(const IndexHeader &header, int64_t segment, size_t offset,
+                             std::span<Part, kPiecesPerSegment> parts) const {
+    const int64_t count = std::min(header.pieceCount - segment * kPiecesPerSegment, kPiecesPerSegment);
+    if (count == kPiecesPerSegment)
+        return ReadAll(file_.Get(), parts.data(), parts.size_bytes(),
+                       OffsetOfSegment(segment) + static_cast<int64_t>(offset) * kPiecesPerSegment)
+                   ? count
+                   : -1;
+    for (int64_t piece = 0; piece < count; ++piece) {
+        if (!ReadAll(file_.Get(), &parts[static_cast<size_t>(piece)], sizeof(Part),
+                     OffsetOfLoosePiece(segment, piece) + static_cast<int64_t>(offset)))
+            return -1;
+    }
+    return count;
+}
+
 int IndexFile::ReadSlices(const IndexHeader &header, int64_t segment, size_t gram,
                           std::span<Slice, kPiecesPerSegment> slices) const {
-    const int64_t firstPiece = segment * kPiecesPerSegment;
-    const int64_t count = std::min(header.pieceCount - firstPiece, kPiecesPerSegment);
-    if (count == kPiecesPerSegment) {
-        if (!ReadAll(file_.Get(), slices.data(), slices.size_bytes(),
-                     OffsetOfSegment(segment) + static_cast<int64_t>(gram * slices.size_bytes())))
-            return -1;
-    } else {
-        for (int64_t piece = 0; piece < count; ++piece) {
-            if (!ReadAll(file_.Get(), &slices[static_cast<size_t>(piece)], sizeof(Slice),
-                         OffsetOfLoosePiece(segment, piece) + static_cast<int64_t>(gram * sizeof(Slice))))
-                return -1;
-        }
-    }
+    const int64_t count = ReadParts(header, segment, gram * sizeof(Slice), slices);
+    const int64_t first = header.basePiece + segment * kPiecesPerSegment;
     for (int64_t piece = 0; piece < count; ++piece) {
         const Slice &slice = slices[static_cast<size_t>(piece)];
-        if (slice.checksum !=
-            kelo::platform::ChecksumOf(slice, header.fileNumber, header.basePiece + firstPiece + piece, gram))
+        if (slice.checksum != kelo::platform::ChecksumOf(slice, header.fileNumber, first + piece, gram))
+            return -1;
+    }
+    return static_cast<int>(count);
+}
+
+int IndexFile::ReadZones(const IndexHeader &header, int64_t segment,
+                         std::span<ZoneMap, kPiecesPerSegment> zones) const {
+    const int64_t count = ReadParts(header, segment, kZonesAt, zones);
+    const int64_t first = header.basePiece + segment * kPiecesPerSegment;
+    for (int64_t piece = 0; piece < count; ++piece) {
+        const ZoneMap &map = zones[static_cast<size_t>(piece)];
+        if (map.checksum != kelo::platform::ChecksumOf(map, header.fileNumber, first + piece))
             return -1;
     }
     return static_cast<int>(count);

@@ -93,6 +93,10 @@ public:
     int ReadSlices(const IndexHeader &header, int64_t segment, size_t gram,
                    std::span<Slice, kPiecesPerSegment> slices) const;
 
+    // The same for the zones of those pieces.
+    int ReadZones(const IndexHeader &header, int64_t segment,
+                  std::span<ZoneMap, kPiecesPerSegment> zones) const;
+
     // Write to the file. False on failure (errno), which leaves what was published before.
     bool Write(const void *bytes, size_t size, int64_t offset) const;
     // The header is complete but for its check sum.
@@ -109,14 +113,19 @@ public:
     int64_t DiskBytes() const;
 
 private:
+    template <typename Part>
+    int64_t ReadParts(const IndexHeader &header, int64_t segment, size_t offset,
+                      std::span<Part, kPiecesPerSegment> parts) const;
     IndexFile(std::string path, UniqueFd file) : path_(std::move(path)), file_(std::move(file)) {}
 
     std::string path_;
     UniqueFd file_;
 };
 
-// Where things are in the file. Segments are counted from the one that the file begins with. The pieces of
-// the segment that is not complete yet are in the place of the one after it.
+// Where things are in the file. Segments are counted from the one that the file begins with. A segment has
+// the slices of its pieces for gram 0, 1 and so on, and then their zones. The pieces of the segment that is
+// not complete yet are in the place of the one after it, each with its slices and its zones.
+inline constexpr size_t kZonesAt = kGramBits * sizeof(Slice); // in a piece
 int64_t OffsetOfSegment(int64_t segment);
 int64_t OffsetOfLoosePiece(int64_t segment, int64_t piece);
 

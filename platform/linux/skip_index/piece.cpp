@@ -12,6 +12,11 @@ uint64_t Mixed(uint64_t hash, uint64_t word) {
     return hash ^ (hash >> 32);
 }
 
+void AddToken(TokenColumn column, std::string_view value, GramBits &bits) {
+    for (const uint16_t bit : BitsOfToken(column, value))
+        bits[bit / 64] |= uint64_t{1} << (bit % 64);
+}
+
 using Tile = std::array<uint64_t, 64>;
 
 // Exchanges rows and columns of 64 x 64 bits, by halves of halves.
@@ -52,18 +57,34 @@ void Piece::Clear() {
     for (GramBits &block : *blocks_)
         block.fill(0);
     rows_.fill(0);
+    zones_.fill({});
 }
 
-void Piece::Add(size_t row, std::string_view text) {
-    AddGrams(text, (*blocks_)[row / kIdsPerBlock]);
-    ++rows_[row / kIdsPerBlock];
+void Piece::Add(size_t number, const IndexedRow &row) {
+    const size_t block = number / kIdsPerBlock;
+    GramBits &bits = (*blocks_)[block];
+    AddGrams(row.message, bits);
+    AddToken(TokenColumn::kSeverity, row.severity, bits);
+    AddToken(TokenColumn::kFacility, row.facility, bits);
+    Zone &zone = zones_[block / 64];
+    for (size_t column = 0; column < zone.size(); ++column)
+        zone[column].Add(row.times[column]);
+    ++rows_[block];
 }
 
 void Piece::FillGaps() {
     for (size_t block = 0; block < rows_.size(); ++block) {
-        if (rows_[block] < kIdsPerBlock)
-            (*blocks_)[block].fill(~uint64_t{0});
+        if (rows_[block] == kIdsPerBlock)
+            continue;
+        (*blocks_)[block].fill(~uint64_t{0});
+        zones_[block / 64].fill(kAllTimes);
     }
+}
+
+BuiltPiece Piece::Build(uint64_t fileNumber, int64_t piece) const {
+    BuiltPiece built{Slices(fileNumber, piece), {zones_, 0}};
+    built.zones.checksum = ChecksumOf(built.zones, fileNumber, piece);
+    return built;
 }
 
 std::unique_ptr<Slice[]> Piece::Slices(uint64_t fileNumber, int64_t piece) const {

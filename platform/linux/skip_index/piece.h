@@ -8,6 +8,7 @@
 #include <string_view>
 
 #include "skip_index/grams.h"
+#include "skip_index/zone.h"
 
 namespace kelo::platform {
 
@@ -36,7 +37,7 @@ struct Slice {
     uint32_t checksum;
 };
 static_assert(sizeof(Slice) == 8 * kWordsPerSlice + 4);
-inline constexpr size_t kPieceBytes = kGramBits * sizeof(Slice);
+inline constexpr size_t kPieceBytes = kGramBits * sizeof(Slice) + sizeof(ZoneMap);
 inline constexpr size_t kSegmentBytes = kPieceBytes * kPiecesPerSegment;
 
 // The check sum of the slice of bit `gram` in `piece`. It depends on where the slice is and on the file's own
@@ -46,22 +47,39 @@ uint32_t ChecksumOf(const Slice &slice, uint64_t fileNumber, int64_t piece, size
 // 64-bit hash of bytes, the same on every machine of the same byte order.
 uint64_t HashOf(std::string_view bytes, uint64_t seed);
 
-// The bits of a piece that is being built.
+// What the index takes of a row.
+struct IndexedRow {
+    std::string_view message; // "" if it has none, as the next two
+    std::string_view severity;
+    std::string_view facility;
+    Zone times; // none for NULL
+};
+
+// A piece as it is written.
+struct BuiltPiece {
+    std::unique_ptr<Slice[]> slices; // those of gram 0, 1 and so on
+    ZoneMap zones;
+};
+
+// A piece that is being built.
 class Piece {
 public:
     // Throws std::bad_alloc.
     Piece();
     void Clear();
-    // Adds the text of the row with this number in the piece, each row once; "" if it has none.
-    void Add(size_t row, std::string_view text);
-    // Makes a block with fewer rows than ids fit every search: the others were deleted, and come back when
-    // somebody copies an older database over the content of this one.
+    // Adds the row with this number in the piece, each once.
+    void Add(size_t number, const IndexedRow &row);
+    // Makes a block or zone with fewer rows than ids fit every search: the others were deleted, and come back
+    // when somebody copies an older database over the content of this one.
     void FillGaps();
-    // The slices with their check sums: those of gram 0, 1 and so on.
-    std::unique_ptr<Slice[]> Slices(uint64_t fileNumber, int64_t piece) const;
+    // All of it with its check sums.
+    BuiltPiece Build(uint64_t fileNumber, int64_t piece) const;
 
 private:
+    std::unique_ptr<Slice[]> Slices(uint64_t fileNumber, int64_t piece) const;
+
     std::unique_ptr<std::array<GramBits, kBlocksPerPiece>> blocks_;
+    std::array<Zone, kZonesPerPiece> zones_{};
     std::array<uint8_t, kBlocksPerPiece> rows_{}; // of each block
 };
 

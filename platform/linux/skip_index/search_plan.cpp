@@ -28,13 +28,16 @@ std::optional<SearchPlan> SearchPlan::Read(sqlite3 *db, std::string_view sql) {
     if (!text || IsSwitchedOff() || sqlite3_get_autocommit(db) == 0 ||
         sqlite3_txn_state(db, "main") != SQLITE_TXN_NONE)
         return std::nullopt;
+    // Without the need of grams only a page may be found faster.
+    const bool isOrdered = text->kind == SearchText::Kind::kSelect && text->order != SearchText::Order::kNone;
+    if (!text->needsGrams && !isOrdered)
+        return std::nullopt;
     std::optional<SkipIndex> index;
     if (text->need.kind != Need::Kind::kNothing)
         index = SkipIndex::Open(db);
     if (index && text->ids.first >= index->Header().EndId())
         index.reset();
-    const bool mayBeSorted = !text->times.empty() && text->order != SearchText::Order::kNone;
-    if (!index && !mayBeSorted)
+    if (!index && (text->times.empty() || !isOrdered))
         return std::nullopt;
     return SearchPlan(db, sql, std::move(*text), std::move(index));
 }
@@ -109,8 +112,15 @@ bool SearchPlan::HasManyRows(const std::string &column, int64_t count) const {
     return rows.Step() && sqlite3_column_int64(rows.Get(), 0) >= count;
 }
 
+// Whether there is an index that fits what this transaction reads.
+bool SearchPlan::HasUsableIndex() {
+    if (!isUsable_)
+        isUsable_ = index_ && index_->Fits(db_);
+    return *isUsable_;
+}
+
 bool SearchPlan::CollectAll() {
-    if (!index_ || !index_->Fits(db_))
+    if (!HasUsableIndex())
         return false;
     Candidates candidates(index_->File(), index_->Header(), text_.need, text_.ids);
     while (candidates.Next(IsAscending(), all_)) {
@@ -131,9 +141,9 @@ bool SearchPlan::IsWorthwhile(int64_t pageRows) {
         return false;
     if (!access.isScan && !HasManyRows(access.column, kFewRows))
         return false;
-    if (access.isSorted && isPage && NarrowByTimes())
+    if (access.isSorted && isPage && ((text_.needsTimes && HasUsableIndex()) || NarrowByTimes()))
         return isByStep_ = true;
-    if (!CollectAll())
+    if (!text_.needsGrams || !CollectAll())
         return false;
     const int64_t count = CountIds(all_, std::numeric_limits<int64_t>::max());
     return access.isScan ? count <= SpanOf(text_.ids) / 2
@@ -165,9 +175,8 @@ bool SearchPlan::Next(std::vector<IdRange> &ranges) {
         return true;
     }
     if (step_ == Step::kOpen) {
-        const bool isUsable = index_ && index_->Fits(db_);
-        step_ = isUsable ? Step::kCandidates : Step::kDone;
-        if (!isUsable) {
+        step_ = HasUsableIndex() ? Step::kCandidates : Step::kDone;
+        if (step_ == Step::kDone) {
             ranges.push_back(text_.ids);
             return true;
         }

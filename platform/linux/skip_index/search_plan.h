@@ -51,6 +51,7 @@ private:
     Access AccessOfStatement(int64_t pageRows) const;
     bool NarrowByTimes();
     bool HasManyRows(const std::string &column, int64_t count) const;
+    bool HasUsableIndex();
     bool CollectAll();
     IdRange TakeWindow();
 
@@ -58,7 +59,8 @@ private:
     std::string_view sql_;
     SearchText text_;
     std::optional<SkipIndex> index_;
-    std::vector<IdRange> all_; // unless they are found step by step
+    std::optional<bool> isUsable_; // once it was asked for
+    std::vector<IdRange> all_;     // unless they are found step by step
     bool isByStep_ = false;
     enum class Step { kWindow, kOpen, kCandidates, kDone } step_ = Step::kWindow;
     std::optional<Candidates> candidates_;

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <charconv>
+#include <functional>
 #include <numeric>
 #include <span>
 #include <utility>
@@ -28,6 +29,7 @@ constexpr std::string_view kForeignWords[] = {
     "between", "case",   "collate", "exists",    "except", "filter", "from",
     "group",   "having", "indexed", "intersect", "limit",  "offset", "order",
     "over",    "raise",  "select",  "union",     "where",  "window", "with"};
+constexpr std::string_view kColumnWords[] = {"llevel", "fac", "utcsec", "ldate"};
 constexpr std::string_view kIdWords[] = {"id", "rowid", "oid", "_rowid_"};
 
 // Where the bracket that opens at `open` closes; tokens.size() if it does not.
@@ -112,6 +114,46 @@ Need NeedOfRegex(const std::string &regex, bool ignoreCase) {
     return any.parts.empty() ? Need{} : any;
 }
 
+std::optional<int64_t> NumberOf(const SqlToken &token) {
+    int64_t number = 0;
+    const char *end = token.text.data() + token.text.size();
+    const auto [stop, error] = std::from_chars(token.text.data(), end, number);
+    return token.kind == Kind::kNumber && error == std::errc() && stop == end ? std::optional(number)
+                                                                              : std::nullopt;
+}
+
+// Narrows a range by a comparison with its values. False for another comparison.
+bool Narrow(std::string_view comparison, int64_t value, int64_t &first, int64_t &last) {
+    if (comparison == ">" && value < std::numeric_limits<int64_t>::max())
+        first = std::max(first, value + 1);
+    else if (comparison == "<" && value > std::numeric_limits<int64_t>::min())
+        last = std::min(last, value - 1);
+    else if (comparison == ">=")
+        first = std::max(first, value);
+    else if (comparison == "<=")
+        last = std::min(last, value);
+    else
+        return false;
+    return true;
+}
+
+// Of "utcsec >= 1577836800" or "ldate = '2020/01/02'".
+Need NeedOfTime(Tokens tokens, TimeColumn column, std::optional<int64_t> value) {
+    Need need{.kind = Need::Kind::kTimes, .column = column, .times = kAllTimes};
+    if (!value)
+        return {};
+    if (tokens[1].Is('='))
+        need.times = {*value, *value};
+    else if (!Narrow(tokens[1].text, *value, need.times.first, need.times.last))
+        return {};
+    return need;
+}
+
+Need NeedOfToken(TokenColumn column, const std::string &value) {
+    const auto bits = BitsOfToken(column, value);
+    return {.kind = Need::Kind::kGrams, .grams = {bits.begin(), bits.end()}};
+}
+
 // Of a condition without AND and OR.
 Need NeedOfComparison(Tokens tokens) {
     const auto string = [&](size_t at) { return StringValue(tokens[at]); };
@@ -129,6 +171,14 @@ Need NeedOfComparison(Tokens tokens) {
         return NeedOfRegex(string(2), false);
     if (AreLike(tokens, {"regexpi", "(", "'", ",", "msg", ")"}))
         return NeedOfRegex(string(2), true);
+    if (AreLike(tokens, {"llevel", "=", "'"}))
+        return NeedOfToken(TokenColumn::kSeverity, string(2));
+    if (AreLike(tokens, {"fac", "=", "'"}))
+        return NeedOfToken(TokenColumn::kFacility, string(2));
+    if (tokens.size() == 3 && tokens[0].Is("utcsec"))
+        return NeedOfTime(tokens, TimeColumn::kSecond, NumberOf(tokens[2]));
+    if (tokens.size() == 3 && tokens[0].Is("ldate") && tokens[2].kind == Kind::kString)
+        return NeedOfTime(tokens, TimeColumn::kDay, NumberOfDay(string(2)));
     return {};
 }
 
@@ -161,6 +211,10 @@ size_t CountGrams(const Need &need) {
                            [](size_t count, const Need &part) { return count + CountGrams(part); });
 }
 
+bool NeedsGrams(const Need &need) {
+    return need.kind == Need::Kind::kGrams || std::any_of(need.parts.begin(), need.parts.end(), NeedsGrams);
+}
+
 bool HasWord(Tokens tokens, std::span<const std::string_view> words) {
     return std::any_of(tokens.begin(), tokens.end(), [&](const SqlToken &token) {
         return std::any_of(words.begin(), words.end(), [&](std::string_view word) { return token.Is(word); });
@@ -176,25 +230,10 @@ bool HasLongPattern(Tokens tokens) {
 // Narrows `range` by a condition "id >= 1". False for anything else.
 bool TakeIdCondition(Tokens tokens, IdRange &range) {
     tokens = Bare(tokens);
-    if (tokens.size() != 3 || !tokens[0].Is("id") || tokens[2].kind != Kind::kNumber)
+    if (tokens.size() != 3 || !tokens[0].Is("id"))
         return false;
-    const std::string_view digits = tokens[2].text;
-    int64_t id = 0;
-    const auto [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), id);
-    if (error != std::errc() || end != digits.data() + digits.size())
-        return false;
-    const std::string_view comparison = tokens[1].text;
-    if (comparison == ">=")
-        range.first = std::max(range.first, id);
-    else if (comparison == "<=")
-        range.last = std::min(range.last, id);
-    else if (comparison == ">" && id < std::numeric_limits<int64_t>::max())
-        range.first = std::max(range.first, id + 1);
-    else if (comparison == "<")
-        range.last = std::min(range.last, id - 1);
-    else
-        return false;
-    return true;
+    const std::optional<int64_t> id = NumberOf(tokens[2]);
+    return id && Narrow(tokens[1].text, *id, range.first, range.last);
 }
 
 struct Head {
@@ -239,8 +278,9 @@ void TakeOrder(Tokens &tokens, SearchText &search) {
 bool MayBeSearch(std::string_view sql) {
     return (sql.starts_with("SELECT *") || sql.starts_with("SELECT COUNT(*)") ||
             sql.starts_with("DELETE ")) &&
-           (sql.find("msg") != std::string_view::npos || sql.find("ldate") != std::string_view::npos ||
-            sql.find("utcsec") != std::string_view::npos);
+           (sql.find("msg") != std::string_view::npos ||
+            std::any_of(std::begin(kColumnWords), std::end(kColumnWords),
+                        [&](std::string_view column) { return sql.find(column) != std::string_view::npos; }));
 }
 
 std::string Joined(const std::vector<std::string_view> &conditions) {
@@ -276,18 +316,24 @@ std::optional<SearchText> ReadSearchText(std::string_view sql) {
             return std::nullopt;
         search.conditions.push_back(TextOf(condition));
         Need need = NeedOfCondition(condition);
-        if (need.kind != Need::Kind::kNothing)
-            search.need.parts.push_back(std::move(need));
-        else if (Bare(condition).size() > 1)
+        const bool isNothing = need.kind == Need::Kind::kNothing;
+        if ((isNothing && Bare(condition).size() > 1) || HasWord(condition, kColumnWords))
             search.isTextOnly = false;
+        if (!isNothing)
+            search.need.parts.push_back(std::move(need));
     }
+    std::vector<Need> &parts = search.need.parts;
+    // What times rule out is quickly seen.
+    const auto grams = std::stable_partition(parts.begin(), parts.end(), std::not_fn(NeedsGrams));
+    search.needsTimes = grams != parts.begin();
+    search.needsGrams = grams != parts.end();
     for (const std::string_view column : {"ldate", "utcsec"}) {
         if (!ConditionsOn(search, column).empty())
             search.times.push_back(column);
     }
-    if (search.need.parts.empty())
+    if (parts.empty())
         search.need.kind = Need::Kind::kNothing;
-    if ((search.need.parts.empty() && search.times.empty()) || CountGrams(search.need) > kMostGramsOfAll)
+    if ((parts.empty() && search.times.empty()) || CountGrams(search.need) > kMostGramsOfAll)
         return std::nullopt;
     return search;
 }

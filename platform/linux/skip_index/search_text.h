@@ -7,20 +7,25 @@
 #include <string_view>
 #include <vector>
 
+#include "skip_index/zone.h"
+
 namespace kelo::platform {
 
-// What a row must have in its grams for a condition to be true: sufficient to rule a row out, never to
-// accept it.
+// What a row must have for a condition to be true, as far as the index knows: sufficient to rule a row out,
+// never to accept it.
 struct Need {
     enum class Kind {
-        kNothing, // the condition says nothing about grams
-        kGrams,   // all of these bits
+        kNothing, // the condition says nothing of the kind
+        kGrams,   // all of these bits, of grams of its message or of a value
+        kTimes,   // a time of `times` in `column`
         kAll,     // all of the parts
         kAny      // one of the parts
     };
     Kind kind = Kind::kNothing;
-    std::vector<uint16_t> grams;
-    std::vector<Need> parts;
+    std::vector<uint16_t> grams{};
+    std::vector<Need> parts{};
+    TimeColumn column = TimeColumn::kSecond;
+    TimeSpan times{};
 };
 
 struct IdRange {
@@ -40,10 +45,13 @@ struct SearchText {
     std::vector<std::string_view> conditions;
     IdRange ids;
     Order order = Order::kNone;
-    Need need; // kNothing if `times` is not empty
+    Need need;
+    // What it needs of. SQLite has indexes for times.
+    bool needsGrams = false;
+    bool needsTimes = false;
     // The columns of times that have conditions of their own: "ldate", "utcsec".
     std::vector<std::string_view> times;
-    // Whether the grams say something about every condition: no index of SQLite serves any of them.
+    // Whether every condition is about messages, and needs something: no index of SQLite serves any of them.
     bool isTextOnly = true;
 };
 
