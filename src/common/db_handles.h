@@ -1,5 +1,7 @@
 #pragma once
 
+#include <sqlite3.h>
+
 #include <cerrno>
 #include <memory>
 #include <string>
@@ -37,6 +39,13 @@ inline DbConnection ConnectOrFail(const std::string &path) {
     else if (connection == nullptr)
         FailPlatform(path, "KELODBConnect");
     return connection;
+}
+
+// Whether the file was moved or removed since it was opened, so that another one may have its path.
+inline bool HasMoved(DBConnect_tag *connection) {
+    int hasMoved = 0;
+    sqlite3_file_control(KELODBInternalDBHdlGet(connection), "main", SQLITE_FCNTL_HAS_MOVED, &hasMoved);
+    return hasMoved != 0;
 }
 
 } // namespace kelo

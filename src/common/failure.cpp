@@ -28,11 +28,15 @@ int FailWithErrno(std::string_view path, std::string_view tried, int error) {
     return -1;
 }
 
-int FailStatement(DBConnect_tag *connection, std::string_view path, std::string_view tried) {
+int FailStatement(DBConnect_tag *connection, std::string_view path, std::string_view tried, int lastError) {
     sqlite3 *db = KELODBInternalDBHdlGet(connection);
     if (db == nullptr)
         return Fail(KELO_FAILURE_ARGUMENT, path, tried, "not connected");
     KELOFailureSetSqlite(lastFailure, db, path, tried);
+    if ((lastFailure.sqliteCode & 0xFF) == SQLITE_IOERR && lastFailure.systemCode == 0 && lastError != 0) {
+        lastFailure.systemCode = lastError;
+        lastFailure.kind = KELOFailureKindOfSqlite(lastFailure.sqliteCode, lastFailure.text, lastError);
+    }
     return -1;
 }
 

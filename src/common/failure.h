@@ -12,8 +12,10 @@ namespace kelo {
 // errno. Each returns -1, the result of most functions that fail.
 int Fail(KELOFAILUREKIND kind, std::string_view path, std::string_view tried, std::string_view text);
 int FailWithErrno(std::string_view path, std::string_view tried, int error);
-// With the error of a connection, which may be null, after `tried`, a statement.
-int FailStatement(DBConnect_tag *connection, std::string_view path, std::string_view tried);
+// With the error of a connection, which may be null, after `tried`, a statement. SQLite forgets the reason of
+// a write that fails within a statement: `lastError` is then the errno after a call before which it was 0.
+int FailStatement(DBConnect_tag *connection, std::string_view path, std::string_view tried,
+                  int lastError = 0);
 // After a call of a platform function that gives no reason but errno, which the caller has set to 0 before.
 // Where the platform tells more than that (KELOFailureGet), it is taken over.
 int FailPlatform(std::string_view path, const char *function);

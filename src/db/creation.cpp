@@ -144,22 +144,6 @@ void RemoveRemains(const std::string &dbPath) {
         RemoveDatabase(dbPath);
 }
 
-// A service that owns its folder must be able to write what root creates there. Only root can give files
-// away.
-void GiveToOwnerOfFolder(const std::string &dbPath) {
-    const std::string folder = dbPath.substr(0, dbPath.rfind('/') + 1);
-    struct stat parent {};
-    if (geteuid() != 0 || stat(folder.c_str(), &parent) != 0 || parent.st_uid == 0)
-        return;
-    // Closing a descriptor of another kind would release the locks of this process on the database.
-    const int fd = open(dbPath.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC);
-    struct stat file {};
-    if (fd >= 0 && fstat(fd, &file) == 0 && S_ISREG(file.st_mode) && file.st_uid == 0 && file.st_nlink == 1)
-        std::ignore = fchownat(fd, "", parent.st_uid, static_cast<gid_t>(-1), AT_EMPTY_PATH);
-    if (fd >= 0)
-        close(fd);
-}
-
 int CreateMissing(const std::string &dbPath, const std::string &schemaPath) {
     const int result = RunSchema(dbPath, schemaPath);
     if (result == 0)
@@ -190,6 +174,20 @@ int CreateLocked(const DatabaseLock &lock, const std::string &dbPath, const std:
 bool IsEmptyFile(const std::string &path) {
     struct stat status {};
     return stat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode) && status.st_size == 0;
+}
+
+void GiveToOwnerOfFolder(const std::string &dbPath) {
+    const std::string folder = dbPath.substr(0, dbPath.rfind('/') + 1);
+    struct stat parent {};
+    if (geteuid() != 0 || stat(folder.c_str(), &parent) != 0 || parent.st_uid == 0)
+        return;
+    // Closing a descriptor of another kind would release the locks of this process on the database.
+    const int fd = open(dbPath.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC);
+    struct stat file {};
+    if (fd >= 0 && fstat(fd, &file) == 0 && S_ISREG(file.st_mode) && file.st_uid == 0 && file.st_nlink == 1)
+        std::ignore = fchownat(fd, "", parent.st_uid, static_cast<gid_t>(-1), AT_EMPTY_PATH);
+    if (fd >= 0)
+        close(fd);
 }
 
 int CreateDatabase(const std::string &dbPath, const std::string &schemaPath, Creation when) {

@@ -21,4 +21,8 @@ int CreateDatabase(const std::string &dbPath, const std::string &schemaPath, Cre
 // off. Returns false, after a report, if that takes too long.
 bool AwaitCreation(const std::string &dbPath, const std::string &schemaPath);
 
+// Gives a new database to the owner of its folder: a service must be able to write what root creates there.
+// Only root can give files away; for others it does nothing.
+void GiveToOwnerOfFolder(const std::string &dbPath);
+
 } // namespace kelo

@@ -1,5 +1,3 @@
-#include <sqlite3.h>
-
 #include <utility>
 
 #include "kelosyslog/dbreader.h"
@@ -8,17 +6,6 @@
 #include "query/statement.h"
 
 using namespace kelo;
-
-namespace {
-
-// Whether the path may name another file by now.
-bool HasMoved(DBConnect_tag *connection) {
-    int hasMoved = 0;
-    sqlite3_file_control(KELODBInternalDBHdlGet(connection), "main", SQLITE_FCNTL_HAS_MOVED, &hasMoved);
-    return hasMoved != 0;
-}
-
-} // namespace
 
 SyslogDBReader::SyslogDBReader(std::string dbPath) : dbPath_(std::move(dbPath)) {}
 

@@ -2,10 +2,12 @@
 
 #include <iterator>
 
+#include "keloplatform/kelodb.h"
 #include "keloplatform/root.h"
 #include "keloplatform/torvc.h"
 #include "kelosyslog/accounting.h"
 #include "kelosyslog/dbreader.h"
+#include "kelosyslog/dbwriter.h"
 #include "kelosyslog/root.h"
 
 namespace kelo::test {
@@ -119,6 +121,39 @@ int GetHosts(Fixture &fixture) {
     return result;
 }
 
+const std::vector<_SYSLOG_LOG_DATA_tag> kNewLogs = {SampleLog(kRows), SampleLog(kRows + 1)};
+constexpr char kMark[] = "INSERT INTO logs (host) VALUES ('mark')";
+
+// Stores two records, and another row in their transaction.
+int StoreRecords(Fixture &fixture) {
+    const auto mark = [](DBConnect_tag *connection, void *) {
+        return KELODBExecute(connection, kMark, nullptr);
+    };
+    return SyslogDBWriter(fixture.root.File("logs.db")).Store(kNewLogs.data(), kNewLogs.size(), mark);
+}
+
+// All or nothing. A commit whose last steps fail may have been one.
+void CheckStored(const Fixture &fixture, const Outcome &outcome, int rowsBefore) {
+    const int rows = std::stoi(RunSql(fixture.database, "SELECT count(*) FROM logs"));
+    const bool neverRan = outcome.outOfMemory || outcome.fault.starts_with("KELODB");
+    EXPECT_TRUE((rows == rowsBefore + 3 && (outcome.IsDone() || !neverRan)) ||
+                (rows == rowsBefore && !outcome.IsDone()))
+        << rows;
+    EXPECT_THAT(outcome.messages, IsEmpty());
+}
+
+// The database is missing before. What has its name is complete.
+void CheckNewDatabase(const Fixture &fixture, const Outcome &outcome) {
+    const std::string path = fixture.root.File("logs.db");
+    EXPECT_TRUE(fs::exists(path) || !outcome.IsDone());
+    if (fs::exists(path)) {
+        EXPECT_EQ(RunSql(path, "SELECT count(*) FROM logs"), outcome.IsDone() ? "3" : "0");
+        EXPECT_EQ(RunSql(path, "PRAGMA journal_mode"), "wal");
+    }
+    for (const auto &file : fs::directory_iterator(fixture.root.Path()))
+        EXPECT_TRUE(file.path().string().find(".new-") == std::string::npos) << file;
+}
+
 const std::string kOldSection = "[R]\nkey=\"old\"\n";
 const std::string kNewSection = "[R]\nkey=\"new\"\n";
 
@@ -209,6 +244,9 @@ const std::vector<Operation> &Operations() {
             Ask("GetHosts", GetHosts, {"host00", "host01"}, {}),
             Delete("DeleteFiltered", SetUpLogsOfHost3, kRows - 1),
             Delete("DeleteAll", SetUpLogs, 0),
+            {"StoreRecords", true, SetUpLogs, StoreRecords,
+             [](const Fixture &fixture, const Outcome &outcome) { CheckStored(fixture, outcome, kRows); }},
+            {"StoreIntoNewDatabase", true, [](Fixture &) {}, StoreRecords, CheckNewDatabase, false},
             {"SetSection", true, SetUpSection, SetSection, CheckSection},
             {"FlushAccounting", true, SetUpAccounting, FlushAccounting, CheckAccounting},
         };

@@ -17,3 +17,4 @@ using reader::log;
 int PrintLog(_SYSLOG_LOG_DATA_tag &log, void *);
 bool Receive(std::string &host);
 void Store(const _SYSLOG_LOG_DATA_tag &log);
+void TryAgainLater();

@@ -35,7 +35,8 @@ int MustStop(void *) {
 } // namespace
 
 void SqliteConnection::Close::operator()(sqlite3 *db) const {
-    sqlite3_close(db);
+    if (!isBorrowed)
+        sqlite3_close(db);
 }
 
 SqliteConnection::SqliteConnection(const std::string &path, const SqliteOptions &options,

@@ -16,6 +16,7 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "base/errors.h"
 
@@ -53,6 +54,8 @@ class SqliteConnection {
 public:
     // Opens the file at the absolute `path`. Errors use `name`, if one is given.
     SqliteConnection(const std::string &path, const SqliteOptions &options, const std::string &name = "");
+    // Works on a connection that somebody else has opened and closes later.
+    SqliteConnection(sqlite3 *db, std::string name) : name_(std::move(name)), db_(db, {.isBorrowed = true}) {}
     SqliteConnection(const SqliteConnection &) = delete;
     SqliteConnection &operator=(const SqliteConnection &) = delete;
 
@@ -83,6 +86,7 @@ public:
 
 private:
     struct Close {
+        bool isBorrowed; // false unless it is set
         void operator()(sqlite3 *db) const;
     };
     void Open(const std::string &path);

@@ -7,10 +7,8 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <filesystem>
 #include <memory>
 
-#include "base/atomic_file.h"
 #include "base/files.h"
 #include "keloplatform/kelodb.h"
 #include "kelosyslog/dbhandler.h"
@@ -20,7 +18,7 @@ namespace {
 
 constexpr int64_t kBatchMs = 500;
 // SQLite itself waits a second for a lock, at each try.
-constexpr LogStoreOptions kStoreOptions{.busyTimeoutMs = 1000, .mustSyncCommits = false};
+constexpr SyslogDBWriterOptions kStoreOptions{.busyTimeoutMs = 1000, .mustSyncCommits = false};
 constexpr int64_t kRetrySoonMs = 100;
 constexpr int64_t kRetryMs = 1000;
 constexpr int64_t kRetryDamagedMs = 60'000; // each try notifies the administrator
@@ -116,12 +114,6 @@ void LogWriter::Open() {
     }
     if (store_)
         return;
-    // What creates the fresh database deletes a write-ahead log that is left there. That of a database that
-    // was set aside before stays what it is.
-    std::error_code isMissing;
-    const auto walBytes = std::filesystem::file_size(path_ + "-wal", isMissing);
-    if (InodeOf(path_) == 0 && !isMissing && walBytes > 0)
-        RenameToFreeName(path_ + "-wal", path_ + ".corrupt-wal");
     store_.emplace(path_, kStoreOptions);
 }
 

@@ -1,6 +1,6 @@
 #pragma once
 
-// Storing records into table "logs" of a log database.
+// Storing records with the progress of their source, with exceptions for failures.
 
 #include <cstdint>
 #include <functional>
@@ -9,8 +9,7 @@
 #include <string>
 
 #include "base/sqlite.h"
-#include "kelosyslog/records.h"
-#include "store/record_table.h"
+#include "kelosyslog/dbwriter.h"
 
 namespace kelo::tool {
 
@@ -23,30 +22,17 @@ struct StoreProgress {
     bool operator==(const StoreProgress &) const = default;
 };
 
-struct LogStoreOptions {
-    int busyTimeoutMs = 10'000; // how long to wait for another writer
-    // Without it a commit is on the disk only with the next checkpoint: after a loss of power the last ones
-    // may be missing, and the database is intact.
-    bool mustSyncCommits = true;
-};
-
 // An open log database, used by one thread at a time. Batches are transactions: after a failure, a kill or a
-// loss of power the database has whole batches, each with its progress.
+// loss of power the database has whole batches, each with its progress. All functions throw SqliteError.
 class LogStore {
 public:
-    // Opens the database at `path`, which is created from the shipped schema, in WAL mode, when it is
-    // missing; it appears under its name only when it is complete, but where a database that was moved has
-    // left files under its names. A database without any table gets the schema too. All functions throw
-    // SqliteError.
-    explicit LogStore(const std::string &path, const LogStoreOptions &options = {});
-    ~LogStore();
-    LogStore(const LogStore &) = delete;
-    LogStore &operator=(const LogStore &) = delete;
+    // Opens the database at `path`, or creates it, as SyslogDBWriter does.
+    explicit LogStore(const std::string &path, const SyslogDBWriterOptions &options = {});
 
     // The progress that was last stored for a source.
     std::optional<StoreProgress> ProgressGet(const std::string &source);
 
-    // Stores `logs`, whose ids SQLite chooses, in one transaction: all or, when it throws, none.
+    // Stores `logs` in one transaction: all or, when it throws, none.
     void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs);
 
     // The same, and `progress` in the same transaction.
@@ -56,23 +42,15 @@ public:
     void Store(std::span<const _SYSLOG_LOG_DATA_tag> logs,
                const std::function<void(SqliteConnection &)> &alongside);
 
-    // Whether the file was removed or renamed since it was opened. Records that are stored then are not found
-    // at the path.
-    bool HasMoved() const { return db_.HasMoved(); }
-
-    const std::string &Path() const { return path_; }
+    // Whether the file was removed or renamed since it was opened. The next records are stored into what has
+    // its path then.
+    bool HasMoved() const { return writer_.HasMoved(); }
 
 private:
-    void FillEmpty();
-    void InsertLogs(std::span<const _SYSLOG_LOG_DATA_tag> logs);
-    void PrepareProgress();
-    void SaveProgress(const StoreProgress &progress);
+    void Require(int result) const;
 
     std::string path_; // absolute
-    SqliteConnection db_;
-    RecordTable batch_;
-    std::optional<SqliteStatement> insertLogs_;
-    std::optional<SqliteStatement> saveProgress_; // made when it is needed
+    SyslogDBWriter writer_;
 };
 
 } // namespace kelo::tool

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-namespace kelo::tool {
+namespace kelo {
 namespace {
 
 constexpr char kDeclaration[] = "CREATE TABLE kelo_records(host, ip, fac, prio, llevel, tag, utcsec, "
@@ -14,11 +14,11 @@ constexpr char kDeclaration[] = "CREATE TABLE kelo_records(host, ip, fac, prio, 
 enum Column { kHost, kIp, kFac, kPrio, kLlevel, kTag, kUtcsec, kTzoffset, kLdate, kLtime, kProg, kMsg };
 
 struct Table : sqlite3_vtab {
-    const std::span<const _SYSLOG_LOG_DATA_tag> *logs;
+    const std::vector<const _SYSLOG_LOG_DATA_tag *> *logs;
 };
 
 struct Cursor : sqlite3_vtab_cursor {
-    std::span<const _SYSLOG_LOG_DATA_tag> logs;
+    const std::vector<const _SYSLOG_LOG_DATA_tag *> *logs;
     size_t row;
 };
 
@@ -73,7 +73,7 @@ struct RecordTable::Functions {
         auto *cursor = new (std::nothrow) Cursor{};
         if (cursor == nullptr)
             return SQLITE_NOMEM;
-        cursor->logs = *static_cast<Table *>(table)->logs;
+        cursor->logs = static_cast<Table *>(table)->logs;
         *result = cursor;
         return SQLITE_OK;
     }
@@ -91,12 +91,12 @@ struct RecordTable::Functions {
     }
     static int IsAtEnd(sqlite3_vtab_cursor *cursor) {
         const auto *position = static_cast<const Cursor *>(cursor);
-        return position->row >= position->logs.size() ? 1 : 0;
+        return position->row >= position->logs->size() ? 1 : 0;
     }
     // Both severity columns have the word.
     static int Value(sqlite3_vtab_cursor *cursor, sqlite3_context *result, int column) {
         const auto *position = static_cast<const Cursor *>(cursor);
-        const _SYSLOG_LOG_DATA_tag &log = position->logs[position->row];
+        const _SYSLOG_LOG_DATA_tag &log = *(*position->logs)[position->row];
         if (column == kPrio || column == kLlevel)
             sqlite3_result_text(result, g_MappingSyslogPrior[log.prio], -1, SQLITE_STATIC);
         else if (column == kUtcsec)
@@ -126,11 +126,9 @@ struct RecordTable::Functions {
 };
 
 // Without xCreate the table exists in every connection that has the module, and in no file.
-RecordTable::RecordTable(SqliteConnection &connection) {
+int RecordTable::Register(sqlite3 *db) {
     static const sqlite3_module module = Functions::Module();
-    const int status = sqlite3_create_module(connection.Get(), "kelo_records", &module, this);
-    if (status != SQLITE_OK)
-        connection.Fail(status);
+    return sqlite3_create_module(db, "kelo_records", &module, this);
 }
 
-} // namespace kelo::tool
+} // namespace kelo
