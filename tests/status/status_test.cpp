@@ -155,7 +155,7 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     status.volumes = {{{"/x"}, 1000 * kMiB, 100 * kMiB}, {{"/y"}, 100 * kMiB, 16 * kMiB}};
     EXPECT_TRUE(FindAttention(status).empty());
     // Where it listens: not, with nearly all connections in use, with datagrams that were lost.
-    status.syslogNg.aboveRate = 3;
+    status.syslogNg.aboveRate = 3, status.syslogNg.refusedTls = 1;
     status.network.listeners = ConfiguredListeners({});
     status.network.listeners[0].isKnown = true;
     status.network.listeners[1].isOpen = status.network.listeners[2].isOpen = true;
@@ -164,8 +164,9 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     EXPECT_THAT(FindAttention(status),
                 ElementsAre(HasSubstr("does not listen on UDP 127.0.0.1 port 514"), HasSubstr("5 datagrams"),
                             HasSubstr("231 connections of 256 on TCP 127.0.0.1 port 601"),
-                            HasSubstr("dropped 3 messages of addresses")));
-    status.network = {}, status.syslogNg.aboveRate = 0;
+                            HasSubstr("dropped 3 messages of addresses"),
+                            HasSubstr("TLS: syslog-ng refused 1 connection since")));
+    status.network = {}, status.syslogNg.aboveRate = status.syslogNg.refusedTls = 0;
     // Who stores should be the only one who can write the folder, also of a link.
     fs::create_directories(root_.File("open"));
     fs::create_symlink(logs_, root_.File("open/link.db"));

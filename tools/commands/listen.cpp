@@ -158,6 +158,7 @@ int Change(const Options &options, const std::string &root) {
                          ConfigurationLink(root) + " is missing");
     TakeOver change;
     change.root = root;
+    change.before = before;
     change.after = Changed(before, options);
     change.findSyslogNg = [&root] { return FindSyslogNg(root).pid; };
     const pid_t syslogNg = change.findSyslogNg();

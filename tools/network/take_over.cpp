@@ -140,16 +140,32 @@ std::string MissingListener(const NetworkSettings &settings, pid_t syslogNg) {
     return "";
 }
 
-// Waits until they are.
+// "" when none is open that only the earlier settings ask for. A reload closes them a while after it began.
+std::string LeftListener(const TakeOver &change, pid_t syslogNg) {
+    const std::vector<Listener> earlier = ConfiguredListeners(change.before);
+    for (const Listener &listener : FindListeners(change.after, syslogNg)) {
+        const bool isEarlier = std::any_of(earlier.begin(), earlier.end(), [&](const Listener &other) {
+            return other.isTcp == listener.isTcp && other.address == listener.address &&
+                   other.port == listener.port;
+        });
+        if (isEarlier && !listener.isConfigured)
+            return "syslog-ng still listens on " + listener.Name();
+    }
+    return "";
+}
+
+// Waits until syslog-ng has the sockets of the settings.
 std::string AwaitListeners(const TakeOver &change) {
     using Clock = std::chrono::steady_clock;
     constexpr std::chrono::seconds kPatience{20};
     constexpr std::chrono::milliseconds kPause{50};
     for (const auto deadline = Clock::now() + kPatience;;) {
         const pid_t pid = change.findSyslogNg();
-        std::string missing = pid == 0 ? "syslog-ng does not run" : MissingListener(change.after, pid);
-        if (missing.empty() || Clock::now() >= deadline)
-            return missing;
+        std::string problem = pid == 0 ? "syslog-ng does not run" : MissingListener(change.after, pid);
+        if (problem.empty())
+            problem = LeftListener(change, pid);
+        if (problem.empty() || Clock::now() >= deadline)
+            return problem;
         std::this_thread::sleep_for(kPause);
     }
 }

@@ -18,6 +18,7 @@ Step NeededStep(const NetworkSettings &before, const NetworkSettings &after, pid
 
 struct TakeOver {
     std::string root;
+    NetworkSettings before;
     NetworkSettings after;
     Step step = Step::kNone;
     std::function<pid_t()> findSyslogNg; // its process; 0 when it does not run
@@ -27,8 +28,9 @@ struct TakeOver {
 // another reason than those before. Changes nothing.
 void RequireAccepted(const std::string &root, const NetworkSettings &before, const NetworkSettings &after);
 
-// Writes the settings, lets syslog-ng take the step and waits until it listens. If it does not, the earlier
-// file is restored and syslog-ng restarted, and OutputError has the reason.
+// Writes the settings, lets syslog-ng take the step and waits until it has their sockets and none of those
+// before. If that does not happen, the earlier file is restored and syslog-ng restarted, and OutputError has
+// the reason.
 void ApplySettings(const TakeOver &change);
 
 } // namespace kelo::tool

@@ -64,6 +64,9 @@ std::vector<std::string> FindNetworkProblems(const NetworkStatus &status, const 
         lines.push_back("syslog-ng dropped " + Counted(syslogNg.aboveRate, "message") +
                         " of addresses that sent more than " + Grouped(status.settings.rate) +
                         " a second (kelosyslog listen)");
+    if (syslogNg.refusedTls > 0)
+        lines.push_back("TLS: syslog-ng refused " + Counted(syslogNg.refusedTls, "connection") +
+                        " since its start; its messages of SSL and certificates in the system log say why");
     for (const std::string &problem : status.tlsProblems)
         lines.push_back("TLS: " + problem);
     return lines;

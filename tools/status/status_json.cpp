@@ -33,6 +33,7 @@ Value ToJson(const SyslogNgStatus &status) {
     json["received"] = areTold ? Count(status.Received()) : Value();
     json["dropped"] = areTold ? Count(status.Dropped()) : Value();
     json["above_rate"] = areTold ? Count(status.aboveRate) : Value();
+    json["refused_tls"] = areTold ? Count(status.refusedTls) : Value();
     json["sources"] = Json::arrayValue;
     for (const SyslogNgCounters &source : status.sources) {
         Value &item = json["sources"].append(Value());

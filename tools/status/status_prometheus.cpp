@@ -71,6 +71,8 @@ void AddSyslogNg(Metrics &metrics, const SyslogNgStatus &status) {
         metrics.Single("syslog_ng_start_time_seconds", "Start of syslog-ng.", status.since);
     metrics.Single("syslog_ng_above_rate_messages_total", "Messages that the rate limit dropped.",
                    status.aboveRate);
+    metrics.Single("syslog_ng_refused_tls_connections_total", "Connections over TLS that were refused.",
+                   status.refusedTls);
     using Counters = SyslogNgCounters;
     const auto source = [](const Counters &one) { return Labels{{"source", one.id}}; };
     const auto destination = [](const Counters &one) {

@@ -76,11 +76,11 @@ SyslogNgStatus::State StateOf(const ControlAnswer &answer, pid_t pid) {
 
 using Destinations = std::vector<SyslogNgCounters>;
 
-// The shipped configuration sends what is above the rate limit to a destination that stores nothing.
-uint64_t CountAboveRate(const std::string &text) {
-    constexpr std::string_view kCounter = "\ndestination;d_kelo_above_rate;;a;processed;";
-    const size_t at = text.find(kCounter);
-    return at == std::string::npos ? 0 : std::strtoull(text.c_str() + at + kCounter.size(), nullptr, 10);
+// The shipped configuration sends what it only counts to destinations that store nothing.
+uint64_t CountSentTo(const std::string &destination, const std::string &text) {
+    const std::string counter = "\ndestination;" + destination + ";;a;processed;";
+    const size_t at = text.find(counter);
+    return at == std::string::npos ? 0 : std::strtoull(text.c_str() + at + counter.size(), nullptr, 10);
 }
 
 // Takes the sources and destinations out of an answer.
@@ -89,7 +89,8 @@ void ReadCounters(const std::string &text, SyslogNgStatus &status) {
     status.destinations.clear();
     for (SyslogNgCounters &counters : ParseSyslogNgCounters(text))
         (counters.driver == "source" ? status.sources : status.destinations).push_back(std::move(counters));
-    status.aboveRate = CountAboveRate(text);
+    status.aboveRate = CountSentTo("d_kelo_above_rate", text);
+    status.refusedTls = CountSentTo("d_kelo_tls_refused", text);
 }
 
 bool HasWritten(const SyslogNgCounters &now, const Destinations &before) {

@@ -38,7 +38,10 @@ struct SyslogNgStatus {
     std::string problem; // why there are no counters; "" when there are
     std::vector<SyslogNgCounters> sources;
     std::vector<SyslogNgCounters> destinations;
-    uint64_t aboveRate = 0; // messages that the rate limit of the shipped configuration dropped
+    // Counted by the shipped configuration: messages that its rate limit dropped, and connections over TLS
+    // whose handshake failed.
+    uint64_t aboveRate = 0;
+    uint64_t refusedTls = 0;
 
     uint64_t Received() const;
     uint64_t Dropped() const;
