@@ -86,5 +86,36 @@ TEST_F(Count, SplitsByColumnTheMostFrequentFirst) {
     Expect("count --by message", 2);
 }
 
+TEST_F(Count, CountsTheValuesOfAnyColumnAndFilter) {
+    RunSql(
+        logs_,
+        "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 12000) "
+        "INSERT INTO logs(host, prog, llevel, msg, utcsec) SELECT CASE i % 4 WHEN 0 THEN NULL WHEN 1 THEN "
+        "'b' "
+        "ELSE 'a' END, 'p' || (i % 3), 'info', CASE WHEN i > 11000 THEN 'rare' ELSE 'often' END, i FROM n;"
+        "INSERT INTO logs(host, msg, utcsec) VALUES ('', 'last', NULL), (CAST(X'ff' AS TEXT), 'last', NULL)");
+    const std::pair<std::string, std::string> cases[] = {
+        {"host --counts", "VALUE  COUNT\na       6000\n        3001\nb       3000\n\\xff       1\n"},
+        {"host --counts -n 1 --offset 1 -o jsonl", "{\"value\":\"\",\"count\":3001}\n"},
+        {"host --counts -g rare -o csv", "value,count\r\na,500\r\n,250\r\nb,250\r\n"},
+        {"host --counts -g often -n 1 -o csv --no-header", "a,5500\r\n"},
+        {"host --counts --since @11999 -o csv --no-header", ",1\r\na,1\r\n"},
+        {"host -g last -o jsonl", "\"\"\n\"\xef\xbf\xbd\"\n"},
+        {"host --counts --offset 3 -o jsonl",
+         "{\"value\":\"\xef\xbf\xbd\",\"value_base64\":\"/w==\",\"count\":1}\n"},
+        {"prog -t p1,p2", "p1\np2\n"},
+        {"msg --counts -o csv --no-header", "often,11000\r\nrare,1000\r\nlast,2\r\n"},
+        {"utcsec -H b --since @11990 -o json", "[\n\"11993\",\n\"11997\"\n]\n"},
+        {"utcsec --counts -n 2 -o csv --no-header", ",2\r\n1,1\r\n"},
+    };
+    for (const auto &[options, out] : cases)
+        Expect("values " + options, 0, out);
+    Expect("values host --counts -H nobody", 1, "");
+    Expect(
+        "count --by host -g rare -o csv", 0,
+        "value,count,emerg,alert,crit,err,warning,notice,info,debug,unknown\r\na,500,0,0,0,0,0,0,500,0,0\r\n"
+        ",250,0,0,0,0,0,0,250,0,0\r\nb,250,0,0,0,0,0,0,250,0,0\r\n");
+}
+
 } // namespace
 } // namespace kelo::test

@@ -105,6 +105,37 @@ TEST_F(Search, PagesByIdFromBothEnds) {
     Expect("search --follow --before-id 5", 2);
 }
 
+TEST_F(Search, TakesNamesAsTheyAre) {
+    RunSql(logs_,
+           "INSERT INTO logs(host, prog) VALUES ('a,b', 'p*'), ('!c', 'p1'), ('a', 'it''s'), ('b', NULL)");
+    const std::pair<std::string, std::string> cases[] = {
+        {"--host-is a,b", "1 "},
+        {"--host-is '!c' --host-is b", "2 4 "},
+        {"--program-is 'p*'", "1 "},
+        {"--program-is \"it's\" --host-is a", "3 "},
+        {"--program-is-not 'p*' --program-is-not \"it's\"", "2 4 "},
+        {"--host-is-not a,b -H 'a,b'", "3 4 "},
+    };
+    for (const auto &[options, ids] : cases) {
+        std::string found = Run("search -o csv --no-header --fields id " + options).out;
+        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
+            found.replace(at, 2, " ");
+        EXPECT_EQ(found, ids) << options;
+    }
+    Expect("search --host-is ''", 2);
+}
+
+TEST_F(Search, CutsMessagesAtAWholeCharacter) {
+    RunSql(
+        logs_,
+        "INSERT INTO logs(msg) VALUES ('ab\xc3\xa4z'), ('abc'), ('ab' || CAST(X'80808080808080' AS TEXT))");
+    Expect("search --max-message 3 -o jsonl --fields id,msg", 0,
+           "{\"id\":1,\"msg\":\"ab\",\"length\":5}\n{\"id\":2,\"msg\":\"abc\",\"length\":3}\n"
+           "{\"id\":3,\"msg\":\"ab\xef\xbf\xbd\",\"msg_base64\":\"YWKA\",\"length\":9}\n");
+    Expect("search --max-message 4 -o csv --no-header --fields msg -n 1 --oldest", 0, "ab\xc3\xa4\r\n");
+    EXPECT_THAT(Run("search --max-message 1 -o short -n 1").out, HasSubstr(" : a\n"));
+}
+
 TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
     const std::string japanese = "\xe6\x97\xa5\xe6\x9c\xac", prog = "\x1b]0;owned\x07", bad = "\xef\xbf\xbd";
     const std::string msg = "a\\b\r\nc\td \xff\xc3( \xed\xa0\x80 \xc2\x9b"
@@ -118,7 +149,8 @@ TEST_F(Search, PrintsHostileLogsWholeInFilesAndHarmlessOnATerminal) {
     const std::string json =
         R"({"id":9223372036854775807,"time":"2020-01-02T10:11:12+00:00","prio":"err","host":"h\"o,s't",)"
         R"("prog":"\u001b]0;owned\u0007","msg":"a\\b\r\nc\td )" +
-        bad + bad + "( " + bad + bad + bad + " \\u009b31m \\u202e " + japanese + "\"}";
+        bad + bad + "( " + bad + bad + bad + " \\u009b31m \\u202e " + japanese +
+        R"(","msg_base64":"YVxiDQpjCWQg/8MoIO2ggCDCmzMxbSDigK4g5pel5pys"})";
     Expect("search -o json --fields id,time,prio,host,prog,msg", 0, "[\n" + json + "\n]\n");
     Expect("search -o jsonl --fields id,time,prio,host,prog,msg", 0, json + "\n");
     Expect("search -o json -H nobody", 1, "[\n]\n");

@@ -53,7 +53,8 @@ void JsonObject::End() {
 
 void JsonObject::Add(std::string_view name, std::string_view text) {
     AddName(name);
-    AppendJsonString(out_, text);
+    if (!AppendJsonString(out_, text))
+        AddJson(std::string(name) + "_base64", '"' + Base64(text) + '"');
 }
 
 void JsonObject::AddJson(std::string_view name, std::string_view json) {

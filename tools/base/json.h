@@ -23,6 +23,7 @@ public:
     enum class Layout { kOneLine, kLineEach };
 
     explicit JsonObject(std::string &out, Layout layout = Layout::kOneLine) : out_(out), layout_(layout) {}
+    // A text; of one that is no UTF-8, the member "NAME_base64" behind it has the bytes.
     void Add(std::string_view name, std::string_view text);
     // A value that is JSON: a number, true, null.
     void AddJson(std::string_view name, std::string_view json);

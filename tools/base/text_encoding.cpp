@@ -137,18 +137,27 @@ size_t FirstCharacters(std::string_view text, size_t count) {
 size_t WholeCharacters(std::string_view text, size_t maxBytes) {
     if (text.size() <= maxBytes)
         return text.size();
-    size_t length = maxBytes;
-    while (length > 0 && !BeginsCharacter(text[length]))
-        --length;
-    return length;
+    constexpr size_t kLongest = 4;
+    for (size_t length = maxBytes; maxBytes - length < kLongest; --length) {
+        const auto byte = static_cast<uint8_t>(text[length]);
+        if (BeginsCharacter(text[length])) {
+            const size_t size = byte < 0xc0 ? 1 : byte < 0xe0 ? 2 : byte < 0xf0 ? 3 : kLongest;
+            return length + size > maxBytes ? length : maxBytes;
+        }
+        if (length == 0)
+            break;
+    }
+    return maxBytes;
 }
 
-void AppendJsonString(std::string &out, std::string_view text) {
+bool AppendJsonString(std::string &out, std::string_view text) {
+    bool isExact = true;
     const auto isPlain = [](uint32_t code) {
         return code != '"' && code != '\\' && !IsControl(code) && !Misleads(code);
     };
     out += '"';
     AppendEscaped(out, text, isPlain, [&](Character character) {
+        isExact = isExact && character.isValid;
         if (!character.isValid)
             out += "\xef\xbf\xbd";
         else if (character.code == '"' || character.code == '\\')
@@ -159,6 +168,21 @@ void AppendJsonString(std::string &out, std::string_view text) {
             AppendEscape(out, "\\u%04x", character.code);
     });
     out += '"';
+    return isExact;
+}
+
+std::string Base64(std::string_view bytes) {
+    constexpr const char *kDigits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::string text;
+    for (size_t i = 0; i < bytes.size(); i += 3) {
+        const size_t count = std::min<size_t>(3, bytes.size() - i);
+        uint32_t group = 0;
+        for (size_t k = 0; k < 3; ++k)
+            group = group << 8 | (k < count ? static_cast<unsigned char>(bytes[i + k]) : 0U);
+        for (size_t k = 0; k < 4; ++k)
+            text += k <= count ? kDigits[group >> (18 - 6 * k) & 63] : '=';
+    }
+    return text;
 }
 
 std::string EscapeMarkup(std::string_view text, std::string_view characters) {

@@ -19,13 +19,17 @@ size_t CharacterCount(std::string_view text);
 // Length in bytes of the first `count` characters of a text that is UTF-8.
 size_t FirstCharacters(std::string_view text, size_t count);
 
-// Length in bytes of the whole characters within the first `maxBytes` of a text that is UTF-8.
+// Length in bytes of the whole characters within the first `maxBytes` of a text; of one that is no UTF-8
+// there, `maxBytes`.
 size_t WholeCharacters(std::string_view text, size_t maxBytes);
 
 // Appends the text as a JSON string with its quotes: control characters, characters that turn the writing
 // direction, and the line and paragraph separators are escaped, and each byte that is no UTF-8 becomes
-// U+FFFD.
-void AppendJsonString(std::string &out, std::string_view text);
+// U+FFFD. Returns whether there was none of those.
+bool AppendJsonString(std::string &out, std::string_view text);
+
+// The bytes in Base64 (RFC 4648).
+std::string Base64(std::string_view bytes);
 
 // The text with those of the characters & < > " ' as entities that are in `characters`.
 std::string EscapeMarkup(std::string_view text, std::string_view characters);

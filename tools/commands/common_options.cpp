@@ -48,6 +48,17 @@ void AddFilterOptions(Command command, LogFilter &filter) {
     command.AddTexts("-t,--program", filter.programs, "PROGRAM", "Program; * and ? are wildcards")
         .Group(group);
     command
+        .AddTexts("--host-is", filter.hostNames, "NAME",
+                  "Sending host of exactly this name: commas, wildcards and '!' mean themselves. Given "
+                  "twice, either")
+        .Group(group);
+    command
+        .AddTexts("--host-is-not", filter.otherHostNames, "NAME", "Any other host than the one of this name")
+        .Group(group);
+    command.AddTexts("--program-is", filter.programNames, "NAME", "Program of exactly this name")
+        .Group(group);
+    command.AddTexts("--program-is-not", filter.otherProgramNames, "NAME", "Any other program").Group(group);
+    command
         .AddTexts(
             "-g,--grep", filter.keywords, "KEYWORDS",
             "Message: words that all occur, \"a phrase\", one OR other, -without, wild*card, /regex/; exact "

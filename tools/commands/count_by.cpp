@@ -4,7 +4,6 @@
 
 #include "base/errors.h"
 #include "base/json.h"
-#include "base/text_encoding.h"
 #include "base/time_format.h"
 #include "cli/exit_status.h"
 #include "print/statistics_table.h"
@@ -35,8 +34,8 @@ struct Answer {
     std::string head = {}; // the members before "count" in a document, ...
     std::string tail = {}; // ... and behind it
     struct Row {
-        std::string json; // of the first column
-        std::string text; // the same in a table
+        std::string text;   // of the first column
+        std::string number; // the same in a document if it is a number there
         SeverityCounts counts;
     };
     std::vector<Row> rows = {};
@@ -62,7 +61,10 @@ std::string Document(const Answer &answer) {
     for (const Answer::Row &row : answer.rows) {
         lines.BeginItem(out);
         JsonObject object(out);
-        object.AddJson(answer.name, row.json);
+        if (row.number.empty())
+            object.Add(answer.name, row.text);
+        else
+            object.AddJson(answer.name, row.number);
         object.AddJson("count", std::to_string(row.counts.total));
         if (answer.hasSeverities)
             object.AddJson("severities", SeveritiesOf(row.counts));
@@ -109,17 +111,10 @@ Answer AnswerByTime(const TimeBuckets &counts, OutputFormat format) {
     const TimeFormat time(false);
     for (size_t i = 0; i < counts.buckets.size(); ++i) {
         const int64_t begin = counts.BeginOf(i);
-        answer.rows.push_back({std::to_string(begin),
-                               format == OutputFormat::Text ? time.Plain(begin) : time.Iso(begin),
-                               counts.buckets[i]});
+        answer.rows.push_back({format == OutputFormat::Text ? time.Plain(begin) : time.Iso(begin),
+                               std::to_string(begin), counts.buckets[i]});
     }
     return answer;
-}
-
-Answer::Row RowOf(const std::string &value, const SeverityCounts &counts) {
-    std::string json;
-    AppendJsonString(json, value);
-    return {json, value, counts};
 }
 
 // The most frequent first.
@@ -129,7 +124,7 @@ Answer AnswerByColumn(const CountedColumn &column, const LogTable &table, const 
     Answer answer{.name = "value", .hasSeverities = hasSeverities, .total = tally.total};
     answer.head = std::string("\"by\":\"") + column.name + "\"";
     for (const auto &[value, counts] : tally.values)
-        answer.rows.push_back(RowOf(value, counts));
+        answer.rows.push_back({value, "", counts});
     std::stable_sort(answer.rows.begin(), answer.rows.end(), [](const Answer::Row &a, const Answer::Row &b) {
         return a.counts.total > b.counts.total;
     });
@@ -187,7 +182,8 @@ int CountBy(const LogTable &table, const Conditions &conditions, const LogFilter
             const CountByOptions &options, OutputFormat format) {
     if (!options.by.empty() && !options.buckets.empty())
         throw UsageError("--buckets: goes not together with --by");
-    const Answer answer = Ask(table, conditions, PeriodOf(filter, now), options, format);
+    const Conditions selected = filter.keywords.empty() ? conditions : NarrowToFew(table, conditions);
+    const Answer answer = Ask(table, selected, PeriodOf(filter, now), options, format);
     Output output(true);
     output.Write(format == OutputFormat::Json ? Document(answer) : Table(answer, format));
     output.Finish();

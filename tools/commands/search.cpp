@@ -43,6 +43,7 @@ struct Options {
     std::string beforeId;
     std::string afterId;
     std::string idle;
+    std::string maxMessage;
     bool fromOldest = false;
     bool newestFirst = false;
     bool follow = false;
@@ -88,7 +89,9 @@ int Run(const Options &options, const std::string &root) {
     const Page page = options.follow ? Page{} : ParsePage(options);
     const FollowOptions follow = options.follow ? ParseFollow(options, now) : FollowOptions{};
     const LogTable table = ResolveLogTable(options.table, root);
-    const RecordLayout layout = MakeLayout(options.output, table.kind);
+    RecordLayout layout = MakeLayout(options.output, table.kind);
+    if (!options.maxMessage.empty())
+        layout.maxMessage = ParseNumber("--max-message", options.maxMessage, 0, kMaxLines);
     const LogReader reader(table, MakeConditions(options.filter, table, now));
 
     Output output(!options.follow && !options.output.noPager);
@@ -138,6 +141,10 @@ void AddSearch(Program &program) {
     command.AddText("--idle", options->idle, "SECONDS", "Stop following after SECONDS without a new log")
         .Group(group);
     AddOutputOptions(command, options->output);
+    command
+        .AddText("--max-message", options->maxMessage, "N",
+                 "Cut messages to N bytes, at a whole character; in json 'length' is the length of all of it")
+        .Group("How to print");
     AddTableOptions(command, options->table);
 }
 

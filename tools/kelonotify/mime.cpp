@@ -16,20 +16,6 @@ bool IsPlain(char byte) {
     return byte >= 0x20 && byte < 0x7f;
 }
 
-std::string Base64(std::string_view bytes) {
-    constexpr const char *kDigits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-    std::string text;
-    for (size_t i = 0; i < bytes.size(); i += 3) {
-        const size_t count = std::min<size_t>(3, bytes.size() - i);
-        uint32_t group = 0;
-        for (size_t k = 0; k < 3; ++k)
-            group = group << 8 | (k < count ? static_cast<unsigned char>(bytes[i + k]) : 0U);
-        for (size_t k = 0; k < 4; ++k)
-            text += k <= count ? kDigits[group >> (18 - 6 * k) & 63] : '=';
-    }
-    return text;
-}
-
 std::string Date(int64_t seconds) {
     constexpr const char *kDays[] = {"Sun", "Mon", "Tue", "Wed", "Thu", "Fri", "Sat"};
     constexpr const char *kMonths[] = {"Jan", "Feb", "Mar", "Apr", "May", "Jun",

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <string_view>
 
 #include "base/errors.h"
 
@@ -98,6 +99,10 @@ RecordFields ParseFields(const std::string &names, TableKind kind) {
 
 bool IsTime(const RecordField &field) {
     return &field == &kFields[1];
+}
+
+bool IsMessage(const RecordField &field) {
+    return std::string_view(field.name) == "msg";
 }
 
 std::string RecordTime(const Log &log, TableKind kind, const TimeFormat &format,

@@ -35,6 +35,9 @@ RecordFields ParseFields(const std::string &names, TableKind kind);
 // Whether the field is "time", whose text depends on the time zone and on the form (RecordTime).
 bool IsTime(const RecordField &field);
 
+// Whether the field is the message, of any length.
+bool IsMessage(const RecordField &field);
+
 // The time of a record: `local` of its `utcsec`, or its own `ldate` and `ltime` in a table without `utcsec`.
 std::string RecordTime(const _SYSLOG_LOG_DATA_tag &log, TableKind kind, const TimeFormat &format,
                        std::string (TimeFormat::*form)(int64_t) const);

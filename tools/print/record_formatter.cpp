@@ -44,7 +44,15 @@ protected:
     const RecordLayout &Layout() const { return layout_; }
     std::string Value(const RecordField &field, const Log &log,
                       std::string (TimeFormat::*form)(int64_t) const) const {
-        return IsTime(field) ? RecordTime(log, layout_.kind, time_, form) : field.value(log);
+        std::string value = IsTime(field) ? RecordTime(log, layout_.kind, time_, form) : field.value(log);
+        if (layout_.maxMessage && IsMessage(field))
+            Cut(value);
+        return value;
+    }
+    std::string Message(const Log &log) const {
+        std::string text = RecordMessage(log, layout_.kind);
+        Cut(text);
+        return text;
     }
     std::string Time(const Log &log, std::string (TimeFormat::*form)(int64_t) const) const {
         return RecordTime(log, layout_.kind, time_, form);
@@ -54,6 +62,11 @@ protected:
     }
 
 private:
+    void Cut(std::string &message) const {
+        if (layout_.maxMessage)
+            message.resize(WholeCharacters(message, *layout_.maxMessage));
+    }
+
     RecordLayout layout_;
     TimeFormat time_;
 };
@@ -117,7 +130,7 @@ public:
 
     void Add(const Log &log, std::string &out) override {
         out += EscapeForTerminal(Time(log, &TimeFormat::Short) + " " + log.host + " " + log.prog + ": ");
-        AppendColoured(out, EscapeForTerminal(RecordMessage(log, Layout().kind)), Colour(log));
+        AppendColoured(out, EscapeForTerminal(Message(log)), Colour(log));
         out += '\n';
     }
 };
@@ -137,6 +150,8 @@ public:
                 object.AddJson(field->name, value);
             else
                 object.Add(field->name, value);
+            if (Layout().maxMessage && IsMessage(*field))
+                object.AddJson("length", std::to_string(field->value(log).size()));
         }
         object.End();
         lines_.EndItem(out);

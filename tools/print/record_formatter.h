@@ -29,6 +29,8 @@ struct RecordLayout {
     bool hasHeader = true;
     bool hasColour = false;
     bool inUtc = false;
+    // A longer message is cut to so many bytes, or some fewer for a whole character; JSON has its length.
+    std::optional<size_t> maxMessage = {};
 };
 
 // Formats records as text, one by one:

@@ -64,6 +64,19 @@ void AddValues(Conditions &conditions, _SYSLOG_DB_ATTRI_tag attr, const IncludeE
         conditions.push_back(Exclusion(LogAttriStrGet(attr), value));
 }
 
+// The values as they are: nothing in them has a meaning.
+void AddNames(Conditions &conditions, _SYSLOG_DB_ATTRI_tag attr, const std::string &option,
+              const std::vector<std::string> &names, const std::vector<std::string> &otherNames) {
+    RequireFewValues(option, names.size() + otherNames.size());
+    std::string anyOf;
+    for (const std::string &name : names)
+        anyOf += (anyOf.empty() ? "" : ",") + SqlText(name);
+    if (!names.empty())
+        conditions.push_back(RawCondition(LogAttriStrGet(attr) + (" IN (" + anyOf + ")")));
+    for (const std::string &name : otherNames)
+        conditions.push_back(RawCondition(LogAttriStrGet(attr) + (" IS NOT " + SqlText(name))));
+}
+
 void AddSeverities(Conditions &conditions, const std::vector<std::string> &values) {
     const SeverityFilter severities = ParseSeverities(values);
     IncludeExclude words;
@@ -120,7 +133,8 @@ void RequireColumn(bool isUsed, const char *option, const char *column, const Lo
 bool IsEmpty(const LogFilter &filter) {
     return filter.since.empty() && filter.until.empty() && filter.severities.empty() &&
            filter.facilities.empty() && filter.hosts.empty() && filter.programs.empty() &&
-           filter.keywords.empty();
+           filter.keywords.empty() && filter.hostNames.empty() && filter.otherHostNames.empty() &&
+           filter.programNames.empty() && filter.otherProgramNames.empty();
 }
 
 std::optional<int64_t> LastSecond(const LogFilter &filter, int64_t now) {
@@ -140,6 +154,8 @@ std::list<_SYSLOG_SQL_COND_tag> MakeConditions(const LogFilter &filter, const Lo
     AddSeverities(conditions, filter.severities);
     AddFacilities(conditions, filter.facilities);
     AddValues(conditions, SYSLOG_ATTRI_PROG, SplitValues("--program", filter.programs));
+    AddNames(conditions, SYSLOG_ATTRI_HOST, "--host-is", filter.hostNames, filter.otherHostNames);
+    AddNames(conditions, SYSLOG_ATTRI_PROG, "--program-is", filter.programNames, filter.otherProgramNames);
     for (const std::string &keyword : filter.keywords)
         AddKeyword(conditions, keyword);
     if (!filter.since.empty()) {

@@ -20,6 +20,11 @@ struct LogFilter {
     std::vector<std::string> facilities = {};
     std::vector<std::string> hosts = {};
     std::vector<std::string> programs = {};
+    // Exactly these, without wildcards; and none of those.
+    std::vector<std::string> hostNames = {};
+    std::vector<std::string> otherHostNames = {};
+    std::vector<std::string> programNames = {};
+    std::vector<std::string> otherProgramNames = {};
     std::vector<std::string> keywords = {};
 };
 

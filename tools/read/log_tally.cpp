@@ -28,20 +28,59 @@ std::string SelectionOf(const LogTable &table, const Conditions &conditions) {
     return table.name + (clause.empty() ? "" : " WHERE " + clause);
 }
 
-// Passes the first value and the severity of each selected record to `take`.
-template <typename Take>
-void ForEachRecord(const LogTable &table, const Conditions &conditions, const std::string &column,
-                   Take take) {
-    const bool hasSeverity = table.kind != TableKind::Transfer;
+using Row = ReadOnlyQuery::Values;
+
+// Passes these columns of each selected record to `take`.
+void ForEachRecord(const LogTable &table, const Conditions &conditions, const std::string &columns,
+                   const ReadOnlyQuery::RowHandler &take) {
     const ReadOnlyQuery database(table);
     try {
-        database.ForEach(column + (hasSeverity ? ", llevel" : ""), SelectionOf(table, conditions),
-                         [&](const ReadOnlyQuery::Values &row) {
-                             take(row, hasSeverity ? SeverityOf(row.Text(1)) : kUnknownSeverity);
-                         });
+        database.ForEach(columns, SelectionOf(table, conditions), take);
     } catch (const SqliteError &) {
         throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
     }
+}
+
+// Something for each value, found without a copy of it.
+template <typename Counts>
+class ByValue {
+public:
+    Counts &operator[](std::string_view value) {
+        const auto found = values_.find(value);
+        return found != values_.end() ? found->second : values_.emplace(value, Counts()).first->second;
+    }
+    auto begin() const { return values_.begin(); }
+    auto end() const { return values_.end(); }
+
+private:
+    struct Hash : std::hash<std::string_view> {
+        using is_transparent = void;
+    };
+    std::unordered_map<std::string, Counts, Hash, std::equal_to<>> values_;
+};
+
+// Columns with a value of its own in most records, which SQLite counts with files for what memory cannot
+// hold.
+bool HasManyValues(const std::string &column) {
+    return column == "id" || column == "utcsec" || column == "msg";
+}
+
+std::vector<ValueCount> CountManyValues(const LogTable &table, const Conditions &conditions,
+                                        const std::string &column, const ValueOrder &order) {
+    const std::string sql = "SELECT ifnull(" + column + ", '') AS value, COUNT(*) AS count FROM " +
+                            SelectionOf(table, conditions) + " GROUP BY 1 ORDER BY " +
+                            (order.isMostFrequentFirst ? "2 DESC, " : "") + "1 LIMIT " +
+                            (order.limit == 0 ? "-1" : std::to_string(order.limit)) + " OFFSET " +
+                            std::to_string(order.offset);
+    std::vector<ValueCount> values;
+    const ReadOnlyQuery database(table);
+    try {
+        for (const ReadOnlyQuery::Row &row : database.Rows(sql, {"value", "count"}))
+            values.push_back({row[0], std::strtoull(row[1].c_str(), nullptr, 10)});
+    } catch (const SqliteError &) {
+        throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
+    }
+    return values;
 }
 
 void Count(SeverityCounts &counts, size_t severity) {
@@ -71,8 +110,9 @@ TimeTally TallyByTime(const LogTable &table, const Conditions &conditions, int64
     TimeTally tally;
     int64_t lastSpan = 0;
     SeverityCounts *last = nullptr; // of the record before, as most follow one of the same span
-    ForEachRecord(table, conditions, "utcsec", [&](const ReadOnlyQuery::Values &row, size_t severity) {
+    ForEachRecord(table, conditions, "utcsec, llevel", [&](const Row &row) {
         const std::optional<int64_t> time = row.Number(0);
+        const size_t severity = SeverityOf(row.Text(1));
         Count(tally.total, severity);
         if (!time || *time < -kFarthestTime || *time > kFarthestTime)
             return Count(tally.untimed, severity);
@@ -86,21 +126,47 @@ TimeTally TallyByTime(const LogTable &table, const Conditions &conditions, int64
 }
 
 ValueTally TallyByColumn(const LogTable &table, const Conditions &conditions, const std::string &column) {
-    struct Hash : std::hash<std::string_view> {
-        using is_transparent = void;
-    };
-    std::unordered_map<std::string, SeverityCounts, Hash, std::equal_to<>> values;
+    ByValue<SeverityCounts> values;
     ValueTally tally;
-    ForEachRecord(table, conditions, column, [&](const ReadOnlyQuery::Values &row, size_t severity) {
-        const std::string_view value = row.Text(0);
-        auto found = values.find(value);
-        if (found == values.end())
-            found = values.emplace(value, SeverityCounts()).first;
-        Count(found->second, severity);
+    const bool hasSeverity = table.kind != TableKind::Transfer;
+    ForEachRecord(table, conditions, column + (hasSeverity ? ", llevel" : ""), [&](const Row &row) {
+        const size_t severity = hasSeverity ? SeverityOf(row.Text(1)) : kUnknownSeverity;
+        Count(values[row.Text(0)], severity);
         Count(tally.total, severity);
     });
-    tally.values = {std::make_move_iterator(values.begin()), std::make_move_iterator(values.end())};
+    tally.values = {values.begin(), values.end()};
     return tally;
+}
+
+std::vector<ValueCount> CountValues(const LogTable &table, const Conditions &conditions,
+                                    const std::string &column, const ValueOrder &order) {
+    if (HasManyValues(column))
+        return CountManyValues(table, conditions, column, order);
+    ByValue<uint64_t> counts;
+    ForEachRecord(table, conditions, column, [&](const Row &row) { ++counts[row.Text(0)]; });
+    std::vector<ValueCount> values;
+    for (const auto &[value, count] : counts)
+        values.push_back({value, count});
+    std::sort(values.begin(), values.end(), [&](const ValueCount &a, const ValueCount &b) {
+        return order.isMostFrequentFirst && a.count != b.count ? a.count > b.count : a.value < b.value;
+    });
+    values.erase(values.begin(),
+                 values.begin() + static_cast<long>(std::min<uint64_t>(order.offset, values.size())));
+    if (order.limit != 0 && order.limit < values.size())
+        values.resize(order.limit);
+    return values;
+}
+
+Conditions NarrowToFew(const LogTable &table, const Conditions &conditions) {
+    constexpr uint64_t kFew = 10'000;
+    std::string ids;
+    const uint64_t count =
+        LogReader(table, conditions).ReadPage({kFew}, false, [&](const _SYSLOG_LOG_DATA_tag &log) {
+            ids += (ids.empty() ? "" : ",") + std::to_string(log.id);
+        });
+    if (count == kFew)
+        return conditions;
+    return {{SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "id IN (" + ids + ")", {}}};
 }
 
 uint64_t CountUpTo(const LogTable &table, const Conditions &conditions, uint64_t limit) {

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <vector>
 
 #include "read/log_reader.h"
 #include "read/log_table.h"
@@ -40,6 +41,23 @@ struct ValueTally {
     SeverityCounts total;
 };
 ValueTally TallyByColumn(const LogTable &table, const Conditions &conditions, const std::string &column);
+
+// A value of a column and the number of its records.
+struct ValueCount {
+    std::string value;
+    uint64_t count = 0;
+};
+struct ValueOrder {
+    bool isMostFrequentFirst = false; // else by value
+    uint64_t limit = 0;               // 0 for all
+    uint64_t offset = 0;
+};
+std::vector<ValueCount> CountValues(const LogTable &table, const Conditions &conditions,
+                                    const std::string &column, const ValueOrder &order);
+
+// The same selection by its ids if it is small, for conditions with a keyword: the index for keywords serves
+// only the reading of whole records, not the counts above.
+Conditions NarrowToFew(const LogTable &table, const Conditions &conditions);
 
 // Times that far from the epoch are no times of records.
 constexpr int64_t kFarthestTime = int64_t{1} << 40;

@@ -115,9 +115,7 @@ void ReadOnlyQuery::ForEach(const std::string &columns, const std::string &from,
 
 std::string_view ReadOnlyQuery::Values::Text(int column) const {
     const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(values_[column]));
-    return text == nullptr
-               ? std::string_view()
-               : std::string_view(text, static_cast<size_t>(sqlite3_value_bytes(values_[column])));
+    return text == nullptr ? std::string_view() : std::string_view(text);
 }
 
 std::optional<int64_t> ReadOnlyQuery::Values::Number(int column) const {

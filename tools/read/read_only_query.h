@@ -66,7 +66,7 @@ class ReadOnlyQuery::Values {
 public:
     explicit Values(sqlite3_value **values) : values_(values) {}
 
-    // The bytes of a text, and a number as text; "" for NULL.
+    // A text up to its first NUL byte, as in other results; a number as text, and NULL as "".
     std::string_view Text(int column) const;
     // A number, without its fraction; nothing for other types.
     std::optional<int64_t> Number(int column) const;

@@ -60,6 +60,11 @@ void AddSeverities(std::vector<_SYSLOG_DB_PRIORITY_tag> &severities, const std::
 
 } // namespace
 
+void RequireFewValues(const std::string &option, size_t count) {
+    if (count > kMaxValues)
+        throw UsageError(option + ": more than " + std::to_string(kMaxValues) + " values");
+}
+
 IncludeExclude SplitValues(const std::string &option, const std::vector<std::string> &values) {
     IncludeExclude filter;
     for (const std::string &value : values) {
@@ -76,8 +81,7 @@ IncludeExclude SplitValues(const std::string &option, const std::vector<std::str
             begin = end + 1;
         }
     }
-    if (filter.included.size() + filter.excluded.size() > kMaxValues)
-        throw UsageError(option + ": more than " + std::to_string(kMaxValues) + " values");
+    RequireFewValues(option, filter.included.size() + filter.excluded.size());
     return filter;
 }
 

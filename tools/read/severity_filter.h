@@ -17,6 +17,9 @@ struct IncludeExclude {
 // value and for more values than one statement can hold.
 IncludeExclude SplitValues(const std::string &option, const std::vector<std::string> &values);
 
+// Throws UsageError that names `option` if one statement cannot hold as many values.
+void RequireFewValues(const std::string &option, size_t count);
+
 // The severities that --priority selects. If none is included, all but the excluded ones are.
 struct SeverityFilter {
     std::vector<_SYSLOG_DB_PRIORITY_tag> included;
