@@ -20,31 +20,31 @@ bool IsEscape(std::string_view text, size_t at, std::string_view escaped) {
     return text[at] == '\\' && at + 1 < text.size() && escaped.find(text[at + 1]) != std::string_view::npos;
 }
 
-void AppendLiteral(std::vector<Piece> &pieces, char byte) {
-    if (pieces.empty() || pieces.back().kind != Piece::Kind::kLiteral)
-        pieces.push_back({Piece::Kind::kLiteral, {}});
+void AppendLiteral(std::vector<TermPiece> &pieces, char byte) {
+    if (pieces.empty() || pieces.back().kind != TermPiece::Kind::kLiteral)
+        pieces.push_back({TermPiece::Kind::kLiteral, {}});
     pieces.back().literal += byte;
 }
 
 // A term is found anywhere in a text, so kAnyText at its ends has no effect.
-void AppendAnyText(std::vector<Piece> &pieces) {
-    if (!pieces.empty() && pieces.back().kind != Piece::Kind::kAnyText)
-        pieces.push_back({Piece::Kind::kAnyText, {}});
+void AppendAnyText(std::vector<TermPiece> &pieces) {
+    if (!pieces.empty() && pieces.back().kind != TermPiece::Kind::kAnyText)
+        pieces.push_back({TermPiece::Kind::kAnyText, {}});
 }
 
-std::vector<Piece> WordPieces(std::string_view word) {
-    std::vector<Piece> pieces;
+std::vector<TermPiece> WordPieces(std::string_view word) {
+    std::vector<TermPiece> pieces;
     for (size_t at = 0; at < word.size(); ++at) {
         if (IsEscape(word, at, kEscapedInWord))
             AppendLiteral(pieces, word[++at]);
         else if (word[at] == '*')
             AppendAnyText(pieces);
         else if (word[at] == '?')
-            pieces.push_back({Piece::Kind::kAnyCharacter, {}});
+            pieces.push_back({TermPiece::Kind::kAnyCharacter, {}});
         else
             AppendLiteral(pieces, word[at]);
     }
-    if (!pieces.empty() && pieces.back().kind == Piece::Kind::kAnyText)
+    if (!pieces.empty() && pieces.back().kind == TermPiece::Kind::kAnyText)
         pieces.pop_back();
     return pieces;
 }
@@ -62,8 +62,8 @@ public:
 private:
     void SkipBlanks() { rest_.remove_prefix(std::min(rest_.find_first_not_of(kBlanks), rest_.size())); }
     bool TakeRegex(std::string &regex);
-    std::vector<Piece> TakePhrase();
-    std::vector<Piece> TakeWord();
+    std::vector<TermPiece> TakePhrase();
+    std::vector<TermPiece> TakeWord();
 
     std::string_view rest_;
 };
@@ -111,8 +111,8 @@ bool Reader::TakeRegex(std::string &regex) {
     return true;
 }
 
-std::vector<Piece> Reader::TakePhrase() {
-    std::vector<Piece> pieces;
+std::vector<TermPiece> Reader::TakePhrase() {
+    std::vector<TermPiece> pieces;
     size_t at = 1;
     for (; at < rest_.size() && rest_[at] != '"'; ++at) {
         if (IsEscape(rest_, at, kEscapedInPhrase))
@@ -123,7 +123,7 @@ std::vector<Piece> Reader::TakePhrase() {
     return pieces;
 }
 
-std::vector<Piece> Reader::TakeWord() {
+std::vector<TermPiece> Reader::TakeWord() {
     const std::string_view word = rest_.substr(0, rest_.find_first_of(kBlanks));
     rest_.remove_prefix(word.size());
     return WordPieces(word);

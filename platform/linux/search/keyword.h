@@ -7,7 +7,7 @@
 namespace kelo::platform {
 
 // A part of a text term: literal text, or one of the wildcards.
-struct Piece {
+struct TermPiece {
     enum class Kind { kLiteral, kAnyText, kAnyCharacter };
     Kind kind = Kind::kLiteral;
     std::string literal; // empty unless kLiteral
@@ -19,7 +19,7 @@ struct Term {
     std::string regex; // of a /regex/, not empty; then there are no pieces
     // Of a text term, to find anywhere in a text. There is no kAnyText at either end or next to another one;
     // no pieces at all match every text.
-    std::vector<Piece> pieces;
+    std::vector<TermPiece> pieces;
 
     bool IsRegex() const { return !regex.empty(); }
     bool MatchesEveryText() const { return !IsRegex() && pieces.empty(); }

@@ -16,7 +16,7 @@ namespace {
 constexpr size_t kMaxPatternBytes = 40'000;
 constexpr std::ptrdiff_t kMaxStars = 1'000;
 
-using Pieces = std::vector<Piece>;
+using Pieces = std::vector<TermPiece>;
 
 std::string Quoted(std::string_view text) {
     std::string quoted = "'";
@@ -32,7 +32,7 @@ enum class LetterCase { kNoLetters, kIgnored, kExact };
 
 LetterCase LetterCaseOf(const Pieces &pieces) {
     LetterCase letterCase = LetterCase::kNoLetters;
-    for (const Piece &piece : pieces) {
+    for (const TermPiece &piece : pieces) {
         if (HasCapitals(piece.literal))
             return LetterCase::kExact;
         if (std::any_of(piece.literal.begin(), piece.literal.end(),
@@ -56,10 +56,10 @@ constexpr PatternSyntax kRegex = {".*", ".", R"(\^$.|?*+()[]{})", "\\", ""};
 
 std::string Pattern(const Pieces &pieces, const PatternSyntax &syntax) {
     std::string pattern;
-    for (const Piece &piece : pieces) {
-        if (piece.kind == Piece::Kind::kAnyText)
+    for (const TermPiece &piece : pieces) {
+        if (piece.kind == TermPiece::Kind::kAnyText)
             pattern += syntax.anyText;
-        else if (piece.kind == Piece::Kind::kAnyCharacter)
+        else if (piece.kind == TermPiece::Kind::kAnyCharacter)
             pattern += syntax.anyCharacter;
         for (const char byte : piece.literal) {
             const bool isSpecial = syntax.special.find(byte) != std::string_view::npos;
@@ -92,9 +92,10 @@ std::string TextSql(const Pieces &pieces, const std::string &column, std::vector
     const bool ignoreCase =
         letterCase == LetterCase::kIgnored || (letterCase == LetterCase::kNoLetters && !globIsFast);
     const PatternSyntax &syntax = ignoreCase ? kLike : kGlob;
-    const bool isLiteral = pieces.size() == 1 && pieces[0].kind == Piece::Kind::kLiteral;
-    const auto stars = std::count_if(pieces.begin(), pieces.end(),
-                                     [](const Piece &piece) { return piece.kind == Piece::Kind::kAnyText; });
+    const bool isLiteral = pieces.size() == 1 && pieces[0].kind == TermPiece::Kind::kLiteral;
+    const auto stars = std::count_if(pieces.begin(), pieces.end(), [](const TermPiece &piece) {
+        return piece.kind == TermPiece::Kind::kAnyText;
+    });
     const std::string pattern = Pattern(pieces, syntax);
 
     if (isLiteral && pattern.size() > kMaxPatternBytes)
