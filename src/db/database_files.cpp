@@ -22,7 +22,7 @@ constexpr const char *kFiles[] = {"", "-wal", "-shm"};
 // The platform's index for searches fits no other database, and a moved one does without.
 constexpr const char *kSkipIndex = "-skip";
 
-bool Exists(const std::string &path) {
+bool HasEntry(const std::string &path) {
     struct stat status {};
     return lstat(path.c_str(), &status) == 0;
 }
@@ -94,7 +94,7 @@ std::string WithFreeNumber(const std::string &path) {
     for (int number = 1;; ++number) {
         std::string numbered = path + "." + std::to_string(number);
         if (std::none_of(std::begin(kFiles), std::end(kFiles),
-                         [&](const char *file) { return Exists(numbered + file); }))
+                         [&](const char *file) { return HasEntry(numbered + file); }))
             return numbered;
     }
 }
@@ -110,7 +110,7 @@ bool MakeRoom(const std::string &aside, const std::string &numbered, const std::
 } // namespace
 
 int PutDatabaseAside(const std::string &dbPath, const std::string &aside) {
-    if (!Exists(dbPath))
+    if (!HasEntry(dbPath))
         return ENOENT;
     const CompanionGuard guard(dbPath);
     const std::string numbered = WithFreeNumber(aside);
@@ -118,7 +118,7 @@ int PutDatabaseAside(const std::string &dbPath, const std::string &aside) {
 }
 
 void RemoveDatabase(const std::string &dbPath) {
-    if (!Exists(dbPath))
+    if (!HasEntry(dbPath))
         return;
     const CompanionGuard guard(dbPath);
     for (const char *suffix : {"", "-wal", "-shm", "-journal", kSkipIndex})

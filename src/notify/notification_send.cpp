@@ -15,7 +15,7 @@ int Fail(const std::string &text) {
     return -1;
 }
 
-int FailForMemory() {
+int FailWithoutMemory() {
     kelo::Fail(KELO_FAILURE_MEMORY, "", "TORVCSzHashSetValue", kNoMemory);
     return Fail(kNoMemory);
 }
@@ -26,13 +26,13 @@ int SendContent(NotificationManager &manager, const char *tag, const std::string
         return 0;
     kelo::SzHash values;
     if (!values)
-        return FailForMemory();
+        return FailWithoutMemory();
     const std::optional<std::string> escaped = kelo::EscapeContent(content.c_str());
     if (!escaped)
         return Fail("Not enough memory");
     if (!values.Set("%HOST%", host) || !values.Set(placeholder, value) ||
         !values.Set("%SYSLOG_CONTENT%", *escaped))
-        return FailForMemory();
+        return FailWithoutMemory();
     if (manager.NotificationSend(tag, values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;
@@ -55,7 +55,7 @@ int NotificationManager::NotificationSendEps(uint64_t eps) {
     kelo::SzHash values;
     if (!values || !values.Set("%EPS%", ullNumberToString(eps)) ||
         !values.Set("%TOLERNCE%", ullNumberToString(threshold)))
-        return FailForMemory();
+        return FailWithoutMemory();
     if (NotificationSend("KELOSYSLOG_EPS_EXCEED", values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;
@@ -64,7 +64,7 @@ int NotificationManager::NotificationSendEps(uint64_t eps) {
 int NotificationManager::NotificationSendVolFull(const std::string &share) {
     kelo::SzHash values;
     if (!values || !values.Set("%SHARED_FOLDER%", share))
-        return FailForMemory();
+        return FailWithoutMemory();
     if (NotificationSend("KELOSYSLOG_VOL_FULL", values.Address()) < 0)
         return Fail("Fail to send notification");
     return 0;

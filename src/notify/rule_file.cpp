@@ -10,7 +10,7 @@
 
 namespace {
 
-constexpr char kSource[] = "utils";
+constexpr char kRuleSource[] = "utils";
 constexpr char kLineFormat[] = "%s=\"%s\"\n";
 
 const char *TextOf(const kelo::SzHash &section, const char *key) {
@@ -41,7 +41,7 @@ bool HoldsNul(const _SYSLOG_NOTIFY_RULES_tag &rule) {
 // Reports what failed under the line number of its message.
 int FailAt(int line, const char *message, const std::string &path, const char *function) {
     kelo::FailPlatform(path, function);
-    kelo::ReportErrorAt(kSource, line, message);
+    kelo::ReportErrorAt(kRuleSource, line, message);
     return -1;
 }
 
@@ -69,7 +69,7 @@ int SyslogNotifyConfSet(const std::string &path, const std::string &, const _SYS
                       values ? "TORVCSzHashSetValue" : "TORVCSzHashAlloc");
     // A C string would end at a NUL byte and lose the rest.
     if (HoldsNul(rule)) {
-        kelo::ReportErrorAt(kSource, 139, "Fail set section to file");
+        kelo::ReportErrorAt(kRuleSource, 139, "Fail set section to file");
         return kelo::Fail(KELO_FAILURE_ARGUMENT, path, rule.name, "the name or the pattern holds a NUL byte");
     }
     if (TORVCFileSetSection(path.c_str(), rule.name.c_str(), rule.name.c_str(), *values.Address(),

@@ -17,7 +17,7 @@ namespace {
 
 constexpr size_t kMaxSubjectBytes = 320;
 constexpr size_t kMaxReplyBytes = 250;
-constexpr size_t kMaxBodyBytes = size_t{256} << 10;
+constexpr size_t kMaxMailBytes = size_t{256} << 10;
 
 bool IsAddress(const std::string &text) {
     const auto isAllowed = [](char byte) {
@@ -114,7 +114,7 @@ private:
         mail.sender = sender;
         mail.recipient = recipient;
         mail.subject = SafeLine(prefix + (prefix.empty() ? "" : " ") + entry.title, kMaxSubjectBytes);
-        mail.body = SafeLines(entry.body, kMaxBodyBytes);
+        mail.body = SafeLines(entry.body, kMaxMailBytes);
         mail.messageId = entry.id + "." + HostName() + sender.substr(sender.rfind('@'));
         mail.time = entry.time;
         return mail;

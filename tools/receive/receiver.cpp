@@ -17,27 +17,22 @@
 #include "kelosyslog/logger.h"
 #include "receive/complete_databases.h"
 #include "receive/loop_time.h"
+#include "receive/receiver_names.h"
 
 namespace kelo::tool {
 namespace {
 
-constexpr const char *kEventText = "kelosyslog receive";
-constexpr const char *kFolder = "/var/log/kelolog";
 constexpr const char *kEventDatabase = "/usr/kelo/etc/kelosyslog.db";
 constexpr int kWarning = 1; // the level of an event
 
-constexpr int64_t kSecondMs = 1000;
-constexpr int64_t kBeatMs = 6000;
-constexpr int64_t kRepairMs = 60'000;
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input
 constexpr int64_t kFinishMs = 20'000;    // for storing and flushing at the end
 constexpr int64_t kLeastFinishMs = 2000; // of it, if waiting for the database has taken the time before
-constexpr std::chrono::milliseconds kFinishRetry{200};
 constexpr std::chrono::milliseconds kFinishFlush{2000}; // between flushes that fail and are reported
 
 std::string FolderOf(const ReceiverOptions &options) {
     if (options.database.empty())
-        return options.root + kFolder;
+        return options.root + kLogFolder;
     return std::filesystem::absolute(options.database).parent_path().string();
 }
 
@@ -54,10 +49,11 @@ bool TellOtherDevices(const ReceiverOptions &options, uint64_t others) {
 
 Receiver::Receiver(ReceiverOptions options)
     : options_(std::move(options)), rules_(options_.notifyLimit),
-      accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
+      accounting_(options_.root + kLogFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
                   [this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
       volume_(options_.root, FolderOf(options_)),
-      setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
+      setAside_(options_.setAside.empty() ? options_.root + kLogFolder + "/set-aside.log"
+                                          : options_.setAside),
       lines_(LogStream::kMaxLineBytes),
       import_([this](const LineReader &reader,
                      const std::string &reason) { setAside_.Add(reason, reader.Line()); },
@@ -82,7 +78,7 @@ void Receiver::Run(int input) {
     now_ = NowMs();
     stateTime_ = now_;
     CompleteDatabases(options_.root);
-    Logger().LogAddServStart(kEventText);
+    Logger().LogAddServStart(kReceiverName);
     try {
         ReceiveUntilEnd(input);
     } catch (const std::system_error &) {
@@ -248,7 +244,7 @@ void Receiver::Finish() {
         syslog(LOG_ERR, "the counts since the last flush of the accounting are lost");
     rules_.Finish();
     setAside_.Finish();
-    Logger().LogAddServStop(kEventText);
+    Logger().LogAddServStop(kReceiverName);
     state_.ended = std::time(nullptr);
     now_ = NowMs();
     WriteState();

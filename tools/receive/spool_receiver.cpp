@@ -17,22 +17,16 @@
 #include "kelosyslog/logger.h"
 #include "receive/complete_databases.h"
 #include "receive/loop_time.h"
+#include "receive/receiver_names.h"
 #include "receive/spool_report.h"
 
 namespace kelo::tool {
 namespace {
 
-constexpr const char *kEventText = "kelosyslog receive";
-constexpr const char *kFolder = "/var/log/kelolog";
-
-constexpr int64_t kSecondMs = 1000;
-constexpr int64_t kBeatMs = 6000;
-constexpr int64_t kRepairMs = 60'000;
 // Between two turns: each commit costs as much as some hundred rows, and a message waits half of it.
 constexpr int64_t kTurnMs = 40;
 constexpr int64_t kLoadRetryMs = 1000;
-constexpr int64_t kFinishMs = 10'000;
-constexpr std::chrono::milliseconds kFinishRetry{200};
+constexpr int64_t kFinishSpoolMs = 10'000; // for storing and flushing at the end
 // Half a record at the end of a file that has not changed for so long gets no second half. A writer that
 // waits for room on the disk may take long.
 constexpr int64_t kPartialSec = 600;
@@ -46,10 +40,11 @@ std::string FolderOf(const std::string &database) {
 
 SpoolReceiver::SpoolReceiver(ReceiverOptions options)
     : options_(std::move(options)), rules_(options_.notifyLimit),
-      accounting_(options_.root + kFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
+      accounting_(options_.root + kLogFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
                   [this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
       volume_(options_.root, FolderOf(options_.database)),
-      setAside_(options_.setAside.empty() ? options_.root + kFolder + "/set-aside.log" : options_.setAside),
+      setAside_(options_.setAside.empty() ? options_.root + kLogFolder + "/set-aside.log"
+                                          : options_.setAside),
       writer_(options_.database, volume_), folder_(options_.spool + "/files") {
     writer_.HooksSet({.alongside = [this](SqliteConnection &database) { Save(database); },
                       .onStored =
@@ -80,7 +75,7 @@ void SpoolReceiver::Run() {
     now_ = NowMs();
     stateTime_ = now_;
     CompleteDatabases(options_.root);
-    Logger().LogAddServStart(kEventText);
+    Logger().LogAddServStart(kReceiverName);
     EventSource changes = loop_.AddInput(folder_.Changes(), [this, &changes] {
         haveNamesChanged_ = folder_.Drain() || haveNamesChanged_;
         hasNews_ = true;
@@ -106,7 +101,7 @@ bool SpoolReceiver::LoadAll() {
     const std::pair<SpoolReader, std::string> sources[] = {
         {SpoolReader::kRows, writer_.Path()},
         {SpoolReader::kRules, writer_.Path()},
-        {SpoolReader::kCounts, options_.root + kFolder + "/.KELOACCOUNTDB"}};
+        {SpoolReader::kCounts, options_.root + kLogFolder + "/.KELOACCOUNTDB"}};
     std::string problem;
     for (const auto &[reader, path] : sources) {
         if (const std::string reason = TryLoadPlaces(path, reader, loaded_[reader]); !reason.empty())
@@ -413,7 +408,7 @@ void SpoolReceiver::Reload() {
 
 void SpoolReceiver::Finish() {
     now_ = NowMs();
-    const int64_t deadline = now_ + kFinishMs;
+    const int64_t deadline = now_ + kFinishSpoolMs;
     bool isFlushed = !isLoaded_ || (StoreWaiting() && accounting_.Finish());
     while (!isFlushed && (now_ = NowMs()) < deadline && writer_.Waiting() == 0) {
         std::this_thread::sleep_for(kFinishRetry);
@@ -424,7 +419,7 @@ void SpoolReceiver::Finish() {
     if (isLoaded_ && writer_.Waiting() == 0)
         SavePlaces();
     TellDone();
-    Logger().LogAddServStop(kEventText);
+    Logger().LogAddServStop(kReceiverName);
     state_.ended = std::time(nullptr);
     now_ = NowMs();
     WriteState();

@@ -9,9 +9,9 @@ namespace {
 
 constexpr int64_t kLongestWaitSec = 3600; // the longest pause between two attempts
 
-using Lines = std::vector<std::string>;
+using Points = std::vector<std::string>;
 
-void LookAtSyslogNg(const SyslogNgStatus &status, Lines &lines) {
+void LookAtSyslogNg(const SyslogNgStatus &status, Points &lines) {
     using State = SyslogNgStatus::State;
     if (status.state == State::Stopped)
         lines.push_back("syslog-ng is not running (" + status.control + ": " + status.problem + ")");
@@ -29,7 +29,7 @@ void LookAtSyslogNg(const SyslogNgStatus &status, Lines &lines) {
 }
 
 // Messages that wait and do not become records, with the time since the newest record.
-void LookAtQueues(const ServerStatus &status, Lines &lines) {
+void LookAtQueues(const ServerStatus &status, Points &lines) {
     constexpr uint64_t kManyMessages = 1000;
     constexpr int64_t kLongSec = 60;
     const std::string &ofReceiver = status.receiver.told.database;
@@ -48,7 +48,7 @@ void LookAtQueues(const ServerStatus &status, Lines &lines) {
     }
 }
 
-void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
+void LookAtReceiver(const ReceiverStatus &status, int64_t now, Points &lines) {
     using State = ReceiverStatus::State;
     const std::string pid = std::to_string(status.told.pid);
     if (status.state == State::Died)
@@ -68,7 +68,7 @@ void LookAtReceiver(const ReceiverStatus &status, int64_t now, Lines &lines) {
         lines.push_back("the receiver waits: " + status.told.waiting);
 }
 
-void LookAtSpool(const ReceiverStatus &status, Lines &lines) {
+void LookAtSpool(const ReceiverStatus &status, Points &lines) {
     constexpr int64_t kLongSec = 60;
     const ReceiverState::Spool &spool = status.told.spool;
     if (spool.folder.empty())
@@ -83,7 +83,7 @@ void LookAtSpool(const ReceiverStatus &status, Lines &lines) {
                         (lasts ? "; " + spool.folder + " is full in " + Duration(*lasts) : ""));
 }
 
-void LookAtDatabases(const ServerStatus &status, Lines &lines) {
+void LookAtDatabases(const ServerStatus &status, Points &lines) {
     using State = DatabaseStatus::State;
     const std::string &ofReceiver = status.receiver.told.database;
     for (const DatabaseStatus &database : status.databases) {
@@ -104,7 +104,7 @@ void LookAtDatabases(const ServerStatus &status, Lines &lines) {
         lines.push_back("archives: " + status.archives.problem);
 }
 
-void LookAtRetention(const ServerStatus &status, Lines &lines) {
+void LookAtRetention(const ServerStatus &status, Points &lines) {
     constexpr int64_t kDaySec = 86400;
     const RetentionStatus &retention = status.retention;
     if (!retention.problem.empty())
@@ -121,7 +121,7 @@ void LookAtRetention(const ServerStatus &status, Lines &lines) {
     }
 }
 
-void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &lines) {
+void LookAtNotifications(const NotificationStatus &status, int64_t now, Points &lines) {
     if (!status.problem.empty())
         lines.push_back("notifications: " + status.problem);
     if (status.failed > 0)
@@ -138,7 +138,7 @@ void LookAtNotifications(const NotificationStatus &status, int64_t now, Lines &l
 } // namespace
 
 std::vector<std::string> FindAttention(const ServerStatus &status) {
-    Lines lines;
+    Points lines;
     LookAtSyslogNg(status.syslogNg, lines);
     LookAtQueues(status, lines);
     for (std::string &line : FindNetworkProblems(status.network, status.syslogNg))

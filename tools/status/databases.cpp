@@ -22,7 +22,7 @@ namespace fs = std::filesystem;
 using State = DatabaseStatus::State;
 using Row = ReadOnlyQuery::Row;
 
-constexpr std::chrono::milliseconds kPatience{150};
+constexpr std::chrono::milliseconds kAskPatience{150};
 constexpr int64_t kMostCounted = 100'000; // rows; counting them takes a few milliseconds
 constexpr const char *kArchives = "/var/log/kelosyslog/archive";
 
@@ -99,7 +99,7 @@ State StateAfter(int code) {
 
 void Read(DatabaseStatus &status) {
     try {
-        const ReadOnlyQuery database({status.path, status.table}, kPatience);
+        const ReadOnlyQuery database({status.path, status.table}, kAskPatience);
         database.RequireTable();
         if (status.table == "logs" && status.size > 0 &&
             database.Number("SELECT count(*) AS value FROM sqlite_master") == 0) {

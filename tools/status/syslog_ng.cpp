@@ -18,7 +18,7 @@ namespace {
 constexpr const char *kControl = "/var/lib/syslog-ng/syslog-ng.ctl";
 // The first is the init script's, the second the daemon's default.
 constexpr const char *kPidFiles[] = {"/run/syslog-ng.pid", "/var/lib/syslog-ng/syslog-ng.pid"};
-constexpr const char *kProgram = "syslog-ng";
+constexpr const char *kSyslogNg = "syslog-ng";
 
 // The fields of a line; one with a semicolon is in double quotes, with a backslash before each quote of its
 // own.
@@ -56,7 +56,7 @@ pid_t PidFromFile(const std::string &root) {
     for (const char *path : kPidFiles) {
         pid_t pid = 0;
         std::ifstream(root + path) >> pid;
-        if (pid > 0 && ProcessName(pid) == kProgram)
+        if (pid > 0 && ProcessName(pid) == kSyslogNg)
             return pid;
     }
     return 0;

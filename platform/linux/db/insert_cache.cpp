@@ -14,7 +14,7 @@ constexpr const char *kBlanks = " \t\n\r\f";
 constexpr const char *kHeadBytes =
     "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789_,() \t\n\r\f";
 
-void SkipBlanks(const char *&text) {
+void PassBlanks(const char *&text) {
     text += std::strspn(text, kBlanks);
 }
 
@@ -48,17 +48,17 @@ bool InsertCache::Read(const char *sql) {
     if (!ReadHead(text))
         return false;
     do {
-        SkipBlanks(text);
+        PassBlanks(text);
         if (!ReadLiteral(text))
             return false;
-        SkipBlanks(text);
+        PassBlanks(text);
         form_ += *text;
     } while (*text++ == ',');
     if (text[-1] != ')')
         return false;
-    SkipBlanks(text);
+    PassBlanks(text);
     text += *text == ';';
-    SkipBlanks(text);
+    PassBlanks(text);
     return *text == '\0';
 }
 

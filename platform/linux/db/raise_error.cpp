@@ -3,7 +3,7 @@
 namespace kelo::platform {
 namespace {
 
-constexpr char kPointerType[] = "kelo-error";
+constexpr char kErrorType[] = "kelo-error";
 
 struct Error {
     int code;
@@ -12,7 +12,7 @@ struct Error {
 
 // For any caller but RaiseError the function gives NULL, because SQL cannot create such a pointer.
 void Raise(sqlite3_context *context, int, sqlite3_value **arguments) {
-    const auto *error = static_cast<const Error *>(sqlite3_value_pointer(arguments[0], kPointerType));
+    const auto *error = static_cast<const Error *>(sqlite3_value_pointer(arguments[0], kErrorType));
     if (error == nullptr)
         return;
     sqlite3_result_error(context, error->message, -1);
@@ -30,7 +30,7 @@ void RaiseError(sqlite3 *db, int code, const char *message) {
                                    nullptr, nullptr, nullptr) != SQLITE_OK ||
         sqlite3_prepare_v2(db, "SELECT kelo_raise(?1)", -1, &statement, nullptr) != SQLITE_OK)
         return;
-    if (sqlite3_bind_pointer(statement, 1, &error, kPointerType, nullptr) == SQLITE_OK)
+    if (sqlite3_bind_pointer(statement, 1, &error, kErrorType, nullptr) == SQLITE_OK)
         sqlite3_step(statement);
     sqlite3_finalize(statement); // repeats the error of the step
 }

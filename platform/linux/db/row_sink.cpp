@@ -7,7 +7,7 @@
 namespace kelo::platform {
 namespace {
 
-constexpr char kPointerType[] = "kelo-result";
+constexpr char kResultType[] = "kelo-result";
 
 // Makes `cell` the text of a value; an integer is written to `digits`. False when there is no memory.
 bool TakeValue(sqlite3_value *value, DBResult_tag::Digits &digits, Cell &cell) {
@@ -25,7 +25,7 @@ bool TakeValue(sqlite3_value *value, DBResult_tag::Digits &digits, Cell &cell) {
 // that a query which calls the aggregate itself gets an error.
 void Deliver(sqlite3_context *context, int count, sqlite3_value **values) {
     auto *result =
-        count > 0 ? static_cast<DBResult_tag *>(sqlite3_value_pointer(values[0], kPointerType)) : nullptr;
+        count > 0 ? static_cast<DBResult_tag *>(sqlite3_value_pointer(values[0], kResultType)) : nullptr;
     if (result == nullptr || static_cast<size_t>(count - 1) != result->cells.size()) {
         sqlite3_result_error(context, "kelo_rows() is internal", -1);
         return;
@@ -72,7 +72,7 @@ Statement PrepareRowSink(sqlite3 *db, const SingleStatement &query, DBResult_tag
             SQLITE_OK)
         return nullptr;
     Statement sink(statement);
-    if (sqlite3_bind_pointer(statement, 1, &result, kPointerType, nullptr) != SQLITE_OK)
+    if (sqlite3_bind_pointer(statement, 1, &result, kResultType, nullptr) != SQLITE_OK)
         return nullptr;
     return sink;
 }

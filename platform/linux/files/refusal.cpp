@@ -15,4 +15,9 @@ void ReportRefusal(const std::string &path, size_t line, const std::string &reas
     errno = savedErrno;
 }
 
+int FailWith(int cause) {
+    errno = cause;
+    return -1;
+}
+
 } // namespace kelo::platform

@@ -1,3 +1,4 @@
+#include <cerrno>
 #include <unordered_set>
 
 #include "common/catch_bad_alloc.h"
@@ -10,11 +11,6 @@
 using namespace kelo::platform;
 
 namespace {
-
-int FailWith(int cause) {
-    errno = cause;
-    return -1;
-}
 
 int EnumSection(const std::string &path, TORVSZLIST &list) {
     const std::shared_ptr<const SectionText> text = LoadSectionText(path);

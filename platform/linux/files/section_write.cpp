@@ -1,3 +1,4 @@
+#include <cerrno>
 #include <climits>
 #include <cstdlib>
 #include <memory>
@@ -13,11 +14,6 @@
 using namespace kelo::platform;
 
 namespace {
-
-int FailWith(int cause) {
-    errno = cause;
-    return -1;
-}
 
 int Refuse(const std::string &path, int cause, const std::string &reason) {
     ReportRefusal(path, 0, reason);

@@ -1,0 +1,9 @@
+#pragma once
+
+namespace kelo::tool {
+
+// What both receivers call themselves in the event log, and the folder below --root that holds their files.
+inline constexpr const char *kReceiverName = "kelosyslog receive";
+inline constexpr const char *kLogFolder = "/var/log/kelolog";
+
+} // namespace kelo::tool
