@@ -2,9 +2,11 @@
 
 #include <sqlite3.h>
 
+#include <iterator>
 #include <new>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace kelo {
 namespace {
@@ -12,6 +14,13 @@ namespace {
 constexpr char kDeclaration[] = "CREATE TABLE kelo_records(host, ip, fac, prio, llevel, tag, utcsec, "
                                 "tzoffset, ldate, ltime, prog, msg)";
 enum Column { kHost, kIp, kFac, kPrio, kLlevel, kTag, kUtcsec, kTzoffset, kLdate, kLtime, kProg, kMsg };
+
+// The severities' words, measured once and not for every row.
+std::string_view WordOf(_SYSLOG_DB_PRIORITY_tag severity) {
+    static const std::vector<std::string_view> words(std::begin(g_MappingSyslogPrior),
+                                                     std::end(g_MappingSyslogPrior));
+    return words[static_cast<size_t>(severity)];
+}
 
 struct Table : sqlite3_vtab {
     const std::vector<const _SYSLOG_LOG_DATA_tag *> *logs;
@@ -98,7 +107,7 @@ struct RecordTable::Functions {
         const auto *position = static_cast<const Cursor *>(cursor);
         const _SYSLOG_LOG_DATA_tag &log = *(*position->logs)[position->row];
         if (column == kPrio || column == kLlevel)
-            sqlite3_result_text(result, g_MappingSyslogPrior[log.prio], -1, SQLITE_STATIC);
+            Return(result, WordOf(log.prio));
         else if (column == kUtcsec)
             sqlite3_result_int64(result, log.utcsec);
         else

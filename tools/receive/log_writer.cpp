@@ -36,8 +36,8 @@ ino_t InodeOf(const std::string &path) {
 
 } // namespace
 
-LogWriter::LogWriter(const std::string &path, DiskSpaceMonitor &volume)
-    : path_(FollowLinks(path)), volume_(volume) {}
+LogWriter::LogWriter(const std::string &path, DiskSpaceMonitor &volume, size_t batchRows)
+    : path_(FollowLinks(path)), volume_(volume), batch_(batchRows) {}
 
 void LogWriter::Take(_SYSLOG_LOG_DATA_tag &log, int64_t now) {
     if (batch_.Size() == 0)

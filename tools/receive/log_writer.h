@@ -32,7 +32,10 @@ public:
     };
 
     // Opens nothing yet. `volume`, which is notified of a full disk, must outlive the writer.
-    LogWriter(const std::string &path, DiskSpaceMonitor &volume);
+    LogWriter(const std::string &path, DiskSpaceMonitor &volume, size_t batchRows = RecordBatch::kFullRows);
+
+    // A record to be filled and taken without a copy; see RecordBatch.
+    _SYSLOG_LOG_DATA_tag &Next() { return batch_.Next(); }
 
     // Takes the record, and may leave the content of another in it.
     void Take(_SYSLOG_LOG_DATA_tag &log, int64_t now);
@@ -55,6 +58,7 @@ public:
     // Closes the database. The next batch is written to the file that has its name then.
     void Reopen() { store_.reset(); }
 
+    std::span<const _SYSLOG_LOG_DATA_tag> Records() const { return batch_.Records(); }
     size_t Waiting() const { return batch_.Size(); }
     bool IsFull() const { return batch_.IsFull(); }
     uint64_t Stored() const { return stored_; }

@@ -4,7 +4,10 @@
 #include <charconv>
 #include <cstdio>
 #include <ctime>
+#include <iterator>
 #include <optional>
+
+#include "receive/raw_message.h"
 
 namespace kelo::tool {
 namespace {
@@ -34,6 +37,14 @@ template <typename Number>
 bool Read(std::string_view text, Number &number) {
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
     return error == std::errc() && end == text.data() + text.size();
+}
+
+_SYSLOG_DB_PRIORITY_tag SeverityOf(std::string_view word) {
+    const auto *const found =
+        std::find(std::begin(g_MappingSyslogPrior), std::end(g_MappingSyslogPrior), word);
+    return found != std::end(g_MappingSyslogPrior)
+               ? static_cast<_SYSLOG_DB_PRIORITY_tag>(found - std::begin(g_MappingSyslogPrior))
+               : SYSLOG_PRIO_DEBUG;
 }
 
 // "+05:30" in seconds.
@@ -109,13 +120,16 @@ SpoolParser::Piece SpoolParser::ParseRecord(std::string_view bytes, _SYSLOG_LOG_
     if (bytes[body + host] != ' ' || bytes[body + host + 1 + prog] != ' ' || bytes[size - 1] != '\n')
         return Piece::kGarbage;
 
-    log.fac = header.fields[Header::kFacility];
-    log.prio = PriorStrToType(std::string(header.fields[Header::kLevel]).c_str());
-    log.tag = header.fields[Header::kTag];
     log.ip = header.fields[Header::kIp];
-    log.host = bytes.substr(body, host);
-    log.prog = bytes.substr(body + host + 1, prog);
-    log.msg = bytes.substr(body + host + 1 + prog + 1, msg);
+    const std::string_view text = bytes.substr(body + host + 1 + prog + 1, msg);
+    if (prog > 0 || !ParseRawMessage(text, log)) {
+        log.fac = header.fields[Header::kFacility];
+        log.prio = SeverityOf(header.fields[Header::kLevel]);
+        log.tag = header.fields[Header::kTag];
+        log.host = bytes.substr(body, host);
+        log.prog = prog > 0 ? bytes.substr(body + host + 1, prog) : "-";
+        log.msg = text;
+    }
     if (mark_.empty())
         mark_ = mark;
     size_ = size;

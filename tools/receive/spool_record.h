@@ -12,6 +12,8 @@ namespace kelo::tool {
 //
 //     1 HOSTID RECEIPT HOSTLEN PROGLEN MSGLEN UTC TZ FAC LEVEL TAG IP HOST PROG MSG\n
 //
+// Without a program MSG is the whole message as it came.
+//
 // What is no record is garbage up to where the next one begins: HOSTID, a random number that no sender knows,
 // is the same in all records of a file.
 class SpoolParser {
