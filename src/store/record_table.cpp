@@ -2,11 +2,12 @@
 
 #include <sqlite3.h>
 
+#include <algorithm>
+#include <array>
 #include <iterator>
 #include <new>
 #include <string>
 #include <string_view>
-#include <vector>
 
 namespace kelo {
 namespace {
@@ -17,8 +18,11 @@ enum Column { kHost, kIp, kFac, kPrio, kLlevel, kTag, kUtcsec, kTzoffset, kLdate
 
 // The severities' words, measured once and not for every row.
 std::string_view WordOf(_SYSLOG_DB_PRIORITY_tag severity) {
-    static const std::vector<std::string_view> words(std::begin(g_MappingSyslogPrior),
-                                                     std::end(g_MappingSyslogPrior));
+    static const auto words = [] {
+        std::array<std::string_view, std::size(g_MappingSyslogPrior)> all;
+        std::copy(std::begin(g_MappingSyslogPrior), std::end(g_MappingSyslogPrior), all.begin());
+        return all;
+    }();
     return words[static_cast<size_t>(severity)];
 }
 

@@ -24,10 +24,10 @@ bool IsChange(pid_t process) {
     ptrace(PTRACE_GET_SYSCALL_INFO, process, sizeof call, &call);
     if (call.op != PTRACE_SYSCALL_INFO_ENTRY)
         return false;
-    static const std::set<uint64_t> kChanges = {SYS_clone,     SYS_vfork,    SYS_execve,    SYS_exit_group,
-                                                SYS_write,     SYS_pwrite64, SYS_fdatasync, SYS_unlink,
-                                                SYS_ftruncate, SYS_mkdir,    SYS_fchmod,    SYS_fchown,
-                                                SYS_flock,     SYS_link,     SYS_rename,    SYS_fsync};
+    static const std::set<uint64_t> kChanges = {
+        SYS_clone,  SYS_vfork,     SYS_execve,   SYS_exit_group, SYS_write,  SYS_pwrite64, SYS_fdatasync,
+        SYS_unlink, SYS_ftruncate, SYS_mkdir,    SYS_fchmod,     SYS_fchown, SYS_flock,    SYS_link,
+        SYS_rename, SYS_fsync,     SYS_renameat, SYS_unlinkat,   SYS_mkdirat};
     return kChanges.contains(call.entry.nr) ||
            (call.entry.nr == SYS_openat && (call.entry.args[2] & O_CREAT) != 0);
 }

@@ -59,6 +59,10 @@ protected:
     ptrdiff_t Notifications() const {
         return std::distance(fs::directory_iterator(spool_ + "new"), fs::directory_iterator());
     }
+    ptrdiff_t Events() const {
+        return std::stol(Query(root_.File("usr/kelo/etc/kelosyslog.db"),
+                               "SELECT count(*) FROM log WHERE event GLOB 'Event detection*'"));
+    }
     // All of this is stored and counted, each once.
     bool Has(int messages) const {
         const std::string number = std::to_string(messages);
@@ -169,9 +173,8 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     EXPECT_TRUE(AwaitRows(receiver, kMessages)) << Rows() << " " << Counted() << receiver.Err();
     ExpectEnd(receiver);
     EXPECT_TRUE(Has(kMessages)) << Counted();
-    // A kill between a notification and the note of it sends that again.
-    EXPECT_GE(Notifications(), kMessages / 1000);
-    EXPECT_LE(Notifications(), kMessages / 1000 + kKills);
+    EXPECT_EQ(Notifications(), kMessages / 1000);
+    EXPECT_EQ(Events(), kMessages / 1000);
 }
 
 // A turn and an orderly end: SIGTERM waits for the receiver from its start.
@@ -198,22 +201,19 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingAtAnyCall) {
     };
     runAll(); // creates the databases
     int sent = 0;
-    int rounds = 0;
     for (int number = 1;; number += 13) {
         Append("20200102-10111",
                Messages(sent, 50) + Message(sent + 50, "an error " + std::to_string(number), "err"));
         sent += 51;
-        ++rounds;
         const bool wasKilled = KillAtCall(number, Victim::kProcess, run, runAll).has_value();
         if (!wasKilled)
             runAll();
         ASSERT_TRUE(Has(sent)) << "killed at call " << number << ": " << Rows() << ", " << Counted() << "\n"
                                << ReadFile(root_.File("err"));
-        if (!wasKilled) {
-            // A kill between a notification and the note of it sends that again.
-            EXPECT_GE(Notifications(), rounds);
-            EXPECT_LE(Notifications(), rounds + rounds / 4);
+        const ptrdiff_t errors = std::stol(Query(logs_, "SELECT count(*) FROM logs WHERE prio = 'err'"));
+        ASSERT_EQ(Notifications(), errors) << "killed at call " << number;
+        ASSERT_EQ(Events(), errors) << "killed at call " << number;
+        if (!wasKilled)
             break;
-        }
     }
 }

@@ -35,6 +35,8 @@ public:
     };
     void HooksSet(Hooks hooks);
 
+    const std::string &Path() const { return path_; }
+
     // Records that were not counted for their host but as DeviceNames::kOthers.
     uint64_t Others() const { return names_.Others(); }
 

@@ -5,37 +5,37 @@
 namespace kelo::tool {
 
 void RateLimiter::BeginMinute(int64_t now) {
-    if (hasBegun_ && now - begin_ < kMinuteSec)
+    if (state_.hasBegun && now - state_.begin < kMinuteSec)
         return;
-    hasBegun_ = true;
-    begin_ = now;
-    for (const auto &[rule, count] : std::exchange(suppressed_, {}))
-        toTell_[rule] += count;
-    raised_.clear();
-    raisedByAll_ = toTell_.empty() ? 0 : 1;
+    state_.hasBegun = true;
+    state_.begin = now;
+    for (const auto &[rule, count] : std::exchange(state_.suppressed, {}))
+        state_.toTell[rule] += count;
+    state_.raised.clear();
+    state_.raisedByAll = state_.toTell.empty() ? 0 : 1;
 }
 
 bool RateLimiter::Allow(const std::string &rule, int64_t now) {
     BeginMinute(now);
-    uint64_t &raised = raised_[rule];
-    if (raised == 0 || (raised < perRule_ && raisedByAll_ < forAll_)) {
+    uint64_t &raised = state_.raised[rule];
+    if (raised == 0 || (raised < perRule_ && state_.raisedByAll < forAll_)) {
         ++raised;
-        ++raisedByAll_;
+        ++state_.raisedByAll;
         return true;
     }
-    ++suppressed_[rule];
+    ++state_.suppressed[rule];
     return false;
 }
 
 RateLimiter::Counts RateLimiter::TakeSuppressed(int64_t now) {
-    if (!suppressed_.empty())
+    if (!state_.suppressed.empty())
         BeginMinute(now);
-    return std::exchange(toTell_, {});
+    return std::exchange(state_.toTell, {});
 }
 
 RateLimiter::Counts RateLimiter::Drain() {
-    begin_ -= kMinuteSec; // the minute is over
-    return TakeSuppressed(begin_ + kMinuteSec);
+    state_.begin -= kMinuteSec; // the minute is over
+    return TakeSuppressed(state_.begin + kMinuteSec);
 }
 
 } // namespace kelo::tool

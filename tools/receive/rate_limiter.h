@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <utility>
 
 namespace kelo::tool {
 
@@ -15,6 +16,16 @@ class RateLimiter {
 public:
     using Counts = std::map<std::string, uint64_t>; // by rule
 
+    struct State {
+        bool hasBegun = false; // a minute
+        int64_t begin = 0;
+        // In the minute.
+        Counts raised;
+        Counts suppressed;
+        uint64_t raisedByAll = 0;
+        Counts toTell; // of the minutes before
+    };
+
     // Notifications a minute; both are at least 1.
     RateLimiter(uint64_t perRule, uint64_t forAll) : perRule_(perRule), forAll_(forAll) {}
 
@@ -26,10 +37,14 @@ public:
     Counts TakeSuppressed(int64_t now);
 
     // Whether there are matches that were counted and not reported yet.
-    bool HasSuppressed() const { return !suppressed_.empty() || !toTell_.empty(); }
+    bool HasSuppressed() const { return !state_.suppressed.empty() || !state_.toTell.empty(); }
 
     // All of them.
     Counts Drain();
+
+    // To go on in another process.
+    const State &StateGet() const { return state_; }
+    void StateSet(State state) { state_ = std::move(state); }
 
 private:
     void BeginMinute(int64_t now);
@@ -38,13 +53,7 @@ private:
 
     uint64_t perRule_;
     uint64_t forAll_;
-    bool hasBegun_ = false;
-    int64_t begin_ = 0;
-    // In the minute.
-    Counts raised_;
-    Counts suppressed_;
-    uint64_t raisedByAll_ = 0;
-    Counts toTell_; // of the minutes before
+    State state_;
 };
 
 } // namespace kelo::tool

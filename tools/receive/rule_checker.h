@@ -1,13 +1,13 @@
 #pragma once
 
 #include <cstdint>
-#include <deque>
-#include <map>
+#include <functional>
 #include <optional>
 #include <string>
 
 #include "kelosyslog/notification.h"
 #include "receive/rate_limiter.h"
+#include "receive/rule_memory.h"
 
 namespace kelo::tool {
 
@@ -29,13 +29,29 @@ public:
     // The same for the number of records of a sample.
     void CheckEps(uint64_t eps, int64_t now);
 
+    // Once and for all: notifications and events wait for Deliver, so that the caller can note in a database
+    // what happened to them (Memory), and go on with that after a kill (MemorySet). `eventLog` is the path of
+    // the event log.
+    void Hold(const std::string &eventLog) { eventLog_ = eventLog; }
+
+    // While holding: counts the record for its second, and checks the number of a second that is over. Call
+    // EpsTick while no records wait, with the time of day.
+    void CountForEps(int64_t utcsec, int64_t now);
+    void EpsTick(int64_t utcsec, int64_t now);
+
+    // While holding: sends each notification that is due and adds its event. `note` writes down Memory, and
+    // returns whether it could.
+    void Deliver(int64_t now, const std::function<bool()> &note);
+    const RuleMemory &Memory();
+    void MemorySet(RuleMemory memory, int64_t now);
+
     // Call it about once a second, unless idle: reports what was suppressed in a minute that is over.
     void Tick(int64_t now);
 
     // Whether nothing is left to report.
-    bool IsIdle() const { return !limit_.HasSuppressed() && waiting_.empty(); }
+    bool IsIdle() const { return !limit_.HasSuppressed() && memory_.waiting.empty(); }
 
-    // Reports what was suppressed and is not reported yet.
+    // Reports what was suppressed and is not reported yet. While holding that waits for Deliver.
     void Finish();
 
     // Reloads the rules.
@@ -54,24 +70,16 @@ public:
     uint64_t Lost() const { return lost_; }
 
 private:
-    enum class Kind { Severity, Keyword, Eps };
-    // The match of a record and its host, or of a number of records.
-    struct Match {
-        Kind kind;
-        std::string what; // the severity, the keyword or the rule about numbers
-        std::string host = {};
-        uint64_t eps = 0;
-    };
-    struct Notification {
-        Match match;
-        std::string content;
-        int64_t since; // when it failed first
-    };
+    using Match = RuleMatch;
+    using Kind = RuleMatch::Kind;
     void Handle(Match match, const std::string &message);
     static std::string NameOf(const Match &match);
     static int WriteEvent(const Match &match, const std::string &content);
     void Raise(const Match &match, const std::string &content);
     bool Notify(const Match &match, const std::string &content);
+    bool IsHolding() const { return !eventLog_.empty(); }
+    bool HoldFirst();
+    bool HasEvent(const Notice &notice) const;
     void NotifyAgain();
     void GiveUpFirst();
     void Tell(const RateLimiter::Counts &counts);
@@ -79,11 +87,12 @@ private:
 
     std::optional<NotificationManager> rules_;
     RateLimiter limit_;
-    std::map<std::string, Match> lastSuppressed_; // by rule, with the highest number of records
+    RuleMemory memory_;    // but its limit, which is that of limit_
+    std::string eventLog_; // empty: nothing is held
+    uint64_t ids_ = 0;
     uint64_t raised_ = 0;
     uint64_t suppressed_ = 0;
-    std::deque<Notification> waiting_; // those that failed, oldest first
-    int64_t nextNotify_ = 0;           // when they are tried again
+    int64_t nextNotify_ = 0; // when those that failed are tried again
     uint64_t lost_ = 0;
     int64_t now_ = 0;
     int64_t nextEvent_ = INT64_MIN; // after a failure, when the next event is tried

@@ -13,7 +13,7 @@
 namespace kelo::tool {
 
 // The readers of the message spool.
-enum class SpoolReader { kRows, kRules, kCounts };
+enum class SpoolReader { kRows, kCounts };
 
 // How far a reader has got in a file. It is recognised by its inode and its first bytes: names come again
 // when the clock is set back, and inodes when files are removed.
@@ -26,7 +26,7 @@ struct SpoolPlace {
 // An open file of the message spool and how far it has been read. What has been removed is read to its end.
 struct SpoolFile {
     static constexpr size_t kHeadBytes = 64;
-    static constexpr size_t kReaders = 3;
+    static constexpr size_t kReaders = 2;
 
     // How far a reader has got, and what of it is in the database.
     struct Progress {

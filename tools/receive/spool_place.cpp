@@ -6,14 +6,7 @@ namespace kelo::tool {
 namespace {
 
 std::string NameOf(SpoolReader reader) {
-    switch (reader) {
-    case SpoolReader::kRows:
-        return "'rows'";
-    case SpoolReader::kRules:
-        return "'rules'";
-    default:
-        return "'counts'";
-    }
+    return reader == SpoolReader::kRows ? "'rows'" : "'counts'";
 }
 
 std::string Hex(const std::string &bytes) {

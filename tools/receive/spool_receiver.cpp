@@ -23,8 +23,12 @@
 namespace kelo::tool {
 namespace {
 
+constexpr const char *kEventLog = "/usr/kelo/etc/kelosyslog.db";
+
 // Between two turns: each commit costs as much as some hundred rows, and a message waits half of it.
 constexpr int64_t kTurnMs = 40;
+// Behind, larger batches write fewer pages of the indexes twice.
+constexpr size_t kBatchRows = 20'000;
 constexpr int64_t kLoadRetryMs = 1000;
 constexpr int64_t kFinishSpoolMs = 10'000; // for storing and flushing at the end
 // Half a record at the end of a file that has not changed for so long gets no second half. A writer that
@@ -41,18 +45,19 @@ std::string FolderOf(const std::string &database) {
 SpoolReceiver::SpoolReceiver(ReceiverOptions options)
     : options_(std::move(options)), rules_(options_.notifyLimit),
       accounting_(options_.root + kLogFolder + "/.KELOACCOUNTDB", options_.deviceLimit,
-                  [this](uint64_t records) { rules_.CheckEps(records, now_ / kSecondMs); }),
+                  [](uint64_t) {}), // the rules count for themselves
       volume_(options_.root, FolderOf(options_.database)),
       setAside_(options_.setAside.empty() ? options_.root + kLogFolder + "/set-aside.log"
                                           : options_.setAside),
-      writer_(options_.database, volume_), folder_(options_.spool + "/files") {
+      writer_(options_.database, volume_, kBatchRows), folder_(options_.spool + "/files") {
     writer_.HooksSet({.alongside = [this](SqliteConnection &database) { Save(database); },
                       .onStored =
                           [this](std::span<const _SYSLOG_LOG_DATA_tag> logs) {
                               MarkSaved(SpoolReader::kRows);
-                              MarkSaved(SpoolReader::kRules);
-                              Process(logs);
+                              isSaveDue_ = false;
+                              Count(logs);
                           }});
+    rules_.Hold(options_.root + kEventLog);
     accounting_.HooksSet(
         {.statements =
              [this] { return PlaceStatements(SpoolReader::kCounts, PlacesOf(SpoolReader::kCounts)); },
@@ -98,15 +103,16 @@ void SpoolReceiver::Run() {
 // Where the readers had got. A database that cannot be read now may be readable soon; a missing or damaged
 // one has no places.
 bool SpoolReceiver::LoadAll() {
-    const std::pair<SpoolReader, std::string> sources[] = {
-        {SpoolReader::kRows, writer_.Path()},
-        {SpoolReader::kRules, writer_.Path()},
-        {SpoolReader::kCounts, options_.root + kLogFolder + "/.KELOACCOUNTDB"}};
-    std::string problem;
-    for (const auto &[reader, path] : sources) {
-        if (const std::string reason = TryLoadPlaces(path, reader, loaded_[reader]); !reason.empty())
-            problem = reason;
-    }
+    loaded_.clear();
+    std::string problem = TryLoad(writer_.Path(), [this](SqliteConnection &database) {
+        loaded_[SpoolReader::kRows] = LoadPlaces(database, SpoolReader::kRows);
+        rules_.MemorySet(LoadRuleMemory(database, now_ / kSecondMs), now_ / kSecondMs);
+    });
+    const std::string reason = TryLoad(accounting_.Path(), [this](SqliteConnection &database) {
+        loaded_[SpoolReader::kCounts] = LoadPlaces(database, SpoolReader::kCounts);
+    });
+    if (problem.empty())
+        problem = reason;
     if (!problem.empty() && state_.waiting != problem)
         syslog(LOG_ERR, "receiving waits, as it is not known what was received before: %s", problem.c_str());
     state_.waiting = problem;
@@ -145,23 +151,20 @@ void SpoolReceiver::Advance(SpoolReader reader) {
         file->Of(reader).offset = std::max(file->Of(reader).offset, file->position);
 }
 
+// The rows of this transaction are up to the position of their files, and so far the rules are checked.
 void SpoolReceiver::Save(SqliteConnection &database) {
-    for (const SpoolReader reader : {SpoolReader::kRows, SpoolReader::kRules}) {
-        // The rows of this transaction are up to the position of their files.
-        if (reader == SpoolReader::kRows)
-            Advance(reader);
-        for (const std::string &statement : PlaceStatements(reader, PlacesOf(reader)))
-            database.Run(statement);
-    }
+    Advance(SpoolReader::kRows);
+    for (const std::string &statement : PlaceStatements(SpoolReader::kRows, PlacesOf(SpoolReader::kRows)))
+        database.Run(statement);
+    SaveRuleMemory(database, rules_.Memory());
 }
 
-// Without rows: what was only checked, set aside or had come before.
-void SpoolReceiver::SavePlaces() {
+// Without rows: what was set aside, had come before, or was sent. Not while a batch waits.
+bool SpoolReceiver::SavePlaces() {
     isSaveDue_ = !writer_.WriteAlongside();
-    if (isSaveDue_)
-        return;
-    MarkSaved(SpoolReader::kRows);
-    MarkSaved(SpoolReader::kRules);
+    if (!isSaveDue_)
+        MarkSaved(SpoolReader::kRows);
+    return !isSaveDue_;
 }
 
 // ---- Turns ----
@@ -184,6 +187,8 @@ void SpoolReceiver::Work() {
 // Whether the last batch is in the database.
 bool SpoolReceiver::StoreWaiting() {
     const bool isStored = writer_.Waiting() == 0 || writer_.Advance(now_, true);
+    if (isStored)
+        rules_.Deliver(now_ / kSecondMs, [this] { return SavePlaces(); });
     if (writer_.Reason() != state_.waiting)
         TickState();
     return isStored;
@@ -199,9 +204,10 @@ void SpoolReceiver::Turn() {
     hasNews_ = Fill();
     nextTurn_ = hasNews_ ? now_ : now_ + kTurnMs;
     if (again_.Size() > 0) {
-        Process(again_.Records());
+        Count(again_.Records());
         again_.Clear();
     } else if (!sources_.empty()) {
+        CheckRules();
         StoreWaiting();
     }
 }
@@ -235,7 +241,8 @@ bool SpoolReceiver::ReadFile(SpoolFile &file) {
 
 void SpoolReceiver::Take(SpoolFile &file, std::string_view bytes) {
     while (!bytes.empty() && !IsBatchFull()) {
-        const SpoolParser::Piece piece = file.parser.Parse(bytes, log_);
+        _SYSLOG_LOG_DATA_tag &log = writer_.Next();
+        const SpoolParser::Piece piece = file.parser.Parse(bytes, log);
         file.isForeign = piece == SpoolParser::Piece::kForeign;
         if (file.isForeign || piece == SpoolParser::Piece::kPartial)
             break;
@@ -246,7 +253,7 @@ void SpoolReceiver::Take(SpoolFile &file, std::string_view bytes) {
             if (isNew)
                 PutAside(file, "no record", bytes.substr(0, size));
         } else if (!file.receipts.Has(file.parser.Receipt())) {
-            TakeRecord(file, end);
+            TakeRecord(file, end, log);
         }
         isSaveDue_ = isSaveDue_ || isNew;
         file.position = end;
@@ -254,11 +261,11 @@ void SpoolReceiver::Take(SpoolFile &file, std::string_view bytes) {
     }
 }
 
-void SpoolReceiver::TakeRecord(SpoolFile &file, uint64_t end) {
+void SpoolReceiver::TakeRecord(SpoolFile &file, uint64_t end, _SYSLOG_LOG_DATA_tag &log) {
     if (end > file.Of(SpoolReader::kRows).offset)
-        writer_.Take(log_, now_);
-    else if (end > file.Of(SpoolReader::kRules).offset || end > file.Of(SpoolReader::kCounts).offset)
-        again_.Take(log_);
+        writer_.Take(log, now_);
+    else if (end > file.Of(SpoolReader::kCounts).offset)
+        again_.Take(log);
     else
         return;
     sources_.push_back({&file, end});
@@ -292,21 +299,21 @@ void SpoolReceiver::PutAside(const SpoolFile &file, const char *reason, std::str
     ++state_.rejected;
 }
 
-// Counts and checks the records of the batch. Those of an earlier run that were stored are skipped by
-// whoever had them.
-void SpoolReceiver::Process(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
+// Before the batch is stored: what the rules make of it is part of its transaction.
+void SpoolReceiver::CheckRules() {
+    for (const _SYSLOG_LOG_DATA_tag &log : writer_.Records()) {
+        rules_.CountForEps(log.utcsec, now_ / kSecondMs);
+        rules_.Check(log, now_ / kSecondMs);
+    }
+}
+
+// Counts the records of the batch. Those of an earlier run may be counted already.
+void SpoolReceiver::Count(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
     // Before the first record of a second all counts belong to closed samples, and only then are they
     // flushed.
     accounting_.Tick(now_ / kSecondMs);
     for (size_t i = 0; i < logs.size(); ++i) {
         const auto &[file, end] = sources_[i];
-        if (end > file->Of(SpoolReader::kRules).offset) {
-            const uint64_t raised = rules_.Raised();
-            rules_.Check(logs[i], now_ / kSecondMs);
-            file->Of(SpoolReader::kRules).offset = end;
-            if (rules_.Raised() != raised)
-                SavePlaces();
-        }
         if (end > file->Of(SpoolReader::kCounts).offset) {
             accounting_.Count(logs[i].host);
             file->Of(SpoolReader::kCounts).offset = end;
@@ -314,9 +321,7 @@ void SpoolReceiver::Process(std::span<const _SYSLOG_LOG_DATA_tag> logs) {
         }
         lastUtc_ = logs[i].utcsec;
     }
-    Advance(SpoolReader::kRules);
     Advance(SpoolReader::kCounts);
-    isSaveDue_ = true;
 }
 
 // ---- Times ----
@@ -344,19 +349,26 @@ void SpoolReceiver::TickSecond() {
     accounting_.Tick(now_ / kSecondMs);
     if (accounting_.IsIdle())
         MarkSaved(SpoolReader::kCounts);
-    rules_.Tick(now_ / kSecondMs);
     setAside_.Tick(now_ / kSecondMs);
     volume_.Tick();
-    if (isLoaded_ && isSaveDue_ && writer_.Waiting() == 0) {
-        Advance(SpoolReader::kRules);
-        Advance(SpoolReader::kCounts);
-        SavePlaces();
-    }
+    if (isLoaded_ && writer_.Waiting() == 0)
+        TickRules();
     TellDone();
     if (now_ >= nextRepair_ && (accounting_.IsFailing() || rules_.IsFailing())) {
         nextRepair_ = now_ + kRepairMs;
         CompleteDatabases(options_.root);
     }
+}
+
+void SpoolReceiver::TickRules() {
+    const int64_t now = now_ / kSecondMs;
+    rules_.Tick(now);
+    if (folder_.Unread() == 0)
+        rules_.EpsTick(std::time(nullptr), now);
+    Advance(SpoolReader::kCounts);
+    if (isSaveDue_)
+        SavePlaces();
+    rules_.Deliver(now, [this] { return SavePlaces(); });
 }
 
 void SpoolReceiver::TickState() {
@@ -416,8 +428,8 @@ void SpoolReceiver::Finish() {
     }
     rules_.Finish();
     setAside_.Finish();
-    if (isLoaded_ && writer_.Waiting() == 0)
-        SavePlaces();
+    if (isLoaded_ && writer_.Waiting() == 0 && SavePlaces())
+        rules_.Deliver(now_ / kSecondMs, [this] { return SavePlaces(); });
     TellDone();
     Logger().LogAddServStop(kReceiverName);
     state_.ended = std::time(nullptr);

@@ -23,9 +23,9 @@ namespace kelo::tool {
 
 // Stores the messages of the message spool, counts them and checks them against the rules, each once.
 //
-// How far the rows go is part of the transaction that has the rows; the same holds for the counts. The rules
-// have a place of their own, which is saved with the rows and after each notification. So after a kill each
-// reader goes on where it was.
+// How far the rows go is part of the transaction that has the rows, and so is what the rules made of them:
+// the notifications to send, and the counts that limit them. The counts of the accounting have a place of
+// their own. So after a kill each reader goes on where it was.
 //
 // Everything runs on the caller's thread, in turns: what has come is read, stored in one transaction, counted
 // and checked. While the database cannot be written the spool grows.
@@ -56,14 +56,16 @@ private:
     bool Fill();
     bool ReadFile(SpoolFile &file);
     void Take(SpoolFile &file, std::string_view bytes);
-    void TakeRecord(SpoolFile &file, uint64_t end);
+    void TakeRecord(SpoolFile &file, uint64_t end, _SYSLOG_LOG_DATA_tag &log);
     bool GiveUpPartial(SpoolFile &file, std::string_view bytes);
     void Advance(SpoolReader reader);
     void PutAside(const SpoolFile &file, const char *reason, std::string_view bytes);
     bool IsBatchFull() const { return writer_.IsFull() || again_.IsFull(); }
     void Save(SqliteConnection &database);
-    void Process(std::span<const _SYSLOG_LOG_DATA_tag> logs);
-    void SavePlaces();
+    void CheckRules();
+    void Count(std::span<const _SYSLOG_LOG_DATA_tag> logs);
+    bool SavePlaces();
+    void TickRules();
     void TellDone();
 
     void Reload();
@@ -89,11 +91,10 @@ private:
     DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
     LogWriter writer_;
-    RecordBatch again_; // records that are stored already, for the rules or the counts
+    RecordBatch again_; // records that are stored already, for the counts
     std::vector<Source> sources_;
     SpoolFolder folder_;
     std::string buffer_;
-    _SYSLOG_LOG_DATA_tag log_;
     std::map<SpoolReader, Places> loaded_; // at the start
     std::string done_;                     // as it was told last
     ReceiverState state_;

@@ -13,14 +13,13 @@
 
 namespace kelo::tool {
 
-std::string TryLoadPlaces(const std::string &path, SpoolReader reader, std::vector<SpoolPlace> &places) {
-    places.clear();
+std::string TryLoad(const std::string &path, const std::function<void(SqliteConnection &)> &read) {
     if (access(path.c_str(), F_OK) != 0 && errno == ENOENT)
         return "";
     try {
         SqliteConnection database(path,
                                   {.mode = SqliteMode::kWrite, .busyTimeoutMs = 1000, .trustsSchema = false});
-        places = LoadPlaces(database, reader);
+        read(database);
     } catch (const SqliteError &error) {
         return error.code == SQLITE_CORRUPT ? "" : error.what();
     }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -9,9 +10,9 @@
 
 namespace kelo::tool {
 
-// The places in the database at `path`, which may be missing or damaged and has none then. Returns why they
-// are unknown, else "".
-std::string TryLoadPlaces(const std::string &path, SpoolReader reader, std::vector<SpoolPlace> &places);
+// Reads from the database at `path`, which may be missing or damaged: then nothing is read. Returns why it
+// cannot be read now, else "".
+std::string TryLoad(const std::string &path, const std::function<void(SqliteConnection &)> &read);
 
 // Replaces the file /run/kelosyslog/spool-done, in which keep-spool finds the files of the message spool that
 // all readers have read: a line "INODE BYTES NAME" for each. Returns false with errno set.

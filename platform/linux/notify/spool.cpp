@@ -13,12 +13,15 @@
 #include "common/unique_fd.h"
 #include "common/utf8.h"
 #include "files/replace_file.h"
+#include "keloplatform/notify_hold.h"
 
 namespace kelo::platform {
 namespace {
 
 constexpr mode_t kFolderMode = 0750;
 constexpr mode_t kEntryMode = 0640; // log texts may be confidential
+
+thread_local std::string heldId; // empty: nothing is held
 
 // Sorts by time and is unique among all processes and calls.
 std::string NewId(const timespec &now) {
@@ -94,16 +97,19 @@ std::string SpoolPath() {
 bool AddToSpool(const SpoolEntry &entry) {
     timespec now{};
     clock_gettime(CLOCK_REALTIME, &now);
-    const std::string id = NewId(now);
+    const bool isHeld = !heldId.empty();
+    const std::string id = isHeld ? heldId : NewId(now);
     const std::string content = ToJson(entry, id, now.tv_sec);
     // The spool belongs to a service, which must not lead root elsewhere by a link.
     const UniqueFd spool = OpenFolder(SpoolPath());
     const UniqueFd tmp = spool ? OpenOrCreate(spool.Get(), "tmp", O_NOFOLLOW) : UniqueFd();
-    const UniqueFd fresh = tmp ? OpenOrCreate(spool.Get(), "new", O_NOFOLLOW) : UniqueFd();
+    const UniqueFd fresh = tmp ? OpenOrCreate(spool.Get(), isHeld ? "held" : "new", O_NOFOLLOW) : UniqueFd();
     if (!fresh)
         return false;
 
     const std::string name = id + ".json";
+    if (isHeld)
+        unlinkat(tmp.Get(), name.c_str(), 0); // of a call that was killed
     const int flags = O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC;
     const UniqueFd file(openat(tmp.Get(), name.c_str(), flags, kEntryMode));
     if (!file)
@@ -124,3 +130,18 @@ bool AddToSpool(const SpoolEntry &entry) {
 }
 
 } // namespace kelo::platform
+
+void KELONotifyHold(const char *id) {
+    kelo::platform::heldId = id != nullptr ? id : "";
+}
+
+int KELONotifyRelease(const char *id) {
+    using namespace kelo::platform;
+    const std::string name = std::string(id) + ".json";
+    const UniqueFd spool = OpenFolder(SpoolPath());
+    const UniqueFd held = spool ? OpenOrCreate(spool.Get(), "held", O_NOFOLLOW) : UniqueFd();
+    const UniqueFd fresh = held ? OpenOrCreate(spool.Get(), "new", O_NOFOLLOW) : UniqueFd();
+    if (!fresh || (renameat(held.Get(), name.c_str(), fresh.Get(), name.c_str()) != 0 && errno != ENOENT))
+        return -1;
+    return fsync(fresh.Get()) == 0 ? 0 : -1;
+}

@@ -23,6 +23,8 @@ std::string SpoolPath();
 
 // Puts the entry into the spool, whose missing folders are created. True when it is on the
 // disk; false with errno set, and then no part of it is left.
+//
+// While the calling thread holds notifications (notify_hold.h), the entry goes into the folder `held`.
 bool AddToSpool(const SpoolEntry &entry);
 
 } // namespace kelo::platform
