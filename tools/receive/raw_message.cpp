@@ -21,7 +21,7 @@ struct Parts {
 };
 
 // The text up to `end`, which is removed with it.
-bool Cut(std::string_view &rest, char end, std::string_view &part) {
+bool TakeUpTo(std::string_view &rest, char end, std::string_view &part) {
     const size_t at = rest.find(end);
     if (at == std::string_view::npos)
         return false;
@@ -35,7 +35,7 @@ bool ParseOld(std::string_view rest, Parts &parts) {
     if (rest.size() < kOldTimeBytes)
         return false;
     rest.remove_prefix(kOldTimeBytes);
-    if (!Cut(rest, ' ', parts.host))
+    if (!TakeUpTo(rest, ' ', parts.host))
         return false;
     const size_t end = rest.find_first_of("[: ");
     if (end == std::string_view::npos || rest[end] == ' ')
@@ -51,8 +51,9 @@ bool ParseOld(std::string_view rest, Parts &parts) {
 // 1 TIME HOST PROG PID ID - MSG
 bool ParseNew(std::string_view rest, Parts &parts) {
     std::string_view skipped;
-    const bool isSplit = Cut(rest, ' ', skipped) && Cut(rest, ' ', skipped) && Cut(rest, ' ', parts.host) &&
-                         Cut(rest, ' ', parts.prog) && Cut(rest, ' ', skipped) && Cut(rest, ' ', skipped);
+    const bool isSplit = TakeUpTo(rest, ' ', skipped) && TakeUpTo(rest, ' ', skipped) &&
+                         TakeUpTo(rest, ' ', parts.host) && TakeUpTo(rest, ' ', parts.prog) &&
+                         TakeUpTo(rest, ' ', skipped) && TakeUpTo(rest, ' ', skipped);
     if (!isSplit || !rest.starts_with("- "))
         return false;
     parts.msg = rest.substr(2);

@@ -22,7 +22,6 @@
 namespace kelo::tool {
 namespace {
 
-constexpr const char *kEventDatabase = "/usr/kelo/etc/kelosyslog.db";
 constexpr int kWarning = 1; // the level of an event
 
 constexpr int64_t kSilenceMs = 1000;     // after a signal to stop, this is the end of the input

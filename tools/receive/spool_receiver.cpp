@@ -23,8 +23,6 @@
 namespace kelo::tool {
 namespace {
 
-constexpr const char *kEventLog = "/usr/kelo/etc/kelosyslog.db";
-
 // Between two turns: each commit costs as much as some hundred rows, and a message waits half of it.
 constexpr int64_t kTurnMs = 40;
 // Behind, larger batches write fewer pages of the indexes twice.
@@ -57,7 +55,7 @@ SpoolReceiver::SpoolReceiver(ReceiverOptions options)
                               isSaveDue_ = false;
                               Count(logs);
                           }});
-    rules_.Hold(options_.root + kEventLog);
+    rules_.Hold(options_.root + kEventDatabase);
     accounting_.HooksSet(
         {.statements =
              [this] { return PlaceStatements(SpoolReader::kCounts, PlacesOf(SpoolReader::kCounts)); },
