@@ -11,7 +11,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr size_t kMaxTitleBytes = 250;
-constexpr size_t kMaxTextBytes = 4096;
+constexpr size_t kMaxPostedBytes = 4096;
 
 bool IsLine(const std::string &text) {
     return std::none_of(text.begin(), text.end(),
@@ -100,7 +100,7 @@ private:
 
     TemplateWords WordsOf(const Entry &entry, const std::string &target) const {
         TemplateWords words = {{"%TITLE%", SafeLine(entry.title, kMaxTitleBytes)},
-                               {"%BODY%", SafeLines(entry.body, kMaxTextBytes)},
+                               {"%BODY%", SafeLines(entry.body, kMaxPostedBytes)},
                                {"%TAG%", SafeLine(entry.tag, kMaxTitleBytes)},
                                {"%ID%", entry.id},
                                {"%TIME%", std::to_string(entry.time)}};

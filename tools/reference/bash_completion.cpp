@@ -8,7 +8,7 @@ namespace {
 
 constexpr const char *kNothing = "nothing";
 
-std::string Entry(const std::string &key, const std::string &words) {
+std::string TableEntry(const std::string &key, const std::string &words) {
     return "        [\"" + key + "\"]=\"" + words + "\"\n";
 }
 
@@ -43,14 +43,14 @@ void AddOption(Tables &tables, CLI::Option &option, const std::string &path) {
     if (option.get_items_expected_min() == 0) // a flag, or a value that may be left out
         return;
     for (const std::string &name : option.get_snames())
-        tables.values += Entry(path + " -" + name, CompletionOf(Option(option)));
+        tables.values += TableEntry(path + " -" + name, CompletionOf(Option(option)));
     for (const std::string &name : option.get_lnames())
-        tables.values += Entry(path + " --" + name, CompletionOf(Option(option)));
+        tables.values += TableEntry(path + " --" + name, CompletionOf(Option(option)));
 }
 
 void AddCommand(Tables &tables, CLI::App &command, CLI::App &app, const std::string &path) {
     const std::string offered = OfferedOptions(command, app);
-    tables.options += Entry(path, offered);
+    tables.options += TableEntry(path, offered);
     size_t arguments = 0;
     for (CLI::Option *option : command.get_options()) {
         if (!option->get_positional()) {
@@ -60,7 +60,7 @@ void AddCommand(Tables &tables, CLI::App &command, CLI::App &app, const std::str
         const bool isLast = option->get_items_expected_max() > 1;
         const std::string number = isLast ? "+" : std::to_string(++arguments);
         if (const std::string offer = CompletionOf(Option(*option)); offer != kNothing)
-            tables.values += Entry(path + " " + number, offer);
+            tables.values += TableEntry(path + " " + number, offer);
     }
     std::string names;
     for (CLI::App *below : command.get_subcommands({})) {
@@ -68,7 +68,7 @@ void AddCommand(Tables &tables, CLI::App &command, CLI::App &app, const std::str
         AddCommand(tables, *below, app, path + " " + below->get_name());
     }
     if (!names.empty())
-        tables.values += Entry(path + " 1", "words" + names + (&command == &app ? " " + offered : ""));
+        tables.values += TableEntry(path + " 1", "words" + names + (&command == &app ? " " + offered : ""));
 }
 
 } // namespace
