@@ -30,8 +30,8 @@ TEST(Completion, OffersWhatGoesWithTheCommandLine) {
     const std::pair<std::string, Words> cases[] = {
         {"re", {"report", "receive", "retention"}},
         {"--root / db r", {"reopen"}}, // behind an option with its value
-        {"db create --", {"--output", "--db", "--schema", "--root", "--help"}},
-        {"events clear-log --", {"--user", "--yes", "--root", "--help"}},
+        {"db create --", {"--output", "--db", "--schema", "--root", "--errors", "--help"}},
+        {"events clear-log --", {"--user", "--yes", "--root", "--errors", "--help"}},
         {"events count --prio", {"--priority"}}, // of the command above
         {"events count --priority w", {"warning"}},
         {"search -p e", {"emerg", "err"}},

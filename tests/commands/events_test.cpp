@@ -45,6 +45,30 @@ TEST_F(Events, AreListedNewestFirstByPageTimeAndLevel) {
     Expect("events count -p error", 0, "1\n");
 }
 
+TEST_F(Events, AreFollowedAlsoIntoAnotherFile) {
+    AddEvents();
+    const std::string columns = "events -f -o csv --no-header ";
+    Expect(columns + "-n 2 --idle 0 -p warning", 0,
+           "2,2020-01-01T00:00:01+00:00,Warning,b,B\r\n"
+           "3,2020-01-01T00:00:02+00:00,Error,c,C\r\n");
+    Expect("events -f --until @0", 1, "");
+    FILE *stream =
+        popen(InFolder(root_.Path(), kProgram + columns + "-n 1 -p '!information' 2>err").c_str(), "r");
+    const auto nextLine = [stream] {
+        char line[99] = "";
+        return std::string(fgets(line, sizeof line, stream) != nullptr ? line : "");
+    };
+    EXPECT_EQ(nextLine(), "3,2020-01-01T00:00:02+00:00,Error,c,C\r\n");
+    RunSql(events_, "INSERT INTO log (level, time, user, event) VALUES (0, 9, 'x', 'X'), (2, 8, 'y', 'Y')");
+    EXPECT_EQ(nextLine(), "7,1970-01-01T00:00:08+00:00,Error,y,Y\r\n") << "of an earlier time";
+    CreateLogDatabase(root_.File("fresh"), "kelosyslog.sql");
+    RunSql(root_.File("fresh"), "INSERT INTO log (level, time, user, event) VALUES (1, 7, 'z', 'Z')");
+    fs::rename(root_.File("fresh"), events_);
+    EXPECT_EQ(nextLine(), "1,1970-01-01T00:00:07+00:00,Warning,z,Z\r\n");
+    EXPECT_EQ(pclose(stream), 0) << "nobody reads any more";
+    EXPECT_EQ(ReadFile(root_.File("err")), "");
+}
+
 TEST_F(Events, OfEveryKindCanBeAdded) {
     for (const char *kind :
          {"server-start 1.0", "server-stop %s%n", "eps 18446744073709551615", "severity err \"it's\"",

@@ -80,7 +80,7 @@ void ArchiveRun::Copy() {
     bar.Clear();
     made_ = fs::path(archive.path).filename().string();
     report_("archived " + LogsOf(archive.logs, order_.host) + " from " + order_.source + " to " +
-            archive.path + " (" + FormatSize(fs::file_size(archive.path, unknown)) + ")\n");
+            archive.path + " (" + FormatSize(fs::file_size(archive.path, unknown)) + ")");
 }
 
 // Removes records that earlier runs archived and did not remove. Returns whether there were any.
@@ -102,7 +102,7 @@ uint64_t ArchiveRun::RemoveArchived(const std::string &name) {
     }
     folder_.ForgetRemoval(name);
     report_("removed " + LogsOf(removal.Removed(), "") + " from " + order_.source + ", which " + name +
-            " holds\n");
+            " holds");
     return removal.Removed();
 }
 

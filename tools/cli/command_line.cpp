@@ -7,6 +7,7 @@
 
 #include "base/errors.h"
 #include "base/text_encoding.h"
+#include "cli/usage_text.h"
 
 namespace kelo::tool {
 
@@ -16,7 +17,7 @@ int RunApp(CLI::App &app, const ExitHandling &exits, const std::function<int()> 
     } catch (const CLI::Success &request) { // --help, --version
         return app.exit(request);
     } catch (const CLI::ParseError &error) {
-        exits.reportUsage(EscapeForTerminal(std::string(error.what()) + " (see --help)"));
+        exits.reportUsage(EscapeForTerminal(DescribeUsage(app, error)));
         return exits.usage;
     } catch (const UsageError &error) {
         exits.reportUsage(EscapeForTerminal(error.what()));

@@ -6,10 +6,11 @@
 #include <cstdio>
 
 #include "base/errors.h"
-#include "base/text_encoding.h"
 #include "cli/command_line.h"
+#include "cli/completion.h"
 #include "cli/exit_status.h"
 #include "cli/help_formatter.h"
+#include "cli/message.h"
 #include "keloplatform/root.h"
 #include "kelosyslog/root.h"
 
@@ -41,18 +42,39 @@ void ApplyRoot(std::string &root) {
         throw UsageError("--root: cannot use '" + root + "'");
 }
 
+// The form of the errors, which must be known while the command line is read. `arguments` are in reverse.
+MessageForm WantedForm(const std::vector<std::string> &arguments) {
+    std::string before;
+    for (auto word = arguments.rbegin(); word != arguments.rend() && *word != "--"; ++word) {
+        if (*word == "--errors=json" || (before == "--errors" && *word == "json"))
+            return MessageForm::kJson;
+        before = *word;
+    }
+    return MessageForm::kText;
+}
+
+// Without a command: the short help, or an error for programs.
+int MissCommand(const Program &program) {
+    if (ParseMessageForm(program.errors) == MessageForm::kJson)
+        throw UsageError("a command is missing (see --help)");
+    std::fputs(program.app->help().c_str(), stderr);
+    return kExitUsage;
+}
+
 int RunCommand(Program &program, int argc, const char *const *argv) {
     std::vector<std::string> arguments = SplitEmptyValues(argc, argv);
+    SetMessageForm(WantedForm(arguments));
     program.app->parse(arguments);
+    ParseMessageForm(program.errors);
     if (!program.run)
-        throw UsageError("a command is missing (see --help)");
+        return MissCommand(program);
     ApplyRoot(program.root);
     try {
         return program.run();
     } catch (const OutputClosed &) {
         return kExitFound;
     } catch (const DatabaseError &error) {
-        PrintMessage(error.what());
+        PrintError(kExitDatabase, error.what());
         return kExitDatabase;
     }
 }
@@ -79,8 +101,12 @@ Command AddSubcommand(Program &program, Command parent, const std::string &name,
     return command;
 }
 
-void AddRoot(Program &program) {
+void AddCommonOptions(Program &program) {
     program.Top().AddText("--root", program.root, "DIR", "Look for the system's logs below DIR");
+    OfferWords(program.Top().AddText(
+                   "--errors", program.errors, "FORMAT",
+                   "What is written to the standard error: text (default), or json (an object a line)"),
+               {"text", "json"});
 }
 
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum) {
@@ -94,13 +120,11 @@ uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_
     return number;
 }
 
-void PrintMessage(const std::string &text) {
-    std::fprintf(stderr, "kelosyslog: %s\n", EscapeForTerminal(text).c_str());
-}
-
 int RunProgram(Program &program, int argc, const char *const *argv) {
-    return RunApp(*program.app, {kExitUsage, kExitSystem, PrintMessage, PrintMessage},
-                  [&] { return RunCommand(program, argc, argv); });
+    const ExitHandling exits = {kExitUsage, kExitSystem,
+                                [](const std::string &text) { PrintError(kExitUsage, text); },
+                                [](const std::string &text) { PrintError(kExitSystem, text); }};
+    return RunApp(*program.app, exits, [&] { return RunCommand(program, argc, argv); });
 }
 
 } // namespace kelo::tool

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "cli/command.h"
+#include "cli/message.h"
 
 namespace kelo::tool {
 
@@ -31,7 +32,8 @@ struct Program {
     Command Top() const { return Command(*app); }
 
     std::unique_ptr<CLI::App> app;
-    std::string root;         // --root, absolute or empty
+    std::string root; // --root, absolute or empty
+    std::string errors = "text";
     std::function<int()> run; // set by the chosen subcommand
 };
 
@@ -42,14 +44,11 @@ Command AddSubcommand(Program &program, const std::string &name, const std::stri
 Command AddSubcommand(Program &program, Command parent, const std::string &name,
                       const std::string &description, std::function<int()> run);
 
-// Adds --root, which goes with every subcommand.
-void AddRoot(Program &program);
+// Adds --root and --errors, which go with every subcommand.
+void AddCommonOptions(Program &program);
 
 // Reads a whole number from `minimum` to `maximum`; throws UsageError naming `option` and `text` otherwise.
 uint64_t ParseNumber(const std::string &option, const std::string &text, uint64_t minimum, uint64_t maximum);
-
-// One line on the standard error, after the program's name, with control bytes made visible.
-void PrintMessage(const std::string &text);
 
 // Reads the command line, runs the chosen subcommand and maps every failure to an ExitStatus and one line.
 int RunProgram(Program &program, int argc, const char *const *argv);

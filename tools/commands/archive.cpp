@@ -16,6 +16,7 @@
 #include "cli/exit_status.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
+#include "print/action_lines.h"
 #include "print/statistics_table.h"
 #include "read/time_expression.h"
 
@@ -67,7 +68,8 @@ class ArchiveCommand {
 public:
     ArchiveCommand(const Options &options, const std::string &root)
         : options_(options), root_(root),
-          folder_(options.to.empty() ? ArchiveFolderPath(root) : fs::absolute(options.to).string()) {
+          folder_(options.to.empty() ? ArchiveFolderPath(root) : fs::absolute(options.to).string()),
+          lines_(options.format == "json" ? OutputFormat::Json : OutputFormat::Text) {
         folder_ = Canonical(folder_);
         RequireSense();
         if (!options.keep.empty()) {
@@ -98,15 +100,17 @@ public:
                        isText ? time.Plain(archive.first) : time.Iso(archive.first),
                        isText ? time.Plain(archive.last) : time.Iso(archive.last),
                        std::to_string(archive.logs), std::to_string(archive.bytes)});
-        Print(table.Write(format, !options_.noHeader));
-        return Finish(table.IsEmpty() ? kExitNothing : kExitFound);
+        Output output(false);
+        output.Write(table.Write(format, !options_.noHeader));
+        output.Finish();
+        return table.IsEmpty() ? kExitNothing : kExitFound;
     }
 
     int Prune() {
         const ArchiveFolder folder(folder_, options_.to.empty());
         const std::vector<Archive> expired = Expired(ListArchives(folder_), retention_);
         if (expired.empty()) {
-            Print("no archive to remove in " + folder_ + "\n");
+            Print("no archive to remove in " + folder_);
             return Finish(kExitNothing);
         }
         const std::string action = "remove " + std::to_string(expired.size()) +
@@ -122,7 +126,7 @@ public:
             return Preview(table.path);
         ArchiveFolder folder(folder_, options_.to.empty());
         ArchiveRun run({table.path, options_.device, options_.isRemoving, root_}, folder,
-                       [this](const std::string &text) { Print(text); });
+                       [this](const std::string &line) { Print(line); });
         const bool hasDone = run.Run();
         retention_.spared = run.Made();
         RemoveExpired(Expired(ListArchives(folder_), retention_));
@@ -156,16 +160,14 @@ private:
         refuse("--keep, --keep-size", options_.isListing && hasRetention, mode);
         if (options_.isPruning && !hasRetention)
             throw UsageError("--prune: needs --keep or --keep-size");
-        if (!options_.isListing && options_.format != "text")
-            throw UsageError("--output: goes with --list only");
+        if (!options_.isListing)
+            ParseKeyValuesFormat(options_.format);
     }
 
     // A failed message must not prevent the rest of the work.
-    void Print(const std::string &text) {
+    void Print(const std::string &line) {
         try {
-            Output output(false);
-            output.Write(text);
-            output.Finish();
+            lines_.Add(line);
         } catch (const std::exception &) {
             outputFailure_ = std::current_exception();
         }
@@ -174,6 +176,7 @@ private:
     int Finish(int status) const {
         if (outputFailure_)
             std::rethrow_exception(outputFailure_);
+        lines_.End();
         return status;
     }
 
@@ -196,7 +199,7 @@ private:
     int Preview(const std::string &source) {
         const uint64_t count = CountLogs(source, options_.device);
         Print("would archive " + LogsOf(count, options_.device) + " from " + source + " to " + folder_ +
-              (options_.isRemoving ? ", and remove them from the database" : "") + "\n");
+              (options_.isRemoving ? ", and remove them from the database" : ""));
         RemoveExpired(Expired(ListArchives(folder_), retention_));
         return Finish(count > 0 ? kExitFound : kExitNothing);
     }
@@ -208,7 +211,7 @@ private:
                 throw OutputError("cannot remove " + path);
             Print(std::string(options_.isDryRun ? "would remove " : "removed ") + path + " (" +
                   LogsOf(archive.logs, "") + " up to " + TimeFormat(false).Plain(archive.last) + ", " +
-                  FormatSize(archive.bytes) + ")\n");
+                  FormatSize(archive.bytes) + ")");
         }
     }
 
@@ -216,6 +219,7 @@ private:
     std::string root_;
     std::string folder_;
     Retention retention_;
+    ActionLines lines_;
     std::exception_ptr outputFailure_;
 };
 
@@ -264,7 +268,7 @@ void AddArchive(Program &program) {
     command.AddFlag("--dry-run", options->isDryRun, "Only tell what would be archived and removed");
     command.AddFlag("-y,--yes", options->isConfirmed, "Do not ask");
     OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
-                               "--list: text (default), json (one array), jsonl (an object per line), csv, "
+                               "text (default) or json; with --list also jsonl (an object per line), csv, "
                                "spreadsheet (csv without formulas)"),
                {"text", "json", "jsonl", "csv", "spreadsheet"});
     command.AddFlag("--no-header", options->noHeader, "--list: no heading in text and csv");

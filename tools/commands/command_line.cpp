@@ -22,7 +22,7 @@ KelosyslogProgram::KelosyslogProgram()
     AddRetention(*this);
     AddListen(*this);
     AddStatus(*this);
-    AddRoot(*this);
+    AddCommonOptions(*this);
 }
 
 } // namespace kelo::tool

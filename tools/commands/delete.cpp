@@ -35,6 +35,7 @@ constexpr uint64_t kLargestStep = 5000; // records
 struct Options {
     LogTableOptions table;
     LogFilter filter;
+    std::string format = "text";
     bool inUtc = false;
     bool all = false;
     bool isConfirmed = false;
@@ -115,8 +116,24 @@ uint64_t DeleteUpTo(const LogReader &reader, uint64_t newest, uint64_t total) {
     return deletion.Count();
 }
 
+// "deleted 5 matching logs from ..."
+void PrintResult(const Options &options, const LogTable &table, uint64_t count, OutputFormat format) {
+    Output output(false);
+    if (format == OutputFormat::Text) {
+        output.Write((options.isDryRun ? "would delete " : "deleted ") + Logs(count) + " from " + table.path +
+                     "\n");
+    } else {
+        KeyValues values;
+        values.Add("path", table.path);
+        values.Add(options.isDryRun ? "matching" : "deleted", static_cast<int64_t>(count));
+        output.Write(values.Render(format));
+    }
+    output.Finish();
+}
+
 int Run(const Options &options, const std::string &root) {
     ApplyUtc(options.inUtc);
+    const OutputFormat format = ParseKeyValuesFormat(options.format);
     if (IsEmpty(options.filter) && !options.all)
         throw UsageError("delete: nothing selects the logs to delete; use --all for all of them");
     if (!IsEmpty(options.filter) && options.all)
@@ -130,10 +147,8 @@ int Run(const Options &options, const std::string &root) {
     const uint64_t newest = reader.IdFromNewest(0);
     const uint64_t count = newest == 0 ? 0 : reader.Count();
     const std::string what = Logs(count) + " from " + table.path;
-    Output output(false);
     if (options.isDryRun || count == 0) {
-        output.Write((options.isDryRun ? "would delete " : "deleted ") + what + "\n");
-        output.Finish();
+        PrintResult(options, table, count, format);
         return count > 0 ? kExitFound : kExitNothing;
     }
     if (!options.isConfirmed && !Confirm("delete", "delete " + what)) {
@@ -143,8 +158,7 @@ int Run(const Options &options, const std::string &root) {
     int stopSignal = 0;
     try {
         const uint64_t deleted = DeleteUpTo(reader, newest, count);
-        output.Write("deleted " + Logs(deleted) + " from " + table.path + "\n");
-        output.Finish();
+        PrintResult(options, table, deleted, format);
     } catch (const Interrupted &interruption) {
         stopSignal = interruption.signal;
     }
@@ -165,6 +179,7 @@ void AddDelete(Program &program) {
     command.AddFlag("-y,--yes", options->isConfirmed, "Do not ask");
     command.AddFlag("--dry-run", options->isDryRun, "Only tell how many logs match");
     AddUtcOption(command, options->inUtc);
+    AddKeyValuesFormat(command, options->format);
     AddTableOptions(command, options->table, false);
 }
 

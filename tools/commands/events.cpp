@@ -3,6 +3,7 @@
 #include "commands/events.h"
 #include "commands/commands.h"
 
+#include <algorithm>
 #include <ctime>
 #include <limits>
 
@@ -10,6 +11,7 @@
 #include "base/errors.h"
 #include "cli/completion.h"
 #include "cli/exit_status.h"
+#include "commands/follow.h"
 #include "kelosyslog/logger.h"
 #include "print/event_fields.h"
 #include "read/event_log.h"
@@ -25,6 +27,7 @@ constexpr const char *kFooter =
     "  kelosyslog events -n 20                          the newest 20 events\n"
     "  kelosyslog events -n 20 --offset 20              the page after them\n"
     "  kelosyslog events -p warning --since yesterday   warnings and errors since yesterday\n"
+    "  kelosyslog events -f -p error -o jsonl           follow the errors\n"
     "  kelosyslog events add server-start 1.0\n"
     "  kelosyslog events export events.html\n"
     "  kelosyslog events clear-log /volume1/old.db\n\n"
@@ -64,33 +67,114 @@ std::list<Event> SelectedEvents(const std::string &path, const EventsOptions &op
     return events;
 }
 
+// The events that are there, up to 10 or --lines, and then those that are added, in their order.
+class EventFollower {
+public:
+    EventFollower(const EventsOptions &options, const std::string &path)
+        : path_(path), filter_(ParseEventFilter(options.filter, std::time(nullptr))),
+          file_(IdentifyFile(path)), lastId_(NewestEventId(path)),
+          present_(SelectedEvents(path, options, PageOf(options))) {
+        present_.reverse();
+        for (const Event &event : present_)
+            lastId_ = std::max<int64_t>(lastId_, event.id);
+    }
+
+    uint64_t Print(const std::function<void(const Event &)> &print) {
+        uint64_t count = present_.size();
+        std::for_each(present_.begin(), present_.end(), print);
+        present_.clear();
+        for (const Event &event : News()) {
+            if (filter_.Matches(event)) {
+                print(event);
+                ++count;
+            }
+        }
+        return count;
+    }
+
+private:
+    static EventPage PageOf(const EventsOptions &options) {
+        EventPage page = ParsePage(options);
+        if (options.lines.empty() && options.filter.since.empty())
+            page.limit = 10;
+        return page;
+    }
+
+    // Another file, or none, may have taken the place of the database; a fresh one has no table yet.
+    std::vector<Event> News() {
+        const std::optional<FileIdentity> current = IdentifyFile(path_);
+        if (!current)
+            return {};
+        try {
+            int64_t lastId = current != file_ ? 0 : lastId_;
+            std::vector<Event> events = ReadEventsAfter(path_, lastId);
+            file_ = current;
+            lastId_ = lastId;
+            return events;
+        } catch (const DatabaseError &) {
+            if (current == file_ && IdentifyFile(path_) == current)
+                throw;
+            return {};
+        }
+    }
+
+    std::string path_;
+    EventFilter filter_;
+    std::optional<FileIdentity> file_; // the one that was read last
+    int64_t lastId_;
+    std::list<Event> present_;
+};
+
+FollowOptions ParseFollow(const EventsOptions &options) {
+    if (!options.offset.empty())
+        throw UsageError("--follow: goes not with --offset");
+    FollowOptions follow;
+    if (!options.idle.empty())
+        follow.idleSec = ParseNumber("--idle", options.idle, 0, kMaxLines);
+    follow.until = LastSecond(options.filter, std::time(nullptr));
+    return follow;
+}
+
 int List(const EventsOptions &options, const std::string &root) {
+    if (!options.follow && !options.idle.empty())
+        throw UsageError("--idle: only together with --follow");
     ApplyUtc(options.output.inUtc);
     RecordLayout layout = MakeLayout(options.output, TableKind::Logs);
     if (layout.format == OutputFormat::Short)
         throw UsageError(
             "--output: events have no form 'short'; forms are text, json, jsonl, csv, spreadsheet");
     layout.fields = EventFields();
-    const EventPage page = ParsePage(options);
-    const std::list<Event> events = SelectedEvents(EventDatabasePath(options.db, root), options, page);
-    Output output(!options.output.noPager);
+    const std::string path = EventDatabasePath(options.db, root);
+    Output output(!options.output.noPager && !options.follow);
     const std::unique_ptr<RecordFormatter> writer = MakeRecordWriter(layout);
     std::string text;
     writer->Begin(text);
-    for (const Event &event : events) {
+    const auto print = [&](const Event &event) {
         writer->Add(RecordOfEvent(event), text);
         output.Write(text);
         text.clear();
+    };
+    uint64_t count = 0;
+    if (options.follow) {
+        const FollowOptions follow = ParseFollow(options);
+        EventFollower follower(options, path);
+        count = RepeatUntilOver(
+            follow, [&] { return follower.Print(print); }, output);
+    } else {
+        const std::list<Event> events = SelectedEvents(path, options, ParsePage(options));
+        std::for_each(events.begin(), events.end(), print);
+        count = events.size();
     }
     writer->End(text);
     output.Write(text);
     output.Finish();
-    return events.empty() ? kExitNothing : kExitFound;
+    return count == 0 ? kExitNothing : kExitFound;
 }
 
 int Count(const EventsOptions &options, const std::string &root) {
-    if (!options.lines.empty() || !options.offset.empty())
-        throw UsageError("count: goes neither with --lines nor with --offset");
+    if (!options.lines.empty() || !options.offset.empty() || options.follow || !options.idle.empty())
+        throw UsageError("count: goes neither with --lines, --offset, --follow nor --idle");
+    const OutputFormat format = ParseKeyValuesFormat(options.output.format);
     ApplyUtc(options.output.inUtc);
     const std::string path = EventDatabasePath(options.db, root);
     int64_t count = 0;
@@ -101,7 +185,8 @@ int Count(const EventsOptions &options, const std::string &root) {
     if (count < 0)
         FailEventDatabase(path);
     Output output(false);
-    output.Write(std::to_string(count) + "\n");
+    output.Write(format == OutputFormat::Text ? std::to_string(count) + "\n"
+                                              : "{\"count\":" + std::to_string(count) + "}\n");
     output.Finish();
     return count > 0 ? kExitFound : kExitNothing;
 }
@@ -145,6 +230,14 @@ void AddListOptions(Command command, EventsOptions &options) {
     command.AddText("-n,--lines", options.lines, "N", "The newest N events, or 'all' (default)")
         .Group(howMany);
     command.AddText("--offset", options.offset, "N", "Skip the N newest events first").Group(howMany);
+    command
+        .AddFlag("-f,--follow", options.follow,
+                 "Print the newest 10 events (or -n; all with --since), oldest first, and then what is "
+                 "added, until "
+                 "--until has passed, --idle has, or nobody reads any more")
+        .Group(howMany);
+    command.AddText("--idle", options.idle, "SECONDS", "Stop following after SECONDS without a new event")
+        .Group(howMany);
     const std::string how = "How to print";
     OfferWords(command.AddText("-o,--output", options.output.format, "FORMAT",
                                "text (default), json (one array), jsonl (an object per line), csv, "
@@ -173,7 +266,8 @@ Command AddEventsAction(Command events, const SharedEventsOptions &options, cons
 }
 
 void RefuseListOptions(const EventsOptions &options, const std::string &action, bool withDb) {
-    if (!IsEmpty(options.filter) || !options.lines.empty() || !options.offset.empty())
+    if (!IsEmpty(options.filter) || !options.lines.empty() || !options.offset.empty() || options.follow ||
+        !options.idle.empty())
         throw UsageError(action + ": goes with no option that selects events");
     if (withDb && !options.db.empty())
         throw UsageError("--db: " + action +

@@ -15,6 +15,8 @@ struct EventsOptions {
     OutputOptions output;
     std::string lines;
     std::string offset;
+    std::string idle;
+    bool follow = false;
     std::function<int()> action; // of the subcommand below "events"; none to list
 };
 using SharedEventsOptions = std::shared_ptr<EventsOptions>;

@@ -15,20 +15,6 @@ using Clock = std::chrono::steady_clock;
 
 constexpr int kPollMs = 250;
 
-// The file at a path; nothing when there is none.
-struct FileIdentity {
-    dev_t device;
-    ino_t inode;
-    bool operator==(const FileIdentity &) const = default;
-};
-
-std::optional<FileIdentity> IdentifyFile(const std::string &path) {
-    struct stat status {};
-    if (stat(path.c_str(), &status) != 0)
-        return std::nullopt;
-    return FileIdentity{status.st_dev, status.st_ino};
-}
-
 class Follower {
 public:
     Follower(const LogReader &reader, const LogHandler &format, const ChunkHandler &print)
@@ -79,16 +65,21 @@ private:
 
 } // namespace
 
-uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &format,
-                const ChunkHandler &print, Output &output) {
-    Follower follower(reader, format, print);
-    uint64_t count = follower.PrintPresent(options);
-    output.Flush();
+std::optional<FileIdentity> IdentifyFile(const std::string &path) {
+    struct stat status {};
+    if (stat(path.c_str(), &status) != 0)
+        return std::nullopt;
+    return FileIdentity{status.st_dev, status.st_ino};
+}
+
+uint64_t RepeatUntilOver(const FollowOptions &options, const std::function<uint64_t()> &printNews,
+                         Output &output) {
+    uint64_t count = 0;
     Clock::time_point lastNews = Clock::now();
     while (true) {
         // Read before the query, so that no record of the last second is missed.
         const bool isOver = options.until && std::time(nullptr) > *options.until;
-        const uint64_t news = follower.PrintNews();
+        const uint64_t news = printNews();
         output.Flush();
         count += news;
         if (news > 0)
@@ -99,6 +90,15 @@ uint64_t Follow(const LogReader &reader, const FollowOptions &options, const Log
             return count;
         output.Wait(kPollMs);
     }
+}
+
+uint64_t Follow(const LogReader &reader, const FollowOptions &options, const LogHandler &format,
+                const ChunkHandler &print, Output &output) {
+    Follower follower(reader, format, print);
+    const uint64_t present = follower.PrintPresent(options);
+    output.Flush();
+    return present + RepeatUntilOver(
+                         options, [&] { return follower.PrintNews(); }, output);
 }
 
 } // namespace kelo::tool

@@ -1,7 +1,11 @@
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstdint>
+#include <functional>
 #include <optional>
+#include <string>
 
 #include "print/output.h"
 #include "read/log_reader.h"
@@ -15,6 +19,20 @@ struct FollowOptions {
     std::optional<uint64_t> idleSec;   // stop after so many seconds without a new record
     std::optional<int64_t> until = {}; // stop when this second (of the epoch) has passed
 };
+
+// The file at a path, to notice that another has taken its place.
+struct FileIdentity {
+    dev_t device;
+    ino_t inode;
+    bool operator==(const FileIdentity &) const = default;
+};
+std::optional<FileIdentity> IdentifyFile(const std::string &path); // nothing when there is none
+
+// Calls `printNews`, which returns how much there was, again and again until the bounds of `options` end it,
+// and flushes `output` after each call. Returns the sum. OutputClosed ends it when the reader has closed its
+// end.
+uint64_t RepeatUntilOver(const FollowOptions &options, const std::function<uint64_t()> &printNews,
+                         Output &output);
 
 // Hands the logs that are there and then every new one to `format`, calls `print` once the database is
 // closed, and flushes `output` after each batch. Returns their number when the bounds of `options` end it;

@@ -109,11 +109,16 @@ std::string Describe(const NetworkSettings &settings) {
            "; up to " + std::to_string(settings.connections) + " connections on each TCP port\n";
 }
 
-int Show(const NetworkSettings &settings, const std::string &root, const std::string &formatName) {
-    const OutputFormat format = ParseOutputFormat(formatName);
+OutputFormat ParseTableFormat(const std::string &name) {
+    const OutputFormat format = ParseOutputFormat(name);
     if (format == OutputFormat::Short)
         throw UsageError("--output: there is no form 'short' of this; forms are text, json, jsonl, csv, "
                          "spreadsheet");
+    return format;
+}
+
+int Show(const NetworkSettings &settings, const std::string &root, const std::string &formatName) {
+    const OutputFormat format = ParseTableFormat(formatName);
     const SyslogNgStatus syslogNg = FindSyslogNg(root);
     const NetworkStatus status = GatherNetwork(root, false, syslogNg);
     const std::vector<Listener> &listeners = status.isUsed ? status.listeners : ConfiguredListeners(settings);
@@ -151,6 +156,7 @@ FileHandle LockChanges(const std::string &root) {
 }
 
 int Change(const Options &options, const std::string &root) {
+    const OutputFormat format = ParseTableFormat(options.format);
     const FileHandle lock = options.isDryRun ? FileHandle() : LockChanges(root);
     const NetworkSettings before = ReadNetworkSettings(root);
     if (!IsConfigurationUsed(root))
@@ -166,15 +172,19 @@ int Change(const Options &options, const std::string &root) {
     const bool isOurs = syslogNg != 0 && root.empty();
     change.step = isOurs ? NeededStep(before, change.after, syslogNg) : Step::kNone;
     if (change.after == before && change.step == Step::kNone) {
-        Print("nothing to change\n");
+        Print(format == OutputFormat::Text
+                  ? "nothing to change\n"
+                  : TableOfListeners(ConfiguredListeners(before)).Write(format, true));
         return kExitNothing;
     }
     RequirePossible(change.after, root, syslogNg);
     RequireAccepted(root, before, change.after);
     if (options.isDryRun) {
-        Print("would write " + ListenPath(root) + " and " + NameOf(change.step) + ":\n" +
-              TableOfListeners(ConfiguredListeners(change.after)).Write(OutputFormat::Text, true) +
-              Describe(change.after));
+        const std::string listeners = TableOfListeners(ConfiguredListeners(change.after)).Write(format, true);
+        Print(format == OutputFormat::Text
+                  ? "would write " + ListenPath(root) + " and " + NameOf(change.step) + ":\n" + listeners +
+                        Describe(change.after)
+                  : listeners);
         return kExitFound;
     }
     ApplySettings(change);
@@ -221,8 +231,9 @@ void AddListen(Program &program) {
     command.AddText("--connections", options->connections, "N",
                     "Accept N connections on each TCP port (256)");
     command.AddFlag("--dry-run", options->isDryRun, "Check, and print what would be done");
-    command.AddText("-o,--output", options->format, "FORMAT",
-                    "text (default), json, jsonl, csv or spreadsheet");
+    OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
+                               "text (default), json, jsonl, csv or spreadsheet"),
+               {"text", "json", "jsonl", "csv", "spreadsheet"});
 }
 
 } // namespace kelo::tool

@@ -8,11 +8,11 @@
 
 #include "base/errors.h"
 #include "base/stop_signals.h"
-#include "base/text_encoding.h"
 #include "cli/confirm.h"
 #include "cli/exit_status.h"
 #include "commands/commands.h"
-#include "print/output.h"
+#include "commands/common_options.h"
+#include "print/action_lines.h"
 #include "read/log_table.h"
 #include "retention/retention_run.h"
 #include "retention/retention_state.h"
@@ -34,15 +34,10 @@ constexpr const char *kFooter =
     "a database, 4 output.";
 
 struct Options {
+    std::string format = "text";
     bool isDryRun = false;
     bool isConfirmed = false;
 };
-
-void Print(const std::string &line) {
-    Output output(false);
-    output.Write(EscapeForTerminal(line) + "\n");
-    output.Finish();
-}
 
 // Calls `follow`, and notes in the state of the retention why it fails. The timer would repeat it every
 // minute, so the system log gets a reason once.
@@ -69,20 +64,21 @@ int NoteProblem(const std::string &root, const std::function<int()> &follow) {
     }
 }
 
-int Follow(const Options &options, const std::string &root) {
+int Follow(const Options &options, const std::string &root, ActionLines &lines) {
+    const auto print = [&lines](const std::string &line) { lines.Add(line); };
     const std::string path = ResolveLogTable({}, root).path;
     const VolumeStatus volume = VolumeOf(root, std::filesystem::path(path).parent_path().string());
     const std::optional<RetentionRule> rule = LoadRetentionRule(root, volume);
     if (!rule || !std::filesystem::exists(path)) {
-        Print(rule ? "no working log " + path : "no rule in " + RetentionFilePath(root) + ": records stay");
+        print(rule ? "no working log " + path : "no rule in " + RetentionFilePath(root) + ": records stay");
         return kExitNothing;
     }
-    RetentionRun run(root, *rule, volume, options.isDryRun, Print);
+    RetentionRun run(root, *rule, volume, options.isDryRun, print);
     if (options.isDryRun || !options.isConfirmed) {
         const std::vector<std::string> plan = run.Plan();
-        Print("rule: " + DescribeRetention(*rule));
+        print("rule: " + DescribeRetention(*rule));
         for (const std::string &line : plan)
-            Print("would " + line);
+            print("would " + line);
         if (plan.empty() || options.isDryRun)
             return plan.empty() ? kExitNothing : kExitFound;
         if (!Confirm("retention", "do so")) {
@@ -95,7 +91,13 @@ int Follow(const Options &options, const std::string &root) {
 
 int Run(const Options &options, const std::string &root) {
     openlog("kelosyslog", LOG_PID, LOG_DAEMON);
-    const auto follow = [&] { return Follow(options, root); };
+    const OutputFormat format = ParseKeyValuesFormat(options.format);
+    const auto follow = [&] {
+        ActionLines lines(format);
+        const int status = Follow(options, root, lines);
+        lines.End();
+        return status;
+    };
     try {
         const StopSignals signals;
         return options.isDryRun ? follow() : NoteProblem(root, follow);
@@ -115,6 +117,7 @@ void AddRetention(Program &program) {
     command.Footer(kFooter);
     command.AddFlag("--dry-run", options->isDryRun, "Only tell what would be done");
     command.AddFlag("-y,--yes", options->isConfirmed, "Do not ask");
+    AddKeyValuesFormat(command, options->format);
 }
 
 } // namespace kelo::tool

@@ -7,6 +7,8 @@
 #include <cstring>
 #include <ctime>
 #include <limits>
+#include <map>
+#include <optional>
 
 #include "base/errors.h"
 #include "cli/completion.h"
@@ -49,6 +51,7 @@ struct Options {
     std::string device;
     std::string format = "text";
     bool perDevice = false;
+    bool hasEmpty = false;
     bool plot = false;
     bool noHeader = false;
     bool inUtc = false;
@@ -102,15 +105,22 @@ Answer Total(const std::string &path, const Options &) {
     return {table, 0};
 }
 
-EpsSeries ReadSeries(const std::string &path, const Options &options) {
-    const int64_t now = std::time(nullptr);
+// The seconds that are asked for.
+struct Period {
+    std::optional<int64_t> since;
+    std::optional<int64_t> until;
+};
+
+Period PeriodOf(const Options &options, int64_t now) {
     const LogFilter &period = options.period;
-    const int64_t until = LastSecond(period, now).value_or(std::numeric_limits<int64_t>::max());
-    int64_t since = 0;
     if (!period.since.empty())
-        since = ParseTimeExpression("--since", period.since, now).seconds;
-    else if (period.until.empty())
-        since = now - kDay;
+        return {ParseTimeExpression("--since", period.since, now).seconds, LastSecond(period, now)};
+    return {period.until.empty() ? std::optional(now - kDay) : std::nullopt, LastSecond(period, now)};
+}
+
+EpsSeries ReadSeries(const std::string &path, const Options &options, const Period &period) {
+    const int64_t since = period.since.value_or(0);
+    const int64_t until = period.until.value_or(std::numeric_limits<int64_t>::max());
     EpsSeries series(ParseEpsInterval(options.interval),
                      options.device.empty() ? std::nullopt : std::optional(options.device));
     ReadEps(path, since, until, [&](const SYSLOG_LOG_EPS &sample) { series.Add(sample); });
@@ -129,31 +139,71 @@ void AddGap(StatisticsTable &table, int64_t from, int64_t to, const EpsSeries &s
             table.Add({time.Plain(start), "0", "0.00", "0"});
 }
 
+// A table for people has the time only as text.
+StatisticsTable TableOfTimes(std::vector<StatisticsColumn> columns, bool isText) {
+    if (!isText)
+        columns.push_back({"utcsec", true});
+    return StatisticsTable(columns);
+}
+
+void AddRow(StatisticsTable &table, int64_t start, bool isText, const TimeFormat &time,
+            std::vector<std::string> cells) {
+    cells.insert(cells.begin(), isText ? time.Plain(start) : time.Iso(start));
+    if (!isText)
+        cells.push_back(std::to_string(start));
+    table.Add(cells);
+}
+
 Answer EpsByDevice(const EpsSeries &series, const Options &options, const TimeFormat &time) {
     const bool isText = options.format == "text";
-    StatisticsTable table({{"time", false}, {"device", false}, {"count", true}, {"eps", true}});
+    StatisticsTable table =
+        TableOfTimes({{"time", false}, {"device", false}, {"count", true}, {"eps", true}}, isText);
     for (const auto &[start, bucket] : series.Buckets()) {
         for (const auto &[device, logs] : bucket.devices)
-            table.Add({isText ? time.Plain(start) : time.Iso(start), device, std::to_string(logs),
-                       Rounded(series.PerSecond(logs))});
+            AddRow(table, start, isText, time,
+                   {device, std::to_string(logs), Rounded(series.PerSecond(logs))});
     }
     return {table, 2};
 }
 
+// The intervals of the period with and without records, up to now. Throws UsageError for too many.
+std::map<int64_t, EpsBucket> WithEmpty(const EpsSeries &series, const Period &period, int64_t now) {
+    constexpr int64_t kMost = 1'000'000;
+    std::map<int64_t, EpsBucket> buckets = series.Buckets();
+    if (!period.since && buckets.empty())
+        return buckets;
+    const int64_t first = period.since ? std::max<int64_t>(*period.since, 0) : buckets.begin()->first;
+    const int64_t last = period.until.value_or(now);
+    if ((last - first) / series.Seconds() > kMost)
+        throw UsageError("--empty: more than " + std::to_string(kMost) +
+                         " intervals; choose a longer one with --by, or a shorter period");
+    // An hour may be longer or shorter where the clocks are set.
+    for (int64_t start = series.StartOf(first); start <= last;
+         start = series.StartOf(start + series.Seconds()))
+        buckets[start];
+    return buckets;
+}
+
 Answer Eps(const std::string &path, const Options &options) {
-    const EpsSeries series = ReadSeries(path, options);
+    const int64_t now = std::time(nullptr);
+    const Period period = PeriodOf(options, now);
+    const EpsSeries series = ReadSeries(path, options, period);
     const TimeFormat time(options.inUtc);
     if (options.perDevice)
         return EpsByDevice(series, options, time);
     const bool isText = options.format == "text";
-    StatisticsTable table({{"time", false}, {"count", true}, {"eps", true}, {"peak", true}});
-    int64_t expected = series.Buckets().empty() ? 0 : series.Buckets().begin()->first;
-    for (const auto &[start, bucket] : series.Buckets()) {
+    const std::map<int64_t, EpsBucket> buckets =
+        options.hasEmpty ? WithEmpty(series, period, now) : series.Buckets();
+    StatisticsTable table =
+        TableOfTimes({{"time", false}, {"count", true}, {"eps", true}, {"peak", true}}, isText);
+    int64_t expected = buckets.empty() ? 0 : buckets.begin()->first;
+    for (const auto &[start, bucket] : buckets) {
         if (options.plot && start > expected)
             AddGap(table, expected, start, series, time);
         expected = start + series.Seconds();
-        table.Add({isText ? time.Plain(start) : time.Iso(start), std::to_string(bucket.logs),
-                   Rounded(series.PerSecond(bucket.logs)), std::to_string(bucket.peak)});
+        AddRow(table, start, isText, time,
+               {std::to_string(bucket.logs), Rounded(series.PerSecond(bucket.logs)),
+                std::to_string(bucket.peak)});
     }
     return {table, 1};
 }
@@ -184,6 +234,9 @@ void RequireSense(const Options &options, OutputFormat format) {
     belongsTo("--until", !options.period.until.empty(), isEps, "eps");
     belongsTo("--device", !options.device.empty(), isEps, "eps");
     belongsTo("--per-device", options.perDevice, isEps, "eps");
+    belongsTo("--empty", options.hasEmpty, isEps, "eps");
+    if (options.hasEmpty && options.perDevice)
+        throw UsageError("--empty: goes not together with --per-device");
     const bool isDevice = options.what == "device";
     const bool isForget = options.what == "forget";
     belongsTo("NAME", !options.forget.names.empty(), isDevice || isForget, "device' and 'stats forget");
@@ -201,8 +254,10 @@ void RequireSense(const Options &options, OutputFormat format) {
 
 int Run(const Options &options, const std::string &root) {
     if (options.what == "forget") {
-        RequireSense(options, OutputFormat::Text);
-        return ForgetDevicesByOptions(AccountingPath(options.db, root), options.forget, root);
+        ForgetOptions forget = options.forget;
+        forget.format = ParseKeyValuesFormat(options.format);
+        RequireSense(options, forget.format);
+        return ForgetDevicesByOptions(AccountingPath(options.db, root), forget, root);
     }
     const Question &question = QuestionOf(options);
     const OutputFormat format = ParseOutputFormat(options.format);
@@ -244,6 +299,7 @@ void AddStats(Program &program) {
         {"second", "minute", "hour"});
     command.AddText("--device", options->device, "NAME", "eps: only of this device");
     command.AddFlag("--per-device", options->perDevice, "eps: a row for each device");
+    command.AddFlag("--empty", options->hasEmpty, "eps: also the intervals of the period without logs");
     command.AddFlag("--plot", options->plot, "Draw the counts as bars");
     OfferWords(command.AddText("-o,--output", options->format, "FORMAT",
                                "text (default), json, jsonl, csv, spreadsheet (csv without formulas)"),

@@ -8,6 +8,7 @@
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "commands/tell_receiver.h"
+#include "print/key_values.h"
 #include "print/output.h"
 #include "read/accounting_samples.h"
 #include "store/forgotten_devices.h"
@@ -40,6 +41,20 @@ std::vector<std::string> Select(const std::string &path, const ForgetOptions &op
     return devices;
 }
 
+void PrintResult(const std::string &path, const ForgetOptions &options, size_t count,
+                 const std::string &what) {
+    Output output(false);
+    if (options.format == OutputFormat::Text) {
+        output.Write((options.isDryRun ? "would forget " : "forgot ") + what + "\n");
+    } else {
+        KeyValues values;
+        values.Add("path", path);
+        values.Add(options.isDryRun ? "matching" : "forgotten", static_cast<int64_t>(count));
+        output.Write(values.Render(options.format));
+    }
+    output.Finish();
+}
+
 } // namespace
 
 int ForgetDevicesByOptions(const std::string &path, const ForgetOptions &options, const std::string &root) {
@@ -53,10 +68,8 @@ int ForgetDevicesByOptions(const std::string &path, const ForgetOptions &options
     }
     const std::string what =
         std::to_string(devices.size()) + (devices.size() == 1 ? " device" : " devices") + " in " + path;
-    Output output(false);
     if (options.isDryRun) {
-        output.Write("would forget " + what + "\n");
-        output.Finish();
+        PrintResult(path, options, devices.size(), what);
         return kExitFound;
     }
     if (!options.isConfirmed && !Confirm("stats forget", "forget the counts of " + what)) {
@@ -65,8 +78,7 @@ int ForgetDevicesByOptions(const std::string &path, const ForgetOptions &options
     }
     ForgetDevices(path, devices);
     TellReceiver(root, "these devices until it is restarted");
-    output.Write("forgot " + what + "\n");
-    output.Finish();
+    PrintResult(path, options, devices.size(), what);
     return kExitFound;
 }
 

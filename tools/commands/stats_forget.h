@@ -3,6 +3,8 @@
 #include <string>
 #include <vector>
 
+#include "print/record_formatter.h"
+
 namespace kelo::tool {
 
 struct ForgetOptions {
@@ -10,6 +12,7 @@ struct ForgetOptions {
     std::string below;              // only devices with fewer records; empty: any number
     bool isDryRun = false;
     bool isConfirmed = false;
+    OutputFormat format = OutputFormat::Text; // or Json
 };
 
 // kelosyslog stats forget: removes devices from the accounting database at `path`, after asking, and makes a

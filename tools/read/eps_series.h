@@ -50,9 +50,10 @@ public:
         return static_cast<double>(logs) / static_cast<double>(Seconds());
     }
 
-private:
+    // The beginning of the interval of a second.
     int64_t StartOf(int64_t stamp) const;
 
+private:
     EpsInterval interval_;
     std::optional<std::string> device_;
     std::map<int64_t, EpsBucket> buckets_;

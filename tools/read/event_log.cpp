@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstdlib>
 #include <filesystem>
 
 #include "base/errors.h"
@@ -89,6 +90,28 @@ std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
     if (events.empty() && MayHaveEvents(path, limit == 0 ? 0 : offset))
         FailEventDatabase(path);
     return events;
+}
+
+std::vector<Event> ReadEventsAfter(const std::string &path, int64_t &lastId) {
+    const std::string sql = "SELECT * FROM log WHERE id > " + std::to_string(lastId) + " ORDER BY id";
+    const auto number = [](const std::string &text) { return std::strtoll(text.c_str(), nullptr, 10); };
+    std::vector<Event> events;
+    for (const ReadOnlyQuery::Row &row :
+         ReadOnlyQuery({path, "log"}).Rows(sql, {"id", "level", "time", "user", "event"})) {
+        lastId = number(row[0]);
+        Event event;
+        event.id = static_cast<decltype(event.id)>(lastId);
+        event.level = static_cast<decltype(event.level)>(number(row[1]));
+        event.time = number(row[2]);
+        event.user = row[3];
+        event.event = row[4];
+        events.push_back(event);
+    }
+    return events;
+}
+
+int64_t NewestEventId(const std::string &path) {
+    return ReadOnlyQuery({path, "log"}).Number("SELECT max(id) AS value FROM log");
 }
 
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add) {

@@ -21,6 +21,12 @@ std::string EventDatabasePath(const std::string &db, const std::string &root);
 // of 0. Throws DatabaseError when it cannot be read; a missing one is not created.
 std::list<Event> ReadEvents(const std::string &path, int offset = 0, int limit = 0);
 
+// The events with an id above `lastId`, which becomes the largest of theirs, in the order in which they were
+// added. Throws DatabaseError.
+std::vector<Event> ReadEventsAfter(const std::string &path, int64_t &lastId);
+// The largest id; 0 without events. Throws DatabaseError.
+int64_t NewestEventId(const std::string &path);
+
 // Adds an event to the server's own event database below `root` with the library operation that `add` calls.
 // Returns "", or the reason of the failure.
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add);
