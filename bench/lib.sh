@@ -34,3 +34,36 @@ END
     fi
     define "$root/$kind/kelosyslog.conf" kelo_store "$kind"
 }
+
+# rsyslog, out of its packages. Fails where they cannot be had.
+rsyslog_unpack() {
+    mkdir "$root/packages"
+    (
+        cd "$root/packages"
+        apt-get download -o APT::Sandbox::User=root rsyslog libestr0 libfastjson4 liblognorm5 >/dev/null 2>&1 &&
+            for package in *.deb; do dpkg-deb -x "$package" unpacked || exit 1; done
+    )
+}
+
+# rsyslog_start FOLDER: it writes the columns to FOLDER/logs.txt; is ended by syslog_ng_stop.
+rsyslog_start() {
+    local libraries
+    libraries=$(dirname "$root"/packages/unpacked/usr/lib/*/rsyslog)
+    rm -rf "$1"
+    mkdir "$1"
+    syslogPort=$(free_port)
+    cat >"$1/rsyslog.conf" <<END
+module(load="imtcp")
+input(type="imtcp" address="127.0.0.1" port="$syslogPort")
+template(name="columns" type="string" string="%HOSTNAME% %fromhost-ip% %syslogfacility-text% %syslogseverity-text% \
+%syslogseverity-text% %pri% %timegenerated:::date-unixtimestamp% %timegenerated:::date-tzoffshour% \
+%timegenerated:::date-year%/%timegenerated:::date-month%/%timegenerated:::date-day% \
+%timegenerated:::date-hour%:%timegenerated:::date-minute%:%timegenerated:::date-second% %programname%%msg%\n")
+action(type="omfile" file="$1/logs.txt" template="columns" ioBufferSize="64k")
+END
+    LD_LIBRARY_PATH=$libraries "$root/packages/unpacked/usr/sbin/rsyslogd" -n -f "$1/rsyslog.conf" -i NONE \
+        -M "$libraries/rsyslog" </dev/null >"$1/rsyslog.err" 2>&1 &
+    echo $! >"$1/pid"
+    disown
+    wait_until 20 port_in_use "$syslogPort" || { cat "$1/rsyslog.err" >&2; return 1; }
+}

@@ -177,7 +177,8 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     EXPECT_EQ(Events(), kMessages / 1000);
 }
 
-// A turn and an orderly end: SIGTERM waits for the receiver from its start.
+// A turn and an orderly end: SIGTERM waits for the receiver from its start. What one that was killed has left
+// is for the next one. With KELO_EVERY_CALL in the environment it takes minutes.
 TEST_F(SpoolProgram, DoublesAndLosesNothingAtAnyCall) {
     const std::string command =
         InFolder(root_.Path(), kProgram + kReceive + " 2>>" + root_.File("err") + " </dev/null");
@@ -201,14 +202,17 @@ TEST_F(SpoolProgram, DoublesAndLosesNothingAtAnyCall) {
     };
     runAll(); // creates the databases
     int sent = 0;
-    for (int number = 1;; number += 13) {
+    const bool isEveryCall = std::getenv("KELO_EVERY_CALL") != nullptr;
+    for (int number = 1;; number += isEveryCall ? 1 : 13) {
         Append("20200102-10111",
                Messages(sent, 50) + Message(sent + 50, "an error " + std::to_string(number), "err"));
         sent += 51;
-        const bool wasKilled = KillAtCall(number, Victim::kProcess, run, runAll).has_value();
-        if (!wasKilled)
-            runAll();
-        ASSERT_TRUE(Has(sent)) << "killed at call " << number << ": " << Rows() << ", " << Counted() << "\n"
+        const bool wasKilled = KillAtCall(number, Victim::kProcess, run, [] { return 0; }).has_value();
+        if (wasKilled && number % 10 != 0)
+            continue;
+        runAll();
+        ASSERT_TRUE(Has(sent)) << "killed at call " << number << " or before: " << Rows() << ", " << Counted()
+                               << "\n"
                                << ReadFile(root_.File("err"));
         const ptrdiff_t errors = std::stol(Query(logs_, "SELECT count(*) FROM logs WHERE prio = 'err'"));
         ASSERT_EQ(Notifications(), errors) << "killed at call " << number;

@@ -157,9 +157,10 @@ void SpoolReceiver::Save(SqliteConnection &database) {
     SaveRuleMemory(database, rules_.Memory());
 }
 
-// Without rows: what was set aside, had come before, or was sent. Not while a batch waits.
+// Without rows: what was set aside, had come before, or was sent. Not while a batch waits, and not before the
+// files are known: their places would be gone.
 bool SpoolReceiver::SavePlaces() {
-    isSaveDue_ = !writer_.WriteAlongside();
+    isSaveDue_ = !isScanned_ || !writer_.WriteAlongside();
     if (!isSaveDue_)
         MarkSaved(SpoolReader::kRows);
     return !isSaveDue_;
@@ -185,7 +186,7 @@ void SpoolReceiver::Work() {
 // Whether the last batch is in the database.
 bool SpoolReceiver::StoreWaiting() {
     const bool isStored = writer_.Waiting() == 0 || writer_.Advance(now_, true);
-    if (isStored)
+    if (isStored && isScanned_)
         rules_.Deliver(now_ / kSecondMs, [this] { return SavePlaces(); });
     if (writer_.Reason() != state_.waiting)
         TickState();
@@ -199,6 +200,7 @@ void SpoolReceiver::Turn() {
     else
         folder_.Refresh();
     haveNamesChanged_ = false;
+    isScanned_ = true;
     hasNews_ = Fill();
     nextTurn_ = hasNews_ ? now_ : now_ + kTurnMs;
     if (again_.Size() > 0) {

@@ -103,6 +103,7 @@ private:
     int64_t stateTime_ = 0;
     int64_t lastUtc_ = 0; // of the record that was read last
     bool isLoaded_ = false;
+    bool isScanned_ = false;
     bool hasNews_ = true;
     bool haveNamesChanged_ = true;
     bool isSaveDue_ = false;
