@@ -110,6 +110,19 @@ TEST_F(Listen, KeepsWhatItWrote) {
     EXPECT_THAT(Run("listen").err, HasSubstr("listen.conf: kelo_port is \"70000\""));
 }
 
+TEST_F(Listen, FindsTheSourceOfSyslogNgsMessages) {
+    const std::pair<const char *, const char *> configurations[] = {
+        {"source s_src {\n  system();\n  internal();\n};", "s_src"},
+        {"source a { system(); }; source my-own { internal ( ); };", "my-own"},
+        {"# source s_src { internal(); };\nsource a { system(); # internal();\n };", ""},
+        {"", ""},
+    };
+    for (const auto &[text, source] : configurations) {
+        WriteFile(root_.File("etc/syslog-ng/syslog-ng.conf"), text);
+        EXPECT_EQ(FindInternalSource(root_.Path()), source) << text;
+    }
+}
+
 TEST_F(Listen, FindsTheSocketsOfAProcess) {
     const BoundSocket lines(AF_INET, SOCK_STREAM);
     const BoundSocket other(AF_INET6, SOCK_DGRAM);

@@ -166,6 +166,7 @@ int Change(const Options &options, const std::string &root) {
     change.root = root;
     change.before = before;
     change.after = Changed(before, options);
+    change.after.internalSource = change.after.isTls ? FindInternalSource(root) : "";
     change.findSyslogNg = [&root] { return FindSyslogNg(root).pid; };
     const pid_t syslogNg = change.findSyslogNg();
     // The syslog-ng of another root is not a service of this machine.

@@ -7,6 +7,7 @@
 #include <cstring>
 #include <map>
 #include <optional>
+#include <regex>
 #include <sstream>
 
 #include "base/files.h"
@@ -87,6 +88,9 @@ const char *OnOff(bool isOn) {
 
 } // namespace
 
+std::string MainConfigurationPath(const std::string &root) {
+    return root + "/etc/syslog-ng/syslog-ng.conf";
+}
 std::string ConfigurationPath(const std::string &root) {
     return root + kFolder + "kelosyslog.conf";
 }
@@ -142,11 +146,21 @@ NetworkSettings ReadNetworkSettings(const std::string &root) {
     values.ReadNumber("kelo_frame_port", settings.framePort);
     values.Read("kelo_tls", settings.isTls);
     values.ReadNumber("kelo_tls_port", settings.tlsPort);
+    values.Read("kelo_internal", settings.internalSource);
     values.Read("kelo_rate_limit", settings.isRateLimited);
     values.ReadNumber("kelo_rate", settings.rate);
     values.ReadNumber("kelo_connections", settings.connections);
     values.Read("kelo_tls_dir", settings.tlsFolder);
     return settings;
+}
+
+std::string FindInternalSource(const std::string &root) {
+    static const std::regex comment("#[^\n]*");
+    static const std::regex source(R"(\bsource\s+([\w.-]+)\s*\{[^{}]*\binternal\s*\()");
+    const std::string text =
+        std::regex_replace(ReadWhole(MainConfigurationPath(root)).value_or(""), comment, "");
+    std::smatch found;
+    return std::regex_search(text, found, source) ? found.str(1) : "";
 }
 
 std::string WriteNetworkSettings(const NetworkSettings &settings) {
@@ -162,6 +176,8 @@ std::string WriteNetworkSettings(const NetworkSettings &settings) {
     define("kelo_frame_port", settings.framePort);
     define("kelo_tls", OnOff(settings.isTls));
     define("kelo_tls_port", settings.tlsPort);
+    define("kelo_count_refused", OnOff(!settings.internalSource.empty()));
+    define("kelo_internal", settings.internalSource);
     define("kelo_rate_limit", OnOff(settings.isRateLimited));
     define("kelo_rate", settings.rate);
     define("kelo_connections", settings.connections);

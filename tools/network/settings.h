@@ -19,6 +19,7 @@ struct NetworkSettings {
     uint16_t framePort = 601;          // TCP, messages with their lengths
     bool isTls = false;
     uint16_t tlsPort = 6514;
+    std::string internalSource; // counts who is refused over TLS; "": nothing does
     bool isRateLimited = false;
     uint64_t rate = 1000;       // messages a second of one address
     uint64_t connections = 256; // most of each TCP port
@@ -27,7 +28,9 @@ struct NetworkSettings {
     bool operator==(const NetworkSettings &) const = default;
 };
 
-// The files below a root. syslog-ng reads the first through the link, and the first includes the second.
+// The files below a root. syslog-ng begins with the first, reads the second through the link, and the second
+// includes the last.
+std::string MainConfigurationPath(const std::string &root);
 std::string ConfigurationPath(const std::string &root);
 std::string ConfigurationLink(const std::string &root);
 std::string ListenPath(const std::string &root);
@@ -35,14 +38,17 @@ std::string ListenPath(const std::string &root);
 // Whether syslog-ng reads the configuration: whether the link is there.
 bool IsConfigurationUsed(const std::string &root);
 
-// Throws SettingsError if the first does not include the second, as in earlier versions.
+// Throws SettingsError if ours does not include the last, as in earlier versions.
 void RequireInclude(const std::string &root);
 
 // The settings of both files; what neither sets has its default. Throws SettingsError for a configuration
 // that is missing and for a value that makes no sense.
 NetworkSettings ReadNetworkSettings(const std::string &root);
 
-// The content of the second file.
+// The source of syslog-ng.conf with internal(); "" when that file has none.
+std::string FindInternalSource(const std::string &root);
+
+// The content of the last file.
 std::string WriteNetworkSettings(const NetworkSettings &settings);
 
 // Whether the address is one of IPv6.

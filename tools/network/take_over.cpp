@@ -95,20 +95,17 @@ std::string WithInclude(const std::string &configuration, const std::string &fil
     return text;
 }
 
-std::string MainConfiguration(const std::string &root) {
-    return root + "/etc/syslog-ng/syslog-ng.conf";
-}
-
 // Why syslog-ng refuses our configuration alone with these settings; "" when it accepts it.
 std::string Trial(const std::string &root, const NetworkSettings &settings) {
     const TrialFolder folder;
-    std::string listen = WriteNetworkSettings(settings);
+    std::string listen = WriteNetworkSettings(settings) + "@define kelo_count_refused \"off\"\n";
     if (settings.isTls)
         listen += "@define kelo_tls_dir \"" + folder.CopyTlsFiles(root + settings.tlsFolder) + "\"\n";
     const std::string file = folder.Write("listen.conf", listen);
     const std::string configuration = ReadWhole(ConfigurationPath(root)).value_or("");
-    return Refusal(folder.Write("syslog-ng.conf", VersionOf(ReadWhole(MainConfiguration(root)).value_or("")) +
-                                                      WithInclude(configuration, file)));
+    return Refusal(
+        folder.Write("syslog-ng.conf", VersionOf(ReadWhole(MainConfigurationPath(root)).value_or("")) +
+                                           WithInclude(configuration, file)));
 }
 
 bool IsSystemd() {
@@ -140,7 +137,7 @@ std::string MissingListener(const NetworkSettings &settings, pid_t syslogNg) {
     return "";
 }
 
-// "" when none is open that only the earlier settings ask for. A reload closes them a while after it began.
+// "" when none is open that only the earlier settings ask for.
 std::string LeftListener(const TakeOver &change, pid_t syslogNg) {
     const std::vector<Listener> earlier = ConfiguredListeners(change.before);
     for (const Listener &listener : FindListeners(change.after, syslogNg)) {
@@ -199,7 +196,7 @@ void RequireAccepted(const std::string &root, const NetworkSettings &before, con
     if (const std::string reason = Trial(root, after); !reason.empty())
         throw UsageError("syslog-ng would refuse its configuration: " + reason);
     // What the earlier settings break, the new ones may mend.
-    const std::string reason = Refusal(MainConfiguration(root));
+    const std::string reason = Refusal(MainConfigurationPath(root));
     if (!reason.empty() && Trial(root, before).empty())
         throw UsageError("syslog-ng refuses its configuration as it is (syslog-ng --syntax-only): " + reason);
 }
