@@ -4,6 +4,8 @@
 //
 // They are an addition of this platform, like root.h. An appliance's own platform may lack them, so
 // libkelosyslog does not call them.
+//
+// Threads: the functions may be called from any thread.
 
 #include <string>
 
@@ -15,7 +17,7 @@
 //   KELOKeywordError("/fail(ed/")   Broken regular expression [fail(ed] in a search keyword matches nothing:
 //                                   missing ): fail(ed
 //
-// One line without control characters. Nothing is logged. Thread-safe. Throws nothing but std::bad_alloc and
+// One line without control characters. Nothing is logged. Throws nothing but std::bad_alloc and
 // std::length_error.
 KELOPLATFORM_API std::string KELOKeywordError(const std::string &pattern);
 

@@ -5,6 +5,8 @@
 //
 //     if (KELODBExecute(connection, sql, nullptr) < 0 && KELOFailureGet()->kind == KELO_FAILURE_BUSY)
 //         TryLater();
+//
+// Threads: each one has a record of its own, so the functions may be called from any.
 
 #include <cstdint>
 

@@ -3,6 +3,8 @@
 // The kind of an error of SQLite or of the system, and how a record of a failure is filled. All of it is in
 // this header, so that programs and platforms of one's own can report their own failures in the same way. It
 // needs the header of SQLite.
+//
+// Threads: nothing here keeps state; a record belongs to one thread.
 
 #include <sqlite3.h>
 

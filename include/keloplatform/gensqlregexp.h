@@ -31,6 +31,8 @@
 //
 // Every text is a valid keyword. An unclosed phrase ends with the keyword. A NUL byte counts as a blank.
 // Bytes that are not UTF-8 are read as Latin-1.
+//
+// Threads: the function may be called from any thread.
 
 #include <string>
 
@@ -63,5 +65,5 @@
 // Rows: a text ends at its first NUL byte. Bytes of a row that are not UTF-8 are Latin-1 to a regex;
 // elsewhere only * and ? match them.
 //
-// Thread-safe. Throws nothing but std::bad_alloc and std::length_error.
+// Throws nothing but std::bad_alloc and std::length_error.
 KELOPLATFORM_API std::string GenSQLRegexp(std::string pattern, std::string column);

@@ -2,8 +2,8 @@
 
 // The appliance's database layer: connections and statements over SQLite.
 //
-// A connection and its results are used by one thread at a time. Nothing here throws: a failure is a null or
-// negative result, and the connection has the cause (KELODBErrorGet, sqlite3_errcode() on
+// Threads: a connection and its results are used by one thread at a time. Nothing here throws: a failure is a
+// null or negative result, and the connection has the cause (KELODBErrorGet, sqlite3_errcode() on
 // KELODBInternalDBHdlGet, and failure.h). Nothing writes to the system log but a search that removes a
 // damaged skip index (skip_index.h).
 

@@ -1,9 +1,9 @@
 #pragma once
 
-// The appliance's notification service, and its mail and SMS settings. All of it may be called from any
-// thread.
+// The appliance's notification service, and its mail and SMS settings.
 //
-// The settings are in the key/value file /etc/keloinfo.conf (keloinfo.conf(5)) under the platform's root.
+// Threads: the functions may be called from any thread. The settings are in the key/value file
+// /etc/keloinfo.conf (keloinfo.conf(5)) under the platform's root.
 
 #include "keloplatform/export.h"
 

@@ -1,6 +1,8 @@
 #pragma once
 
-// File system and service manager of the appliance. All of it may be called from any thread.
+// File system and service manager of the appliance.
+//
+// Threads: the functions may be called from any thread.
 
 #include <string>
 

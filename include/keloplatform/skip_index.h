@@ -4,6 +4,8 @@
 // rows that a keyword can match without reading the others. docs/skip-index.md describes it. Like root.h an
 // addition of this platform.
 //
+// Threads: the functions may be called from any thread, but with a connection by one at a time.
+//
 // Statements have the same results with and without it. They use it where it is there and helps; only the
 // functions here build it.
 

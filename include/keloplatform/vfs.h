@@ -1,6 +1,8 @@
 #pragma once
 
 // How to open a database that somebody else may have prepared. Like root.h an addition of this platform.
+//
+// Threads: the function may be called from any thread.
 
 #include "keloplatform/export.h"
 
@@ -13,7 +15,7 @@ extern "C" {
 // transactions over several attached databases, which log databases never have. A journal that names one is
 // rolled back all the same; the statement that meets it fails with SQLITE_CANTOPEN, and the next one works.
 //
-// Never null. Thread-safe. When out of memory the name is unknown to SQLite, and opening fails.
+// Never null. When out of memory the name is unknown to SQLite, and opening fails.
 KELOPLATFORM_API const char *KELODBVfs();
 
 } // extern "C"

@@ -10,7 +10,9 @@
 //
 // At the first record of a new second the manager closes a sample: records per device since the sample
 // before. A sample that reaches the threshold of a rule causes a notification and an event. Samples are kept
-// until a flush has written them. One object per accounting database, used by one thread.
+// until a flush has written them.
+//
+// Threads: one object for each accounting database, used by one thread at a time.
 //
 // Only closed samples are flushed, and the histogram only together with one: what was counted after that is
 // lost with the object. To end without loss, repeat these two lines until CurrentEpsGet() is 0 and the flush

@@ -1,7 +1,8 @@
 #pragma once
 
-// Commands written as JSON objects, one after the other. A parser holds no state and may be used from any
-// thread.
+// Commands written as JSON objects, one after the other.
+//
+// Threads: a parser holds no state and may be used from any thread, by several at a time.
 
 #include <json/value.h>
 

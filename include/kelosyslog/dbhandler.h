@@ -10,10 +10,12 @@
 //         db.DBTranEnd();
 //     }
 //
-// Operations return 0 or -1 unless stated otherwise and never throw on a database error. A handler is used by
-// one thread at a time; several handlers, also in different threads and processes, may work on one file.
-// Creating, quarantining and removing a database exclude each other by a lock on the file PATH.lock, which is
-// there only meanwhile.
+// Operations return 0 or -1 unless stated otherwise and never throw on a database error. Reasons of failures
+// are in failure.h.
+//
+// Threads: a handler is used by one thread at a time; several handlers, also in different threads and
+// processes, may work on one file. The free functions may be called from any thread. Creating, quarantining
+// and removing a database exclude each other by a lock on the file PATH.lock, which is there only meanwhile.
 
 #include <cstdint>
 #include <string>

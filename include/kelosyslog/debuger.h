@@ -1,6 +1,8 @@
 #pragma once
 
-// The debug channel that the library reports through. May be used from any thread.
+// The debug channel that the library reports through.
+//
+// Threads: all of it may be used from any thread, by several at a time.
 
 #include <cstdint>
 #include <string>
@@ -16,7 +18,7 @@ public:
     static void MSG(int32_t level, std::string text);
 
     // Sets the highest level that is written, 0 at the start, for the whole process. Levels of 0 and below
-    // are written whatever the threshold. May be called from any thread.
+    // are written whatever the threshold.
     static void ThresholdSet(int32_t level);
 
     // The current threshold. A text of a higher level need not be composed.

@@ -18,7 +18,7 @@
 //   stored its event.
 // - std::bad_alloc is its own reason and sets nothing.
 //
-// Each thread has a record of its own.
+// Threads: each one has a record of its own, so the functions may be called from any.
 
 #include "keloplatform/failure.h"
 #include "kelosyslog/export.h"

@@ -17,8 +17,8 @@
 //         if (parser.isValidLog(log))
 //             Store(log);
 //
-// A parser is used by one thread at a time. Out of memory is reported as std::bad_alloc; what was parsed
-// before stays.
+// Threads: a parser, with the stream that feeds it, is used by one thread at a time. Out of memory is
+// reported as std::bad_alloc; what was parsed before stays.
 
 #include <cstddef>
 #include <cstdint>

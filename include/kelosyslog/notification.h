@@ -12,6 +12,8 @@
 // to the administrator. An `int` result is 0 for success and -1 for failure; failures are written to the
 // system log unless stated otherwise. Fixed paths are under the root of kelosyslog/root.h. When memory runs
 // out, operations throw std::bad_alloc unless they state another result.
+//
+// Threads: a NotificationManager is used by one thread at a time; the free functions may be called from any.
 
 #include <cstdint>
 #include <list>
@@ -32,8 +34,7 @@ struct _SYSLOG_NOTIFY_RULES_tag {
     bool enable = false;
 };
 
-// The rules of the rule file at the time when the object was created. Used by one thread at a time; the free
-// functions below may be called from any.
+// The rules of the rule file at the time when the object was created.
 class KELOSYSLOG_API NotificationManager {
 public:
     // Loads the rules of /etc/kelosyslog/notify.conf. If that fails, the manager can be used with the rules

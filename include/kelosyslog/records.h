@@ -6,7 +6,7 @@
 //     if (DBRecToLogInfo("logs", result, row, &log, false) == 0)
 //         printf("%s %s\n", g_MappingSyslogPrior[log.prio], log.msg.c_str());
 //
-// Everything here is stateless and may be used from any thread.
+// Threads: everything here is stateless and may be used from any thread, but a result by one at a time.
 
 #include <cstdint>
 #include <string>

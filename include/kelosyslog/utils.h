@@ -1,6 +1,8 @@
 #pragma once
 
-// Small text and file utilities. They keep no state and may be called from any thread.
+// Small text and file utilities.
+//
+// Threads: they keep no state and may be called from any thread; a stream is read by one at a time.
 
 #include <cstdint>
 #include <cstdio>

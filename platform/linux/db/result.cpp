@@ -27,18 +27,20 @@ void DBResult_tag::AddRow() {
     rows.Add(cells);
 }
 
+// One call into the statement for each cell: the functions that take a column check the connection's state each
+// time. One thread uses the connection, so the values need no protection.
 void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
     for (size_t i = 0; i < cells.size(); ++i) {
-        const int column = static_cast<int>(i);
-        const int type = sqlite3_column_type(statement, column);
+        sqlite3_value *value = sqlite3_column_value(statement, static_cast<int>(i));
+        const int type = sqlite3_value_type(value);
         if (type == SQLITE_INTEGER) {
-            cells[i] = TextOf(sqlite3_column_int64(statement, column), digits[i]);
+            cells[i] = TextOf(sqlite3_value_int64(value), digits[i]);
             continue;
         }
-        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
+        const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
         if (text == nullptr && type != SQLITE_NULL)
             throw std::bad_alloc();
-        cells[i] = {text, static_cast<size_t>(sqlite3_column_bytes(statement, column))};
+        cells[i] = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
     }
     AddRow();
 }
