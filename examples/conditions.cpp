@@ -1,10 +1,11 @@
 // Conditions made by hand: comparisons, wildcards, alternatives, and an SQL expression.
 
-#include <kelosyslog/dbhandler.h>
 #include <kelosyslog/dbutil.h>
 #include <syslog.h>
 
 #include <iostream>
+
+#include "modern.h"
 
 using Condition = _SYSLOG_SQL_COND_tag;
 
@@ -24,12 +25,9 @@ int main(int argc, char **argv) {
         return 2;
     openlog("example", LOG_PERROR, LOG_USER);
     const std::string root = argv[1], path = root + "/logs.db";
-    DBHandler db(path, root + "/usr/kelo/syslog/schema/logs.sql");
-    if (db.DBCon() != 0)
-        return 1;
-    db.DBExecute("INSERT INTO logs (host, utcsec, msg) VALUES"
-                 " ('nas', 10, '100% full'), ('nas', 20, '1000 files'), ('web1', 30, 'it''s up')");
-    db.DBDiscon();
+    Database(path, root + "/usr/kelo/syslog/schema/logs.sql") // connected for this statement
+        ->DBExecute("INSERT INTO logs (host, utcsec, msg) VALUES"
+                    " ('nas', 10, '100% full'), ('nas', 20, '1000 files'), ('web1', 30, 'it''s up')");
 
     Show(path, "since 20", {{SYSLOG_ATTRI_UTCSEC, SYSLOG_OP_GE, "20", {}}});
     // '*' and '?' are the wildcards; '%', '_' and quotes in a value are literal.

@@ -1,11 +1,12 @@
 // The record, the words for its parts, and a row of a database converted to a record.
 
 #include <keloplatform/kelodb.h>
-#include <kelosyslog/dbhandler.h>
 #include <kelosyslog/records.h>
 #include <syslog.h>
 
 #include <iostream>
+
+#include "modern.h"
 
 int PrintLogs(DBResult_tag *result, void *) {
     _SYSLOG_LOG_DATA_tag log; // one for all rows: a conversion sets what its table has
@@ -31,11 +32,8 @@ int main(int argc, char **argv) {
     std::cout << "SMB transfers: " << XferlogDBPathGet("smbxfer") << "\n";
 
     const std::string root = argv[1];
-    DBHandler db(root + "/logs.db", root + "/usr/kelo/syslog/schema/logs.sql");
-    if (db.DBCon() != 0)
-        return 1;
-    db.DBExecute("INSERT INTO logs (host, prio, msg) VALUES ('nas', 'notice', 'alice: logged in')");
-    db.DBExecute("INSERT INTO logs (host, msg) VALUES (NULL, 'no host and no severity')");
-    db.DBExecute("SELECT * FROM logs", PrintLogs, nullptr);
-    db.DBDiscon();
+    Database db(root + "/logs.db", root + "/usr/kelo/syslog/schema/logs.sql");
+    db->DBExecute("INSERT INTO logs (host, prio, msg) VALUES ('nas', 'notice', 'alice: logged in')");
+    db->DBExecute("INSERT INTO logs (host, msg) VALUES (NULL, 'no host and no severity')");
+    db->DBExecute("SELECT * FROM logs", PrintLogs, nullptr);
 }

@@ -1,10 +1,11 @@
 // Reads the counts of the accounting, and the distinct values of a column.
 
-#include <kelosyslog/dbhandler.h>
 #include <kelosyslog/dbutil.h>
 #include <syslog.h>
 
 #include <iostream>
+
+#include "modern.h"
 
 int main(int argc, char **argv) {
     if (argc != 2)
@@ -13,13 +14,10 @@ int main(int argc, char **argv) {
     const std::string root = argv[1], schemas = root + "/usr/kelo/syslog/schema/";
 
     const std::string accounting = root + "/accounting.db";
-    DBHandler samples(accounting, schemas + "accinfo.sql");
-    if (samples.DBCon() != 0)
-        return 1;
-    samples.DBExecute("INSERT INTO histogram (device, count) VALUES ('nas', 700), ('web1', 40), ('tv', 2)");
-    samples.DBExecute("INSERT INTO eps (stamp, device, eps) VALUES"
-                      " (1577931072, 'nas', 30), (1577931072, 'web1', 4), (1577931073, 'nas', 2)");
-    samples.DBDiscon();
+    Database samples(accounting, schemas + "accinfo.sql");
+    samples->DBExecute("INSERT INTO histogram (device, count) VALUES ('nas', 700), ('web1', 40), ('tv', 2)");
+    samples->DBExecute("INSERT INTO eps (stamp, device, eps) VALUES"
+                       " (1577931072, 'nas', 30), (1577931072, 'web1', 4), (1577931073, 'nas', 2)");
 
     std::cout << "all devices: " << SyslogDBHistTotalGet(accounting)
               << ", web1: " << SyslogDBHistGetSingle(accounting, "web1") << "\n";
@@ -33,11 +31,8 @@ int main(int argc, char **argv) {
     }
 
     const std::string logs = root + "/logs.db";
-    DBHandler db(logs, schemas + "logs.sql");
-    if (db.DBCon() != 0)
-        return 1;
-    db.DBExecute("INSERT INTO logs (host, prog) VALUES ('web1', 'sshd'), ('nas', 'cron'), ('nas', 'sshd')");
-    db.DBDiscon();
+    Database db(logs, schemas + "logs.sql");
+    db->DBExecute("INSERT INTO logs (host, prog) VALUES ('web1', 'sshd'), ('nas', 'cron'), ('nas', 'sshd')");
     std::list<std::string> hosts;
     SyslogDBAttriValueGet(logs, "host", nullptr, hosts);
     for (const std::string &host : hosts)

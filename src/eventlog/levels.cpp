@@ -1,6 +1,7 @@
 #include <array>
 #include <cstdio>
 
+#include "common/failure.h"
 #include "kelosyslog/logger.h"
 
 namespace {
@@ -21,7 +22,7 @@ std::string strLevelGet(int level) {
 
 int szLevelGet(int level, char *buffer, int size) {
     if (buffer == nullptr)
-        return -1;
+        return kelo::Fail(KELO_FAILURE_ARGUMENT, "", "szLevelGet", "a null pointer");
     if (size > 0)
         std::snprintf(buffer, static_cast<size_t>(size), "%s", LevelName(level));
     return 0;

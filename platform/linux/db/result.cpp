@@ -7,7 +7,8 @@
 #include "common/failure.h"
 
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
-    : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()) {
+    : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()),
+      numbers(cells.size()) {
     for (int column = 0; column < sqlite3_column_count(statement); ++column) {
         const char *name = sqlite3_column_name(statement, column);
         if (name == nullptr)
@@ -27,14 +28,19 @@ void DBResult_tag::AddRow() {
     rows.Add(cells);
 }
 
-// One call into the statement for each cell: the functions that take a column check the connection's state each
-// time. One thread uses the connection, so the values need no protection.
+// One call into the statement for each cell: the functions that take a column check the connection's state
+// each time. One thread uses the connection, so the values need no protection.
 void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
     for (size_t i = 0; i < cells.size(); ++i) {
         sqlite3_value *value = sqlite3_column_value(statement, static_cast<int>(i));
         const int type = sqlite3_value_type(value);
         if (type == SQLITE_INTEGER) {
-            cells[i] = TextOf(sqlite3_value_int64(value), digits[i]);
+            const int64_t number = sqlite3_value_int64(value);
+            // Row after row has the same second, and of a page by row id the same total.
+            if (number != numbers[i] || cells[i].text != digits[i].data()) {
+                cells[i] = TextOf(number, digits[i]);
+                numbers[i] = number;
+            }
             continue;
         }
         const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));

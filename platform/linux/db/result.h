@@ -33,5 +33,6 @@ struct DBResult_tag {
     kelo::platform::RowBlock rows;
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
     std::vector<Digits> digits;              // of the integers in `cells`
+    std::vector<int64_t> numbers;            // of which they are the texts
     uint32_t nextRow = 0;
 };
