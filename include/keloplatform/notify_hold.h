@@ -10,6 +10,8 @@
 //     KELONotifyRelease(id);    // again after a kill: without effect if it was released before
 //
 // They are an addition of this platform, like root.h.
+//
+// Threads: the functions may be called from any thread; each holds its own notifications.
 
 #include "keloplatform/export.h"
 
