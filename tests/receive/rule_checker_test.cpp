@@ -2,6 +2,7 @@
 
 #include "notify/notify_fixture.h"
 #include "receive/rate_limiter.h"
+#include "receive/rule_memory.h"
 
 namespace kelo::test {
 namespace {
@@ -40,6 +41,35 @@ TEST_F(RuleChecks, LimitTheNotificationsOfARateThatStays) {
     EXPECT_EQ(
         RunSql(root_.File("usr/kelo/etc/kelosyslog.db"), "SELECT count(*) FROM log WHERE event GLOB '*EPS*'"),
         "5");
+}
+
+// What a killed receiver has counted and held back goes on in the next one.
+TEST_F(RuleChecks, GoOnWhereTheyWere) {
+    CreateLogDatabase(root_.File("usr/kelo/etc/kelosyslog.db"), "kelosyslog.sql");
+    WriteRules(RuleText("busy", 1, "0", "500", "") + RuleText("worst", 0, "2", "0", ""));
+    tool::SqliteConnection database(root_.File("rules.db"), {.mode = tool::SqliteMode::kCreate});
+    _SYSLOG_LOG_DATA_tag fire;
+    fire.prio = SYSLOG_PRIO_EMERG;
+    fire.msg = "fire";
+    for (const int64_t now : {10, 11, 12}) { // a receiver each
+        tool::RuleChecker checker(1);
+        checker.Hold(root_.File("usr/kelo/etc/kelosyslog.db"));
+        checker.MemorySet(tool::LoadRuleMemory(database, now), now);
+        for (int i = 0; i < 200; ++i)
+            checker.CountForEps(1000, now);
+        checker.Check(fire, now);
+        if (now == 12) {
+            checker.EpsTick(1001, now);
+            checker.Tick(70);
+            checker.Deliver(70, [] { return true; });
+        }
+        tool::SaveRuleMemory(database, checker.Memory());
+    }
+    std::string sent;
+    for (const SentNotification &one : PlatformCalls::Sent())
+        sent += one.values.contains("%EPS%") ? one.values.at("%EPS%") + " "
+                                             : one.values.at("%SYSLOG_CONTENT%") + " ";
+    EXPECT_EQ(sent, "fire 600 2 more within a minute, without a notification of their own ");
 }
 
 TEST(RateLimiter, BoundsEveryMinuteAndTellsTheRestOfEachRule) {
