@@ -52,7 +52,7 @@ export const brokenTests = world => ({
             await until("a follower", follows);
             await page.close();
             await until("the follower has ended", () => !follows());
-        });
+        }, { isAlone: true });
         await visit(world, async ({ page, frame, server }) => {
             await loaded(frame);
             await frame.locator("#live").click();
@@ -60,6 +60,6 @@ export const brokenTests = world => ({
             server.end();
             await page.getByRole("button", { name: "Reconnect" }).waitFor();
             await until("the follower has ended", () => !follows());
-        });
+        }, { isAlone: true });
     },
 });

@@ -64,9 +64,9 @@ export const hostileTests = world => ({
             await loaded(frame);
         }
         const started = await f.evaluate(() => window.started);
-        expect("only reading", started.filter(args => args[0] !== "kelosyslog" || !["search", "count", "status", "stats", "values"].includes(args[1])), []);
+        expect("only reading", started.filter(args => args[0] !== "kelosyslog" || args[1] !== "--errors=json" || !["search", "count", "status", "stats", "values"].includes(args[2])), []);
         expect("no database, root or file", started.flat().filter(arg => /^--(db|root|table|to|log|follow)/.test(arg)), []);
-        expect("each argument is an option with its value", started.flatMap(args => args.slice(args[1] === "stats" || args[1] === "values" ? 3 : 2)).filter(arg => !/^--[a-z-]+(=|$)/s.test(arg)), []);
+        expect("each argument is an option with its value", started.flatMap(args => args.slice(args[2] === "stats" || args[2] === "values" ? 4 : 3)).filter(arg => !/^--[a-z-]+(=|$)/s.test(arg)), []);
         expect("title", await page.title() === "pwned", false);
     }),
 });

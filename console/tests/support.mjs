@@ -89,26 +89,51 @@ export async function openWindow(options = {}) {
     return page;
 }
 
-// Opens the page of `world` in a browser of its own and hands { page, frame, ... } to `use`; afterwards no process is left and the
-// page has not complained.
-export async function visit(world, use, { hash = "", ...options } = {}) {
-    const { server, address } = await serve(`cockpit_serve ${world.home} "$1"`);
-    const page = await openWindow(options);
+// Opens the page of `world` and hands { page, frame, ... } to `use`; afterwards no process is left and the page has not complained.
+// Tests that need no browser of their own (`options`) share one, in which the page begins anew.
+let shared = null;
+export async function visit(world, use, { hash = "#/logs", isAlone = false, ...options } = {}) {
+    const isShared = !isAlone && Object.keys(options).length === 0;
+    const opened = isShared && shared?.world === world ? await again(shared, hash) : await open(world, hash, options);
+    shared = null;
+    const { page, server } = opened;
+    let isWell = false;
     try {
-        await page.goto(`${address}/kelosyslog${hash}`);
         const frame = page.frameLocator("iframe[name='cockpit1:localhost/kelosyslog']");
         const inner = async () => { await until("the frame", () => innerFrame(page)); return innerFrame(page); };
-        await use({ world, server, address, page, frame, inner, go: async (name, query = {}) => (await inner()).evaluate(([n, q]) => window.cockpit.location.go([n], q), [name, query]) });
+        await use({ ...opened, frame, inner, go: async (name, query = {}) => (await inner()).evaluate(([n, q]) => window.cockpit.location.go([n], q), [name, query]) });
         expect("complaints of the page", page.complaints, []);
+        isWell = true;
     } catch (error) {
         const picture = path.join(path.dirname(new URL(import.meta.url).pathname), "failed.png");
         await page.screenshot({ path: picture }).catch(() => {});
         throw new Error(`${error.message}\n(${picture}; complaints: ${page.complaints.join("; ")})`);
     } finally {
-        await page.context().close();
-        server.end();
+        if (isShared && isWell) {
+            shared = opened;
+        } else {
+            await page.context().close();
+            server.end();
+        }
     }
-    await until("no process is left", () => processes(world).length === 0);
+    if (!isShared)
+        await until("no process is left", () => processes(world).length === 0);
+}
+
+async function open(world, hash, options) {
+    const { server, address } = await serve(`cockpit_serve ${world.home} "$1"`);
+    const page = await openWindow(options);
+    await page.goto(`${address}/kelosyslog${hash}`);
+    return { world, server, address, page };
+}
+
+async function again(opened, hash) {
+    const { page } = opened;
+    page.complaints.length = 0;
+    await page.evaluate(wanted => { location.hash = wanted; }, hash);
+    await innerFrame(page).evaluate(() => { localStorage.removeItem("kelosyslog:columns"); window.isOld = true; location.reload(); }).catch(() => {});
+    await until("the page begins anew", () => innerFrame(page)?.evaluate(() => !window.isOld && document.querySelector("#tabs ul") !== null).catch(() => false));
+    return opened;
 }
 export const innerFrame = page => page.frames().find(frame => frame.url().includes("/kelosyslog/index.html"));
 

@@ -17,14 +17,26 @@ export class ProgramError extends Error {
     get isCancelled() { return this.problem === "cancelled"; }
 }
 
+// The error that ended the program. What no JSON is comes from another program, such as the shell of a login.
+function lastError(message) {
+    const lines = message.split("\n").filter(line => line !== "").map(line => {
+        try {
+            return JSON.parse(line);
+        } catch {
+            return { code: "", text: line };
+        }
+    });
+    return lines.findLast(line => line.code !== "note") ?? { code: "", text: "" };
+}
+
 // What the program said, in words for the page.
 function explain(error) {
-    const text = (error.message || "").replace(/^kelosyslog: /gm, "").trim();
+    const { code, text } = lastError(error.message || "");
     if (error.problem === "not-found")
         return _("The program kelosyslog is not installed on this machine.");
     if (error.problem && error.problem !== "access-denied" && error.exit_status === null)
         return _("The connection to the machine was lost.");
-    if (error.problem === "access-denied" || /permission denied|operation not permitted|read-only/i.test(text))
+    if (error.problem === "access-denied" || code === "permission" || /permission denied|operation not permitted/i.test(text))
         return `${text}\n${_("You need more rights: switch on administrative access in Cockpit. To read, the group adm is enough.")}`.trim();
     return text || error.problem || _("The program failed without a message.");
 }
@@ -32,7 +44,7 @@ function explain(error) {
 // Runs it to its end. Resolves with its output, also if nothing matched; rejects with a ProgramError. `onData` gets the output
 // in pieces instead. When `signal` fires, the process is ended.
 export function run(args, { onData, signal } = {}) {
-    const process = cockpit.spawn(["kelosyslog", ...args], { err: "message", superuser: "try" });
+    const process = cockpit.spawn(["kelosyslog", "--errors=json", ...args], { err: "message", superuser: "try" });
     if (onData)
         process.stream(onData);
     const cancel = () => process.close("cancelled");
