@@ -1,14 +1,14 @@
 #include "base/event_loop.h"
 
 #include <sys/epoll.h>
-#include <systemd/sd-daemon.h>
-#include <systemd/sd-event.h>
 
 #include <cerrno>
 #include <csignal>
 #include <ctime>
 #include <system_error>
 #include <utility>
+
+#include "base/late_systemd.h"
 
 namespace kelo::tool {
 namespace {

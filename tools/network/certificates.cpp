@@ -1,8 +1,5 @@
 #include "network/certificates.h"
 
-#include <openssl/pem.h>
-#include <openssl/x509.h>
-#include <openssl/x509v3.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -16,6 +13,7 @@
 #include "base/errors.h"
 #include "base/files.h"
 #include "base/time_format.h"
+#include "network/late_crypto.h"
 
 namespace kelo::tool {
 namespace {
@@ -83,7 +81,7 @@ private:
 
     // All objects of one kind in a file.
     template <typename Object>
-    std::vector<Object> ReadAll(const char *name, const char *kind, auto read) {
+    std::vector<Object> ReadAll(const char *name, const char *kind, const auto &read) {
         std::vector<Object> objects;
         const std::optional<std::string> text = Read(name);
         if (!text)

@@ -8,8 +8,26 @@
 #include <cstring>
 #include <memory>
 
+#include "system/late_function.h"
+
 namespace kelo::platform {
 namespace {
+
+#define KELO_SYSTEMD(name) constinit const LateFunction<decltype(::name)> name("libsystemd.so.0", #name)
+KELO_SYSTEMD(sd_booted);
+KELO_SYSTEMD(sd_bus_call_method);
+KELO_SYSTEMD(sd_bus_error_free);
+KELO_SYSTEMD(sd_bus_flush_close_unref);
+KELO_SYSTEMD(sd_bus_get_property);
+KELO_SYSTEMD(sd_bus_get_property_string);
+KELO_SYSTEMD(sd_bus_match_signal);
+KELO_SYSTEMD(sd_bus_message_read);
+KELO_SYSTEMD(sd_bus_message_unref);
+KELO_SYSTEMD(sd_bus_open_system);
+KELO_SYSTEMD(sd_bus_path_encode);
+KELO_SYSTEMD(sd_bus_process);
+KELO_SYSTEMD(sd_bus_wait);
+#undef KELO_SYSTEMD
 
 constexpr char kDestination[] = "org.freedesktop.systemd1";
 constexpr char kPath[] = "/org/freedesktop/systemd1";
@@ -105,7 +123,7 @@ int AskForReload(sd_bus *bus, const std::string &unit, BusError &error, std::str
 } // namespace
 
 bool IsSystemdRunning() {
-    return sd_booted() > 0;
+    return sd_booted.IsThere() && sd_booted() > 0;
 }
 
 std::string ReloadUnit(const std::string &unit) {
