@@ -35,6 +35,11 @@ void AppendEscaped(std::string &out, std::string_view text, IsPlain isPlain, Esc
     const char *plain = at; // where the plain characters before `at` begin
     const char *checked = at;
     while (at != end) {
+        // Most bytes are ASCII.
+        while (at != end && static_cast<uint8_t>(*at) < 0x80 && isPlain(static_cast<uint8_t>(*at)))
+            ++at;
+        if (at == end)
+            break;
         const char *const start = at;
         const Character character = TakeCharacter(at, end, checked);
         if (character.isValid && isPlain(character.code))
@@ -94,7 +99,10 @@ bool IsFormula(std::string_view text) {
 }
 
 void AppendCsvField(std::string &out, std::string_view text) {
-    if (text.find_first_of(",\"\r\n") == std::string_view::npos) {
+    const auto isSpecial = [](char byte) {
+        return byte == ',' || byte == '"' || byte == '\r' || byte == '\n';
+    };
+    if (std::none_of(text.begin(), text.end(), isSpecial)) {
         out += text;
         return;
     }
@@ -153,7 +161,7 @@ size_t WholeCharacters(std::string_view text, size_t maxBytes) {
 bool AppendJsonString(std::string &out, std::string_view text) {
     bool isExact = true;
     const auto isPlain = [](uint32_t code) {
-        return code != '"' && code != '\\' && !IsControl(code) && !Misleads(code);
+        return code != '"' && code != '\\' && !IsControl(code) && (code < 0x80 || !Misleads(code));
     };
     out += '"';
     AppendEscaped(out, text, isPlain, [&](Character character) {
@@ -214,6 +222,10 @@ void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, Csv
     for (const std::string &field : fields) {
         if (&field != &fields.front())
             out += ',';
+        if (!style.isForTerminal && !style.isForSpreadsheet) {
+            AppendCsvField(out, field);
+            continue;
+        }
         const std::string text = style.isForTerminal ? EscapeForTerminal(field) : field;
         AppendCsvField(out, style.isForSpreadsheet && IsFormula(field) ? "'" + text : text);
     }

@@ -6,7 +6,7 @@
 
 namespace kelo::tool {
 
-// Formats times in the time zone of the process (TZ), or in UTC.
+// Formats times in the time zone of the process (TZ), or in UTC. An object is for one thread.
 class TimeFormat {
 public:
     explicit TimeFormat(bool inUtc) : inUtc_(inUtc) {}
@@ -19,10 +19,13 @@ public:
     std::string Short(int64_t seconds) const;
 
 private:
+    std::string WholeIso(int64_t seconds) const;
     std::string Format(int64_t seconds, const char *format) const;
     bool Break(int64_t seconds, tm &parts) const;
 
     bool inUtc_;
+    mutable int64_t quarter_ = -1; // the beginning of the quarter of an hour that was formatted last
+    mutable std::string quarterText_;
 };
 
 } // namespace kelo::tool

@@ -176,14 +176,15 @@ public:
         AppendCsvLine(out, names, style_);
     }
     void Add(const Log &log, std::string &out) override {
-        std::vector<std::string> values;
+        values_.clear();
         for (const RecordField *field : Layout().fields)
-            values.push_back(Value(*field, log, &TimeFormat::Iso));
-        AppendCsvLine(out, values, style_);
+            values_.push_back(Value(*field, log, &TimeFormat::Iso));
+        AppendCsvLine(out, values_, style_);
     }
 
 private:
     CsvStyle style_;
+    std::vector<std::string> values_; // of the record that is written
 };
 
 } // namespace

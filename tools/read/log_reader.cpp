@@ -61,8 +61,11 @@ LogReader::Scanned LogReader::Select(const IdRange &range, bool oldestFirst, con
     _SYSLOG_SQL_LIMIT_tag limit{page.limit, page.offset};
     _SYSLOG_SQL_ORDER_tag order{oldestFirst ? 1 : 0, SYSLOG_ATTRI_ID};
     RowVisitor walker{handle, page.limit};
-    const int status = SyslogDBSelectByTable(table_.path, table_.name, conditions, &limit, &order,
-                                             RowVisitor::Take, &walker, false);
+    const int status = connection_ != nullptr
+                           ? connection_->SelectByTable(table_.name, conditions, &limit, &order,
+                                                        RowVisitor::Take, &walker, false)
+                           : SyslogDBSelectByTable(table_.path, table_.name, conditions, &limit, &order,
+                                                   RowVisitor::Take, &walker, false);
     if (walker.exception != nullptr)
         std::rethrow_exception(walker.exception);
     if (status != 0)
@@ -146,7 +149,10 @@ uint64_t LogReader::ReadPage(const Page &page, bool oldestFirst, const LogHandle
 uint64_t LogReader::CountWith(Conditions conditions) const {
     // Always true, and not the text for which the library would return the largest id.
     conditions.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, "1", {}});
-    const int count = SyslogDBSelectCountByTable(table_.path, table_.name, conditions, nullptr, nullptr);
+    const int count =
+        connection_ != nullptr
+            ? connection_->SelectCountByTable(table_.name, conditions, nullptr, nullptr)
+            : SyslogDBSelectCountByTable(table_.path, table_.name, conditions, nullptr, nullptr);
     if (count < 0)
         throw DatabaseError(DescribeDatabaseProblem(table_));
     return static_cast<uint64_t>(count);
@@ -159,14 +165,17 @@ uint64_t LogReader::CountIn(const IdRange &range) const {
 }
 
 uint64_t LogReader::Count() const {
-    const LogReader everything(table_, {});
+    SyslogDBReader connection(table_.path);
+    LogReader everything(table_, {});
+    LogReader selected(table_, conditions_);
+    everything.connection_ = selected.connection_ = &connection;
     const uint64_t newest = everything.IdFromNewest(0);
     if (newest <= kCountableIds)
-        return CountWith(conditions_);
+        return selected.CountWith(conditions_);
     uint64_t total = 0;
     for (uint64_t next = everything.FirstId({}); next != 0 && next <= newest;) {
         const IdRange range{next, next + kCountableIds - 1};
-        total += CountIn(range);
+        total += selected.CountIn(range);
         next = everything.FirstId({range.last + 1, newest});
     }
     return total;

@@ -5,6 +5,7 @@
 #include <limits>
 #include <list>
 
+#include "kelosyslog/dbreader.h"
 #include "kelosyslog/dbutil.h"
 #include "read/log_table.h"
 
@@ -89,6 +90,7 @@ private:
 
     LogTable table_;
     Conditions conditions_;
+    SyslogDBReader *connection_ = nullptr; // kept for several statements; each has its own without it
 };
 
 // Adds the condition that the id lies in `range`.
