@@ -53,6 +53,16 @@ protected:
 
 } // namespace
 
+TEST_F(ReceiveProgram, HasTheIndexExtendedOnItsBeat) {
+    ChildProgram receiver = Start();
+    receiver.Send(LogLines(0, 40'000));
+    const auto covered = [&] {
+        return ReadFile(logs_ + "-skip").size() > 500'000; // two pieces
+    };
+    EXPECT_TRUE(receiver.Await(covered));
+    EXPECT_EQ(receiver.End().status, 0);
+}
+
 TEST_F(ReceiveProgram, StoresCountsAndSetsAside) {
     ChildProgram receiver = Start();
     receiver.Send(LogLines(0, 3000) + "\n" + kLogHead + "\nshort line\n" + std::string(17 << 20, 'x') + "\n" +

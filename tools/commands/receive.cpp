@@ -71,6 +71,7 @@ int RunOnSpool(const ReceiverOptions &options) {
 
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
+    options.receiver.indexer = "/proc/self/exe";
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
     options.receiver.deviceLimit = ParseNumber("--device-limit", options.deviceLimit, 1, 10'000'000);
     // A limit of the file size is handled like a full disk.

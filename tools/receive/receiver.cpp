@@ -181,6 +181,8 @@ void Receiver::TickState() {
     if (!areOthersTold_) // one event, however long the flood of names lasts
         areOthersTold_ = TellOtherDevices(options_, accounting_.Others());
     WriteState();
+    if (writer_)
+        index_.Tick(writer_->Path(), writer_->Stored());
     FireAt(stateTimer_, now_ + kBeatMs);
 }
 

@@ -8,6 +8,7 @@
 #include "base/event_loop.h"
 #include "receive/accounting_flusher.h"
 #include "receive/disk_space_monitor.h"
+#include "receive/index_keeper.h"
 #include "receive/log_writer.h"
 #include "receive/receiver_state.h"
 #include "receive/rule_checker.h"
@@ -21,6 +22,7 @@ struct ReceiverOptions {
     std::string root;          // of the system's files, absolute or empty
     std::string spool;         // folder of the message spool, for SpoolReceiver
     std::string database;      // to store into; empty: records are only counted and checked
+    std::string indexer;       // program that builds the index for keywords (IndexKeeper); empty: none
     std::string setAside;      // file for lines that are not valid records; empty: the default below the root
     uint64_t notifyLimit = 10; // notifications a minute for each rule
     size_t deviceLimit = 10'000; // devices that are counted each by its name
@@ -74,6 +76,7 @@ private:
     DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
     std::optional<LogWriter> writer_;
+    IndexKeeper index_{options_.indexer};
     LineReader lines_;
     LogImport import_;
     ReceiverState state_;

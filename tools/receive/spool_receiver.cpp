@@ -376,6 +376,7 @@ void SpoolReceiver::TickState() {
     if (!areOthersTold_)
         areOthersTold_ = TellOtherDevices(options_, accounting_.Others());
     WriteState();
+    index_.Tick(writer_.Path(), writer_.Stored());
     FireAt(stateTimer_, now_ + kBeatMs);
 }
 

@@ -10,6 +10,7 @@
 #include "base/event_loop.h"
 #include "receive/accounting_flusher.h"
 #include "receive/disk_space_monitor.h"
+#include "receive/index_keeper.h"
 #include "receive/log_writer.h"
 #include "receive/receiver.h"
 #include "receive/receiver_state.h"
@@ -91,6 +92,7 @@ private:
     DiskSpaceMonitor volume_;
     SetAsideFile setAside_;
     LogWriter writer_;
+    IndexKeeper index_{options_.indexer};
     RecordBatch again_; // records that are stored already, for the counts
     std::vector<Source> sources_;
     SpoolFolder folder_;
