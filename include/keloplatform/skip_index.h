@@ -51,6 +51,10 @@ KELOPLATFORM_API int KELODBSkipIndexBuild(const char *path, int maxMs);
 // if the database cannot be read; the connection has the cause.
 KELOPLATFORM_API int KELODBSkipIndexGet(DBConnect_tag *connection, KELODBSkipIndex *index);
 
+// The number of ids that the last statement of the calling thread that an index served had to read beside it,
+// because the index does not know them yet; -1 if no statement was served since the last call.
+KELOPLATFORM_API int64_t KELODBSkipIndexLag(void);
+
 // Removes the index of the database at `path`, which may be gone itself. Returns 0, 1 if there is none, or -1
 // (errno). Searches that use it go on.
 KELOPLATFORM_API int KELODBSkipIndexRemove(const char *path);

@@ -17,6 +17,8 @@ namespace {
 constexpr int64_t kManyRows = 20'000; // a search reads them in some milliseconds
 
 bool IsBehind(const LogTable &table) {
+    if (const int64_t lag = KELODBSkipIndexLag(); lag >= 0)
+        return lag >= kManyRows;
     try {
         const KELODBSkipIndex index = ReadOnlyQuery(table).SkipIndex();
         return index.isPossible != 0 && index.newestId - (index.isThere != 0 ? index.endId : 0) >= kManyRows;

@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <memory>
 #include <system_error>
+#include <utility>
 
 #include "keloplatform/kelodb.h"
 #include "keloplatform/skip_index.h"
@@ -85,6 +86,10 @@ int KELODBSkipIndexGet(DBConnect_tag *connection, KELODBSkipIndex *index) {
     } catch (const std::bad_alloc &) {
         return -1;
     }
+}
+
+int64_t KELODBSkipIndexLag() {
+    return std::exchange(lastLag, -1);
 }
 
 int KELODBSkipIndexRemove(const char *path) {

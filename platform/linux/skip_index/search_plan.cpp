@@ -114,8 +114,11 @@ bool SearchPlan::HasManyRows(const std::string &column, int64_t count) const {
 
 // Whether there is an index that fits what this transaction reads.
 bool SearchPlan::HasUsableIndex() {
-    if (!isUsable_)
+    if (!isUsable_) {
         isUsable_ = index_ && index_->Fits(db_);
+        if (*isUsable_)
+            lastLag = std::max<int64_t>(LargestIdEver(db_) + 1 - index_->Header().EndId(), 0);
+    }
     return *isUsable_;
 }
 

@@ -8,6 +8,8 @@
 
 namespace kelo::platform {
 
+thread_local int64_t lastLag = -1;
+
 bool IsSwitchedOff() {
     const char *setting = std::getenv("KELO_SKIP_INDEX");
     return setting != nullptr && std::string_view(setting) == "off";

@@ -13,6 +13,9 @@ namespace kelo::platform {
 // Whether the environment variable KELO_SKIP_INDEX is "off": all statements run as they are then.
 bool IsSwitchedOff();
 
+// What KELODBSkipIndexLag of this thread returns.
+extern thread_local int64_t lastLag;
+
 // The index of an open database, as it was when it was opened.
 //
 // It knows rows that were committed before; those that came after have ids beyond the ones that it knows. So
