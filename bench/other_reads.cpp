@@ -91,7 +91,7 @@ int main(int argc, char **argv) {
     const Read reads[] = {
         {"page of three old days", [&] { return Page(database, Days("2020/01/01", "2020/01/03")); }, 0.05, 5},
         {"page of an old hour", [&] { return Page(database, Seconds(kFirst + 80'000, kFirst + 83'600)); },
-         0.05, 5},
+         0.2, 5},
         {"page up to an old second", [&] { return Page(database, Seconds(0, kFirst + 80'000)); }, 0.05, 5},
         {"values of host", [&] { return ValuesOf(database, "host"); }, 0.05, 20},
         {"values of prog", [&] { return ValuesOf(database, "prog"); }, 0.05, 20},

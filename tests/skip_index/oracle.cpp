@@ -1,7 +1,10 @@
 // Searches with and without the skip index, on a database to which everything happens meanwhile. Each must
 // give the same rows in the same order, the same count, and delete the same rows.
 //
-//     skip_index_oracle [SEARCHES [SEED]]
+//     skip_index_oracle [SEARCHES [SEED [DATABASE]]]
+//
+// With DATABASE: searches of that one, to which others may append meanwhile, up to its newest record at the
+// time. The index is extended now and then.
 //
 // Exit status: 0 all the same, 1 a difference.
 
@@ -118,6 +121,40 @@ private:
     size_t indexed_ = 0;
 };
 
+// Nothing if both answers are the same, otherwise what was searched for.
+std::string SearchBeside(const std::string &path, Random &random) {
+    RandomSearch search = MakeRandomSearch(random, [&] { return RandomPartOfMessage(path, random); });
+    search.conditions.push_back(
+        {SYSLOG_ATTRI_ID, SYSLOG_OP_LE, RunSql(path, "SELECT ifnull(max(id), 0) FROM logs"), {}});
+    const Answer found = Ask(path, search);
+    const WithoutIndex off;
+    const Answer expected = Ask(path, search);
+    std::string clause;
+    if (found != expected)
+        LogSearchClauseGet(search.conditions, clause);
+    return clause;
+}
+
+int RunBeside(const std::string &path, size_t searches, uint64_t seed) {
+    Random random(seed);
+    KELODBSkipIndex index{};
+    const std::string first = RunSql(path, "SELECT max(id) FROM logs");
+    for (size_t done = 0; done < searches; ++done) {
+        if (done % kSearchesPerChange == 0)
+            KELODBSkipIndexBuild(path.c_str(), 0);
+        if (const std::string difference = SearchBeside(path, random); !difference.empty()) {
+            std::fprintf(stderr, "search %zu of seed %llu differs: %s\n", done,
+                         static_cast<unsigned long long>(seed), difference.c_str());
+            return 1;
+        }
+    }
+    KELODBSkipIndexGet(ConnectTo(path).get(), &index);
+    std::printf("%zu searches gave the same; the newest record was %s, then %s; the index ends at %lld\n",
+                searches, first.c_str(), RunSql(path, "SELECT max(id) FROM logs").c_str(),
+                static_cast<long long>(index.endId));
+    return index.endId > 0 ? 0 : 1;
+}
+
 int Run(size_t searches, uint64_t seed) {
     SyslogCapture log;
     Oracle oracle(seed);
@@ -141,6 +178,7 @@ int Run(size_t searches, uint64_t seed) {
 } // namespace kelo::test
 
 int main(int argc, char **argv) {
-    return kelo::test::Run(argc > 1 ? std::strtoul(argv[1], nullptr, 10) : 1000,
-                           argc > 2 ? std::strtoull(argv[2], nullptr, 10) : 1);
+    const size_t searches = argc > 1 ? std::strtoul(argv[1], nullptr, 10) : 1000;
+    const uint64_t seed = argc > 2 ? std::strtoull(argv[2], nullptr, 10) : 1;
+    return argc > 3 ? kelo::test::RunBeside(argv[3], searches, seed) : kelo::test::Run(searches, seed);
 }

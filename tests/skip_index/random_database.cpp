@@ -201,15 +201,15 @@ std::string RandomDatabase::ChangeSomething() {
     }
 }
 
-std::string RandomDatabase::PartOfMessage() {
-    std::string id = "(SELECT min(id) FROM logs) + " + std::to_string(random_.Below(kMostRows));
-    if (random_.OneIn(3)) // at the end of what the index knows
-        id = "((" + id + ") / 16384 * 16384 - " + std::to_string(random_.Below(2)) + ")";
+std::string RandomPartOfMessage(const std::string &database, Random &random) {
+    std::string id = "(SELECT min(id) FROM logs) + " + std::to_string(random.Below(kMostRows));
+    if (random.OneIn(3)) // at the end of what the index knows
+        id = "((" + id + ") / 16384 * 16384 - " + std::to_string(random.Below(2)) + ")";
     const std::string text =
-        RunSql(path_, "SELECT msg FROM logs WHERE id >= " + id + " AND msg NOT NULL LIMIT 1");
+        RunSql(database, "SELECT msg FROM logs WHERE id >= " + id + " AND msg NOT NULL LIMIT 1");
     if (text.empty())
         return "none";
-    return text.substr(random_.Below(text.size()), 1 + random_.Below(24));
+    return text.substr(random.Below(text.size()), 1 + random.Below(24));
 }
 
 } // namespace kelo::test

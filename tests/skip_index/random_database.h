@@ -9,6 +9,9 @@
 
 namespace kelo::test {
 
+// A part of a message of a log database, "none" without one.
+std::string RandomPartOfMessage(const std::string &database, Random &random);
+
 // A log database to which everything happens that may happen to one, and to its index.
 class RandomDatabase {
 public:
@@ -18,7 +21,7 @@ public:
     std::string Change();
     const std::string &Path() const { return path_; }
     // A part of a message that may be there.
-    std::string PartOfMessage();
+    std::string PartOfMessage() { return RandomPartOfMessage(path_, random_); }
 
 private:
     std::string ChangeSomething();
