@@ -15,8 +15,10 @@ namespace {
 constexpr size_t kUnknownSeverity = 8;
 
 size_t SeverityOf(std::string_view word) {
+    const char first = word.empty() ? '\0' : word.front(); // tells nearly all of them apart
     size_t index = 0;
-    while (index < kUnknownSeverity && word != g_MappingSyslogPrior[index])
+    while (index < kUnknownSeverity &&
+           (first != *g_MappingSyslogPrior[index] || word != g_MappingSyslogPrior[index]))
         ++index;
     return index;
 }
