@@ -23,6 +23,10 @@ export const pageTests = (world, shots) => ({
                 await frame.getByRole("button", { name: "Show what came before and after" }).click();
                 await frame.locator(".lines .this").waitFor();
             }
+            if (name === "rules") {
+                await frame.getByRole("button", { name: "Test all" }).click();
+                await until("the results", async () => await frame.getByText(/^Would (not )?have fired/).count() === 4);
+            }
             if (name === "overview")
                 await frame.locator(".bars meter.error").first().waitFor();
             await accessible(name, f);

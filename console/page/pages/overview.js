@@ -5,9 +5,11 @@ import { json, records } from "../base/program.js";
 import { number, bytes, change, age, moment, instant } from "../base/format.js";
 import { card, alert, bars, empty, faint, table, label } from "../base/parts.js";
 import { Chart } from "../chart.js";
+import { classify } from "../search/histogram.js";
 
 const cockpit = window.cockpit;
 const DAY = 86400;
+const STEP = 600; // seconds of a bar
 const TOP = 10;
 const showLogs = options => cockpit.location.go(["logs"], options);
 
@@ -76,6 +78,8 @@ export async function overview(root, signal) {
     // What is slow in a large database comes last, and nothing waits for it.
     const severities = Promise.all([json(["count", "--by=severity", ...day(middle - DAY, middle - 1)], { signal }), json(["count", "--by=severity", ...day(middle, now)], { signal })]);
     severities.catch(() => {});
+    const split = json(["count", `--buckets=${DAY / STEP}`, ...day(middle, now)], { signal });
+    split.catch(() => {});
     const [status, samples, devices] = await Promise.all([json(["status"], { signal }), records(["stats", "eps", "--by=minute", ...day(middle, now)], { signal }),
                                                           records(["stats", "eps", "--by=hour", "--per-device", ...day(middle - DAY, now)], { signal })]);
     signal.throwIfAborted();
@@ -88,9 +92,10 @@ export async function overview(root, signal) {
     signal.addEventListener("abort", () => chart.end());
     const buckets = new Map();
     for (const sample of samples) {
-        const time = Math.floor(instant(sample.time) / 600) * 600;
+        const time = Math.floor(instant(sample.time) / STEP) * STEP;
         buckets.set(time, (buckets.get(time) ?? 0) + sample.count);
     }
-    chart.show([...buckets].map(([time, count]) => ({ time, count })), 600, middle, now);
+    chart.show([...buckets].map(([time, count]) => ({ time, count })), STEP, middle, now);
+    split.then(found => found && !signal.aborted && chart.show(found.buckets.map(classify), found.span, middle, now), () => {});
     slow.replaceChildren(await severities.then(severityCard, error => alert("danger", error.message)));
 }
