@@ -5,6 +5,7 @@
 #include <thread>
 
 #include "keloplatform/kelodb.h"
+#include "kelosyslog/dbreader.h"
 #include "kelosyslog/failure.h"
 #include "support/test.h"
 
@@ -94,8 +95,14 @@ TEST_F(Writer, SharesANewDatabaseWithOtherThreads) {
     for (int i = 0; i < 8; ++i)
         threads.emplace_back([this] {
             SyslogDBWriter writer(path_);
-            for (int batch = 0; batch < 10; ++batch)
+            SyslogDBReader reader(path_);
+            for (int batch = 1; batch <= 10; ++batch) {
                 EXPECT_EQ(writer.Store(logs_.data(), logs_.size()), 0) << SyslogFailureGet()->text;
+                const SyslogDBSnapshot snapshot(reader);
+                const int count = reader.SelectCount({}, nullptr, nullptr);
+                EXPECT_GE(count, 2 * batch);
+                EXPECT_EQ(reader.SelectCount({}, nullptr, nullptr), count);
+            }
         });
     for (std::thread &thread : threads)
         thread.join();
