@@ -6,8 +6,10 @@
 #include <memory>
 #include <new>
 #include <thread>
+#include <utility>
 
 #include "common/failure.h"
+#include "db/cluster_connection.h"
 #include "search/regexp_function.h"
 
 using kelo::platform::Database;
@@ -97,6 +99,8 @@ DBConnect_tag *KELODBConnect(const char *, const char *, const char *, const cha
             db = connection->file.Open();
             if (db == nullptr)
                 return Refuse(path, errno);
+            if (kelo::platform::DescribesCluster(db.get()))
+                return kelo::platform::ConnectToCluster(std::move(connection), path);
             if (!Harden(db.get()) || !kelo::platform::RegisterSearchFunctions(db.get())) {
                 kelo::platform::FailStatement(db.get(), "KELODBConnect");
                 return nullptr;

@@ -2,6 +2,9 @@
 
 #include <sqlite3.h>
 
+#include <memory>
+
+#include "cluster/cluster.h"
 #include "db/database_file.h"
 #include "db/insert_cache.h"
 #include "db/select_cache.h"
@@ -14,4 +17,7 @@ struct DBConnect_tag {
     sqlite3 *db = nullptr; // closed by KELODBClose
     kelo::platform::InsertCache inserts = {};
     kelo::platform::SelectCache selects = {};
+    // Set if the file describes a cluster, which runs the statements; `db` is an empty database that has the
+    // errors.
+    std::unique_ptr<kelo::platform::Cluster> cluster = nullptr;
 };

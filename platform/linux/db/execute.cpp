@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "common/failure.h"
+#include "db/cluster_connection.h"
 #include "db/connection.h"
 #include "db/distinct_values.h"
 #include "db/indexed_search.h"
@@ -183,6 +184,8 @@ std::optional<bool> RunInOtherWay(sqlite3 *db, const char *sql, const PageBounds
 }
 
 bool Run(DBConnect_tag &connection, const char *sql, Delivery delivery, DBResult_tag **result) {
+    if (connection.cluster != nullptr)
+        return kelo::platform::RunOnCluster(connection, sql, nullptr, result);
     if (const std::optional<bool> isInserted = connection.inserts.Run(connection.db, sql))
         return *isInserted;
     Rows rows;
@@ -216,6 +219,8 @@ bool BoundedText(sqlite3 *db, const char *sql, const PageBounds &page, std::stri
 }
 
 bool RunPage(DBConnect_tag &connection, const char *sql, const PageBounds &page, DBResult_tag **result) {
+    if (connection.cluster != nullptr)
+        return kelo::platform::RunOnCluster(connection, sql, &page, result);
     Rows rows;
     if (const auto isFound = RunInOtherWay(connection.db, sql, &page, result != nullptr, rows))
         return *isFound && HandOver(connection, std::move(rows), result);

@@ -17,6 +17,12 @@ DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
     }
 }
 
+DBResult_tag::DBResult_tag(std::span<const std::string> columnNames)
+    : cells(columnNames.size()), digits(cells.size()) {
+    for (const std::string &name : columnNames)
+        columns.Add(name);
+}
+
 kelo::platform::Cell DBResult_tag::TextOf(int64_t number, Digits &digits) {
     char *end = std::to_chars(digits.begin(), digits.end(), number).ptr;
     return {digits.data(), static_cast<size_t>(end - digits.data())};

@@ -5,6 +5,8 @@
 #include <array>
 #include <climits>
 #include <cstdint>
+#include <span>
+#include <string>
 #include <vector>
 
 #include "db/column_index.h"
@@ -18,6 +20,7 @@ struct DBResult_tag {
 
     // Takes the column names of a statement. Throws std::bad_alloc.
     explicit DBResult_tag(sqlite3_stmt *statement);
+    explicit DBResult_tag(std::span<const std::string> columnNames);
 
     using Digits = std::array<char, 20>; // -9223372036854775808
     // An integer as a text in `digits`, which is faster than SQLite's conversion. The text has no NUL.

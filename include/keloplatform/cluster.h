@@ -1,0 +1,30 @@
+#pragma once
+
+// Clusters as databases: a file whose first line is "[cluster]" describes servers that KELODBConnect reaches
+// in its place (docs/cluster.md). An addition of this platform, which an appliance's own may lack.
+//
+//     if (KELODBIsCluster(path))
+//         KELODBClusterPartialSet(1);
+//     ... search ...
+//     if (KELODBClusterMissingGet()[0] != '\0')
+//         Warn(KELODBClusterMissingGet());
+
+#include "keloplatform/export.h"
+
+// The id of a record of a cluster has its second of receipt above so many bits.
+inline constexpr int KELODB_CLUSTER_BITS_BELOW_SECOND = 30;
+
+extern "C" {
+
+// 1 if the file at `path` describes a cluster; 0 if it does not, or cannot be read.
+KELOPLATFORM_API int KELODBIsCluster(const char *path);
+
+// Whether the calling thread takes answers that lack the rows of servers that are away, instead of an error.
+// The description needs a line "partial-user=" for it. Forgets what was missing.
+KELOPLATFORM_API void KELODBClusterPartialSet(int isWanted);
+
+// What was missing in an answer since then: one line that names the servers, "" for nothing. Belongs to the
+// thread, and changes with its next answer.
+KELOPLATFORM_API const char *KELODBClusterMissingGet();
+
+} // extern "C"
