@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "base/stop_signals.h"
+#include "keloplatform/cluster.h"
 #include "keloplatform/vfs.h"
 
 namespace kelo::tool {
@@ -103,6 +104,8 @@ void SqliteConnection::Fail(int status) const {
     const int code = status & 0xff;
     if (options_.heedsStopSignals && (code == SQLITE_INTERRUPT || code == SQLITE_BUSY))
         StopSignals::Check();
+    if (code == SQLITE_NOTADB && KELODBIsCluster(name_.c_str()) != 0)
+        throw SqliteError(name_ + " describes a cluster: this needs a database of SQLite", code, 0);
     std::string cause = db_ != nullptr ? sqlite3_errmsg(db_.get()) : sqlite3_errstr(status);
     int systemError = db_ != nullptr ? sqlite3_system_errno(db_.get()) : 0;
     // SQLite forgets the reason of a write that fails within a statement, and errno still has it, unless

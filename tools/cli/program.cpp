@@ -11,6 +11,7 @@
 #include "cli/exit_status.h"
 #include "cli/help_formatter.h"
 #include "cli/message.h"
+#include "keloplatform/cluster.h"
 #include "keloplatform/root.h"
 #include "kelosyslog/root.h"
 
@@ -70,7 +71,10 @@ int RunCommand(Program &program, int argc, const char *const *argv) {
         return MissCommand(program);
     ApplyRoot(program.root);
     try {
-        return program.run();
+        const int status = program.run();
+        if (KELODBClusterMissingGet()[0] != '\0')
+            PrintMessage(std::string("the answer is incomplete: ") + KELODBClusterMissingGet());
+        return status;
     } catch (const OutputClosed &) {
         return kExitFound;
     } catch (const DatabaseError &error) {

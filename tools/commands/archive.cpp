@@ -231,6 +231,7 @@ int Run(const Options &options, const std::string &root) {
     if (options.isPruning)
         return command.Prune();
     LogTable table = ResolveLogTable(options.table, root);
+    RequireDatabase(table.path, "archive");
     table.path = Canonical(table.path); // one name for the note of a removal
     if (table.kind != TableKind::Logs)
         throw UsageError("--log: only logs in table logs can be archived, not '" + options.table.log + "'");

@@ -10,10 +10,11 @@ struct Subcommand {
     void (*add)(Program &);
 };
 constexpr Subcommand kSubcommands[] = {
-    {"search", AddSearch},   {"count", AddCount},         {"delete", AddDelete},   {"events", AddEvents},
-    {"report", AddReport},   {"values", AddValues},       {"stats", AddStats},     {"rules", AddRules},
-    {"notify", AddNotify},   {"parse", AddParse},         {"receive", AddReceive}, {"db", AddDb},
-    {"archive", AddArchive}, {"retention", AddRetention}, {"listen", AddListen},   {"status", AddStatus},
+    {"search", AddSearch},   {"count", AddCount},     {"delete", AddDelete},       {"events", AddEvents},
+    {"report", AddReport},   {"values", AddValues},   {"stats", AddStats},         {"rules", AddRules},
+    {"notify", AddNotify},   {"parse", AddParse},     {"receive", AddReceive},     {"db", AddDb},
+    {"archive", AddArchive}, {"cluster", AddCluster}, {"retention", AddRetention}, {"listen", AddListen},
+    {"status", AddStatus},
 };
 
 } // namespace

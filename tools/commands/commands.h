@@ -26,6 +26,7 @@ void AddParse(Program &program);
 void AddReceive(Program &program);
 void AddDb(Program &program);
 void AddArchive(Program &program);
+void AddCluster(Program &program);
 void AddRetention(Program &program);
 void AddListen(Program &program);
 void AddStatus(Program &program);

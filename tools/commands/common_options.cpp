@@ -27,6 +27,13 @@ void AddTableOptions(Command command, LogTableOptions &options, bool withTable) 
             .Group(group);
 }
 
+void AddPartialOption(Command command, LogTableOptions &options) {
+    command
+        .AddFlag("--partial", options.partial,
+                 "Of a cluster: do without servers that are away; a message says what is missing")
+        .Group("Where to look");
+}
+
 void AddFilterOptions(Command command, LogFilter &filter) {
     const std::string group = "Which logs (values separated by commas are alternatives; '!value' excludes)";
     command.AddText("-S,--since", filter.since, "TIME", "From this time on").Group(group);

@@ -16,6 +16,9 @@ namespace kelo::tool {
 // --db, --log and --table.
 void AddTableOptions(Command command, LogTableOptions &options, bool withTable = true);
 
+// --partial, of the commands that read.
+void AddPartialOption(Command command, LogTableOptions &options);
+
 // --since, --until, --priority, --facility, --host, --program and --grep.
 void AddFilterOptions(Command command, LogFilter &filter);
 

@@ -11,6 +11,7 @@
 #include "commands/common_options.h"
 #include "commands/count_by.h"
 #include "commands/index_upkeep.h"
+#include "keloplatform/cluster.h"
 #include "read/log_reader.h"
 #include "read/log_tally.h"
 
@@ -66,9 +67,12 @@ int PrintCount(const LogTable &table, const Conditions &conditions, const Option
     if (!options.limit.empty())
         limit = ParseNumber("--limit", options.limit, 0, kHighestLimit);
     const LogReader reader(table, conditions);
-    const uint64_t count = options.isEstimate ? reader.IdFromNewest(0)
-                           : limit            ? CountUpTo(table, conditions, *limit)
-                                              : reader.Count();
+    const bool isCluster =
+        KELODBIsCluster(table.path.c_str()) != 0; // it counts at once, and its ids are times
+    const uint64_t count = isCluster            ? reader.Count()
+                           : options.isEstimate ? reader.IdFromNewest(0)
+                           : limit              ? CountUpTo(table, conditions, *limit)
+                                                : reader.Count();
     Output output(false);
     output.Write(Answer(count, limit, format));
     output.Finish();
@@ -85,6 +89,8 @@ int Run(const Options &options, const std::string &root) {
     const int64_t now = std::time(nullptr);
     const LogTable table = ResolveLogTable(options.table, root);
     const Conditions conditions = MakeConditions(options.filter, table, now);
+    if (options.IsSplit())
+        RequireDatabase(table.path, "count --by or --buckets");
     const int status = options.IsSplit() ? CountBy(table, conditions, options.filter, now, options.by, format)
                                          : PrintCount(table, conditions, options);
     if (!options.filter.keywords.empty())
@@ -123,6 +129,7 @@ void AddCount(Program &program) {
         .Group(how);
     AddUtcOption(command, options->inUtc);
     AddTableOptions(command, options->table);
+    AddPartialOption(command, options->table);
 }
 
 } // namespace kelo::tool

@@ -14,7 +14,11 @@ struct DbOptions {
     std::string format = "text";
     const std::string *root = nullptr; // --root, known once the command line was read
 
-    LogTable Table() const { return ResolveLogTable(table, *root); }
+    LogTable Table() const {
+        LogTable resolved = ResolveLogTable(table, *root);
+        RequireDatabase(resolved.path, "db");
+        return resolved;
+    }
     OutputFormat Format() const { return ParseKeyValuesFormat(format); }
 };
 

@@ -12,6 +12,7 @@
 #include "cli/progress_bar.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
+#include "keloplatform/cluster.h"
 #include "read/log_reader.h"
 
 namespace kelo::tool {
@@ -102,6 +103,15 @@ private:
     uint64_t step_ = 500;
 };
 
+// On a cluster in one statement: it deletes at the cost of a part of the table, however many rows there are,
+// and keeps nobody waiting.
+void DeleteOnCluster(const LogReader &reader, uint64_t newest) {
+    std::list<_SYSLOG_SQL_COND_tag> conditions = reader.Selected();
+    AddRange(conditions, {1, newest});
+    if (SyslogDBDelete(reader.Table().path, conditions) != 0)
+        throw DatabaseError(DescribeDatabaseProblem(reader.Table(), true));
+}
+
 // Deletes the selected records up to `newest`. Returns how many.
 uint64_t DeleteUpTo(const LogReader &reader, uint64_t newest, uint64_t total) {
     const StopSignals signals;
@@ -157,7 +167,11 @@ int Run(const Options &options, const std::string &root) {
     }
     int stopSignal = 0;
     try {
-        const uint64_t deleted = DeleteUpTo(reader, newest, count);
+        uint64_t deleted = count;
+        if (KELODBIsCluster(table.path.c_str()) != 0)
+            DeleteOnCluster(reader, newest);
+        else
+            deleted = DeleteUpTo(reader, newest, count);
         PrintResult(options, table, deleted, format);
     } catch (const Interrupted &interruption) {
         stopSignal = interruption.signal;

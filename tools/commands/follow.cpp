@@ -5,8 +5,10 @@
 #include <algorithm>
 #include <chrono>
 #include <ctime>
+#include <set>
 
 #include "base/errors.h"
+#include "keloplatform/cluster.h"
 
 namespace kelo::tool {
 namespace {
@@ -14,6 +16,8 @@ namespace {
 using Clock = std::chrono::steady_clock;
 
 constexpr int kPollMs = 250;
+// How late a record of a cluster may come, in ids: ten seconds.
+constexpr uint64_t kLateIds = uint64_t{10} << KELODB_CLUSTER_BITS_BELOW_SECOND;
 
 class Follower {
 public:
@@ -23,9 +27,13 @@ public:
     uint64_t PrintPresent(const FollowOptions &options) {
         file_ = IdentifyFile(reader_.Table().path);
         lastId_ = everything_.IdFromNewest(0);
+        if (isCluster_)
+            NoteLateOnes();
         if (!options.showAll && options.lines == 0)
             return 0;
         const auto format = [this](const _SYSLOG_LOG_DATA_tag &log) {
+            if (isCluster_)
+                seen_.insert(log.id);
             format_(log);
             lastId_ = std::max(lastId_, log.id);
         };
@@ -34,6 +42,8 @@ public:
     }
 
     uint64_t PrintNews() {
+        if (isCluster_)
+            return PrintNewsOfCluster();
         const std::optional<FileIdentity> current = IdentifyFile(reader_.Table().path);
         if (!current)
             return 0;
@@ -55,12 +65,39 @@ public:
     }
 
 private:
+    // From here on records of other servers may still arrive.
+    uint64_t FirstLateId() const { return lastId_ > kLateIds ? lastId_ - kLateIds : 1; }
+
+    void NoteLateOnes() {
+        reader_.Scan({FirstLateId(), lastId_}, true, 0,
+                     [this](const _SYSLOG_LOG_DATA_tag &log) { seen_.insert(log.id); });
+    }
+
+    // The last seconds are read again, for what came late.
+    uint64_t PrintNewsOfCluster() {
+        uint64_t count = 0;
+        const auto format = [&](const _SYSLOG_LOG_DATA_tag &log) {
+            if (!seen_.insert(log.id).second)
+                return;
+            format_(log);
+            ++count;
+        };
+        const uint64_t newest = everything_.IdFromNewest(0);
+        if (newest != 0)
+            reader_.Scan({FirstLateId(), newest}, true, 0, format, print_);
+        lastId_ = std::max(lastId_, newest);
+        seen_.erase(seen_.begin(), seen_.lower_bound(FirstLateId()));
+        return count;
+    }
+
     const LogReader &reader_;
     LogReader everything_;
     const LogHandler &format_;
     const ChunkHandler &print_;
     std::optional<FileIdentity> file_; // the one that was read last
     uint64_t lastId_ = 0;
+    const bool isCluster_ = KELODBIsCluster(reader_.Table().path.c_str()) != 0;
+    std::set<uint64_t> seen_; // selected records of a cluster that may be read again
 };
 
 } // namespace

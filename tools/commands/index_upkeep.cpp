@@ -8,6 +8,7 @@
 #include <cstdlib>
 
 #include "base/errors.h"
+#include "keloplatform/cluster.h"
 #include "keloplatform/skip_index.h"
 #include "read/read_only_query.h"
 
@@ -46,8 +47,8 @@ bool MayWriteBeside(const std::string &path) {
 } // namespace
 
 void ExtendIndexLater(const LogTable &table) {
-    if (table.name != "logs" || std::getenv("KELO_SKIP_INDEX") != nullptr || !MayWriteBeside(table.path) ||
-        !IsBehind(table))
+    if (table.name != "logs" || std::getenv("KELO_SKIP_INDEX") != nullptr ||
+        KELODBIsCluster(table.path.c_str()) != 0 || !MayWriteBeside(table.path) || !IsBehind(table))
         return;
     const pid_t child = fork();
     if (child == 0) {

@@ -231,6 +231,7 @@ int Run(Options options, bool hasDb) {
         throw UsageError("FILE: '-' can be read only once");
     if (hasDb && options.db.empty())
         throw UsageError("--db: an empty path");
+    RequireDatabase(options.db, "parse --db");
     ApplyUtc(options.output.inUtc);
     ParseRun run(options);
     if (hasDb)

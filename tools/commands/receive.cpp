@@ -15,6 +15,7 @@
 #include "cli/exit_status.h"
 #include "cli/program.h"
 #include "commands/commands.h"
+#include "read/log_table.h"
 #include "receive/receiver.h"
 #include "receive/spool_receiver.h"
 
@@ -72,6 +73,7 @@ int RunOnSpool(const ReceiverOptions &options) {
 int Run(Options options, const std::string &root) {
     options.receiver.root = root;
     options.receiver.indexer = "/proc/self/exe";
+    RequireDatabase(options.receiver.database, "receive --db");
     options.receiver.notifyLimit = ParseNumber("--notify-limit", options.notifyLimit, 1, 100'000);
     options.receiver.deviceLimit = ParseNumber("--device-limit", options.deviceLimit, 1, 10'000'000);
     // A limit of the file size is handled like a full disk.

@@ -124,6 +124,7 @@ void AddReport(Program &program) {
     command.AddText("--events", options->events, "N", "List the newest N events (default: 100)");
     AddUtcOption(command, options->inUtc);
     AddTableOptions(command, options->table, false);
+    AddPartialOption(command, options->table);
     command.AddText("--events-db", options->eventsDb, "PATH", "This event database, not the server's own")
         .Group("Where to look");
 }

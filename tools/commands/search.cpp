@@ -146,6 +146,7 @@ void AddSearch(Program &program) {
                  "Cut messages to N bytes, at a whole character; in json 'length' is the length of all of it")
         .Group("How to print");
     AddTableOptions(command, options->table);
+    AddPartialOption(command, options->table);
 }
 
 } // namespace kelo::tool

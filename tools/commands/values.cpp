@@ -169,6 +169,7 @@ void AddValues(Program &program) {
                     "No heading in csv and spreadsheet, and of counts in text");
     AddUtcOption(command, options->inUtc);
     AddTableOptions(command, options->table, false);
+    AddPartialOption(command, options->table);
 }
 
 } // namespace kelo::tool

@@ -6,6 +6,8 @@
 #include <vector>
 
 #include "base/errors.h"
+#include "keloplatform/cluster.h"
+#include "read/read_only_query.h"
 
 namespace kelo::tool {
 namespace {
@@ -18,6 +20,8 @@ constexpr uint64_t kChunkRows = 10000;
 constexpr uint64_t kPageRows = kChunkRows;
 // Ids that one statement looks at, at most: of sparse ids, such as those made from a time.
 constexpr uint64_t kLargestSpan = uint64_t{1} << 60;
+// The ids of a minute of a cluster, whose ids are times.
+constexpr uint64_t kFirstSpanOfCluster = uint64_t{60} << KELODB_CLUSTER_BITS_BELOW_SECOND;
 // A count comes as an int; no range of this many ids can exceed it.
 constexpr uint64_t kCountableIds = std::numeric_limits<int32_t>::max();
 
@@ -91,7 +95,8 @@ uint64_t LogReader::EndId(const IdRange &range, bool isFirst) const {
 uint64_t LogReader::Scan(const IdRange &range, bool oldestFirst, uint64_t limit, const LogHandler &handle,
                          const ChunkHandler &chunkDone) const {
     IdRange rest = range;
-    uint64_t span = kChunkRows;
+    const bool isCluster = KELODBIsCluster(table_.path.c_str()) != 0;
+    uint64_t span = isCluster ? kFirstSpanOfCluster : kChunkRows;
     uint64_t total = 0;
     const auto moveTo = [&](uint64_t id) { (oldestFirst ? rest.first : rest.last) = id; };
     while (rest.first <= rest.last) {
@@ -105,12 +110,15 @@ uint64_t LogReader::Scan(const IdRange &range, bool oldestFirst, uint64_t limit,
         if (limit != 0 && total == limit)
             break;
         if (scanned.rows == maxRows) { // the rest of the range is still to come
+            if (isCluster)             // which may look at all rows of a range, whatever the limit
+                span = 2 * (oldestFirst ? scanned.lastId - chunk.first : chunk.last - scanned.lastId) +
+                       kChunkRows;
             moveTo(oldestFirst ? scanned.lastId + 1 : scanned.lastId - 1);
             continue;
         }
         moveTo(oldestFirst ? chunk.last + 1 : chunk.first - 1);
         if (scanned.rows < kChunkRows / 4)
-            span = std::min(4 * span, kLargestSpan);
+            span = std::min((isCluster ? 16 : 4) * span, kLargestSpan);
         if (scanned.rows > 0)
             continue;
         const uint64_t next = EndId(rest, oldestFirst); // over a gap, or to the next of rare matches
@@ -164,7 +172,19 @@ uint64_t LogReader::CountIn(const IdRange &range) const {
     return CountWith(conditions);
 }
 
+// In one statement, with a number of 64 bits: the ids of a cluster are far apart, and its rows may be many.
+uint64_t LogReader::CountOnCluster() const {
+    std::string clause;
+    if (LogSearchClauseGet(conditions_, clause) != 0)
+        throw DatabaseError(DescribeDatabaseProblem(table_));
+    const std::string where = clause.empty() ? "" : " WHERE " + clause;
+    return static_cast<uint64_t>(
+        ReadOnlyQuery(table_).Number("SELECT count(*) AS value FROM " + table_.name + where));
+}
+
 uint64_t LogReader::Count() const {
+    if (KELODBIsCluster(table_.path.c_str()) != 0)
+        return CountOnCluster();
     SyslogDBReader connection(table_.path);
     LogReader everything(table_, {});
     LogReader selected(table_, conditions_);

@@ -87,6 +87,7 @@ private:
     uint64_t IdAt(const Page &page) const;
     uint64_t EndId(const IdRange &range, bool isFirst) const;
     uint64_t CountWith(Conditions conditions) const;
+    uint64_t CountOnCluster() const;
 
     LogTable table_;
     Conditions conditions_;

@@ -13,6 +13,7 @@
 
 #include "base/errors.h"
 #include "base/files.h"
+#include "keloplatform/cluster.h"
 #include "kelosyslog/records.h"
 #include "read/failure_reason.h"
 
@@ -79,6 +80,8 @@ std::string ReasonFromOutside(const LogTable &table, bool forWriting) {
         return std::strerror(errno);
     if (size == 0)
         return "the file is empty";
+    if (KELODBIsCluster(table.path.c_str()) != 0)
+        return "";
     constexpr std::string_view kMagic("SQLite format 3\0", 16);
     if (std::memcmp(header.data(), kMagic.data(), kMagic.size()) != 0)
         return "it is not an SQLite database (or an encrypted one)";
@@ -137,7 +140,15 @@ LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root
     if (!options.table.empty())
         table.name = options.table;
     table.kind = KindOf(table.name);
+    if (options.partial && KELODBIsCluster(table.path.c_str()) == 0)
+        throw UsageError("--partial: " + table.path + " does not describe a cluster");
+    KELODBClusterPartialSet(options.partial ? 1 : 0);
     return table;
+}
+
+void RequireDatabase(const std::string &path, const std::string &what) {
+    if (KELODBIsCluster(path.c_str()) != 0)
+        throw DatabaseError(path + " describes a cluster: " + what + " needs a database of SQLite");
 }
 
 std::string ArchiveFolderPath(const std::string &root) {

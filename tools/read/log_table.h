@@ -26,6 +26,7 @@ struct LogTableOptions {
     std::string db;
     std::string log;
     std::string table;
+    bool partial = false; // --partial
 };
 
 // The table to read: a file by its path (relative to the working folder), or a fixed log by its name, whose
@@ -33,6 +34,9 @@ struct LogTableOptions {
 // logs, or else an archive in the folder of the archives by its file name, with or without ".db". Nothing is
 // opened. Throws UsageError for an unknown log or table.
 LogTable ResolveLogTable(const LogTableOptions &options, const std::string &root);
+
+// Throws DatabaseError if the file at `path` describes a cluster, which `what` ("archive") cannot use.
+void RequireDatabase(const std::string &path, const std::string &what);
 
 // The folder of the archives below `root`.
 std::string ArchiveFolderPath(const std::string &root);
