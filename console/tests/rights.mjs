@@ -16,7 +16,7 @@ const SERVER = `unshare --mount --propagation private bash -euc '
     chown 4001:4001 "$root/reader"; chown 4002:4002 "$root/guest"
     printf "[WebService]\\nLoginTitle=kelosyslog\\n" >"$etc/cockpit/cockpit.conf"
     mount --bind "$etc" /etc
-    mkdir -p "$root/packages" "$root/work"
+    mkdir -p "$root/packages"
     cp -r /usr/share/cockpit/. "$root/packages"
     cp -rL "$home/.local/share/cockpit/kelosyslog" "$root/packages/kelosyslog"
     mount --bind "$root/packages" /usr/share/cockpit
