@@ -8,6 +8,8 @@
 //     ... search ...
 //     if (KELODBClusterMissingGet()[0] != '\0')
 //         Warn(KELODBClusterMissingGet());
+//
+// Threads: the functions may be called from any thread; what they set and answer is the calling thread's own.
 
 #include "keloplatform/export.h"
 

@@ -57,6 +57,8 @@ TEST_F(Forms, AreJsonForEveryCommandThatPrints) {
         {"retention", {"--dry-run", "--yes"}},
         {"listen", {""}},
         {"status", {""}},
+        {"cluster", {}},
+        {"cluster init", {"new --shard a"}},
     };
     CreateLogDatabase(root_.File("archive.db"), "archive.sql");
     CreateLogDatabase(root_.File("copy.db"));

@@ -73,6 +73,7 @@ const Case kCases[] = {
     {"db quarantine", "--force --yes", "l"},
     {"db reopen", "", ""},
     {"rules", "list", ""},
+    {"cluster init", "new --shard a", ""},
     {"listen", "", ""},
     {"notify", "list", ""},
 };

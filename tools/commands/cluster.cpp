@@ -11,7 +11,8 @@
 #include "cli/exit_status.h"
 #include "cluster/cluster_files.h"
 #include "commands/commands.h"
-#include "print/output.h"
+#include "commands/common_options.h"
+#include "print/action_lines.h"
 
 namespace kelo::tool {
 namespace {
@@ -31,6 +32,7 @@ constexpr const char *kFooter =
 
 struct Options {
     std::string folder;
+    std::string format = "text";
     ClusterLayoutOptions layout;
 };
 
@@ -43,9 +45,9 @@ void MakeFolder(const std::string &path) {
 int Init(const Options &options) {
     if (options.layout.shards.empty())
         throw UsageError("cluster init: no --shard");
+    ActionLines lines(ParseKeyValuesFormat(options.format));
     const ClusterLayout layout = ReadClusterLayout(options.layout);
     MakeFolder(options.folder);
-    std::string written;
     for (const ClusterFile &made : MakeClusterFiles(layout)) {
         const std::string path = options.folder + "/" + made.path;
         std::error_code error;
@@ -57,11 +59,9 @@ int Init(const Options &options) {
         file.Commit();
         if (chmod(path.c_str(), made.isSecret ? 0640 : 0644) != 0)
             file.Fail(std::strerror(errno));
-        written += path + "\n";
+        lines.Add(path);
     }
-    Output output(false);
-    output.Write(written);
-    output.Finish();
+    lines.End();
     return kExitFound;
 }
 
@@ -70,6 +70,7 @@ int Init(const Options &options) {
 void AddCluster(Program &program) {
     Command cluster =
         program.Top().AddBelow("cluster", "Set up a cluster of servers instead of one database");
+    cluster.NeedBelow(1, 1);
     auto options = std::make_shared<Options>();
     Command command = AddSubcommand(program, cluster, "init", "Write the files of a new cluster",
                                     [options] { return Init(*options); });
@@ -84,6 +85,7 @@ void AddCluster(Program &program) {
     command.AddText("--http-port", options->layout.httpPort, "PORT", "Where readers connect (default: 8123)");
     command.AddText("--native-port", options->layout.nativePort, "PORT",
                     "Where the servers connect to each other (default: 9000)");
+    AddKeyValuesFormat(command, options->format);
 }
 
 } // namespace kelo::tool
