@@ -44,13 +44,14 @@ void SaveRules(SqliteConnection &database, const RuleMemory &memory) {
     SqliteStatement insert(database, "INSERT INTO spool_rule VALUES(?1,?2,?3,?4,?5,?6,?7,?8)");
     RateLimiter::Counts rules = memory.limit.raised; // every rule that was suppressed was raised before
     rules.insert(memory.limit.toTell.begin(), memory.limit.toTell.end());
+    const RuleMatch none; // what is bound must stay until the statement has run
     for (const auto &[rule, ignored] : rules) {
         const auto last = memory.suppressed.find(rule);
         insert.Bind(1, rule);
         insert.Bind(2, CountOf(memory.limit.raised, rule));
         insert.Bind(3, CountOf(memory.limit.suppressed, rule));
         insert.Bind(4, CountOf(memory.limit.toTell, rule));
-        BindMatch(insert, 5, last != memory.suppressed.end() ? last->second : RuleMatch{});
+        BindMatch(insert, 5, last != memory.suppressed.end() ? last->second : none);
         insert.Run();
     }
 }
