@@ -44,7 +44,7 @@ void SaveRules(SqliteConnection &database, const RuleMemory &memory) {
     SqliteStatement insert(database, "INSERT INTO spool_rule VALUES(?1,?2,?3,?4,?5,?6,?7,?8)");
     RateLimiter::Counts rules = memory.limit.raised; // every rule that was suppressed was raised before
     rules.insert(memory.limit.toTell.begin(), memory.limit.toTell.end());
-    const RuleMatch none; // what is bound must stay until the statement has run
+    const RuleMatch none{}; // what is bound must stay until the statement has run
     for (const auto &[rule, ignored] : rules) {
         const auto last = memory.suppressed.find(rule);
         insert.Bind(1, rule);
