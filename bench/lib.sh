@@ -39,7 +39,7 @@ END
 rsyslog_unpack() {
     mkdir "$root/packages"
     (
-        cd "$root/packages"
+        cd "$root/packages" || exit
         apt-get download -o APT::Sandbox::User=root rsyslog libestr0 libfastjson4 liblognorm5 >/dev/null 2>&1 &&
             for package in *.deb; do dpkg-deb -x "$package" unpacked || exit 1; done
     )

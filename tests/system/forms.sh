@@ -8,7 +8,7 @@ for priority in {0..200} 007 1000; do
 done >"$root/messages"
 times=('Feb  1 10:00:00' 'Feb 01 10:00:00' 'Feb 31 23:59:59' 'Feb 32 10:00:00' 'Feb  1 24:00:00' 'Feb  1 10:00:60' 'Feb  1 10:00:00.123'
     'Feb  1 2026 10:00:00' 'Feb  1 10:00:00 2026' 'Feb  1 10:00:00 2026:' 'Xyz  1 10:00:00' 'feb  1 10:00:00' '2026-02-01T10:00:00Z')
-hosts=(host HOST-1.example.org 10.0.0.1 2026 2026.a 1.2 _h fe80::1 h@x h,x 'h x' last Last 'last message repeated' message '' - ü)
+hosts=(host HOST-1.example.org 10.0.0.1 2026 2026.a 1.2 _h fe80::1 h@x 'h,x' 'h x' last Last 'last message repeated' message '' - ü)
 programs=('p[1]:' p: 'p[1]' 'p[a]:' 'p[]:' 'p[1]]:' 'p[1]x:' 'p:x' 'p :' /usr/sbin/p: a/b.c-d_e: -: %ASA-1: 'p(1):' ü: 'forwarded from x:' "$(printf 'p%.0s' {1..300}):")
 stamps=(2026-02-01T10:00:00Z 2026-02-01T10:00:00.123456+01:00 2026-02-31T10:00:00Z 2026-13-01T10:00:00Z 2026-02-01T10:00:60Z
     2026-02-01T10:00:00 2026-02-01T10:00:00.1234567Z 2026-02-01T10:00:00+14:59 2026-02-01T10:00:00-00:00 - x)
@@ -45,7 +45,7 @@ for store in database spool; do
     syslog_ng_start "$root"
     send_lines "$root/messages"
     send_frames "$root/frames"
-    landed $total
+    landed "$total"
     query 'SELECT host, fac, prio, llevel, tag, prog, hex(msg) FROM logs ORDER BY 7, 6, 1' >"$root/$store"
     syslog_ng_stop "$root"
 done

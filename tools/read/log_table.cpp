@@ -113,7 +113,7 @@ std::string ArchivePath(const std::string &name, const std::string &root) {
     const bool isPlain = name.find('/') == std::string::npos && name.front() != '.';
     for (const char *suffix : {"", ".db"}) {
         std::error_code error;
-        const std::string path = folder + "/" + name + suffix;
+        std::string path = folder + "/" + name + suffix;
         if (isPlain && std::filesystem::is_regular_file(path, error))
             return path;
     }
