@@ -4,9 +4,8 @@
 #include <string>
 #include <string_view>
 
-#include "db/raise_error.h"
+#include "db/other_way.h"
 #include "db/statement.h"
-#include "db/transaction.h"
 #include "skip_index/database_state.h"
 #include "skip_index/skip_index.h"
 #include "skip_index/sql_tokens.h"
@@ -151,21 +150,12 @@ std::optional<bool> RunDistinctValues(sqlite3 *db, const char *sql, const PageBo
     if (column.empty() || IsSwitchedOff() || sqlite3_get_autocommit(db) == 0 ||
         sqlite3_txn_state(db, "main") != SQLITE_TXN_NONE)
         return std::nullopt;
-    bool isInterrupted = false;
-    {
-        Transaction transaction(db, "BEGIN");
-        const std::string index = transaction.IsOpen() ? IndexOf(db, sql) : "";
-        if (index.empty() || !IsPlain(db, index, column))
-            return std::nullopt;
-        if (Values(db, column, page, rows).Collect() && transaction.Commit())
-            return true;
-        isInterrupted = sqlite3_errcode(db) == SQLITE_INTERRUPT;
-    }
-    rows.reset();
-    if (!isInterrupted)
-        return std::nullopt; // the statement itself shall report its error
-    RaiseError(db, SQLITE_INTERRUPT, "interrupted");
-    return false;
+    const auto isPossible = [&] {
+        const std::string index = IndexOf(db, sql);
+        return !index.empty() && IsPlain(db, index, column);
+    };
+    return AnswerInOtherWay(
+        db, "BEGIN", isPossible, [&] { return Values(db, column, page, rows).Collect(); }, rows);
 }
 
 } // namespace kelo::platform

@@ -6,9 +6,8 @@
 #include <utility>
 #include <vector>
 
-#include "db/raise_error.h"
+#include "db/other_way.h"
 #include "db/statement.h"
-#include "db/transaction.h"
 #include "skip_index/search_plan.h"
 
 namespace kelo::platform {
@@ -144,20 +143,12 @@ std::optional<bool> RunIndexedSearch(sqlite3 *db, const char *sql, const PageBou
     if (!fits)
         return std::nullopt;
     const int64_t pageRows = page != nullptr && page->limit != 0 ? int64_t{page->limit} + page->offset : 0;
-    bool isInterrupted = false;
-    {
-        Transaction transaction(db, isDeletion ? "BEGIN IMMEDIATE" : "BEGIN");
-        if (!transaction.IsOpen() || !plan->IsWorthwhile(pageRows))
-            return std::nullopt;
-        if (RunPlan(db, *plan, page != nullptr ? *page : PageBounds{0, 0}, rows) && transaction.Commit())
-            return true;
-        isInterrupted = sqlite3_errcode(db) == SQLITE_INTERRUPT;
-    }
-    rows.reset();
-    if (!isInterrupted)
-        return std::nullopt; // the statement itself shall report its error
-    RaiseError(db, SQLITE_INTERRUPT, "interrupted");
-    return false;
+    return AnswerInOtherWay(
+        db, isDeletion ? "BEGIN IMMEDIATE" : "BEGIN", [&] { return plan->IsWorthwhile(pageRows); },
+        [&] {
+            return RunPlan(db, *plan, page != nullptr ? *page : PageBounds{0, 0}, rows);
+        },
+        rows);
 }
 
 } // namespace kelo::platform
