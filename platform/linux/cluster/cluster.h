@@ -35,6 +35,14 @@ public:
     // far are no answer. Also throws what `rows` throws.
     void Run(std::string_view sql, const std::optional<Page> &page, RowTaker &rows);
 
+    const std::vector<std::string> &Servers() const { return configuration_.urls; }
+
+    // Sends a statement of the engine to one server, as it is and once. Throws ClusterError, and what `take`
+    // throws.
+    void RunAsItIs(size_t server, std::string_view statement, const HttpClient::Taker &take) {
+        Client().RunOnce(configuration_.urls.at(server), configuration_.user, statement, take);
+    }
+
 private:
     void Ask(const std::string &sql, size_t columns, RowTaker &rows);
     void AskAs(const std::string &user, const std::string &sql, size_t columns, RowTaker &rows);

@@ -13,7 +13,7 @@ constexpr long kConnectTimeoutSec = 5;
 constexpr long kOk = 200;
 constexpr size_t kMaxErrorBytes = 64 << 10;
 // The server sends nothing before the statement has succeeded, so that an error comes as one.
-constexpr char kWhole[] = "/?wait_end_of_query=1&buffer_size=1048576";
+constexpr char kWhole[] = "/?wait_end_of_query=1&buffer_size=1048576&database=";
 
 } // namespace
 
@@ -74,16 +74,23 @@ size_t HttpClient::TakeBytes(char *bytes, size_t size, size_t count, void *trans
     }
 }
 
-void HttpClient::Run(const std::string &url, const std::string &user, const std::string &statement,
+void HttpClient::RunOnce(const std::string &url, const std::string &user, std::string_view statement,
+                         const Taker &take) {
+    Set(CURLOPT_FRESH_CONNECT, 1L);
+    Run(url, user, statement, take);
+}
+
+void HttpClient::Run(const std::string &url, const std::string &user, std::string_view statement,
                      const Taker &take) {
     Transfer transfer{*this, take, {}};
-    Set(CURLOPT_URL, (url + kWhole).c_str());
+    Set(CURLOPT_URL, (url + kWhole + configuration_.database).c_str());
     Set(CURLOPT_USERNAME, user.c_str());
     Set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(statement.size()));
-    Set(CURLOPT_POSTFIELDS, statement.c_str());
+    Set(CURLOPT_POSTFIELDS, statement.data());
     Set(CURLOPT_WRITEDATA, &transfer);
     reason_[0] = '\0';
     const CURLcode code = curl_.perform(handle_.get());
+    Set(CURLOPT_FRESH_CONNECT, 0L);
     long status = 0;
     curl_off_t sent = 0;
     curl_.getInfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);

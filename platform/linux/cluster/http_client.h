@@ -22,8 +22,11 @@ public:
 
     // Runs a statement on the server at `url` as `user` and hands its answer over, part by part. Throws
     // ClusterError, also when the answer breaks off: what was taken until then is no answer.
-    void Run(const std::string &url, const std::string &user, const std::string &statement,
-             const Taker &take);
+    void Run(const std::string &url, const std::string &user, std::string_view statement, const Taker &take);
+
+    // The same on a new connection: on an open one that breaks, libcurl sends a statement again.
+    void RunOnce(const std::string &url, const std::string &user, std::string_view statement,
+                 const Taker &take);
 
     // Whether the last Run failed before the server had the statement.
     bool HasNotSent() const { return hasNotSent_; }

@@ -1,5 +1,6 @@
 #include "db/cluster_connection.h"
 
+#include <algorithm>
 #include <string_view>
 #include <utility>
 
@@ -90,6 +91,33 @@ bool RunOnCluster(DBConnect_tag &connection, const char *sql, const PageBounds *
 }
 
 } // namespace kelo::platform
+
+const char *KELODBClusterServerGet(DBConnect_tag *connection, unsigned int server) {
+    if (connection == nullptr || connection->cluster == nullptr ||
+        server >= connection->cluster->Servers().size())
+        return nullptr;
+    return connection->cluster->Servers()[server].c_str();
+}
+
+int KELODBClusterRun(DBConnect_tag *connection, unsigned int server, const char *statement, size_t size,
+                     KELODBCLUSTERTAKER take, void *context) {
+    using namespace kelo::platform;
+    if (KELODBClusterServerGet(connection, server) == nullptr || statement == nullptr)
+        return Fail(KELO_FAILURE_ARGUMENT, "KELODBClusterRun", "", "no such server of a cluster");
+    try {
+        connection->cluster->RunAsItIs(server, {statement, size}, [&](std::string_view part) {
+            if (take != nullptr && take(part.data(), part.size(), context) != 0)
+                throw ClusterError(KELO_FAILURE_OTHER, "its answer was not wanted");
+        });
+        return 0;
+    } catch (const ClusterError &error) {
+        RaiseError(connection->db, CodeOf(error.kind), error.what());
+    } catch (const std::bad_alloc &) {
+        RaiseError(connection->db, SQLITE_NOMEM, "out of memory");
+    }
+    constexpr size_t kShown = 200; // of a statement that may be followed by data
+    return FailStatement(connection->db, {statement, std::min(size, kShown)});
+}
 
 int KELODBIsCluster(const char *path) {
     if (path == nullptr || path[0] == '\0')
