@@ -1,4 +1,4 @@
-option(KELO_UNITY "Compile the sources of each folder as one, which halves the time of a whole build; for packages, not for developing" OFF)
+option(KELO_UNITY "Compile the sources of each folder as one, and the header of the tests once: a whole build takes half the time; not for developing" OFF)
 
 # kelo_unity(TARGET): with KELO_UNITY, one compilation for each folder of the target's sources. So a name in an unnamed namespace
 # is unique within its folder, or the build of the packages fails. Called when all sources are known.
