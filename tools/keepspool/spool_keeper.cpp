@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <sstream>
 
 namespace kelo::tool {
@@ -16,6 +17,11 @@ namespace {
 // written after this time.
 constexpr int64_t kRestSec = 5;
 constexpr const char *kAside = ".done-";
+
+// Says how the file is read, so it stays.
+std::string ExtensionOf(const std::string &name) {
+    return std::filesystem::path(name).extension().string();
+}
 
 // Also when the clock was set back since.
 bool IsLongAgo(int64_t time, int64_t now) {
@@ -89,7 +95,7 @@ void SpoolKeeper::Remove(const std::string &name, const struct stat &status, con
     if (name.starts_with(kAside))
         synced_.erase(files.Remove(name) ? status.st_ino : 0);
     else
-        files.Rename(name, files, kAside + std::to_string(status.st_ino));
+        files.Rename(name, files, kAside + std::to_string(status.st_ino) + ExtensionOf(name));
 }
 
 // Whether no process can write the file: only then a lease for reading is given. Where the file system has no

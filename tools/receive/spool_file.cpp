@@ -11,6 +11,9 @@
 namespace kelo::tool {
 namespace {
 
+// The end of the names of files that recover-buffer makes out of messages for sql().
+constexpr const char *kCounted = ".counted";
+
 size_t ReadAt(int file, char *buffer, size_t bytes, uint64_t offset) {
     ssize_t count = 0;
     do
@@ -26,6 +29,9 @@ size_t ReadAt(int file, char *buffer, size_t bytes, uint64_t offset) {
 SpoolFile::SpoolFile(FileHandle opened, const struct stat &status, std::string itsName)
     : file(std::move(opened)), inode(status.st_ino), name(std::move(itsName)) {
     Refresh();
+    isCounted = name.ends_with(kCounted);
+    if (isCounted)
+        Of(SpoolReader::kCounts) = {size, size};
 }
 
 std::string_view SpoolFile::Read(std::string &buffer, uint64_t limit) const {

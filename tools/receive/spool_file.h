@@ -59,6 +59,7 @@ struct SpoolFile {
     int64_t modified = 0; // seconds since the epoch
     bool isRemoved = false;
     bool isForeign = false; // of another version: nothing of it is read
+    bool isCounted = false; // counted and checked before it came into the spool: only its rows are missing
     uint64_t position = 0;  // everything before has been read
     Progress progress[kReaders];
     SpoolParser parser;

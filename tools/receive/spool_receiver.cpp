@@ -301,9 +301,12 @@ void SpoolReceiver::PutAside(const SpoolFile &file, const char *reason, std::str
 
 // Before the batch is stored: what the rules make of it is part of its transaction.
 void SpoolReceiver::CheckRules() {
-    for (const _SYSLOG_LOG_DATA_tag &log : writer_.Records()) {
-        rules_.CountForEps(log.utcsec, now_ / kSecondMs);
-        rules_.Check(log, now_ / kSecondMs);
+    const std::span<const _SYSLOG_LOG_DATA_tag> logs = writer_.Records();
+    for (size_t i = 0; i < logs.size(); ++i) {
+        if (sources_[i].file->isCounted)
+            continue;
+        rules_.CountForEps(logs[i].utcsec, now_ / kSecondMs);
+        rules_.Check(logs[i], now_ / kSecondMs);
     }
 }
 
