@@ -40,5 +40,7 @@ CREATE TABLE IF NOT EXISTS kelo.logs (
     ldate String,
     ltime String,
     prog String,
-    msg String
+    msg String,
+    node UInt8,
+    rcptid UInt64
 ) ENGINE = Distributed({cluster}, kelo, logs_shard);

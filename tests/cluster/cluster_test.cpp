@@ -487,5 +487,6 @@ int main(int argc, char **argv) {
     }
     World everything;
     world = &everything;
+    sharedServers = &everything.servers;
     return RUN_ALL_TESTS();
 }

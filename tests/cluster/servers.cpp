@@ -48,11 +48,14 @@ constexpr char kUsers[] =
     "</password><networks><ip>127.0.0.0/8</ip></networks><profile>default</profile><quota>default</quota>"
     "</default></users><quotas><default></default></quotas></yandex>\n";
 
+// Not 127.0.0.1, which every server would take for its own.
 std::string AddressOf(size_t server) {
-    return "127.0.0." + std::to_string(server + 1);
+    return "127.0.0." + std::to_string(server + 2);
 }
 
 } // namespace
+
+Servers *sharedServers = nullptr;
 
 bool Servers::AreInstalled() {
     return RunIn("/", "command -v clickhouse-server >/dev/null").status == 0;
@@ -60,8 +63,8 @@ bool Servers::AreInstalled() {
 
 Servers::Servers() : ports_(FreePorts(3)) {
     const ProgramResult made =
-        RunIn(root_.Path(), "exec kelosyslog cluster init new --shard 127.0.0.1 --shard 127.0.0.2 "
-                            "--http-port " +
+        RunIn(root_.Path(), "exec kelosyslog cluster init new --shard 127.0.0.2 --shard 127.0.0.3 "
+                            "--network 127.0.0.1 --http-port " +
                                 std::to_string(ports_[0]) + " --native-port " + std::to_string(ports_[1]));
     if (made.status != 0)
         throw std::runtime_error("cluster init: " + made.err);

@@ -27,6 +27,7 @@ public:
 
     // A file that "kelosyslog cluster init" made.
     std::string Made(const std::string &name) const { return root_.File("new/" + name); }
+    int HttpPort() const { return ports_[0]; }
     std::string Url(size_t server) const;
     std::string NativeAddress(size_t server) const;
 
@@ -38,5 +39,8 @@ private:
     std::vector<int> ports_; // HTTP, native and between servers
     std::unique_ptr<ChildProgram> programs_[kServers];
 };
+
+// The servers that all tests of the program share.
+extern Servers *sharedServers;
 
 } // namespace kelo::test

@@ -59,6 +59,8 @@ TEST_F(Forms, AreJsonForEveryCommandThatPrints) {
         {"status", {""}},
         {"cluster", {}},
         {"cluster init", {"new --shard a"}},
+        {"cluster import", {}}, // needs servers, which tests/cluster has
+        {"cluster export", {}},
     };
     CreateLogDatabase(root_.File("archive.db"), "archive.sql");
     CreateLogDatabase(root_.File("copy.db"));

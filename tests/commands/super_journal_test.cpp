@@ -74,6 +74,8 @@ const Case kCases[] = {
     {"db reopen", "", ""},
     {"rules", "list", ""},
     {"cluster init", "new --shard a", ""},
+    {"cluster import", "var/log/kelosyslog/logs.db --node 1 --db cluster.conf", "l"},
+    {"cluster export", "var/log/kelosyslog/logs.db --db cluster.conf", "l"},
     {"listen", "", ""},
     {"notify", "list", ""},
 };
@@ -159,6 +161,8 @@ TEST_F(SuperJournal, IsLeftAloneByEveryCommand) {
     ASSERT_EQ(chmod(root_.Path().c_str(), 0755), 0); // for the other users
     WriteFile(root_.File("lines"), LogLines(1, 2));
     WriteFile(root_.File("etc/kelosyslog/retention.conf"), "keep=\"1d\"\n");
+    WriteFile(root_.File("cluster.conf"), "[cluster]\nurl=http://127.0.0.1:1\nuser=u\n");
+    ASSERT_EQ(chmod(root_.File("cluster.conf").c_str(), 0600), 0);
     for (const std::string mode : {"WAL", "DELETE"}) {
         SCOPED_TRACE(mode);
         Build(mode);

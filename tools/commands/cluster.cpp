@@ -10,6 +10,7 @@
 #include "base/errors.h"
 #include "cli/exit_status.h"
 #include "cluster/cluster_files.h"
+#include "commands/cluster_transfer.h"
 #include "commands/commands.h"
 #include "commands/common_options.h"
 #include "print/action_lines.h"
@@ -69,7 +70,7 @@ int Init(const Options &options) {
 
 void AddCluster(Program &program) {
     Command cluster =
-        program.Top().AddBelow("cluster", "Set up a cluster of servers instead of one database");
+        program.Top().AddBelow("cluster", "Set up a cluster of servers instead of one database, and move records");
     cluster.NeedBelow(1, 1);
     auto options = std::make_shared<Options>();
     Command command = AddSubcommand(program, cluster, "init", "Write the files of a new cluster",
@@ -86,6 +87,7 @@ void AddCluster(Program &program) {
     command.AddText("--native-port", options->layout.nativePort, "PORT",
                     "Where the servers connect to each other (default: 9000)");
     AddKeyValuesFormat(command, options->format);
+    AddClusterTransfer(program, cluster);
 }
 
 } // namespace kelo::tool

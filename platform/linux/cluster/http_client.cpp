@@ -77,6 +77,7 @@ size_t HttpClient::TakeBytes(char *bytes, size_t size, size_t count, void *trans
 void HttpClient::RunOnce(const std::string &url, const std::string &user, std::string_view statement,
                          const Taker &take) {
     Set(CURLOPT_FRESH_CONNECT, 1L);
+    Set(CURLOPT_FORBID_REUSE, 1L);
     Run(url, user, statement, take);
 }
 
@@ -91,6 +92,7 @@ void HttpClient::Run(const std::string &url, const std::string &user, std::strin
     reason_[0] = '\0';
     const CURLcode code = curl_.perform(handle_.get());
     Set(CURLOPT_FRESH_CONNECT, 0L);
+    Set(CURLOPT_FORBID_REUSE, 0L);
     long status = 0;
     curl_off_t sent = 0;
     curl_.getInfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);

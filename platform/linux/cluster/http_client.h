@@ -24,7 +24,7 @@ public:
     // ClusterError, also when the answer breaks off: what was taken until then is no answer.
     void Run(const std::string &url, const std::string &user, std::string_view statement, const Taker &take);
 
-    // The same on a new connection: on an open one that breaks, libcurl sends a statement again.
+    // The same on a connection of its own: on an open one that breaks, libcurl sends a statement again.
     void RunOnce(const std::string &url, const std::string &user, std::string_view statement,
                  const Taker &take);
 
