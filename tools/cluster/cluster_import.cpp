@@ -107,7 +107,7 @@ ClusterImportResult ImportIntoCluster(const ClusterImportOrder &order) {
     EngineServers servers(order.cluster, "--db");
     BlockTransfer transfer(servers, order.node);
     SqliteConnection database(order.database,
-                              {.mode = SqliteMode::kRead, .heedsStopSignals = true, .trustsSchema = false});
+                              {.mode = SqliteMode::kWrite, .heedsStopSignals = true, .trustsSchema = false});
     ClusterImportResult result;
     BlockReader reader(database, result);
     const uint64_t total = reader.IdsBehind();
