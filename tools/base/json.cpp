@@ -37,11 +37,15 @@ std::string WriteJsonLine(const Json::Value &value, JsonTexts texts) {
     return EscapeDirections(Json::writeString(builder, value)) + "\n";
 }
 
-void JsonObject::AddName(std::string_view name) {
+JsonName::JsonName(std::string_view name) {
+    AppendJsonString(text_, name);
+}
+
+void JsonObject::AddName(const JsonName &name) {
     out_ += std::exchange(separator_, ',');
     if (layout_ == Layout::kLineEach)
         out_ += "\n  ";
-    AppendJsonString(out_, name);
+    out_ += name.text_;
     out_ += layout_ == Layout::kLineEach ? ": " : ":";
 }
 
@@ -51,13 +55,16 @@ void JsonObject::End() {
     out_ += layout_ == Layout::kLineEach ? "\n}\n" : "}";
 }
 
-void JsonObject::Add(std::string_view name, std::string_view text) {
+void JsonObject::Add(const JsonName &name, std::string_view text) {
     AddName(name);
-    if (!AppendJsonString(out_, text))
-        AddJson(std::string(name) + "_base64", '"' + Base64(text) + '"');
+    if (AppendJsonString(out_, text))
+        return;
+    JsonName bytes = name;
+    bytes.text_.insert(bytes.text_.size() - 1, "_base64");
+    AddJson(bytes, '"' + Base64(text) + '"');
 }
 
-void JsonObject::AddJson(std::string_view name, std::string_view json) {
+void JsonObject::AddJson(const JsonName &name, std::string_view json) {
     AddName(name);
     out_ += json;
 }

@@ -17,6 +17,16 @@ enum class JsonTexts { kUtf8, kAscii };
 // UTF-8 become U+FFFD, and fractions have up to two decimals.
 std::string WriteJsonLine(const Json::Value &value, JsonTexts texts = JsonTexts::kUtf8);
 
+// The name of a member, escaped once for all the objects that have it.
+class JsonName {
+public:
+    explicit JsonName(std::string_view name);
+
+private:
+    friend class JsonObject;
+    std::string text_; // with its quotes
+};
+
 // Appends an object with its members in the order of the calls; Json::Value would sort them.
 class JsonObject {
 public:
@@ -24,13 +34,15 @@ public:
 
     explicit JsonObject(std::string &out, Layout layout = Layout::kOneLine) : out_(out), layout_(layout) {}
     // A text; of one that is no UTF-8, the member "NAME_base64" behind it has the bytes.
-    void Add(std::string_view name, std::string_view text);
+    void Add(const JsonName &name, std::string_view text);
+    void Add(std::string_view name, std::string_view text) { Add(JsonName(name), text); }
     // A value that is JSON: a number, true, null.
-    void AddJson(std::string_view name, std::string_view json);
+    void AddJson(const JsonName &name, std::string_view json);
+    void AddJson(std::string_view name, std::string_view json) { AddJson(JsonName(name), json); }
     void End();
 
 private:
-    void AddName(std::string_view name);
+    void AddName(const JsonName &name);
 
     std::string &out_;
     Layout layout_;

@@ -7,6 +7,8 @@
 #include <cstdint>
 #include <cstdio>
 
+#include "base/byte_scan.h"
+
 namespace kelo::tool {
 namespace {
 
@@ -27,17 +29,30 @@ Character TakeCharacter(const char *&at, const char *end, const char *&checked) 
     return {byte, byte < 0x80};
 }
 
+// What most texts have none of: characters that are not ASCII or are not printed.
+constexpr auto kIsUnusual = [](auto bytes) { return (bytes < 0x20) | (bytes >= 0x7f); };
+constexpr auto kIsUnusualInJson = [](auto bytes) {
+    return (bytes < 0x20) | (bytes >= 0x7f) | (bytes == '"') | (bytes == '\\');
+};
+constexpr auto kIsSpecialInCsv = [](auto bytes) {
+    return (bytes == ',') | (bytes == '"') | (bytes == '\r') | (bytes == '\n');
+};
+
 // Appends the text: the characters that `isPlain` accepts as they are, the rest as `escape` appends it.
-template <typename IsPlain, typename Escape>
-void AppendEscaped(std::string &out, std::string_view text, IsPlain isPlain, Escape escape) {
+// `isUnusual` is true for all bytes of the rest, and those that are not ASCII.
+template <typename IsUnusual, typename IsPlain, typename Escape>
+void AppendEscaped(std::string &out, std::string_view text, IsUnusual isUnusual, IsPlain isPlain,
+                   Escape escape) {
+    if (IsFreeOf(text, isUnusual)) {
+        out += text;
+        return;
+    }
     const char *at = text.data();
     const char *const end = at + text.size();
     const char *plain = at; // where the plain characters before `at` begin
     const char *checked = at;
     while (at != end) {
-        // Most bytes are ASCII.
-        while (at != end && static_cast<uint8_t>(*at) < 0x80 && isPlain(static_cast<uint8_t>(*at)))
-            ++at;
+        at = FindSpecial(at, end, isUnusual);
         if (at == end)
             break;
         const char *const start = at;
@@ -99,20 +114,16 @@ bool IsFormula(std::string_view text) {
 }
 
 void AppendCsvField(std::string &out, std::string_view text) {
-    const auto isSpecial = [](char byte) {
-        return byte == ',' || byte == '"' || byte == '\r' || byte == '\n';
-    };
-    if (std::none_of(text.begin(), text.end(), isSpecial)) {
+    if (IsFreeOf(text, kIsSpecialInCsv)) {
         out += text;
         return;
     }
     out += '"';
-    for (const char byte : text) {
-        if (byte == '"')
-            out += '"';
-        out += byte;
+    for (size_t quote = 0; (quote = text.find('"')) != std::string_view::npos;) {
+        out.append(text.substr(0, quote + 1)) += '"';
+        text.remove_prefix(quote + 1);
     }
-    out += '"';
+    out.append(text) += '"';
 }
 
 } // namespace
@@ -121,7 +132,7 @@ std::string EscapeForTerminal(std::string_view text) {
     std::string out;
     out.reserve(text.size());
     const auto isPlain = [](uint32_t code) { return !IsControl(code) && !TurnsDirection(code); };
-    AppendEscaped(out, text, isPlain, [&](Character character) {
+    AppendEscaped(out, text, kIsUnusual, isPlain, [&](Character character) {
         if (const char escape = ShortEscape(character.code); escape != 0)
             (out += '\\') += escape;
         else
@@ -164,7 +175,7 @@ bool AppendJsonString(std::string &out, std::string_view text) {
         return code != '"' && code != '\\' && !IsControl(code) && (code < 0x80 || !Misleads(code));
     };
     out += '"';
-    AppendEscaped(out, text, isPlain, [&](Character character) {
+    AppendEscaped(out, text, kIsUnusualInJson, isPlain, [&](Character character) {
         isExact = isExact && character.isValid;
         if (!character.isValid)
             out += "\xef\xbf\xbd";
@@ -209,7 +220,7 @@ std::string EscapeMarkup(std::string_view text, std::string_view characters) {
 std::string EscapeDirections(std::string_view json) {
     std::string out;
     const auto isPlain = [](uint32_t code) { return !Misleads(code); };
-    AppendEscaped(out, json, isPlain, [&](Character character) {
+    AppendEscaped(out, json, [](auto bytes) { return bytes >= 0x80; }, isPlain, [&](Character character) {
         if (character.isValid)
             AppendEscape(out, "\\u%04x", character.code);
         else
@@ -218,20 +229,30 @@ std::string EscapeDirections(std::string_view json) {
     return out;
 }
 
-void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, CsvStyle style) {
-    for (const std::string &field : fields) {
-        if (&field != &fields.front())
-            out += ',';
-        if (!style.isForTerminal && !style.isForSpreadsheet) {
-            AppendCsvField(out, field);
-            continue;
-        }
-        const std::string text = style.isForTerminal ? EscapeForTerminal(field) : field;
-        AppendCsvField(out, style.isForSpreadsheet && IsFormula(field) ? "'" + text : text);
+void CsvLine::Add(std::string_view field) {
+    if (!isFirst_)
+        out_ += ',';
+    isEmpty_ = isFirst_ && field.empty();
+    isFirst_ = false;
+    if (!style_.isForTerminal && !style_.isForSpreadsheet) {
+        AppendCsvField(out_, field);
+        return;
     }
-    if (fields.size() == 1 && fields[0].empty())
-        out += "\"\""; // an empty line would be no record to most readers
-    out += "\r\n";
+    const std::string text = style_.isForTerminal ? EscapeForTerminal(field) : std::string(field);
+    AppendCsvField(out_, style_.isForSpreadsheet && IsFormula(field) ? "'" + text : text);
+}
+
+void CsvLine::End() {
+    if (isEmpty_)
+        out_ += "\"\""; // an empty line would be no record to most readers
+    out_ += "\r\n";
+}
+
+void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, CsvStyle style) {
+    CsvLine line(out, style);
+    for (const std::string &field : fields)
+        line.Add(field);
+    line.End();
 }
 
 } // namespace kelo::tool

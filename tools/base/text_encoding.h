@@ -45,7 +45,21 @@ struct CsvStyle {
     bool isForSpreadsheet = false;
 };
 
-// Appends a record of RFC 4180 with its line end: fields stand between double quotes where they need them.
+// Appends a record of RFC 4180, field by field: they are between double quotes where they need them.
+class CsvLine {
+public:
+    CsvLine(std::string &out, CsvStyle style) : out_(out), style_(style) {}
+    void Add(std::string_view field);
+    void End(); // the line end
+
+private:
+    std::string &out_;
+    CsvStyle style_;
+    bool isFirst_ = true;
+    bool isEmpty_ = false; // a single field without a text
+};
+
+// The same for a whole record.
 void AppendCsvLine(std::string &out, const std::vector<std::string> &fields, CsvStyle style = {});
 
 } // namespace kelo::tool

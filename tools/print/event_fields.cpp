@@ -7,11 +7,14 @@ namespace kelo::tool {
 namespace {
 
 // An event is passed as a record: its level's name as `tag`, its user and text under their own names.
+using Log = _SYSLOG_LOG_DATA_tag;
+using Digits = RecordField::Digits;
+
 constexpr std::array<RecordField, 4> kEventFields = {{
-    {"id", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return std::to_string(log.id); }},
-    {"level", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.tag; }},
-    {"user", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.luser; }},
-    {"event", false, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log) { return log.event; }},
+    {"id", true, 0, 0, [](const Log &log, Digits &digits) { return TextOfNumber(log.id, digits); }},
+    {"level", false, 0, 0, [](const Log &log, Digits &) { return std::string_view(log.tag); }},
+    {"user", false, 0, 0, [](const Log &log, Digits &) { return std::string_view(log.luser); }},
+    {"event", false, 0, 0, [](const Log &log, Digits &) { return std::string_view(log.event); }},
 }};
 
 } // namespace

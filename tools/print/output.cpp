@@ -101,15 +101,24 @@ int Output::File() const {
 }
 
 void Output::Write(std::string_view text) {
+    if (text.size() >= kBufferSize) {
+        Flush();
+        WriteThrough(text);
+        return;
+    }
     buffer_ += text;
     if (buffer_.size() >= kBufferSize)
         Flush();
 }
 
 void Output::Flush() {
-    if (mayPage_ && !buffer_.empty())
+    WriteThrough(buffer_);
+    buffer_.clear();
+}
+
+void Output::WriteThrough(std::string_view rest) {
+    if (mayPage_ && !rest.empty())
         StartPager();
-    std::string_view rest = buffer_;
     while (!rest.empty()) {
         const ssize_t written = write(File(), rest.data(), rest.size());
         if (written >= 0) {
@@ -123,7 +132,6 @@ void Output::Flush() {
             throw OutputError(std::string("cannot write the output: ") + std::strerror(errno));
         }
     }
-    buffer_.clear();
 }
 
 void Output::Wait(int timeoutMs) const {

@@ -42,6 +42,7 @@ public:
     void Finish();
 
 private:
+    void WriteThrough(std::string_view rest);
     void StartPager();
     void ClosePager();
     int File() const;

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <string_view>
+#include <type_traits>
 
 #include "base/errors.h"
 
@@ -19,33 +20,44 @@ constexpr unsigned kSystem = Bit(TableKind::System);
 constexpr unsigned kTransfer = Bit(TableKind::Transfer);
 constexpr unsigned kAll = kLogs | kSystem | kTransfer;
 
-std::string SeverityOf(const Log &log) {
+using Digits = RecordField::Digits;
+
+std::string_view SeverityOf(const Log &log, Digits &) {
     return g_MappingSyslogPrior[log.prio];
+}
+
+// The text or the number that is this member of a record.
+template <auto Member>
+std::string_view TextOf(const Log &log, Digits &digits) {
+    if constexpr (std::is_same_v<decltype(Member), std::string Log::*>)
+        return log.*Member;
+    else
+        return TextOfNumber(log.*Member, digits);
 }
 
 // "llevel" of table "logs" is the same as "prio", which is shown for both.
 constexpr std::array<RecordField, 21> kFields = {{
-    {"id", true, kAll, 0, [](const Log &log) { return std::to_string(log.id); }},
-    {"time", false, kAll, kAll, [](const Log &) { return std::string(); }},
-    {"utcsec", true, kLogs, 0, [](const Log &log) { return std::to_string(log.utcsec); }},
-    {"tzoffset", false, kLogs, 0, [](const Log &log) { return log.tzoffset; }},
-    {"ldate", false, kAll, 0, [](const Log &log) { return log.ldate; }},
-    {"ltime", false, kAll, 0, [](const Log &log) { return log.ltime; }},
+    {"id", true, kAll, 0, TextOf<&Log::id>},
+    {"time", false, kAll, kAll, [](const Log &, Digits &) { return std::string_view(); }},
+    {"utcsec", true, kLogs, 0, TextOf<&Log::utcsec>},
+    {"tzoffset", false, kLogs, 0, TextOf<&Log::tzoffset>},
+    {"ldate", false, kAll, 0, TextOf<&Log::ldate>},
+    {"ltime", false, kAll, 0, TextOf<&Log::ltime>},
     {"prio", false, kLogs, kLogs, SeverityOf},
     {"llevel", false, kSystem, kSystem, SeverityOf},
-    {"fac", false, kLogs, 0, [](const Log &log) { return log.fac; }},
-    {"tag", false, kLogs, 0, [](const Log &log) { return log.tag; }},
-    {"host", false, kAll, kAll, [](const Log &log) { return log.host; }},
-    {"ip", false, kLogs, 0, [](const Log &log) { return log.ip; }},
-    {"ip", false, kTransfer, kTransfer, [](const Log &log) { return log.xferip; }},
-    {"prog", false, kAll, kLogs | kSystem, [](const Log &log) { return log.prog; }},
-    {"luser", false, kSystem | kTransfer, kSystem | kTransfer, [](const Log &log) { return log.luser; }},
-    {"event", false, kTransfer, kTransfer, [](const Log &log) { return log.event; }},
-    {"isdir", true, kTransfer, 0, [](const Log &log) { return std::to_string(log.isdir); }},
-    {"fsize", false, kTransfer, kTransfer, [](const Log &log) { return log.fsize; }},
-    {"fname", false, kTransfer, kTransfer, [](const Log &log) { return log.fname; }},
-    {"msg", false, kLogs, kLogs, [](const Log &log) { return log.msg; }},
-    {"msg", false, kSystem, kSystem, [](const Log &log) { return log.event; }},
+    {"fac", false, kLogs, 0, TextOf<&Log::fac>},
+    {"tag", false, kLogs, 0, TextOf<&Log::tag>},
+    {"host", false, kAll, kAll, TextOf<&Log::host>},
+    {"ip", false, kLogs, 0, TextOf<&Log::ip>},
+    {"ip", false, kTransfer, kTransfer, TextOf<&Log::xferip>},
+    {"prog", false, kAll, kLogs | kSystem, TextOf<&Log::prog>},
+    {"luser", false, kSystem | kTransfer, kSystem | kTransfer, TextOf<&Log::luser>},
+    {"event", false, kTransfer, kTransfer, TextOf<&Log::event>},
+    {"isdir", true, kTransfer, 0, TextOf<&Log::isdir>},
+    {"fsize", false, kTransfer, kTransfer, TextOf<&Log::fsize>},
+    {"fname", false, kTransfer, kTransfer, TextOf<&Log::fname>},
+    {"msg", false, kLogs, kLogs, TextOf<&Log::msg>},
+    {"msg", false, kSystem, kSystem, TextOf<&Log::event>},
 }};
 
 RecordFields Choose(unsigned RecordField::*tables, TableKind kind) {

@@ -1,6 +1,9 @@
 #pragma once
 
+#include <array>
+#include <charconv>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "base/time_format.h"
@@ -12,12 +15,22 @@ namespace kelo::tool {
 // One printable field of a record, with the name of its column. "time" is not a column: it is `utcsec` as
 // text or, in tables without it, `ldate` and `ltime`.
 struct RecordField {
+    using Digits = std::array<char, 20>; // of a number with 64 bits
+
     const char *name;
     bool isNumber;
     unsigned tables;  // bit per TableKind: the tables that have it
     unsigned summary; // bit per TableKind: the tables that show it by default
-    std::string (*value)(const _SYSLOG_LOG_DATA_tag &log);
+    // The text of the field, which lies in `log` or, of a number, in `digits`.
+    std::string_view (*text)(const _SYSLOG_LOG_DATA_tag &log, Digits &digits);
 };
+
+// The text of a number, in `digits`.
+template <typename Number>
+std::string_view TextOfNumber(Number number, RecordField::Digits &digits) {
+    const char *end = std::to_chars(digits.begin(), digits.end(), number).ptr;
+    return {digits.data(), static_cast<size_t>(end - digits.data())};
+}
 
 using RecordFields = std::vector<const RecordField *>;
 

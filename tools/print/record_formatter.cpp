@@ -42,16 +42,20 @@ protected:
     explicit LayoutWriter(RecordLayout layout) : layout_(std::move(layout)), time_(layout_.inUtc) {}
 
     const RecordLayout &Layout() const { return layout_; }
-    std::string Value(const RecordField &field, const Log &log,
-                      std::string (TimeFormat::*form)(int64_t) const) const {
-        std::string value = IsTime(field) ? RecordTime(log, layout_.kind, time_, form) : field.value(log);
-        if (layout_.maxMessage && IsMessage(field))
-            Cut(value);
-        return value;
+    // Valid until the next call.
+    std::string_view Value(const RecordField &field, const Log &log,
+                           std::string (TimeFormat::*form)(int64_t) const) {
+        if (IsTime(field))
+            return text_ = RecordTime(log, layout_.kind, time_, form);
+        const std::string_view text = field.text(log, digits_);
+        return layout_.maxMessage && IsMessage(field)
+                   ? text.substr(0, WholeCharacters(text, *layout_.maxMessage))
+                   : text;
     }
     std::string Message(const Log &log) const {
         std::string text = RecordMessage(log, layout_.kind);
-        Cut(text);
+        if (layout_.maxMessage)
+            text.resize(WholeCharacters(text, *layout_.maxMessage));
         return text;
     }
     std::string Time(const Log &log, std::string (TimeFormat::*form)(int64_t) const) const {
@@ -62,13 +66,10 @@ protected:
     }
 
 private:
-    void Cut(std::string &message) const {
-        if (layout_.maxMessage)
-            message.resize(WholeCharacters(message, *layout_.maxMessage));
-    }
-
     RecordLayout layout_;
     TimeFormat time_;
+    std::string text_; // of the time
+    RecordField::Digits digits_{};
 };
 
 class TextWriter final : public LayoutWriter {
@@ -138,20 +139,26 @@ public:
 class JsonWriter final : public LayoutWriter {
 public:
     explicit JsonWriter(RecordLayout layout)
-        : LayoutWriter(std::move(layout)), lines_(Layout().format == OutputFormat::Json) {}
+        : LayoutWriter(std::move(layout)), lines_(Layout().format == OutputFormat::Json) {
+        for (const RecordField *field : Layout().fields)
+            names_.emplace_back(field->name);
+    }
 
     void Begin(std::string &out) override { lines_.Begin(out); }
     void Add(const Log &log, std::string &out) override {
         lines_.BeginItem(out);
         JsonObject object(out);
-        for (const RecordField *field : Layout().fields) {
-            const std::string value = Value(*field, log, &TimeFormat::Iso);
-            if (field->isNumber)
-                object.AddJson(field->name, value);
+        for (size_t i = 0; i < names_.size(); ++i) {
+            const RecordField &field = *Layout().fields[i];
+            const std::string_view value = Value(field, log, &TimeFormat::Iso);
+            if (field.isNumber)
+                object.AddJson(names_[i], value);
             else
-                object.Add(field->name, value);
-            if (Layout().maxMessage && IsMessage(*field))
-                object.AddJson("length", std::to_string(field->value(log).size()));
+                object.Add(names_[i], value);
+            if (Layout().maxMessage && IsMessage(field)) {
+                RecordField::Digits digits;
+                object.AddJson("length", std::to_string(field.text(log, digits).size()));
+            }
         }
         object.End();
         lines_.EndItem(out);
@@ -160,6 +167,7 @@ public:
 
 private:
     JsonLines lines_;
+    std::vector<JsonName> names_;
 };
 
 class CsvWriter final : public LayoutWriter {
@@ -170,21 +178,20 @@ public:
     void Begin(std::string &out) override {
         if (!Layout().hasHeader)
             return;
-        std::vector<std::string> names;
+        CsvLine line(out, style_);
         for (const RecordField *field : Layout().fields)
-            names.emplace_back(field->name);
-        AppendCsvLine(out, names, style_);
+            line.Add(field->name);
+        line.End();
     }
     void Add(const Log &log, std::string &out) override {
-        values_.clear();
+        CsvLine line(out, style_);
         for (const RecordField *field : Layout().fields)
-            values_.push_back(Value(*field, log, &TimeFormat::Iso));
-        AppendCsvLine(out, values_, style_);
+            line.Add(Value(*field, log, &TimeFormat::Iso));
+        line.End();
     }
 
 private:
     CsvStyle style_;
-    std::vector<std::string> values_; // of the record that is written
 };
 
 } // namespace

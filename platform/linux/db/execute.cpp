@@ -95,7 +95,8 @@ bool Deliver(sqlite3 *db, const SingleStatement &single, Delivery delivery,
     sqlite3_stmt *statement = single.prepared.get();
     if (result == nullptr)
         return StepToEnd(statement);
-    if (delivery == Delivery::kByRow || result->cells.size() < kSinkColumns)
+    if (delivery == Delivery::kByRow || result->cells.size() < kSinkColumns ||
+        kelo::platform::IsCopied(single.text))
         return TakeAllRows(statement, *result);
     const Progress progress = TakeRows(statement, *result, kSinkRows);
     if (progress != Progress::kMore)

@@ -1,5 +1,6 @@
 #include "db/row_sink.h"
 
+#include <algorithm>
 #include <new>
 #include <stdexcept>
 #include <string>
@@ -58,6 +59,14 @@ std::string WrappedText(std::string_view query, size_t columnCount) {
 }
 
 } // namespace
+
+bool IsCopied(std::string_view query) {
+    const auto has = [query](std::string_view word) {
+        const auto isSame = [](char byte, char letter) { return (byte | 0x20) == letter; };
+        return std::search(query.begin(), query.end(), word.begin(), word.end(), isSame) != query.end();
+    };
+    return has("order") || has("limit");
+}
 
 Statement PrepareRowSink(sqlite3 *db, const SingleStatement &query, DBResult_tag &result) {
     if (sqlite3_stmt_readonly(query.prepared.get()) == 0 ||
