@@ -4,6 +4,7 @@
 //   bench_other_reads [ROWS]      1,000,000 unless given
 
 #include <algorithm>
+#include <cstdio>
 #include <cstdlib>
 #include <functional>
 #include <list>
@@ -71,6 +72,7 @@ struct Read {
     std::function<uint64_t()> run;
     double atMostOfScan;
     double atMostOfNewestPage; // 0: no bound
+    const char *reason = "";   // why it is not 20 times as fast
 };
 
 uint64_t WithoutIndex(const Read &read) {
@@ -91,14 +93,20 @@ int main(int argc, char **argv) {
     const Read reads[] = {
         {"page of three old days", [&] { return Page(database, Days("2020/01/01", "2020/01/03")); }, 0.05, 5},
         {"page of an old hour", [&] { return Page(database, Seconds(kFirst + 80'000, kFirst + 83'600)); },
-         0.2, 5},
+         0.2, 5,
+         "SQLite takes the hour from its index of utcsec and sorts 12,000 records, in 10 to 15 ms. A "
+         "twentieth "
+         "would be about the time of the newest page, which opens the database and reads 50 records; ours "
+         "reads "
+         "the index beside it as well."},
         {"page up to an old second", [&] { return Page(database, Seconds(0, kFirst + 80'000)); }, 0.05, 5},
         {"values of host", [&] { return ValuesOf(database, "host"); }, 0.05, 20},
         {"values of prog", [&] { return ValuesOf(database, "prog"); }, 0.05, 20},
         {"count of a rare severity", [&] { return CountOf(database, Severities("emerg")); }, 0.05, 0},
         {"page of an absent severity", [&] { return Page(database, Severities("alert")); }, 0.05, 0},
         {"count of a severity of every fortieth",
-         [&] { return CountOf(database, Severities("emerg,alert,crit,err")); }, 1.05, 0},
+         [&] { return CountOf(database, Severities("emerg,alert,crit,err")); }, 1.05, 0,
+         "Of one record in forty, more than half of the blocks of 32 records have one, so all are read."},
         {"count of the usual severity", [&] { return CountOf(database, Severities("info")); }, 1.05, 0},
     };
     bool allKept = true;
@@ -116,6 +124,10 @@ int main(int argc, char **argv) {
         if (read.atMostOfNewestPage != 0)
             allKept =
                 PrintRatio(read.name, times[0], "newest page", times[2], read.atMostOfNewestPage) && allKept;
+    }
+    for (const Read &read : reads) {
+        if (*read.reason != '\0')
+            std::printf("\n%s: %s\n", read.name, read.reason);
     }
     return allKept ? 0 : 1;
 }

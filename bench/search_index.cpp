@@ -1,5 +1,5 @@
 // Searches for keywords with the skip index: in the library against the scan, and from start to exit of the
-// program against grep, ripgrep and the sqlite3 shell.
+// program against grep, ripgrep, the sqlite3 shell, lnav and journalctl. What is not installed is skipped.
 //
 //   bench_search_index [ROWS]      1,000,000 unless given
 
@@ -27,8 +27,12 @@ using namespace kelo::bench;
 
 namespace {
 
-constexpr int kRounds = 7;
 constexpr int kFullSize = 5'000'000; // the rows for which the bounds of rare words are meant
+
+// A scan of many rows takes seconds.
+int RoundsFor(int rows) {
+    return rows < kFullSize ? 7 : 3;
+}
 
 struct Search {
     const char *name;
@@ -91,7 +95,7 @@ bool CompareWithScan(const std::string &database, int rows) {
         const auto times =
             MedianTimes({{"index", [&] { return Time([&] { Find(database, search); }); }},
                          {"scan", [&] { return Time([&] { FindByScan(database, search); }); }}},
-                        kRounds);
+                        RoundsFor(rows));
         // What a search costs at least is the same for a smaller table, the scan is not.
         const double atMost =
             search.atMost < 0.5 ? search.atMost * kFullSize / std::min(rows, kFullSize) : search.atMost;
@@ -104,12 +108,24 @@ bool IsInstalled(const std::string &program) {
     return std::system(("command -v " + program + " >/dev/null").c_str()) == 0;
 }
 
+// Says so where it is not.
+bool IsInstalledOrSkipped(const std::string &program) {
+    const bool isInstalled = IsInstalled(program);
+    if (!isInstalled)
+        std::printf("| %s: skipped, it is not installed | | | | | | |\n", program.c_str());
+    return isInstalled;
+}
+
 // Through a pipe: grep stops at the first match if it writes to /dev/null.
 double TimeOf(const std::string &command) {
     return Time([&] {
         if (std::system((command + " | cat >/dev/null").c_str()) == -1)
             Fail("cannot run " + command);
     });
+}
+
+std::string CountCommand(const std::string &database, const std::string &word) {
+    return KELO_PROGRAM " count -g " + word + " --db '" + database + "'";
 }
 
 // Makes the next reader of the file read it from the disk.
@@ -132,14 +148,14 @@ bool CompareCold(const std::string &database, int rows) {
     bool allKept = true;
     PrintHeading("kelosyslog count -g Segfault in " + std::to_string(rows) + " rows that are not in memory",
                  "ms");
-    const std::string ours = KELO_PROGRAM " count -g Segfault --db '" + database + "'";
+    const std::string ours = CountCommand(database, "Segfault");
     const std::pair<const char *, std::string> others[] = {
         {"scan", "env KELO_SKIP_INDEX=off " + ours},
         {"rg", "rg -c -F -e Segfault " + text},
         {"grep", "env LC_ALL=C grep -c -F -e Segfault " + text},
     };
     for (const auto &[name, command] : others) {
-        if (name != std::string("scan") && !IsInstalled(name))
+        if (name != std::string("scan") && !IsInstalledOrSkipped(name))
             continue;
         const auto times =
             MedianTimes({{"ours", [&] { return ColdTimeOf(database, ours); }},
@@ -170,17 +186,53 @@ bool CompareProgram(const std::string &database, int rows) {
              0.02 * scale},
         };
         for (const auto &[program, command, atMost] : others) {
-            if (!IsInstalled(program))
+            if (!IsInstalledOrSkipped(program))
                 continue;
-            const auto times = MedianTimes(
-                {{"ours",
-                  [&] { return TimeOf(KELO_PROGRAM " count -g " + word + " --db '" + database + "'"); }},
-                 {program, [&, &other = command] { return TimeOf(other); }}},
-                kRounds);
+            const auto times = MedianTimes({{"ours", [&] { return TimeOf(CountCommand(database, word)); }},
+                                            {program, [&, &other = command] { return TimeOf(other); }}},
+                                           RoundsFor(rows));
             // Nothing is promised where all rows are read.
             allKept = PrintRatio(word, times[0], program, times[1], isCommon ? 100 : atMost) && allKept;
         }
     }
+    return allKept;
+}
+
+// The journal with the messages of a text file; "" where it cannot be made.
+std::string JournalOf(const std::string &text) {
+    const std::string journal = text + ".journal";
+    constexpr char kWriter[] = "/lib/systemd/systemd-journal-remote";
+    if (access(kWriter, X_OK) != 0)
+        return "";
+    if (access(journal.c_str(), F_OK) == 0)
+        return journal;
+    const std::string command = "awk '{ print \"__REALTIME_TIMESTAMP=\" (1577836800000000 + NR); print "
+                                "\"MESSAGE=\" $0; print \"\" }' '" +
+                                text + "' | " + kWriter + " -o '" + journal + "' - >/dev/null 2>&1";
+    return std::system(command.c_str()) == 0 ? journal : "";
+}
+
+// Viewers of logs, which take seconds: a few rounds for one word.
+bool CompareViewers(const std::string &database, int rows) {
+    constexpr int kViewerRounds = 2;
+    constexpr int kMostRows = 1'000'000; // of a journal, which takes a minute to write
+    bool allKept = true;
+    const auto compare = [&](const std::string &program, const std::string &command) {
+        const auto times = MedianTimes({{"ours", [&] { return TimeOf(CountCommand(database, "Segfault")); }},
+                                        {program, [&] { return TimeOf(command); }}},
+                                       kViewerRounds);
+        allKept = PrintRatio("Segfault", times[0], program, times[1], 0.1) && allKept;
+    };
+    if (IsInstalledOrSkipped("lnav"))
+        compare("lnav", "lnav -n -c ':filter-in Segfault' '" + database + ".txt' </dev/null");
+    if (!IsInstalledOrSkipped("journalctl"))
+        return allKept;
+    const std::string journal = rows <= kMostRows ? JournalOf(database + ".txt") : "";
+    if (journal.empty())
+        std::printf("| journalctl: skipped, systemd-journal-remote is not installed, or too many rows | | | "
+                    "| | | |\n");
+    else
+        compare("journalctl", "journalctl -q --file '" + journal + "' -g Segfault");
     return allKept;
 }
 
@@ -213,5 +265,6 @@ int main(int argc, char **argv) {
     const bool isSmall = Build(database);
     const bool isFast = CompareWithScan(database, rows);
     const bool isWarmKept = CompareProgram(database, rows);
-    return CompareCold(database, rows) && isWarmKept && isFast && isSmall ? 0 : 1;
+    const bool isViewerKept = CompareViewers(database, rows);
+    return CompareCold(database, rows) && isViewerKept && isWarmKept && isFast && isSmall ? 0 : 1;
 }

@@ -30,6 +30,7 @@ Character TakeCharacter(const char *&at, const char *end, const char *&checked) 
 }
 
 // What most texts have none of: characters that are not ASCII or are not printed.
+constexpr auto kIsNotAscii = [](auto bytes) { return bytes >= 0x80; };
 constexpr auto kIsUnusual = [](auto bytes) { return (bytes < 0x20) | (bytes >= 0x7f); };
 constexpr auto kIsUnusualInJson = [](auto bytes) {
     return (bytes < 0x20) | (bytes >= 0x7f) | (bytes == '"') | (bytes == '\\');
@@ -220,7 +221,7 @@ std::string EscapeMarkup(std::string_view text, std::string_view characters) {
 std::string EscapeDirections(std::string_view json) {
     std::string out;
     const auto isPlain = [](uint32_t code) { return !Misleads(code); };
-    AppendEscaped(out, json, [](auto bytes) { return bytes >= 0x80; }, isPlain, [&](Character character) {
+    AppendEscaped(out, json, kIsNotAscii, isPlain, [&](Character character) {
         if (character.isValid)
             AppendEscape(out, "\\u%04x", character.code);
         else

@@ -95,10 +95,10 @@ private:
 
 // The default fields: those of the text, without the row id, which it does not have.
 RecordLayout MakeParseLayout(const OutputOptions &options) {
-    static constexpr RecordField kExtnum = {
-        "extnum", true, 0, 0, [](const _SYSLOG_LOG_DATA_tag &log, RecordField::Digits &digits) {
-            return TextOfNumber(log.extnum, digits);
-        }};
+    static constexpr RecordField kExtnum = {"extnum", true, 0, 0,
+                                            [](const _SYSLOG_LOG_DATA_tag &log, RecordField::Digits &digits) {
+                                                return TextOfNumber(log.extnum, digits);
+                                            }};
     RecordLayout layout = MakeLayout(options, TableKind::Logs);
     if (layout.fields.empty() && layout.format != OutputFormat::Text) {
         layout.fields = AllFields(TableKind::Logs);

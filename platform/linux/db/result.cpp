@@ -8,7 +8,7 @@
 
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
     : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()),
-      numbers(cells.size()) {
+      numbers(cells.size()), hadText(cells.size()) {
     for (int column = 0; column < sqlite3_column_count(statement); ++column) {
         const char *name = sqlite3_column_name(statement, column);
         if (name == nullptr)
@@ -34,25 +34,32 @@ void DBResult_tag::AddRow() {
     rows.Add(cells);
 }
 
+bool DBResult_tag::TakeValue(size_t column, sqlite3_value *value) {
+    kelo::platform::Cell &cell = cells[column];
+    // SQLite makes the same text of an integer, but slowly. After a text there is rarely one, so to ask each
+    // time would take longer.
+    const int type = hadText[column] != 0 ? SQLITE_TEXT : sqlite3_value_type(value);
+    if (type == SQLITE_INTEGER) {
+        const int64_t number = sqlite3_value_int64(value);
+        // Row after row has the same second, and of a page by row id the same total.
+        if (number != numbers[column] || cell.text != digits[column].data()) {
+            cell = TextOf(number, digits[column]);
+            numbers[column] = number;
+        }
+        return true;
+    }
+    const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
+    hadText[column] = type == SQLITE_TEXT && text != nullptr;
+    cell = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
+    return text != nullptr || sqlite3_value_type(value) == SQLITE_NULL;
+}
+
 // One call into the statement for each cell: the functions that take a column check the connection's state
 // each time. One thread uses the connection, so the values need no protection.
 void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
-    for (size_t i = 0; i < cells.size(); ++i) {
-        sqlite3_value *value = sqlite3_column_value(statement, static_cast<int>(i));
-        const int type = sqlite3_value_type(value);
-        if (type == SQLITE_INTEGER) {
-            const int64_t number = sqlite3_value_int64(value);
-            // Row after row has the same second, and of a page by row id the same total.
-            if (number != numbers[i] || cells[i].text != digits[i].data()) {
-                cells[i] = TextOf(number, digits[i]);
-                numbers[i] = number;
-            }
-            continue;
-        }
-        const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
-        if (text == nullptr && type != SQLITE_NULL)
+    for (size_t column = 0; column < cells.size(); ++column) {
+        if (!TakeValue(column, sqlite3_column_value(statement, static_cast<int>(column))))
             throw std::bad_alloc();
-        cells[i] = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
     }
     AddRow();
 }

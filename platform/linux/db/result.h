@@ -26,6 +26,9 @@ struct DBResult_tag {
     // An integer as a text in `digits`, which is faster than SQLite's conversion. The text has no NUL.
     static kelo::platform::Cell TextOf(int64_t number, Digits &digits);
 
+    // Makes the cell of a column the text of a value, which it refers to. False when there is no memory.
+    bool TakeValue(size_t column, sqlite3_value *value);
+
     // Appends the row in `cells`. Throws std::bad_alloc, or std::length_error when the result is full.
     void AddRow();
 
@@ -37,5 +40,6 @@ struct DBResult_tag {
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
     std::vector<Digits> digits;              // of the integers in `cells`
     std::vector<int64_t> numbers;            // of which they are the texts
+    std::vector<char> hadText;               // whether the last value of a column was a text
     uint32_t nextRow = 0;
 };

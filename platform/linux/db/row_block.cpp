@@ -15,6 +15,29 @@ namespace {
 // Chunks grow to the size of a huge page, which spares a large result most of its page faults.
 constexpr size_t kHugePage = size_t{2} << 20;
 
+// Copies a text. Most are short: a call of memcpy would take longer than to copy them by two words, which
+// overlap.
+template <typename Word>
+void CopyByTwoWords(char *to, const char *from, size_t size) {
+    Word first;
+    Word last;
+    std::memcpy(&first, from, sizeof first);
+    std::memcpy(&last, from + size - sizeof last, sizeof last);
+    std::memcpy(to, &first, sizeof first);
+    std::memcpy(to + size - sizeof last, &last, sizeof last);
+}
+
+void CopyText(char *to, const char *from, size_t size) {
+    if (size > 2 * sizeof(uint64_t) || size < sizeof(uint16_t))
+        std::memcpy(to, from, size);
+    else if (size >= sizeof(uint64_t))
+        CopyByTwoWords<uint64_t>(to, from, size);
+    else if (size >= sizeof(uint32_t))
+        CopyByTwoWords<uint32_t>(to, from, size);
+    else
+        CopyByTwoWords<uint16_t>(to, from, size);
+}
+
 } // namespace
 
 template <typename Offset>
@@ -28,7 +51,7 @@ void RowBlock::WriteRow(char *row, Width width, std::span<const Cell> cells) {
         offsets += sizeof offset;
         if (cell.text == nullptr)
             continue;
-        std::memcpy(text, cell.text, cell.size);
+        CopyText(text, cell.text, cell.size);
         text[cell.size] = '\0';
         text += cell.size + 1;
     }

@@ -10,18 +10,6 @@ namespace {
 
 constexpr char kResultType[] = "kelo-result";
 
-// Makes `cell` the text of a value; an integer is written to `digits`. False when there is no memory.
-bool TakeValue(sqlite3_value *value, DBResult_tag::Digits &digits, Cell &cell) {
-    const int type = sqlite3_value_type(value);
-    if (type == SQLITE_INTEGER) {
-        cell = DBResult_tag::TextOf(sqlite3_value_int64(value), digits);
-        return true;
-    }
-    const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
-    cell = {text, static_cast<size_t>(sqlite3_value_bytes(value))};
-    return text != nullptr || type == SQLITE_NULL;
-}
-
 // The aggregate's step: the result, then a row of it. The result comes as a pointer that SQL cannot make, so
 // that a query which calls the aggregate itself gets an error.
 void Deliver(sqlite3_context *context, int count, sqlite3_value **values) {
@@ -32,7 +20,7 @@ void Deliver(sqlite3_context *context, int count, sqlite3_value **values) {
         return;
     }
     for (size_t column = 0; column < result->cells.size(); ++column) {
-        if (!TakeValue(values[column + 1], result->digits[column], result->cells[column])) {
+        if (!result->TakeValue(column, values[column + 1])) {
             sqlite3_result_error_nomem(context);
             return;
         }
