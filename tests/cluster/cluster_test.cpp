@@ -3,6 +3,7 @@
 
 #include <cstring>
 
+#include "cluster/clock_check.h"
 #include "kelosyslog/dbutil.h"
 #include "kelosyslog/failure.h"
 #include "platform/db_fixture.h"
@@ -455,7 +456,72 @@ TEST_F(ClusterTest, IsSetUpOnlyAsItCanWork) {
                       HasSubstr("<host>k</host><port>2181</port>")));
 }
 
-// The last: the rows are gone after it.
+TEST_F(ClusterTest, IsCheckedServerByServer) {
+    const auto check = [] { return RunIn("/", "exec kelosyslog cluster check " + world->cluster); };
+    const ProgramResult sound = check();
+    EXPECT_EQ(sound.status, 0) << sound.out;
+    EXPECT_THAT(sound.out, HasSubstr("2 servers: 0 errors"));
+    const struct {
+        const char *harm;
+        const char *finding;
+        const char *remedy;
+    } cases[] = {
+        {"RENAME TABLE kelo.logs TO kelo.away", "table logs is missing",
+         "RENAME TABLE kelo.away TO kelo.logs"},
+        {"ALTER TABLE kelo.logs_shard MODIFY COLUMN host FixedString(64)",
+         "column host of logs_shard is FixedString(64)",
+         "ALTER TABLE kelo.logs_shard MODIFY COLUMN host String"},
+        {"DETACH TABLE kelo.logs_shard", "table logs_shard is missing", "ATTACH TABLE kelo.logs_shard"},
+    };
+    const std::string name = world->servers.Url(1).substr(7);
+    for (const auto &one : cases) {
+        world->servers.Run(1, one.harm);
+        const ProgramResult result = check();
+        world->servers.Run(1, one.remedy);
+        EXPECT_EQ(result.status, 1) << one.harm;
+        EXPECT_THAT(result.out, HasSubstr(name + ": error: " + one.finding)) << one.harm;
+        EXPECT_THAT(result.out, HasSubstr("2 servers: 1 error,")) << one.harm;
+    }
+    EXPECT_THAT(RunIn("/", "exec kelosyslog cluster check " + world->administrator).out,
+                HasSubstr("may do more than read"));
+}
+
+// In seconds: when it was asked, what it said, when it answered.
+TEST(ClusterClocks, AreWrongOnlyIfTheyMustBe) {
+    tool::ClockOffset offset;
+    tool::Narrow(offset, 10.0, 12, 10.1);
+    tool::Narrow(offset, 10.8, 13, 10.9);
+    EXPECT_NEAR(offset.least, 2.1, 1e-9);
+    EXPECT_NEAR(offset.most, 3.0, 1e-9);
+    const tool::ClockOffset right{-0.2, 0.1};
+    const tool::ClockOffset unknown;
+    EXPECT_THAT(tool::WrongClocks({right, offset, unknown}), ElementsAre(Pair(1, testing::_)));
+    EXPECT_THAT(tool::WrongClocks({offset}), ElementsAre(Pair(0, testing::_)));
+    EXPECT_THAT(tool::WrongClocks({{-0.9, 0.1}, {0.4, 1.1}}), IsEmpty());
+}
+
+TEST_F(ClusterTest, ShowsWhatEachServerHolds) {
+    const auto status = [](const std::string &options) {
+        return RunIn("/", "exec kelosyslog cluster status " + world->cluster + options);
+    };
+    world->servers.Run(0,
+                       "INSERT INTO kelo.logs_shard (utcsec, node, rcptid) SELECT toUnixTimestamp(now()), 7, "
+                       "number FROM numbers(90)");
+    const ProgramResult result = status(" -o json");
+    EXPECT_EQ(result.status, 0) << result.err;
+    std::string rows = world->servers.Run(1, "SELECT count() FROM kelo.logs_shard");
+    rows.pop_back();
+    EXPECT_THAT(result.out, AllOf(HasSubstr("\"shard\":\"2\",\"rows\":" + rows + ","),
+                                  HasSubstr("{\"log_server\":7,\"rows_per_second\":1.5,")));
+    world->servers.Kill(1);
+    EXPECT_EQ(status("").status, 1);
+    EXPECT_THAT(status("").out,
+                HasSubstr("! " + world->servers.Url(1).substr(7) + " is away: Failed to connect"));
+    world->servers.Start(1);
+    EXPECT_EQ(RunCommand("delete --yes --since -1d", world->administrator).status, 0);
+}
+
+// The last: the rows are gone after them.
 TEST_F(ClusterTest, DeletesWhatSqliteDeletes) {
     for (const char *command :
          {"delete -g disk --yes -H 'host[1-3],host1'", "delete -p err --until 2020-09-14 --yes --utc",
@@ -469,6 +535,30 @@ TEST_F(ClusterTest, DeletesWhatSqliteDeletes) {
     EXPECT_EQ(RunCommand("search -H 'host*' -o jsonl", world->cluster).out ==
                   RunCommand("search -o jsonl", world->sqlite).out,
               true);
+}
+
+TEST_F(ClusterTest, RemovesOnlyWholeDaysThatAreOld) {
+    const auto retention = [](const std::string &options) {
+        return RunIn("/", "exec kelosyslog cluster retention " + world->administrator + " " + options);
+    };
+    for (const char *nonsense : {"--keep 1h --yes", "--keep 30 --yes", "--keep 9000y --yes", "--yes"})
+        EXPECT_EQ(retention(nonsense).status, 2) << nonsense;
+    // The time of the engine wraps around, so the first is in an old day.
+    world->servers.Run(1,
+                       "INSERT INTO kelo.logs_shard (host, utcsec) VALUES ('future', 5900000000), ('kept', "
+                       "toUnixTimestamp(now()) - 86400), ('old', toUnixTimestamp(now()) - 4 * 86400)");
+    const auto rows = [] { return world->servers.Run(1, "SELECT count() FROM kelo.logs_shard"); };
+    const std::string before = rows();
+    const ProgramResult dry = retention("--keep 2d --dry-run");
+    EXPECT_EQ(dry.status, 0);
+    EXPECT_THAT(dry.out, HasSubstr("would remove " + world->servers.Url(1).substr(7) + ": day "));
+    EXPECT_EQ(rows(), before);
+    world->servers.Kill(0);
+    EXPECT_EQ(retention("--keep 2d --yes").status, 3);
+    EXPECT_EQ(world->servers.Run(1, "SELECT host FROM kelo.logs_shard ORDER BY host"), "future\nkept\n");
+    world->servers.Start(0);
+    EXPECT_EQ(retention("--keep 2d --yes").status, 0);
+    EXPECT_EQ(retention("--keep 2d --yes").status, 1);
 }
 
 } // namespace

@@ -61,9 +61,14 @@ TEST_F(Forms, AreJsonForEveryCommandThatPrints) {
         {"cluster init", {"new --shard a"}},
         {"cluster import", {}}, // needs servers, which tests/cluster has
         {"cluster export", {}},
+        {"cluster check", {"cluster.conf"}},
+        {"cluster status", {"cluster.conf"}},
+        {"cluster retention", {"cluster.conf --keep 9d --dry-run"}},
     };
     CreateLogDatabase(root_.File("archive.db"), "archive.sql");
     CreateLogDatabase(root_.File("copy.db"));
+    WriteFile(root_.File("cluster.conf"), "[cluster]\nurl=http://127.0.0.1:1\nuser=u\n"); // nobody is there
+    fs::permissions(root_.File("cluster.conf"), fs::perms(0600));
     RunSql(accounting_, "INSERT INTO histogram(device, count) VALUES ('a', 3)");
     const tool::KelosyslogProgram program;
     const tool::CommandTree tree(*program.app);

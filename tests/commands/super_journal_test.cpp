@@ -76,6 +76,9 @@ const Case kCases[] = {
     {"cluster init", "new --shard a", ""},
     {"cluster import", "var/log/kelosyslog/logs.db --node 1 --db cluster.conf", "l"},
     {"cluster export", "var/log/kelosyslog/logs.db --db cluster.conf", "l"},
+    {"cluster check", "no.conf", ""},
+    {"cluster status", "no.conf", ""},
+    {"cluster retention", "no.conf --keep 9d", ""},
     {"listen", "", ""},
     {"notify", "list", ""},
 };

@@ -1,6 +1,7 @@
 #include "cluster/cluster_files.h"
 
 #include "cluster/cluster_tables.h"
+#include "cluster/log_server_file.h"
 #include "cluster/password.h"
 
 namespace kelo::tool {
@@ -62,14 +63,17 @@ std::string KeepersText(const ClusterLayout &layout) {
     return nodes.empty() ? "" : "  " + Element("zookeeper", nodes + "\n  ") + "\n";
 }
 
-std::string UserText(const ClusterLayout &layout, const std::string &name, const std::string &password) {
-    std::string networks;
-    for (const std::string &host : layout.Hosts()) {
+std::string HostsText(const std::vector<std::string> &hosts) {
+    std::string text;
+    for (const std::string &host : hosts) {
         const bool isAddress = host.find_first_not_of("0123456789.") == std::string::npos;
-        networks += Element(isAddress ? "ip" : "host", host);
+        text += Element(isAddress ? "ip" : "host", host);
     }
-    for (const std::string &network : layout.networks)
-        networks += Element("ip", network);
+    return text;
+}
+
+// `networks`: the elements that say from where the user may connect.
+std::string UserText(const std::string &networks, const std::string &name, const std::string &password) {
     return "    " +
            Element(name, "\n      " + Element("password_sha256_hex", Sha256Hex(password)) + "\n      " +
                              Element("networks", networks) + "\n      " + Element("profile", name) +
@@ -86,37 +90,59 @@ constexpr char kProfiles[] =
     "    "
     "<kelo_partial><readonly>1</readonly><skip_unavailable_shards>1</skip_unavailable_shards></"
     "kelo_partial>\n"
+    "    <kelo_writer><allow_ddl>0</allow_ddl></kelo_writer>\n"
     "    <kelo_server><readonly>1</readonly></kelo_server>\n"
     "    <kelo_admin><skip_unavailable_shards>0</skip_unavailable_shards></kelo_admin>\n"
     "  </profiles>\n";
 
+struct ClusterPasswords {
+    std::string reader = MakePassword(); // also of the user for partial answers
+    std::string administrator = MakePassword();
+    std::string server = MakePassword();
+    std::string writer = MakePassword();
+};
+
+std::string UsersText(const ClusterLayout &layout, const ClusterPasswords &passwords) {
+    std::string all = HostsText(layout.Hosts());
+    for (const std::string &network : layout.networks)
+        all += Element("ip", network);
+    std::string users = UserText(all, "kelo_reader", passwords.reader) +
+                        UserText(all, "kelo_partial", passwords.reader) +
+                        UserText(all, "kelo_server", passwords.server) +
+                        UserText(all, "kelo_admin", passwords.administrator);
+    std::vector<std::string> logServers;
+    for (const LogServer &server : layout.logServers)
+        logServers.push_back(server.host);
+    if (!logServers.empty())
+        users += UserText(HostsText(logServers), "kelo_writer", passwords.writer);
+    return "<yandex>\n" + std::string(kProfiles) + "  <users>\n" + users + "  </users>\n</yandex>\n";
+}
+
 } // namespace
 
 std::vector<ClusterFile> MakeClusterFiles(const ClusterLayout &layout) {
-    const std::string reader = MakePassword(); // also of the user for partial answers
-    const std::string administrator = MakePassword();
-    const std::string server = MakePassword();
+    const ClusterPasswords passwords;
     std::vector<ClusterFile> files = {
         {"tables.sql", TablesText(layout)},
-        {"cluster.conf", DescriptionText(layout, "kelo_reader", reader, "kelo_partial"), true},
-        {"cluster-admin.conf", DescriptionText(layout, "kelo_admin", administrator, ""), true}};
-    const std::string users =
-        "<yandex>\n" + std::string(kProfiles) + "  <users>\n" + UserText(layout, "kelo_reader", reader) +
-        UserText(layout, "kelo_partial", reader) + UserText(layout, "kelo_server", server) +
-        UserText(layout, "kelo_admin", administrator) + "  </users>\n</yandex>\n";
+        {"cluster.conf", DescriptionText(layout, "kelo_reader", passwords.reader, "kelo_partial"), true},
+        {"cluster-admin.conf", DescriptionText(layout, "kelo_admin", passwords.administrator, ""), true}};
+    const std::string users = UsersText(layout, passwords);
     for (size_t shard = 0; shard < layout.shards.size(); ++shard) {
         for (const std::string &host : layout.shards[shard]) {
             const std::string macros =
                 "  " +
                 Element("macros", Element("shard", std::to_string(shard + 1)) + Element("replica", host)) +
                 "\n";
-            files.push_back(
-                {host + "/config.d/kelosyslog.xml",
-                 "<yandex>\n" + ServersText(layout, server) + KeepersText(layout) + macros + "</yandex>\n",
-                 true});
+            files.push_back({host + "/config.d/kelosyslog.xml",
+                             "<yandex>\n" + ServersText(layout, passwords.server) + KeepersText(layout) +
+                                 macros + "</yandex>\n",
+                             true});
             files.push_back({host + "/users.d/kelosyslog.xml", users});
         }
     }
+    for (size_t i = 0; i < layout.logServers.size(); ++i)
+        files.push_back({layout.logServers[i].host + "/syslog-ng/cluster.conf",
+                         LogServerText(layout, i, passwords.writer), true});
     return files;
 }
 

@@ -21,6 +21,7 @@ struct ClusterFile {
 //     cluster-admin.conf                the same for those who may delete
 //     HOST/config.d/kelosyslog.xml      the servers, and what this one is
 //     HOST/users.d/kelosyslog.xml       the users and their rights
+//     HOST/syslog-ng/cluster.conf       where a log server stores
 std::vector<ClusterFile> MakeClusterFiles(const ClusterLayout &layout);
 
 } // namespace kelo::tool

@@ -10,6 +10,7 @@ namespace {
 
 constexpr int kMostPorts = 65535;
 constexpr size_t kLongestName = 253;
+constexpr size_t kMostLogServers = 255; // their numbers have 8 bits, and 0 is for records from elsewhere
 
 bool IsOneOf(char byte, const char *others) {
     return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') || (byte >= '0' && byte <= '9') ||
@@ -25,12 +26,17 @@ void RequireName(const char *option, const std::string &text, const char *what, 
         throw UsageError(std::string(option) + ": '" + text + "' is no " + what);
 }
 
+int NumberOf(const char *option, const std::string &text, const char *what, int most) {
+    int number = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end != text.data() + text.size() || number < 1 || number > most)
+        throw UsageError(std::string(option) + ": '" + text + "' is no " + what + " from 1 to " +
+                         std::to_string(most));
+    return number;
+}
+
 int PortOf(const char *option, const std::string &text) {
-    int port = 0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), port);
-    if (error != std::errc() || end != text.data() + text.size() || port < 1 || port > kMostPorts)
-        throw UsageError(std::string(option) + ": '" + text + "' is no port from 1 to 65535");
-    return port;
+    return NumberOf(option, text, "port", kMostPorts);
 }
 
 std::vector<std::string> SplitAtCommas(const std::string &text) {
@@ -50,6 +56,24 @@ std::string KeeperOf(const std::string &text) {
     if (colon != std::string::npos)
         PortOf("--keeper", text.substr(colon + 1));
     return colon != std::string::npos ? text : text + ":2181";
+}
+
+void AddLogServer(ClusterLayout &layout, const std::string &text) {
+    constexpr char kOption[] = "--log-server";
+    LogServer server{text.substr(0, text.find(':')), layout.logServers.size() % layout.shards.size()};
+    RequireName(kOption, server.host, "name or IPv4 address of a host", ".-");
+    if (server.host.size() < text.size())
+        server.shard = static_cast<size_t>(NumberOf(kOption, text.substr(server.host.size() + 1), "shard",
+                                                    static_cast<int>(layout.shards.size()))) -
+                       1;
+    for (const LogServer &known : layout.logServers) {
+        if (known.host == server.host)
+            throw UsageError(std::string(kOption) + ": '" + server.host + "' is there twice");
+    }
+    if (layout.logServers.size() == kMostLogServers)
+        throw UsageError(std::string(kOption) + ": more than " + std::to_string(kMostLogServers) +
+                         " log servers");
+    layout.logServers.push_back(std::move(server));
 }
 
 } // namespace
@@ -76,6 +100,8 @@ ClusterLayout ReadClusterLayout(const ClusterLayoutOptions &options) {
     }
     for (const std::string &keeper : options.keepers)
         layout.keepers.push_back(KeeperOf(keeper));
+    for (const std::string &server : options.logServers)
+        AddLogServer(layout, server);
     for (const std::string &network : options.networks) {
         RequireName("--network", network, "address or network like 192.0.2.0/24", ".:/");
         layout.networks.push_back(network);

@@ -1,5 +1,7 @@
 // The parts of a status that need attention.
 
+#include <algorithm>
+
 #include "status/figures.h"
 #include "status/server_status.h"
 #include "status/state_names.h"
@@ -83,13 +85,22 @@ void LookAtSpool(const ReceiverStatus &status, Points &lines) {
                         (lasts ? "; " + spool.folder + " is full in " + Duration(*lasts) : ""));
 }
 
+// With kelo_store "cluster" of kelosyslog.conf there is no working log.
+bool OnlyClusterStores(const SyslogNgStatus &status) {
+    return std::any_of(
+        status.destinations.begin(), status.destinations.end(),
+        [](const SyslogNgCounters &destination) { return destination.id.starts_with("d_kelo_cluster#"); });
+}
+
 void LookAtDatabases(const ServerStatus &status, Points &lines) {
     using State = DatabaseStatus::State;
     const std::string &ofReceiver = status.receiver.told.database;
+    const bool isCluster = OnlyClusterStores(status.syslogNg);
     for (const DatabaseStatus &database : status.databases) {
         // The accounting and event databases are created with their first content. The working log must exist
-        // unless the receiver stores elsewhere.
-        const bool isMissed = (database.name == "logs" && ofReceiver.empty()) || database.path == ofReceiver;
+        // unless the receiver or a cluster stores instead.
+        const bool isMissed = (database.name == "logs" && ofReceiver.empty() && !isCluster) ||
+                              database.path == ofReceiver;
         if (database.state == State::Damaged)
             lines.push_back("database " + database.name + " is damaged: " + database.problem);
         else if (database.state == State::Locked)
