@@ -12,7 +12,7 @@ namespace kelo::tool {
 namespace {
 
 constexpr int64_t kLatelySec = 60;
-constexpr int64_t kDaySec = 86400;
+constexpr int64_t kRecentSec = 86400;
 
 int64_t Integer(const std::string &text) {
     return std::strtoll(text.c_str(), nullptr, 10);
@@ -39,7 +39,7 @@ void AskServer(EngineServers &servers, size_t server, int64_t now, ClusterServer
          servers.Ask(server, "SELECT substitution FROM system.macros WHERE macro = 'shard'"))
         state.shard = row.at(0);
     // The rows are in the order of their ids, so that the older ones are not read.
-    const int64_t firstId = (now - kDaySec) << KELODB_CLUSTER_BITS_BELOW_SECOND;
+    const int64_t firstId = (now - kRecentSec) << KELODB_CLUSTER_BITS_BELOW_SECOND;
     for (const std::vector<std::string> &row :
          servers.Ask(server, "SELECT node, countIf(utcsec > " + std::to_string(now - kLatelySec) +
                                  "), max(utcsec) FROM logs_shard WHERE id >= " + std::to_string(firstId) +
