@@ -9,7 +9,7 @@
 namespace kelo::tool {
 namespace {
 
-constexpr int kAttempts = 3;
+constexpr int kBlockAttempts = 3;
 // Days of one INSERT: each becomes a part of its own, and later versions refuse more than 100.
 constexpr size_t kMostDays = 50;
 constexpr int64_t kDaySec = 86400;
@@ -73,11 +73,11 @@ uint64_t BlockTransfer::Store(size_t server, std::span<const EngineRow> rows) {
     const Expected expected(rows, node_);
     uint64_t sent = 0;
     std::string problem;
-    for (int attempt = 0; attempt <= kAttempts; ++attempt) {
+    for (int attempt = 0; attempt <= kBlockAttempts; ++attempt) {
         const std::vector<const EngineRow *> missing = Missing(server, expected);
         if (missing.empty())
             return sent;
-        if (attempt == kAttempts)
+        if (attempt == kBlockAttempts)
             break;
         try {
             Send(server, missing);
