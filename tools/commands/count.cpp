@@ -89,8 +89,6 @@ int Run(const Options &options, const std::string &root) {
     const int64_t now = std::time(nullptr);
     const LogTable table = ResolveLogTable(options.table, root);
     const Conditions conditions = MakeConditions(options.filter, table, now);
-    if (options.IsSplit())
-        RequireDatabase(table.path, "count --by or --buckets");
     const int status = options.IsSplit() ? CountBy(table, conditions, options.filter, now, options.by, format)
                                          : PrintCount(table, conditions, options);
     if (!options.filter.keywords.empty())

@@ -2,10 +2,13 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <functional>
+#include <limits>
 #include <string_view>
 #include <unordered_map>
 
 #include "base/errors.h"
+#include "keloplatform/cluster.h"
 #include "keloplatform/failure.h"
 #include "read/read_only_query.h"
 
@@ -43,6 +46,29 @@ void ForEachRecord(const LogTable &table, const Conditions &conditions, const st
     }
 }
 
+// A cluster groups its records itself. Passes each group by its key, `key` as SQL, and its severity.
+struct Group {
+    std::string key;
+    size_t severity;
+    uint64_t count;
+};
+void ForEachGroup(const LogTable &table, const Conditions &conditions, const std::string &key,
+                  const std::function<void(const Group &group)> &take) {
+    const std::string sql = "SELECT " + key + " AS value, llevel, COUNT(*) AS count FROM " +
+                            SelectionOf(table, conditions) + " GROUP BY 1, 2";
+    const ReadOnlyQuery database(table);
+    try {
+        for (const ReadOnlyQuery::Row &row : database.Rows(sql, {"value", "llevel", "count"}))
+            take({row[0], SeverityOf(row[1]), std::strtoull(row[2].c_str(), nullptr, 10)});
+    } catch (const SqliteError &) {
+        throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
+    }
+}
+
+bool IsOfCluster(const LogTable &table) {
+    return KELODBIsCluster(table.path.c_str()) != 0;
+}
+
 // Something for each value, found without a copy of it.
 template <typename Counts>
 class ByValue {
@@ -69,10 +95,11 @@ bool HasManyValues(const std::string &column) {
 
 std::vector<ValueCount> CountManyValues(const LogTable &table, const Conditions &conditions,
                                         const std::string &column, const ValueOrder &order) {
+    constexpr uint64_t kAll = std::numeric_limits<int64_t>::max();
     const std::string sql = "SELECT ifnull(" + column + ", '') AS value, COUNT(*) AS count FROM " +
                             SelectionOf(table, conditions) + " GROUP BY 1 ORDER BY " +
                             (order.isMostFrequentFirst ? "2 DESC, " : "") + "1 LIMIT " +
-                            (order.limit == 0 ? "-1" : std::to_string(order.limit)) + " OFFSET " +
+                            std::to_string(order.limit == 0 ? kAll : order.limit) + " OFFSET " +
                             std::to_string(order.offset);
     std::vector<ValueCount> values;
     const ReadOnlyQuery database(table);
@@ -85,15 +112,51 @@ std::vector<ValueCount> CountManyValues(const LogTable &table, const Conditions 
     return values;
 }
 
-void Count(SeverityCounts &counts, size_t severity) {
-    ++counts.total;
-    ++counts.severities[severity];
+void Count(SeverityCounts &counts, size_t severity, uint64_t count = 1) {
+    counts.total += count;
+    counts.severities[severity] += count;
 }
 
 // The number of the span; `time` may be before `origin`.
 int64_t SpanOf(int64_t time, int64_t origin, int64_t span) {
     const int64_t into = time - origin;
     return into / span - (into % span < 0 ? 1 : 0);
+}
+
+// Spans are counted from one before all times, because SQL rounds towards zero.
+TimeTally TallyClusterByTime(const LogTable &table, const Conditions &conditions, int64_t origin,
+                             int64_t span) {
+    TimeTally tally;
+    const int64_t before = (kFarthestTime + std::abs(origin)) / span + 1;
+    const std::string usable =
+        "utcsec >= " + std::to_string(-kFarthestTime) + " AND utcsec <= " + std::to_string(kFarthestTime);
+    const auto with = [&](const std::string &condition) {
+        Conditions all = conditions;
+        all.push_back({SYSLOG_ATTRI_MSG, SYSLOG_OP_RAW, condition, {}});
+        return all;
+    };
+    ForEachGroup(table, with(usable),
+                 "(utcsec - (" + std::to_string(origin - before * span) + ")) / " + std::to_string(span),
+                 [&](const Group &group) {
+                     const int64_t number = std::strtoll(group.key.c_str(), nullptr, 10) - before;
+                     Count(tally.spans[number], group.severity, group.count);
+                     Count(tally.total, group.severity, group.count);
+                 });
+    ForEachGroup(table, with("NOT (" + usable + ")"), "llevel", [&](const Group &group) {
+        Count(tally.untimed, group.severity, group.count);
+        Count(tally.total, group.severity, group.count);
+    });
+    return tally;
+}
+
+ValueTally TallyClusterByColumn(const LogTable &table, const Conditions &conditions,
+                                const std::string &column) {
+    ValueTally tally;
+    ForEachGroup(table, conditions, column, [&](const Group &group) {
+        Count(tally.values[group.key], group.severity, group.count);
+        Count(tally.total, group.severity, group.count);
+    });
+    return tally;
 }
 
 } // namespace
@@ -109,6 +172,8 @@ const char *SeverityKey(size_t index) {
 }
 
 TimeTally TallyByTime(const LogTable &table, const Conditions &conditions, int64_t origin, int64_t span) {
+    if (IsOfCluster(table))
+        return TallyClusterByTime(table, conditions, origin, span);
     TimeTally tally;
     int64_t lastSpan = 0;
     SeverityCounts *last = nullptr; // of the record before, as most follow one of the same span
@@ -128,6 +193,8 @@ TimeTally TallyByTime(const LogTable &table, const Conditions &conditions, int64
 }
 
 ValueTally TallyByColumn(const LogTable &table, const Conditions &conditions, const std::string &column) {
+    if (IsOfCluster(table))
+        return TallyClusterByColumn(table, conditions, column);
     ByValue<SeverityCounts> values;
     ValueTally tally;
     const bool hasSeverity = table.kind != TableKind::Transfer;
@@ -142,7 +209,7 @@ ValueTally TallyByColumn(const LogTable &table, const Conditions &conditions, co
 
 std::vector<ValueCount> CountValues(const LogTable &table, const Conditions &conditions,
                                     const std::string &column, const ValueOrder &order) {
-    if (HasManyValues(column))
+    if (HasManyValues(column) || IsOfCluster(table))
         return CountManyValues(table, conditions, column, order);
     ByValue<uint64_t> counts;
     ForEachRecord(table, conditions, column, [&](const Row &row) { ++counts[row.Text(0)]; });
@@ -161,6 +228,8 @@ std::vector<ValueCount> CountValues(const LogTable &table, const Conditions &con
 
 Conditions NarrowToFew(const LogTable &table, const Conditions &conditions) {
     constexpr uint64_t kFew = 10'000;
+    if (IsOfCluster(table))
+        return conditions;
     std::string ids;
     const uint64_t count =
         LogReader(table, conditions).ReadPage({kFew}, false, [&](const _SYSLOG_LOG_DATA_tag &log) {

@@ -24,7 +24,7 @@ struct SeverityCounts {
 const char *SeverityKey(size_t index);
 
 // The counts below are each one statement: it hands every record's key and severity to this program, which
-// counts them, because SQLite would sort all records. They throw DatabaseError.
+// counts them, because SQLite would sort all records. A cluster counts itself. They throw DatabaseError.
 
 // Counts of spans of time, by the number of the span: span 0 begins at `origin`, in seconds since the epoch,
 // and lasts `span` seconds.
@@ -56,7 +56,7 @@ std::vector<ValueCount> CountValues(const LogTable &table, const Conditions &con
                                     const std::string &column, const ValueOrder &order);
 
 // The same selection by its ids if it is small, for conditions with a keyword: the index for keywords serves
-// only the reading of whole records, not the counts above.
+// only the reading of whole records, not the counts above. Of a cluster it is left as it is.
 Conditions NarrowToFew(const LogTable &table, const Conditions &conditions);
 
 // Times that far from the epoch are no times of records.

@@ -43,6 +43,27 @@ const std::vector<AnswerForm> &AnswerForms() {
          "SELECT intDiv(utcsec - ({0}), {1}) AS span, prio, count() FROM {logs}{where} GROUP BY span, prio "
          "ORDER BY span, prio",
          {"span", "prio", "number"}},
+        {"select ( utcsec - ( $number ) ) / $number as value , llevel , count ( * ) as count from logs "
+         "$where "
+         "group by 1 , 2",
+         "SELECT intDiv(utcsec - ({0}), {1}) AS value, llevel, count() FROM {logs}{where} GROUP BY value, "
+         "llevel",
+         {"value", "llevel", "count"}},
+        {"select $column as value , llevel , count ( * ) as count from logs $where group by 1 , 2",
+         "SELECT {0} AS value, llevel, count() FROM {logs}{where} GROUP BY value, llevel",
+         {"value", "llevel", "count"}},
+        {"select ifnull ( $column , '' ) as value , count ( * ) as count from logs $where group by 1 order "
+         "by 2 "
+         "desc , 1 limit $number offset $number",
+         "SELECT {0} AS value, count() AS number FROM {logs}{where} GROUP BY value ORDER BY number DESC, "
+         "value "
+         "LIMIT {2}, {1}",
+         {"value", "count"}},
+        {"select ifnull ( $column , '' ) as value , count ( * ) as count from logs $where group by 1 order "
+         "by 1 "
+         "limit $number offset $number",
+         "SELECT {0} AS value, count() FROM {logs}{where} GROUP BY value ORDER BY value LIMIT {2}, {1}",
+         {"value", "count"}},
         {"select host , count ( * ) as number from logs $where group by host order by number desc , host",
          "SELECT host, count() AS number FROM {logs}{where} GROUP BY host ORDER BY number DESC, host",
          {"host", "number"}},
@@ -78,11 +99,15 @@ void ReplaceAll(std::string &text, std::string_view from, const std::string &to)
         text.replace(at, from.size(), to);
 }
 
-std::string EngineValue(std::string_view form, size_t index, const std::string &value) {
-    size_t at = 0;
-    for (size_t seen = 0; seen <= index; ++seen)
-        at = form.find('$', at == 0 ? 0 : at + 1);
-    return form.substr(at).starts_with("$text") ? EngineText(value) : value;
+// The places of a form that have a value, in their order.
+std::vector<std::string_view> PlacesOf(std::string_view form) {
+    std::vector<std::string_view> places;
+    for (size_t at = form.find('$'); at != std::string_view::npos; at = form.find('$', at + 1)) {
+        const std::string_view place = form.substr(at, form.find(' ', at) - at);
+        if (place != "$where" && place != "$order")
+            places.push_back(place);
+    }
+    return places;
 }
 
 // A range of times, as a condition that also limits the ids.
@@ -96,9 +121,10 @@ Translation Fill(const AnswerForm &answer, const FormValues &values, const std::
     std::string &sql = translation.sql;
     if (sql.find("{utcsec}") != std::string::npos)
         ReplaceAll(sql, "{utcsec}", TimeRange(values));
+    const std::vector<std::string_view> places = PlacesOf(answer.form);
     for (size_t i = 0; i < values.values.size(); ++i) {
         const std::string place = "{" + std::to_string(i) + "}";
-        ReplaceAll(sql, place, EngineValue(answer.form, i, values.values[i]));
+        ReplaceAll(sql, place, places[i] == "$text" ? EngineText(values.values[i]) : values.values[i]);
         ReplaceAll(translation.columns.front(), place, values.values[i]);
     }
     ReplaceAll(sql, "{logs}", table);
@@ -108,9 +134,18 @@ Translation Fill(const AnswerForm &answer, const FormValues &values, const std::
     return translation;
 }
 
-bool AreSame(const std::vector<std::string> &values) {
-    return std::all_of(values.begin(), values.end(),
-                       [&](const std::string &value) { return value == values.front(); });
+// Whether the form has the same column in all places of one.
+bool HasOneColumn(std::string_view form, const FormValues &values) {
+    const std::vector<std::string_view> places = PlacesOf(form);
+    const std::string *column = nullptr;
+    for (size_t i = 0; i < places.size(); ++i) {
+        if (places[i] != "$column")
+            continue;
+        if (column != nullptr && *column != values.values[i])
+            return false;
+        column = &values.values[i];
+    }
+    return true;
 }
 
 uint64_t UnsignedOf(const std::string &text) {
@@ -186,8 +221,7 @@ Translation Translate(std::string_view sql, const std::string &database) {
             return PageByIdOf(values);
     }
     for (const AnswerForm &answer : AnswerForms()) {
-        if (has(answer.form) &&
-            (answer.form.find("$column") == std::string_view::npos || AreSame(values.values)))
+        if (has(answer.form) && HasOneColumn(answer.form, values))
             return Fill(answer, values, database + ".logs");
     }
     if (has("select * from logs $where $order"))
