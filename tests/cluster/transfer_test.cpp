@@ -24,7 +24,7 @@ void CreateSource(const std::string &path) {
     RunSql(path,
            "WITH RECURSIVE n(i) AS (SELECT 0 UNION ALL SELECT i + 1 FROM n WHERE i < " +
                std::to_string(kRows - 1) +
-               ") INSERT INTO logs SELECT i * 200 - 1000, 'host' || i % 7, NULLIF('10.0.0.1', i % 9), "
+               ") INSERT INTO logs SELECT i * 200 - 1000, 'host' || (i % 7), NULLIF('10.0.0.1', i % 9), "
                "'user', 'err', 'err', '', CASE i % 9000 WHEN 5 THEN NULL WHEN 6 THEN -7 WHEN 7 THEN "
                "'then' WHEN 8 THEN 1 << 40 ELSE 1600000000 + i * 90 END, '+02:00', '2020/09/13', "
                "'14:26:40', 'prog', CASE i % 1000 WHEN 1 THEN 'it''s \\ 100%\\N \\0' || char(9, 10, 13) "

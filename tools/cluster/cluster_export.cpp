@@ -15,7 +15,7 @@ namespace {
 
 // Rows that are compared and stored as a whole, unless one second has more.
 constexpr uint64_t kSpanRows = 50'000;
-constexpr int kAttempts = 3;
+constexpr int kTries = 3;
 
 // Seconds, both included, and the rows that the cluster had of them.
 struct Span {
@@ -102,7 +102,7 @@ private:
 
     // Returns the number of rows of the cluster.
     uint64_t Store(const Span &span) {
-        for (int attempt = 0; attempt <= kAttempts; ++attempt) {
+        for (int attempt = 0; attempt <= kTries; ++attempt) {
             const std::vector<uint64_t> stored = StoredHashes(span);
             uint64_t sum = 0;
             for (const uint64_t hash : stored)
