@@ -53,14 +53,17 @@ std::vector<int64_t> LowerEnds(const RowIds &ids) {
 std::vector<uint64_t> Cluster::IdsOfPage(const Translation &rows, const Page &page) {
     const uint64_t needed = page.limit + page.offset;
     const std::string select = "SELECT id FROM " + Table() + " WHERE ";
-    const std::string end =
-        " AND (" + rows.where + ")" + OrderText(rows) + " LIMIT " + std::to_string(needed);
+    const std::string end = " AND (" + rows.where + ")" + OrderText(rows) + " LIMIT ";
     std::vector<uint64_t> ids;
+    std::string below; // what was looked through
     for (const int64_t first :
          rows.isAscending ? std::vector{std::max<int64_t>(rows.ids.first, 0)} : LowerEnds(rows.ids)) {
-        ids = AskNumbers(select + "id >= " + std::to_string(first) + end);
+        const std::vector<uint64_t> found = AskNumbers(select + "id >= " + std::to_string(first) + below +
+                                                       end + std::to_string(needed - ids.size()));
+        ids.insert(ids.end(), found.begin(), found.end());
         if (ids.size() >= needed)
             break;
+        below = " AND id < " + std::to_string(first);
     }
     ids.erase(ids.begin(), ids.begin() + static_cast<ptrdiff_t>(std::min<uint64_t>(page.offset, ids.size())));
     return ids;
