@@ -252,7 +252,7 @@ void SpoolReceiver::Take(SpoolFile &file, std::string_view bytes) {
         if (piece == SpoolParser::Piece::kGarbage) {
             if (isNew)
                 PutAside(file, "no record", bytes.substr(0, size));
-        } else if (!file.receipts.Has(file.parser.Receipt())) {
+        } else if (!file.receipts.Has(file.parser.Receipt(), bytes.substr(0, size))) {
             TakeRecord(file, end, log);
         }
         isSaveDue_ = isSaveDue_ || isNew;
