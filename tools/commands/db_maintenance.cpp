@@ -116,14 +116,19 @@ int SetWal(const DbOptions &options) {
 }
 
 // Puts a fresh database in the place of a working log that is gone, so that it can be read before the first
-// message. Only where nobody else can write the folder, and only there does syslog-ng store.
+// message. It belongs to the owner of the folder, who stores.
 void BeginFresh(const LogTable &gone, const std::string &root) {
     struct stat folder {};
     if (gone.path != ResolveLogTable({}, root).path ||
-        stat(fs::path(gone.path).parent_path().c_str(), &folder) != 0 || folder.st_uid != geteuid())
+        stat(fs::path(gone.path).parent_path().c_str(), &folder) != 0 ||
+        (folder.st_uid != geteuid() && geteuid() != 0))
         return;
-    if (DBHandler(gone.path, root + "/usr/kelo/syslog/schema/logs.sql").DBCreate() != 0)
-        PrintMessage("there is no fresh " + gone.path + " before the next message; see the system log");
+    const std::string reason = AsOwnerOfFolder(gone.path, [&] {
+        DBHandler db(gone.path, root + "/usr/kelo/syslog/schema/logs.sql");
+        return db.DBCreate() == 0 ? std::string() : WhyFailed(gone.path);
+    });
+    if (!reason.empty())
+        PrintMessage("there is no fresh " + gone.path + " before the next message: " + reason);
 }
 
 int Limit(const LimitOptions &options) {
