@@ -52,7 +52,7 @@ define() {
 # syslog_ng_configure ROOT SHIPPED PROGRAM: a private copy of the shipped configuration, with all of its paths below ROOT
 # and PROGRAM as kelosyslog.
 syslog_ng_configure() {
-    local root=$1
+    local root=$1 keeper
     cp "$2" "$root/kelosyslog.conf"
     mkdir -p "$root/var/spool/kelosyslog/files" "$root/usr/kelo/syslog" "$root/usr/kelo/etc" "$root/var/log/kelosyslog" "$root/var/log/kelolog"
     ln -sfn "$(readlink -f "$(dirname "$2")/../schema")" "$root/usr/kelo/syslog/schema"
@@ -62,7 +62,9 @@ syslog_ng_configure() {
     define "$root/kelosyslog.conf" kelo_reserve "$(readlink -f "$(dirname "${BASH_SOURCE[0]}")/../../package/syslog-ng/reserve-buffer")"
     define "$root/kelosyslog.conf" kelo_spool "$root/var/spool/kelosyslog"
     define "$root/kelosyslog.conf" kelo_spool_done "$root/run/kelosyslog"
-    define "$root/kelosyslog.conf" kelo_keep_spool "$(dirname "$3")/keep-spool"
+    keeper=$(dirname "$3")/keep-spool # in a build, or as it is installed
+    [[ -x $keeper ]] || keeper=$(dirname "$3")/../libexec/kelosyslog/keep-spool
+    define "$root/kelosyslog.conf" kelo_keep_spool "$keeper"
     define "$root/kelosyslog.conf" kelo_address 127.0.0.1
     define "$root/kelosyslog.conf" kelo_listen "$root/listen.con[f]"
     define "$root/kelosyslog.conf" kelo_tls_dir "$root/tls"
@@ -102,13 +104,19 @@ syslog_ng_ready() {
 
 syslog_ng_control() { syslog-ng-ctl "${@:2}" --control="$1/syslog-ng.ctl" 2>/dev/null; }
 
-# syslog_ng_launch ROOT: starts the daemon with the ports that the configuration names and waits until it listens.
-syslog_ng_launch() {
+# The daemon alone, also in place of one that was killed.
+syslog_ng_run() {
     local root=$1
     syslog-ng --foreground --no-caps --cfgfile="$root/syslog-ng.conf" --persist-file="$root/syslog-ng.persist" \
         --pidfile="$root/syslog-ng.pid" --control="$root/syslog-ng.ctl" </dev/null >>"$root/syslog-ng.err" 2>&1 &
     echo $! >"$root/pid"
     disown # no notice of the shell when the daemon is killed
+}
+
+# syslog_ng_launch ROOT: starts the daemon with the ports that the configuration names and waits until it listens.
+syslog_ng_launch() {
+    local root=$1
+    syslog_ng_run "$root"
     spool_receiver_start "$root"
     wait_until 30 syslog_ng_settled "$root" && syslog_ng_ready "$root"
 }

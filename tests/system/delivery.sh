@@ -1,9 +1,11 @@
 # shellcheck shell=bash
 # A message is one row, whatever its format and text, with each of its parts in the right column of the table that logs.sql creates.
+# usage: delivery.sh database|spool
 source "$(dirname "$0")/support.sh"
+define "$root/kelosyslog.conf" kelo_store "$1"
 syslog_ng_start "$root"
 
-# syslog-ng creates the table from its own configuration.
+# Where syslog-ng stores it creates the table from its own configuration.
 send_lines <(make_messages 1 old)
 landed 1
 describe() {

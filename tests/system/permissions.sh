@@ -3,6 +3,7 @@
 # was taken over can place nothing beside the working log, nobody's open files keep root or a service from working, and
 # members of adm read in every state. Exit status 77: this is not root, or the kernel's settings cannot be changed.
 source "$(dirname "$0")/support.sh"
+define "$root/kelosyslog.conf" kelo_store database
 skip() { echo "SKIPPED: $*"; exit 77; }
 ((EUID == 0)) || skip "needs root, to become other users"
 

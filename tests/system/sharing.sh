@@ -3,6 +3,7 @@
 # for KELO_LOAD_SECONDS seconds (5). Then the database is damaged: the first statement that fails moves it away, the administrator
 # is notified, and syslog-ng continues in a fresh database that contains everything sent afterwards.
 source "$(dirname "$0")/support.sh"
+define "$root/kelosyslog.conf" kelo_store database
 mkdir "$root/run"
 ln -s ../syslog-ng.pid "$root/run/syslog-ng.pid"
 syslog_ng_start "$root"
