@@ -135,6 +135,7 @@ void AddClusterTransfer(Program &program, Command cluster) {
                                    [imported] { return Interruptible([&] { return Import(*imported); }); });
     import.Footer(kImportFooter);
     import.AddTexts("DATABASE", imported->databases, "DATABASE", "Databases of SQLite: logs and archives")
+        .AnyNumber()
         .Required();
     import.AddText("--node", imported->node, "N",
                    "A number from 0 to 255 that no log server and no other log has: it is a part of the ids");

@@ -8,7 +8,8 @@ namespace kelo::platform {
 namespace {
 
 [[noreturn]] void RefuseLibrary(const char *reason) {
-    throw ClusterError(KELO_FAILURE_MISSING, std::string("libcurl (package libcurl4) cannot be used: ") + reason);
+    throw ClusterError(KELO_FAILURE_MISSING,
+                       std::string("libcurl (package libcurl4) cannot be used: ") + reason);
 }
 
 template <typename Function>
