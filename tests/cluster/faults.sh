@@ -133,7 +133,7 @@ merged() {
     ask "$first" 'OPTIMIZE TABLE kelo.logs_shard FINAL' >/dev/null
     has_all "$first" $((number - 1 + hostile))
 }
-wait_until 20 merged || fail "lost answers: $(rows)"
+wait_until 40 merged || fail "lost answers: $(rows)"
 grep -q dropped "$root/dropped" || fail "no answer was lost"
 all_there "$(wc -l <"$root/dropped") answers lost"
 
