@@ -42,6 +42,12 @@ SpoolFile *SpoolFolder::Find(ino_t inode) const {
     return found != files_.end() ? found->get() : nullptr;
 }
 
+bool SpoolFolder::HasRoom() const {
+    const auto isUnread = [](const auto &file) { return !file->isForeign && file->position < file->size; };
+    return files_.size() < kMostOpen &&
+           static_cast<size_t>(std::count_if(files_.begin(), files_.end(), isUnread)) < kMostUnread;
+}
+
 std::unique_ptr<SpoolFile> SpoolFolder::Open(const std::string &name) {
     FileHandle file = folder_.Open(name, O_RDONLY);
     struct stat status {};
@@ -61,6 +67,7 @@ void SpoolFolder::Scan(const std::function<void(SpoolFile &)> &opened) {
     std::erase_if(files_, [](const auto &file) { return file->isRemoved && file->position >= file->size; });
     bytes_ = 0;
     unopened_ = 0;
+    areAllOpen_ = true;
     for (const std::string &name : names) {
         const std::optional<struct stat> status = folder_.Status(name);
         if (!own || !status || !S_ISREG(status->st_mode))
@@ -75,7 +82,8 @@ void SpoolFolder::Scan(const std::function<void(SpoolFile &)> &opened) {
         bytes_ += static_cast<uint64_t>(status->st_size);
         if (SpoolFile *known = Find(status->st_ino)) {
             known->name = name;
-        } else if (files_.size() >= kMostOpen) {
+        } else if (!HasRoom()) {
+            areAllOpen_ = false;
             unopened_ += static_cast<uint64_t>(status->st_size);
         } else if (auto file = Open(name)) {
             opened(*file);

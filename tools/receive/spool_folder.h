@@ -16,8 +16,11 @@ namespace kelo::tool {
 // folder's owner that nobody else can write are read.
 class SpoolFolder {
 public:
-    // No more files are open at a time; the others wait for their turn.
-    static constexpr size_t kMostOpen = 128;
+    // No more files are open at a time; the others wait for their turn. Only some of them may have bytes to
+    // be read: those that were read stay open until they are removed, and those of another version stay for
+    // good.
+    static constexpr size_t kMostOpen = 512;
+    static constexpr size_t kMostUnread = 128;
 
     // Throws std::system_error when changes in the folder cannot be watched.
     explicit SpoolFolder(const std::string &path);
@@ -39,8 +42,11 @@ public:
     uint64_t Unread() const;                  // of them not stored yet
     const std::string &Path() const { return path_; }
 
+    SpoolFile *Find(ino_t inode) const; // among the open files
+    bool AreAllOpen() const { return areAllOpen_; }
+
 private:
-    SpoolFile *Find(ino_t inode) const;
+    bool HasRoom() const;
     std::unique_ptr<SpoolFile> Open(const std::string &name);
 
     std::string path_;
@@ -49,6 +55,7 @@ private:
     std::vector<std::unique_ptr<SpoolFile>> files_;
     uint64_t bytes_ = 0;
     uint64_t unopened_ = 0; // bytes of the files that wait
+    bool areAllOpen_ = true;
     bool areOthersTold_ = false;
 };
 

@@ -10,6 +10,7 @@
 #include <cstring>
 #include <ctime>
 #include <filesystem>
+#include <iterator>
 #include <system_error>
 #include <thread>
 
@@ -134,6 +135,11 @@ SpoolReceiver::Places SpoolReceiver::PlacesOf(SpoolReader reader) const {
     for (const auto &file : folder_.Files()) {
         if (SpoolPlace place = file->Place(reader); place.offset > 0)
             places.push_back(std::move(place));
+    }
+    // Of files that wait for their turn to be opened.
+    if (const auto loaded = loaded_.find(reader); loaded != loaded_.end() && !folder_.AreAllOpen()) {
+        std::copy_if(loaded->second.begin(), loaded->second.end(), std::back_inserter(places),
+                     [this](const SpoolPlace &place) { return folder_.Find(place.inode) == nullptr; });
     }
     return places;
 }
