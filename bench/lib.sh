@@ -23,7 +23,7 @@ configure() {
     mkdir "$root/$kind"
     syslog_ng_configure "$root/$kind" package/syslog-ng/kelosyslog.conf "$programs/kelosyslog"
     if [[ $kind == file ]]; then
-        sed -i '1i block log kelo_pass_on_file() { };' "$root/file/kelosyslog.conf"
+        sed -i '1i block log kelo_pass_on_file() { };\nblock log kelo_parsed_file() { };' "$root/file/kelosyslog.conf"
         cat >>"$root/file/kelosyslog.conf" <<END
 source s_kelo_keeper_file { };
 destination d_kelo_file {

@@ -153,6 +153,54 @@ TEST_F(SpoolProgram, TellsFilesByWhatTheyAre) {
     EXPECT_TRUE(Has(42));
 }
 
+// In the record of today and that of before.
+TEST_F(SpoolProgram, TakesAMessageThatWasPassedOnApart) {
+    const std::string texts[] = {"<134>Feb  1 10:00:00 web-1 nginx[7]: a\nb",
+                                 "<134>1 2020-01-02T10:11:12Z web-1 nginx 7 - - a\nb",
+                                 "no message\n1 0badcaf"};
+    for (const std::string &text : texts) {
+        const std::string head = std::to_string(text.size()) + " 1577931072 +08:00 ";
+        const std::string record = "1 0badcafe 0  " + head + " ::ffff:10.0.0.1  " + text + "\n";
+        Append("20200102-10111", "1 0badcafe 0 8 0 " + head + "user notice 0d 10.0.0.1 10.0.0.1  " + text +
+                                     "\n" + record +
+                                     record.substr(0, record.size() - 3)); // the last one is torn
+    }
+    ChildProgram receiver = Start();
+    ASSERT_TRUE(receiver.Await([&] { return Query(logs_, "SELECT count(*) FROM logs") == "6"; }))
+        << Rows() << receiver.Err();
+    ExpectEnd(receiver);
+    EXPECT_EQ(RunSql(logs_, "SELECT group_concat(count, ';') FROM (SELECT "
+                            "count(*)||','||host||','||ip||','||fac||','||prio||','||tag||"
+                            "','||prog||','||msg AS count FROM logs GROUP BY host, ip, fac, prio, tag, prog, "
+                            "msg ORDER BY 1)"),
+              "2,10.0.0.1,10.0.0.1,user,notice,0d,-,no message\n1 "
+              "0badcaf;4,web-1,10.0.0.1,local0,info,86,nginx,a\nb");
+}
+
+// The clock was set back: more files than are open at a time come before one that was read in part.
+TEST_F(SpoolProgram, KnowsThePlaceInAFileThatWaitsForItsTurn) {
+    constexpr int kFiles = 400;
+    Append("20200102-20000", Messages(0, 10));
+    {
+        ChildProgram receiver = Start();
+        ASSERT_TRUE(AwaitRows(receiver, 10));
+        ExpectEnd(receiver);
+    }
+    for (int number = 10; number < kFiles; ++number)
+        Append("20200102-" + std::to_string(10000 + number),
+               number < 300 ? Messages(number, 1) : "9 0badcafe of another version\n");
+    Append("20200102-20000", Messages(300, 1));
+    {
+        ChildProgram receiver = Start();
+        ASSERT_TRUE(receiver.Await([&] { return Rows() != "10 10"; })) << receiver.Err();
+        kill(receiver.Pid(), SIGKILL);
+    }
+    ChildProgram receiver = Start();
+    ASSERT_TRUE(AwaitRows(receiver, 301)) << Rows() << receiver.Err();
+    ExpectEnd(receiver);
+    EXPECT_TRUE(Has(301)) << Counted();
+}
+
 TEST_F(SpoolProgram, DoublesAndLosesNothingWhenItIsKilled) {
     std::mt19937 random(7);
     constexpr int kMessages = 60'000;

@@ -59,24 +59,44 @@ std::optional<int> SecondsOf(std::string_view zone) {
     return zone[0] == '-' ? -seconds : seconds;
 }
 
+// The rewrite rule r_kelo_address_6: a socket of both families shows an address of IPv4 in another form.
+std::string_view PlainAddress(std::string_view address) {
+    constexpr std::string_view kMapped = "::ffff:";
+    const bool isMapped = address.starts_with(kMapped) &&
+                          address.find_first_not_of("0123456789.", kMapped.size()) == std::string_view::npos;
+    return isMapped ? address.substr(kMapped.size()) : address;
+}
+
 } // namespace
 
 struct SpoolParser::Header {
     enum Field { kReceipt, kHost, kProg, kMsg, kUtc, kZone, kFacility, kLevel, kTag, kIp, kFields };
     std::string_view fields[kFields];
     size_t bytes = 0;
+    bool isPassedOn = false;
 
     // Fails where a blank is missing.
     bool Split(std::string_view text) {
-        bytes = 0;
-        for (std::string_view &field : fields) {
+        for (int i = 0; i < kFields; ++i) {
+            if (isPassedOn && (i == kProg || i == kLevel || i == kTag))
+                continue; // one empty field with the one before
             const size_t blank = text.substr(0, kMaxHeaderBytes).find(' ', bytes);
             if (blank == std::string_view::npos)
                 return false;
-            field = text.substr(bytes, blank - bytes);
+            fields[i] = text.substr(bytes, blank - bytes);
             bytes = blank + 1;
+            isPassedOn = isPassedOn || (i == kHost && fields[i].empty());
         }
         return true;
+    }
+
+    // Host and program have lengths in the record of a parsed message only.
+    bool ReadLengths(size_t &host, size_t &prog, size_t &msg) const {
+        return Read(fields[kMsg], msg) &&
+               (isPassedOn ? fields[kFacility].empty()
+                           : Read(fields[kHost], host) && Read(fields[kProg], prog)) &&
+               host < kMaxRecordBytes && prog < kMaxRecordBytes && msg < kMaxRecordBytes &&
+               host + prog + msg < kMaxRecordBytes;
     }
 };
 
@@ -103,35 +123,35 @@ SpoolParser::Piece SpoolParser::ParseRecord(std::string_view bytes, _SYSLOG_LOG_
     size_t prog = 0;
     size_t msg = 0;
     int64_t utc = 0;
-    const bool isValid =
-        Read(header.fields[Header::kReceipt], receipt_) && Read(header.fields[Header::kHost], host) &&
-        Read(header.fields[Header::kProg], prog) && Read(header.fields[Header::kMsg], msg) &&
-        Read(header.fields[Header::kUtc], utc) && host < kMaxRecordBytes && prog < kMaxRecordBytes &&
-        msg < kMaxRecordBytes && host + prog + msg < kMaxRecordBytes;
+    const bool isValid = Read(header.fields[Header::kReceipt], receipt_) &&
+                         header.ReadLengths(host, prog, msg) && Read(header.fields[Header::kUtc], utc);
     if (!isValid || !SetTime(log, utc, header.fields[Header::kZone]))
         return Piece::kGarbage;
     const size_t body = kMarkBytes + header.bytes;
-    const size_t size = body + host + 1 + prog + 1 + msg + 1;
+    const size_t names = header.isPassedOn ? 0 : host + 1 + prog;
+    const size_t size = body + names + 1 + msg + 1;
     // A record that was cut off is followed by the next one, and its length would swallow that.
-    if (bytes.substr(0, size).find(mark, 1) != std::string_view::npos)
+    const std::string_view record = bytes.substr(0, size);
+    if ((mark_.empty() ? record.find(mark, 1) : FindMark(record, 1)) != std::string_view::npos)
         return Piece::kGarbage;
     if (bytes.size() < size)
         return Piece::kPartial;
-    if (bytes[body + host] != ' ' || bytes[body + host + 1 + prog] != ' ' || bytes[size - 1] != '\n')
+    if ((!header.isPassedOn && bytes[body + host] != ' ') || bytes[body + names] != ' ' ||
+        bytes[size - 1] != '\n')
         return Piece::kGarbage;
 
-    log.ip = header.fields[Header::kIp];
-    const std::string_view text = bytes.substr(body + host + 1 + prog + 1, msg);
+    log.ip = header.isPassedOn ? PlainAddress(header.fields[Header::kIp]) : header.fields[Header::kIp];
+    const std::string_view text = bytes.substr(body + names + 1, msg);
     if (prog > 0 || !ParseRawMessage(text, log)) {
-        log.fac = header.fields[Header::kFacility];
-        log.prio = SeverityOf(header.fields[Header::kLevel]);
-        log.tag = header.fields[Header::kTag];
-        log.host = bytes.substr(body, host);
+        log.fac = header.isPassedOn ? "user" : header.fields[Header::kFacility];
+        log.prio = header.isPassedOn ? SYSLOG_PRIO_NOTICE : SeverityOf(header.fields[Header::kLevel]);
+        log.tag = header.isPassedOn ? "0d" : header.fields[Header::kTag];
+        log.host = header.isPassedOn ? std::string_view(log.ip) : bytes.substr(body, host);
         log.prog = prog > 0 ? bytes.substr(body + host + 1, prog) : "-";
         log.msg = text;
     }
     if (mark_.empty())
-        mark_ = mark;
+        MarkSet(mark);
     size_ = size;
     return Piece::kRecord;
 }
@@ -151,11 +171,28 @@ SpoolParser::Piece SpoolParser::Skip(std::string_view bytes) {
 
 size_t SpoolParser::FindStart(std::string_view bytes, size_t from) const {
     if (!mark_.empty())
-        return bytes.find(mark_, from);
+        return FindMark(bytes, from);
     for (size_t at = bytes.find(kVersion, from); at != std::string_view::npos;
          at = bytes.find(kVersion, at + 1)) {
         if (HasId(bytes, at + kVersion.size()))
             return at;
+    }
+    return std::string_view::npos;
+}
+
+void SpoolParser::MarkSet(std::string_view mark) {
+    mark_ = mark;
+    steps_.fill(kMarkBytes);
+    for (size_t i = 0; i + 1 < kMarkBytes; ++i)
+        steps_[static_cast<uint8_t>(mark_[i])] = static_cast<uint8_t>(kMarkBytes - 1 - i);
+}
+
+// Every record is searched for it: most steps are as long as the mark.
+size_t SpoolParser::FindMark(std::string_view bytes, size_t from) const {
+    for (size_t end = from + kMarkBytes; end <= bytes.size();
+         end += steps_[static_cast<uint8_t>(bytes[end - 1])]) {
+        if (bytes[end - 1] == mark_.back() && bytes.substr(end - kMarkBytes, kMarkBytes) == mark_)
+            return end - kMarkBytes;
     }
     return std::string_view::npos;
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -12,7 +13,9 @@ namespace kelo::tool {
 //
 //     1 HOSTID RECEIPT HOSTLEN PROGLEN MSGLEN UTC TZ FAC LEVEL TAG IP HOST PROG MSG\n
 //
-// Without a program MSG is the whole message as it came.
+// In the record of a message that is passed on as it came the lengths of host and program, the three fields
+// from FAC on, and HOST and PROG are each one empty field; MSG is the whole message. Before, such a record
+// had all fields and a program without a byte.
 //
 // What is no record is garbage up to where the next one begins: HOSTID, a random number that no sender knows,
 // is the same in all records of a file.
@@ -39,9 +42,12 @@ private:
     Piece ParseRecord(std::string_view bytes, _SYSLOG_LOG_DATA_tag &log);
     Piece Skip(std::string_view bytes);
     size_t FindStart(std::string_view bytes, size_t from) const;
+    size_t FindMark(std::string_view bytes, size_t from) const;
+    void MarkSet(std::string_view mark);
     bool SetTime(_SYSLOG_LOG_DATA_tag &log, int64_t utc, std::string_view zone);
 
-    std::string mark_; // what every record of the file begins with, once one is known
+    std::string mark_;                 // what every record of the file begins with, once one is known
+    std::array<uint8_t, 256> steps_{}; // by the last byte looked at: how far on the mark may end
     size_t size_ = 0;
     uint64_t receipt_ = 0;
     // Of the last record: most have the same second.
