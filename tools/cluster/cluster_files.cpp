@@ -106,10 +106,9 @@ std::string UsersText(const ClusterLayout &layout, const ClusterPasswords &passw
     std::string all = HostsText(layout.Hosts());
     for (const std::string &network : layout.networks)
         all += Element("ip", network);
-    std::string users = UserText(all, "kelo_reader", passwords.reader) +
-                        UserText(all, "kelo_partial", passwords.reader) +
-                        UserText(all, "kelo_server", passwords.server) +
-                        UserText(all, "kelo_admin", passwords.administrator);
+    std::string users =
+        UserText(all, "kelo_reader", passwords.reader) + UserText(all, "kelo_partial", passwords.reader) +
+        UserText(all, "kelo_server", passwords.server) + UserText(all, "kelo_admin", passwords.administrator);
     std::vector<std::string> logServers;
     for (const LogServer &server : layout.logServers)
         logServers.push_back(server.host);

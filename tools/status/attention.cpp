@@ -99,8 +99,8 @@ void LookAtDatabases(const ServerStatus &status, Points &lines) {
     for (const DatabaseStatus &database : status.databases) {
         // The accounting and event databases are created with their first content. The working log must exist
         // unless the receiver or a cluster stores instead.
-        const bool isMissed = (database.name == "logs" && ofReceiver.empty() && !isCluster) ||
-                              database.path == ofReceiver;
+        const bool isMissed =
+            (database.name == "logs" && ofReceiver.empty() && !isCluster) || database.path == ofReceiver;
         if (database.state == State::Damaged)
             lines.push_back("database " + database.name + " is damaged: " + database.problem);
         else if (database.state == State::Locked)
