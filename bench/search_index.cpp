@@ -206,7 +206,7 @@ bool CompareProgram(const std::string &database, int rows) {
 
 // The journal with the messages of a text file; "" where it cannot be made.
 std::string JournalOf(const std::string &text) {
-    const std::string journal = text + ".journal";
+    std::string journal = text + ".journal";
     constexpr char kWriter[] = "/lib/systemd/systemd-journal-remote";
     if (access(kWriter, X_OK) != 0)
         return "";
