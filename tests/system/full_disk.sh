@@ -34,11 +34,13 @@ received() {
         END { print sum + 0 }'
 }
 reserved() { (($(stat -c %b "$root"/var/buffer/*.rqf) * 512 > 16777216)); }
-# Takes all free space but BYTES; again what has become free since.
+# Takes all free space but BYTES; again what has become free since. What is written meanwhile makes room for the writers only.
 fill() {
-    local free
-    free=$(df --output=avail --block-size=1 "$root/var" | tail -n 1)
-    fallocate --length $((free - ${1:-0})) "$root/var/ballast/$((++fillers))" 2>/dev/null || true
+    local free spare
+    for spare in 0 1048576 8388608 33554432; do
+        free=$(df --output=avail --block-size=1 "$root/var" | tail -n 1)
+        ! fallocate --length $((free - ${1:-0} - spare)) "$root/var/ballast/$((++fillers))" 2>/dev/null || return 0
+    done
 }
 notified() { grep -qs KELOSYSLOG_VOL_FULL "$root"/var/spool/kelonotify/new/*.json; }
 # Nothing may have been received while status looked, which takes a second and a half.
