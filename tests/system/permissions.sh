@@ -1,7 +1,8 @@
 # shellcheck shell=bash
-# The folders of the package with real users, and with the protections that Debian's kernel has switched on: a service that
-# was taken over can place nothing beside the working log, nobody's open files keep root or a service from working, and
-# members of adm read in every state. Exit status 77: this is not root, or the kernel's settings cannot be changed.
+# The folders of the package with real users, where syslog-ng stores, and with the protections that Debian's kernel has
+# switched on: a service that was taken over can place nothing beside the working log, nobody's open files keep root or a
+# service from working, and members of adm read in every state. Exit status 77: this is not root, or the kernel's settings
+# cannot be changed.
 source "$(dirname "$0")/support.sh"
 define "$root/kelosyslog.conf" kelo_store database
 skip() { echo "SKIPPED: $*"; exit 77; }
@@ -39,6 +40,7 @@ echo "kelosyslog:x:$serviceId:$serviceId::/:/bin/false" >"$root/etc/passwd"
 { echo "kelosyslog:x:$serviceId:"; getent group adm; echo root:x:0:; } >"$root/etc/group"
 echo root:x:0:0::/:/bin/sh >>"$root/etc/passwd"
 systemd-tmpfiles --create --root="$root" "$KELO_SOURCE_DIR/package/systemd/kelosyslog.tmpfiles"
+chown root "$logs" # as where syslog-ng stores
 ln -s ../../var/lib/kelosyslog "$root/usr/kelo/etc"
 ln -s ../syslog-ng.pid "$root/run/syslog-ng.pid"
 define "$root/kelosyslog.conf" kelo_db "$database"
@@ -62,7 +64,7 @@ hold() { # USER DATABASE STATEMENT
     printf '%s\n' '.timeout 2000' "BEGIN;" "$3" "SELECT 'settled';" >&"$held"
     wait_until 20 has_settled || fail "$1 does not get on: $(<"$root/holding")"
 }
-has_settled() { grep -q settled "$root/holding" || ! kill -0 "$holder" 2>/dev/null; }
+has_settled() { grep -qs settled "$root/holding" || ! kill -0 "$holder" 2>/dev/null; }
 kill_holder() {
     kill -KILL "$holder" 2>/dev/null || true
     wait "$holder" 2>/dev/null || true
