@@ -49,7 +49,7 @@ bool DBResult_tag::TakeValue(size_t column, sqlite3_value *value) {
         return true;
     }
     const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
-    hadText[column] = type == SQLITE_TEXT && text != nullptr;
+    hadText[column] = static_cast<char>(type == SQLITE_TEXT && text != nullptr);
     cell = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
     return text != nullptr || sqlite3_value_type(value) == SQLITE_NULL;
 }
