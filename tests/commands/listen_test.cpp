@@ -104,6 +104,7 @@ TEST_F(Listen, KeepsWhatItWrote) {
     NetworkSettings wanted;
     wanted.address = "127.0.0.2", wanted.port = 5141, wanted.framePort = 5142;
     wanted.isRateLimited = true, wanted.rate = 7;
+    wanted.spool = "/var/spool/kelosyslog"; // as shipped
     EXPECT_EQ(settings, wanted);
     Expect("listen --port 5141", 1, "nothing to change\n");
     WriteFile(listen_, "@define kelo_port \"70000\"\n");

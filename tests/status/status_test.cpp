@@ -125,7 +125,19 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
         WriteReceiverState(root_.Path(), state);
         ExpectAttention(named);
     }
+    state.spool = {}, state.ended = now;
+    WriteReceiverState(root_.Path(), state);
+    const std::string configuration = root_.File("etc/kelosyslog/syslog-ng/kelosyslog.conf");
+    const std::string unread = ": messages wait in " + root_.File("spool") + " (5 B); does kelosyslog-receive";
+    WriteFile(root_.File("spool/files/t17"), "12345");
+    WriteFile(root_.File("etc/syslog-ng/conf.d/kelosyslog.conf"), "");
+    WriteFile(configuration, "@define kelo_store \"database\"\n@define kelo_spool \"/spool\"\n");
+    EXPECT_THAT(Gather().attention, testing::Not(testing::Contains(HasSubstr("wait"))));
+    WriteFile(configuration, "@define kelo_store \"spool\"\n@define kelo_spool \"/spool\"\n");
+    EXPECT_THAT(Gather().attention, testing::Contains(StartsWith("the receiver is stopped" + unread)));
     fs::remove_all(root_.File("run/kelosyslog/receive.json"));
+    EXPECT_THAT(Gather().attention, testing::Contains(StartsWith("the receiver never ran" + unread)));
+    fs::remove_all(root_.File("etc/syslog-ng"));
     // A file, its content (nothing: there is no such file), and what is named then.
     const std::tuple<std::string, std::optional<std::string>, const char *> files[] = {
         {root_.File("run/kelosyslog/receive.json"), "{", "receive.json cannot be read"},
@@ -293,6 +305,7 @@ TEST_F(Status, HasTheMetricsThatAreDocumented) {
     std::string name;
     ServerStatus status = Gather();
     status.network.listeners = {{true, "::", 514}, {false, "::", 514}};
+    status.messageSpool.bytes = 1;
     std::istringstream text(StatusPrometheus(status));
     for (std::string line; std::getline(text, line);) {
         if (line.starts_with("# HELP ")) {

@@ -151,6 +151,10 @@ NetworkSettings ReadNetworkSettings(const std::string &root) {
     values.ReadNumber("kelo_rate", settings.rate);
     values.ReadNumber("kelo_connections", settings.connections);
     values.Read("kelo_tls_dir", settings.tlsFolder);
+    std::string store;
+    values.Read("kelo_store", store);
+    if (store == "spool")
+        values.Read("kelo_spool", settings.spool);
     return settings;
 }
 

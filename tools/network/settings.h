@@ -24,6 +24,7 @@ struct NetworkSettings {
     uint64_t rate = 1000;       // messages a second of one address
     uint64_t connections = 256; // most of each TCP port
     std::string tlsFolder = "/etc/kelosyslog/tls";
+    std::string spool; // the folder of the message spool; "" when messages are stored in another way
 
     bool operator==(const NetworkSettings &) const = default;
 };

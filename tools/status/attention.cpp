@@ -70,15 +70,28 @@ void LookAtReceiver(const ReceiverStatus &status, int64_t now, Points &lines) {
         lines.push_back("the receiver waits: " + status.told.waiting);
 }
 
-void LookAtSpool(const ReceiverStatus &status, Points &lines) {
+// Whether nothing reads the message spool although syslog-ng writes it.
+bool LookAtUnreadSpool(const ServerStatus &status, Points &lines) {
+    using State = ReceiverStatus::State;
+    const MessageSpoolStatus &spool = status.messageSpool;
+    const std::string &folder = spool.folder.empty() ? status.receiver.told.spool.folder : spool.folder;
+    const State state = status.receiver.state;
+    if (folder.empty() || (state != State::None && state != State::Stopped))
+        return false;
+    lines.push_back("the receiver " + std::string(state == State::None ? "never ran" : "is stopped") +
+                    ": messages wait in " + folder +
+                    (spool.bytes ? " (" + Bytes(static_cast<int64_t>(*spool.bytes)) + ")" : "") +
+                    "; does kelosyslog-receive run?");
+    return true;
+}
+
+void LookAtSpool(const ServerStatus &status, Points &lines) {
     constexpr int64_t kLongSec = 60;
-    const ReceiverState::Spool &spool = status.told.spool;
-    if (spool.folder.empty())
+    if (LookAtUnreadSpool(status, lines))
         return;
+    const ReceiverState::Spool &spool = status.receiver.told.spool;
     const auto lasts = spool.LastsSec();
-    if (status.state == ReceiverStatus::State::Stopped)
-        lines.push_back("the receiver is stopped: messages wait in " + spool.folder);
-    else if (spool.limit > 0 && spool.bytes >= spool.limit)
+    if (spool.limit > 0 && spool.bytes >= spool.limit)
         lines.push_back(spool.folder + " is full: senders over TCP have to wait");
     else if (spool.behindSec >= kLongSec)
         lines.push_back("the receiver is " + Duration(spool.behindSec) + " behind" +
@@ -155,7 +168,7 @@ std::vector<std::string> FindAttention(const ServerStatus &status) {
     for (std::string &line : FindNetworkProblems(status.network, status.syslogNg))
         lines.push_back(std::move(line));
     LookAtReceiver(status.receiver, status.time, lines);
-    LookAtSpool(status.receiver, lines);
+    LookAtSpool(status, lines);
     lines.insert(lines.end(), status.folderProblems.begin(), status.folderProblems.end());
     LookAtDatabases(status, lines);
     LookAtRetention(status, lines);

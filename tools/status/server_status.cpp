@@ -50,6 +50,7 @@ ServerStatus GatherStatus(const StatusOptions &options) {
     status.syslogNg = GatherSyslogNg(options.root, options.control, options.timeout);
     status.network = GatherNetwork(options.root, !options.control.empty(), status.syslogNg);
     status.receiver = GatherReceiver(options.root, status.time);
+    status.messageSpool = GatherMessageSpool(options.root, status.network);
     status.folderProblems = FindFolderProblems(status.syslogNg, status.receiver);
     std::vector<std::string> others;
     if (!status.receiver.told.database.empty() && MayOpenPathsOf(status.receiver))

@@ -8,6 +8,7 @@
 #include "base/volumes.h"
 #include "status/accounting.h"
 #include "status/databases.h"
+#include "status/message_spool.h"
 #include "status/network.h"
 #include "status/notifications.h"
 #include "status/receiver.h"
@@ -23,6 +24,7 @@ struct ServerStatus {
     SyslogNgStatus syslogNg;
     NetworkStatus network;
     ReceiverStatus receiver;
+    MessageSpoolStatus messageSpool;
     std::vector<DatabaseStatus> databases;
     ArchiveStatus archives;
     RetentionStatus retention;

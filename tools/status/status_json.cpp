@@ -104,6 +104,13 @@ Value ToJson(const ReceiverStatus &status) {
     return json;
 }
 
+Value ToJson(const MessageSpoolStatus &status) {
+    Value json;
+    json["folder"] = status.folder;
+    json["bytes"] = status.bytes ? Count(*status.bytes) : Value();
+    return json;
+}
+
 Value ToJson(const DatabaseStatus &status) {
     Value json;
     json["name"] = status.name;
@@ -215,6 +222,7 @@ std::string StatusJson(const ServerStatus &status) {
     json["syslog_ng"] = ToJson(status.syslogNg);
     json["listening"] = ToArray(status.network.listeners);
     json["receiver"] = ToJson(status.receiver);
+    json["message_spool"] = ToJson(status.messageSpool);
     json["databases"] = ToArray(status.databases);
     json["archives"] = ToJson(status.archives);
     json["retention"] = ToJson(status.retention);

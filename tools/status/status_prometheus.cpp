@@ -191,6 +191,9 @@ std::string StatusPrometheus(const ServerStatus &status) {
     AddSyslogNg(metrics, status.syslogNg);
     AddListeners(metrics, status.network.listeners);
     AddReceiver(metrics, status.receiver);
+    if (status.messageSpool.bytes)
+        metrics.Single("message_spool_bytes", "Size of the files in the message spool.",
+                       *status.messageSpool.bytes);
     AddDatabases(metrics, status);
     metrics.Single("retention_followed", "Whether there is a rule of retention and it is followed.",
                    status.retention.rule && status.retention.problem.empty());

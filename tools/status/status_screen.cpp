@@ -118,12 +118,14 @@ std::string TextOf(const ReceiverState::Spool &spool) {
     return text + ", shrinking, empty in " + Duration(static_cast<int64_t>(seconds));
 }
 
-void AddReceiver(Lines &lines, const ReceiverStatus &status) {
+void AddReceiver(Lines &lines, const ReceiverStatus &status, const MessageSpoolStatus &spool) {
     using State = ReceiverStatus::State;
     const ReceiverState &told = status.told;
     if (status.state == State::None || status.state == State::Unreadable) {
         AddSection(lines, "receiver", status.state == State::None ? "never ran here" : "unreadable",
-                   status.state == State::None ? kHeading : kBad);
+                   status.state == State::None && spool.folder.empty() ? kHeading : kBad);
+        if (spool.bytes)
+            AddText(lines, "spool: " + Bytes(static_cast<int64_t>(*spool.bytes)) + " in " + spool.folder);
         return;
     }
     std::string text = StateName(status.state);
@@ -290,7 +292,7 @@ std::string RenderStatus(const ServerStatus &status, const ScreenLayout &layout)
     AddHead(lines, status, layout.width);
     AddSyslogNg(lines, status.syslogNg);
     AddNetwork(lines, status.network);
-    AddReceiver(lines, status.receiver);
+    AddReceiver(lines, status.receiver, status.messageSpool);
     AddDatabases(lines, status);
     AddRetention(lines, status.retention);
     AddAccounting(lines, status);
