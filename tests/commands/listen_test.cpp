@@ -6,6 +6,9 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <atomic>
+#include <thread>
+
 #include "base/files.h"
 #include "network/certificates.h"
 #include "network/listeners.h"
@@ -146,6 +149,26 @@ TEST_F(Listen, FindsTheSocketsOfAProcess) {
                             "UDP :: port " + std::to_string(other.port) + " IPv4, IPv6 open 0"));
     // What does not listen as it should is restarted; a new port alone needs a reload.
     EXPECT_EQ(NeededStep(settings, settings, getpid()), Step::kRestart);
+}
+
+TEST_F(Listen, ShowsASocketOnceWhileOthersComeAndGo) {
+    std::vector<BoundSocket> kept; // more than a page of the kernel's table
+    for (int i = 0; i < 200; ++i)
+        kept.emplace_back(AF_INET, SOCK_DGRAM);
+    std::atomic<bool> isOver = false;
+    std::thread others([&] {
+        while (!isOver)
+            const BoundSocket passing(AF_INET, SOCK_DGRAM);
+    });
+    uint64_t repeated = 0;
+    for (int reading = 0; reading < 20; ++reading) {
+        std::set<uint64_t> found;
+        for (const InetSocket &socket : ReadInetSockets(0))
+            repeated += socket.inode != 0 && !found.insert(socket.inode).second;
+    }
+    isOver = true;
+    others.join();
+    EXPECT_EQ(repeated, 0U);
 }
 
 TEST_F(Listen, JudgesCertificates) {

@@ -128,7 +128,8 @@ TEST_F(Status, TellsWhatNeedsAttentionAndNothingElse) {
     state.spool = {}, state.ended = now;
     WriteReceiverState(root_.Path(), state);
     const std::string configuration = root_.File("etc/kelosyslog/syslog-ng/kelosyslog.conf");
-    const std::string unread = ": messages wait in " + root_.File("spool") + " (5 B); does kelosyslog-receive";
+    const std::string unread =
+        ": messages wait in " + root_.File("spool") + " (5 B); does kelosyslog-receive";
     WriteFile(root_.File("spool/files/t17"), "12345");
     WriteFile(root_.File("etc/syslog-ng/conf.d/kelosyslog.conf"), "");
     WriteFile(configuration, "@define kelo_store \"database\"\n@define kelo_spool \"/spool\"\n");

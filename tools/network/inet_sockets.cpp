@@ -30,7 +30,10 @@ bool ReadAddress(const std::string &text, InetSocket &socket) {
     return true;
 }
 
+// The kernel hands out a table page by page and finds its place again by counting, so a socket may come twice
+// when others are opened meanwhile.
 void ReadTable(const std::string &path, bool isTcp, std::vector<InetSocket> &sockets) {
+    std::set<uint64_t> known;
     std::ifstream file(path);
     std::string line;
     std::getline(file, line); // names of the columns
@@ -43,7 +46,7 @@ void ReadTable(const std::string &path, bool isTcp, std::vector<InetSocket> &soc
         socket.isTcp = isTcp;
         fields >> skipped >> own >> skipped >> std::hex >> state >> std::dec >> skipped >> skipped >>
             skipped >> socket.user >> skipped >> socket.inode;
-        if (!fields || !ReadAddress(own, socket))
+        if (!fields || !ReadAddress(own, socket) || (socket.inode != 0 && !known.insert(socket.inode).second))
             continue;
         socket.isListening = state == (isTcp ? kListening : kUnconnected);
         socket.isEstablished = isTcp && state == kEstablished;

@@ -22,7 +22,8 @@ struct InetSocket {
     uint64_t drops = 0; // datagrams that the kernel discarded for lack of room
 };
 
-// All sockets in the network of a process, or of the caller's for 0.
+// The sockets in the network of a process, or of the caller's for 0. One may be missing when others are
+// closed meanwhile.
 std::vector<InetSocket> ReadInetSockets(pid_t pid);
 
 // Whether they can be read: a sandbox may hide the process.

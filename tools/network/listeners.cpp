@@ -49,6 +49,41 @@ bool IsAt(const InetSocket &connection, const Listener &listener) {
             kMapped + listener.address == connection.address);
 }
 
+std::vector<Listener> ReadListeners(const NetworkSettings &settings, const Ownership &ownership,
+                                    pid_t syslogNg) {
+    std::vector<Listener> listeners = ConfiguredListeners(settings);
+    const std::vector<InetSocket> sockets = ReadInetSockets(syslogNg);
+    for (Listener &listener : listeners)
+        listener.isKnown = AreSocketsReadable(syslogNg);
+    for (const InetSocket &socket : sockets) {
+        if (!socket.isListening || !ownership.Has(socket))
+            continue;
+        auto listener = std::find_if(listeners.begin(), listeners.end(), [&](const Listener &known) {
+            return known.isTcp == socket.isTcp && known.address == socket.address &&
+                   known.port == socket.port;
+        });
+        if (listener == listeners.end()) {
+            listener = listeners.emplace(listeners.end());
+            listener->isTcp = socket.isTcp;
+            listener->isKnown = true;
+            listener->address = socket.address;
+            listener->port = socket.port;
+        }
+        listener->isOpen = true;
+        listener->drops += socket.drops;
+    }
+    for (const InetSocket &socket : sockets) {
+        if (!socket.isEstablished || !ownership.Has(socket))
+            continue;
+        const auto listener = std::find_if(listeners.begin(), listeners.end(), [&](const Listener &known) {
+            return known.isOpen && IsAt(socket, known);
+        });
+        if (listener != listeners.end())
+            ++listener->connections;
+    }
+    return listeners;
+}
+
 } // namespace
 
 std::string Listener::Name() const {
@@ -85,38 +120,15 @@ std::vector<Listener> ConfiguredListeners(const NetworkSettings &settings) {
 }
 
 std::vector<Listener> FindListeners(const NetworkSettings &settings, pid_t syslogNg) {
-    std::vector<Listener> listeners = ConfiguredListeners(settings);
+    constexpr int kReadings = 3; // as one may miss a socket
     const Ownership ownership(settings, syslogNg);
-    const std::vector<InetSocket> sockets = ReadInetSockets(syslogNg);
-    for (Listener &listener : listeners)
-        listener.isKnown = AreSocketsReadable(syslogNg);
-    for (const InetSocket &socket : sockets) {
-        if (!socket.isListening || !ownership.Has(socket))
-            continue;
-        auto listener = std::find_if(listeners.begin(), listeners.end(), [&](const Listener &known) {
-            return known.isTcp == socket.isTcp && known.address == socket.address &&
-                   known.port == socket.port;
-        });
-        if (listener == listeners.end()) {
-            listener = listeners.emplace(listeners.end());
-            listener->isTcp = socket.isTcp;
-            listener->isKnown = true;
-            listener->address = socket.address;
-            listener->port = socket.port;
-        }
-        listener->isOpen = true;
-        listener->drops += socket.drops;
+    for (int reading = 1;; ++reading) {
+        std::vector<Listener> listeners = ReadListeners(settings, ownership, syslogNg);
+        const bool areAllOpen = std::all_of(listeners.begin(), listeners.end(),
+                                            [](const Listener &listener) { return listener.isOpen; });
+        if (areAllOpen || reading == kReadings)
+            return listeners;
     }
-    for (const InetSocket &socket : sockets) {
-        if (!socket.isEstablished || !ownership.Has(socket))
-            continue;
-        const auto listener = std::find_if(listeners.begin(), listeners.end(), [&](const Listener &known) {
-            return known.isOpen && IsAt(socket, known);
-        });
-        if (listener != listeners.end())
-            ++listener->connections;
-    }
-    return listeners;
 }
 
 bool DoOverlap(const std::string &address, const std::string &other) {
