@@ -1,6 +1,7 @@
 # shellcheck shell=bash
 # While the disk is full, the senders over TCP wait, and status, an event and a notification report it. When there is room
-# again, reception goes on by itself, and every message is a row, once. Takes about 20 s, on a volume in memory.
+# again, reception goes on by itself, and every message is a row, once. With the spool, status shows how many datagrams were dropped.
+# Takes about 20 s, on a volume in memory.
 # usage: full_disk.sh database|receiver|spool
 if [[ ! ${KELO_OWN_MOUNTS:-} ]]; then
     mounts=(unshare --map-root-user --mount)
@@ -14,7 +15,7 @@ clean_up() {
     rm -rf "$root"
 }
 mkdir -p "$root/var"
-mount -t tmpfs -o size=160m tmpfs "$root/var"
+mount -t tmpfs -o size=320m tmpfs "$root/var"
 mkdir -p "$root/var/log/kelosyslog" "$root/var/log/kelolog" "$root/var/buffer" "$root/var/ballast" "$root/var/etc" "$root/var/spool/kelonotify" "$root/var/spool/kelosyslog" "$root/run/kelosyslog"
 rmdir "$root/usr/kelo/etc"
 ln -s "$root/var/etc" "$root/usr/kelo/etc"
@@ -25,6 +26,9 @@ define "$root/kelosyslog.conf" kelo_buffer_dir "$root/var/buffer"
 define "$root/kelosyslog.conf" kelo_buffer_bytes 16777216
 define "$root/kelosyslog.conf" kelo_buffer_window 8388608
 define "$root/kelosyslog.conf" kelo_spool_spare 8388608
+# A window and a buffer of datagrams that the end of this test can fill.
+[[ $1 != spool ]] || sed -i '/^source s_kelo_datagrams/,/^}/ { s/log-iw-size(100000)/log-iw-size(1000)/; s/so-rcvbuf(4194304)/so-rcvbuf(65536)/ }' \
+    "$root/kelosyslog.conf"
 
 # send NAME OPTIONS...: sends for a while; `sent` tells how many messages that were.
 send() { loggen --inet --quiet --interval=10 "${@:2}" >"$root/$1" 2>&1 & }
@@ -90,3 +94,24 @@ wait_until 60 has_rows "$database" $total "$sentOnes" || fail "not all $total me
 expect "rows, and different ones" "$(query "SELECT count(*), count(DISTINCT msg) FROM logs WHERE $sentOnes")" "$total|$total"
 expect "events while it lasted" "$(sql "$root/usr/kelo/etc/kelosyslog.db" \
     "SELECT count(*), sum(time BETWEEN $filled AND $freed) FROM log WHERE event = 'Volume space is not enough.'")" "1|1"
+
+[[ $1 == spool ]] || exit 0
+# Of datagrams that come while the spool is full, each is stored or among those that status says the kernel has dropped.
+is_spool_closed() { [[ ! $(find /proc/"$(<"$root/pid")"/fd -lname "$root/var/spool/kelosyslog/*" 2>/dev/null) ]]; }
+mkdir -p "$root/etc/kelosyslog/syslog-ng" "$root/etc/syslog-ng/conf.d" "$root/var/lib/syslog-ng" # where status looks for the ports
+ln -s "$root/syslog-ng.ctl" "$root/var/lib/syslog-ng"
+cp "$root/kelosyslog.conf" "$root/etc/kelosyslog/syslog-ng"
+ln -s "$root/kelosyslog.conf" "$root/etc/syslog-ng/conf.d"
+keeper=$(pgrep -P "$(<"$root/pid")" keep-spool)
+kill -STOP "$keeper" # else it finds room and opens the spool again
+rm "$root/var/spool/kelosyslog/in"
+wait_until 20 is_spool_closed || { kill -CONT "$keeper"; fail "syslog-ng does not close its file"; }
+send more --dgram --number=4000 --rate=20000 --size=240 127.0.0.1 "$syslogPort"
+wait $!
+"$KELO_BIN_DIR/kelosyslog" status -o json --root "$root" >"$root/status.json" || true
+dropped=$(grep -oP '"kernel_drops": *\K[0-9]+' "$root/status.json" | awk '{ sum += $1 } END { print sum + 0 }')
+kill -CONT "$keeper"
+((dropped > 0 && dropped < 4000)) || fail "status shows $dropped dropped datagrams of 4000: $(<"$root/status.json")"
+wait_until 60 has_rows "$database" $((total + 4000 - dropped)) "$sentOnes" || fail "$dropped of 4000 were dropped, and others are lost"
+syslog_ng_stop "$root"
+expect "rows with the datagrams" "$(query "SELECT count(*) FROM logs WHERE $sentOnes")" $((total + 4000 - dropped))
