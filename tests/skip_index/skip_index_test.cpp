@@ -170,6 +170,17 @@ TEST_F(SkipIndexTest, FindsMessagesThatMatchByOtherBytesThanTheKeywords) {
     }
 }
 
+// One record of a block is the only one of it that fits.
+TEST_F(SkipIndexTest, FindsWordsAtEveryPlaceOfAMessageAndValuesAtTheEndsOfBlocks) {
+    RunSql(path_, "PRAGMA synchronous=OFF; UPDATE logs SET msg = substr(hex(zeroblob(400)), 1, id / 256) || "
+                  "iif(id % 512 = 5, '@NEEDLEAZ[', 'nEEDLEaz`{') WHERE id % 256 = 5; "
+                  "UPDATE logs SET llevel = 'crit', fac = 'lpr' WHERE id % 256 IN (31, 32)");
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    for (const char *where : {"msg LIKE '%needleaz%'", "msg GLOB '*nEEDLEaz`{*'", "msg LIKE '%0@needleaz[%'",
+                              "llevel = 'crit'", "fac = 'lpr'"})
+        EXPECT_EQ(Count(where), Count(std::string(where) + " OR 0")) << where;
+}
+
 TEST_F(SkipIndexTest, FindsRecordsThatComeBackFromACopy) {
     fs::copy_file(path_, root_.File("copy"));
     RunSql(path_, "DELETE FROM logs WHERE msg GLOB '*Segfault*'");

@@ -12,11 +12,6 @@ uint64_t Mixed(uint64_t hash, uint64_t word) {
     return hash ^ (hash >> 32);
 }
 
-void AddToken(TokenColumn column, std::string_view value, GramBits &bits) {
-    for (const uint16_t bit : BitsOfToken(column, value))
-        bits[bit / 64] |= uint64_t{1} << (bit % 64);
-}
-
 using Tile = std::array<uint64_t, 64>;
 
 // Exchanges rows and columns of 64 x 64 bits, by halves of halves.
@@ -58,21 +53,46 @@ void Piece::Clear() {
         block.fill(0);
     rows_.fill(0);
     zones_.fill({});
+    StartBlock(0);
+}
+
+void Piece::StartBlock(size_t block) {
+    block_ = block;
+    flags_.fill(0);
+    severity_.reset();
+    facility_.reset();
+}
+
+void Piece::EndBlock() {
+    AddFlags(flags_, (*blocks_)[block_]);
+}
+
+// Most values are those of the row before.
+void Piece::AddToken(TokenColumn column, std::string_view value, std::optional<std::string> &last) {
+    if (last == value)
+        return;
+    for (const uint16_t bit : BitsOfToken(column, value))
+        flags_[bit] = 1;
+    last = value;
 }
 
 void Piece::Add(size_t number, const IndexedRow &row) {
     const size_t block = number / kIdsPerBlock;
-    GramBits &bits = (*blocks_)[block];
-    AddGrams(row.message, bits);
-    AddToken(TokenColumn::kSeverity, row.severity, bits);
-    AddToken(TokenColumn::kFacility, row.facility, bits);
+    if (block != block_) {
+        EndBlock();
+        StartBlock(block);
+    }
+    AddGrams(row.message, flags_);
+    AddToken(TokenColumn::kSeverity, row.severity, severity_);
+    AddToken(TokenColumn::kFacility, row.facility, facility_);
     Zone &zone = zones_[block / 64];
     for (size_t column = 0; column < zone.size(); ++column)
         zone[column].Add(row.times[column]);
     ++rows_[block];
 }
 
-void Piece::FillGaps() {
+void Piece::Finish() {
+    EndBlock();
     for (size_t block = 0; block < rows_.size(); ++block) {
         if (rows_[block] == kIdsPerBlock)
             continue;

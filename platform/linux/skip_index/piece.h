@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <cstring>
 #include <memory>
+#include <optional>
+#include <string>
 #include <string_view>
 
 #include "skip_index/grams.h"
@@ -67,17 +69,25 @@ public:
     // Throws std::bad_alloc.
     Piece();
     void Clear();
-    // Adds the row with this number in the piece, each once.
+    // Adds the row with this number in the piece, each once. The order of the numbers is the fastest one.
     void Add(size_t number, const IndexedRow &row);
-    // Makes a block or zone with fewer rows than ids fit every search: the others were deleted, and come back
-    // when somebody copies an older database over the content of this one.
-    void FillGaps();
+    // After the last row: makes a block or zone with fewer rows than ids fit every search. The others were
+    // deleted, and come back when somebody copies an older database over the content of this one.
+    void Finish();
     // All of it with its check sums.
     BuiltPiece Build(uint64_t fileNumber, int64_t piece) const;
 
 private:
+    void StartBlock(size_t block);
+    void EndBlock();
+    void AddToken(TokenColumn column, std::string_view value, std::optional<std::string> &last);
     std::unique_ptr<Slice[]> Slices(uint64_t fileNumber, int64_t piece) const;
 
+    // The block of the newest row, and its last values.
+    size_t block_ = 0;
+    GramFlags flags_{};
+    std::optional<std::string> severity_;
+    std::optional<std::string> facility_;
     std::unique_ptr<std::array<GramBits, kBlocksPerPiece>> blocks_;
     std::array<Zone, kZonesPerPiece> zones_{};
     std::array<uint8_t, kBlocksPerPiece> rows_{}; // of each block

@@ -96,7 +96,7 @@ bool AreLike(Tokens tokens, std::initializer_list<std::string_view> form) {
 Need NeedOf(const std::vector<std::string> &literals) {
     Need need;
     for (const std::string &literal : literals) {
-        const std::vector<uint16_t> grams = GramsOfLiteral(literal, kMostGrams);
+        const std::vector<uint16_t> grams = BitsOfLiteral(literal, kMostGrams);
         need.grams.insert(need.grams.end(), grams.begin(), grams.end());
     }
     if (!need.grams.empty())
