@@ -190,6 +190,36 @@ TEST_F(SkipIndexTest, FindsRecordsThatComeBackFromACopy) {
     EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
 }
 
+TEST_F(SkipIndexTest, IsUsedUpToTheLargestId) {
+    RunSql(path_,
+           "UPDATE sqlite_sequence SET seq = 9223372036854755807; INSERT INTO logs(utcsec, msg) SELECT "
+           "id, msg FROM logs WHERE id <= 20000; DELETE FROM logs WHERE id <= 160000");
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "1");
+    for (const char *order : {"ASC", "DESC"}) {
+        const std::string sql = std::string("SELECT * FROM logs WHERE (utcsec > 19400) ORDER BY id ") + order;
+        EXPECT_EQ(Execute(ConnectTo(path_), sql, {}, {{1000, 0}}).rows.size(), 600U);
+    }
+}
+
+// "logs" is not the table of the file, or has an index in whose order the rows come.
+TEST_F(SkipIndexTest, LeavesStatementsAloneThatMeanSomethingElse) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    const Connection connection = ConnectTo(path_);
+    const auto firstId = [&](const char *sql) {
+        const Rows rows = Execute(connection, sql, {"id"}).rows;
+        return rows.empty() ? "" : rows[0][0].value_or("NULL");
+    };
+    const char *const unordered = "SELECT * FROM logs WHERE (msg GLOB 'request*Segfault')";
+    EXPECT_EQ(firstId(unordered), "7");
+    Execute(connection, "CREATE INDEX messages ON logs(msg)");
+    EXPECT_EQ(firstId(unordered), "100007");
+    Execute(connection, "CREATE TEMP VIEW logs AS SELECT id, 'Segfault' AS msg FROM main.logs WHERE id > 70");
+    const char *const counting = "SELECT COUNT(*) FROM logs WHERE (msg GLOB 'Segfault')";
+    EXPECT_EQ(Execute(connection, counting, {"COUNT(*)"}).rows,
+              (Rows{{std::optional<std::string>("159930")}}));
+}
+
 TEST_F(SkipIndexTest, TrustsNoFileThatSomebodyElseMayHavePutThere) {
     ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
     const std::string bytes = ReadFile(index_);

@@ -40,14 +40,13 @@ bool HasIndexableTable(sqlite3 *db) {
                                              nullptr, nullptr) == SQLITE_OK &&
                sqlite3_stricmp(declared, type) == 0 && sqlite3_stricmp(collation, "BINARY") == 0;
     };
-    const auto hasTable = [db](const char *schema, const char *column, int *isAutoincrement) {
-        return sqlite3_table_column_metadata(db, schema, "logs", column, nullptr, nullptr, nullptr, nullptr,
-                                             isAutoincrement) == SQLITE_OK;
-    };
     int isAutoincrement = 0;
-    // A temporary table would have the name first.
-    if (!hasTable("main", "id", &isAutoincrement) || isAutoincrement == 0 ||
-        hasTable("temp", nullptr, nullptr))
+    if (sqlite3_table_column_metadata(db, "main", "logs", "id", nullptr, nullptr, nullptr, nullptr,
+                                      &isAutoincrement) != SQLITE_OK ||
+        isAutoincrement == 0)
+        return false;
+    // A temporary table or view would have the name first.
+    if (Query(db, "SELECT 1 FROM temp.sqlite_schema WHERE name = 'logs' COLLATE NOCASE").Step())
         return false;
     for (const char *column : {"msg", "llevel", "fac", "ldate"}) {
         if (!hasColumn(column, "TEXT"))

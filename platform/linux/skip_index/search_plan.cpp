@@ -55,7 +55,8 @@ bool SearchPlan::BoundIds() {
 // How SQLite would find the rows of the statement as it is.
 SearchPlan::Access SearchPlan::AccessOfStatement(int64_t pageRows) const {
     Access access;
-    if (text_.isTextOnly)
+    // Without an order the rows come in that of an index of messages, should there be one.
+    if (text_.isTextOnly && !IsUnordered())
         return {true, false, ""};
     const std::string limit = pageRows != 0 ? " LIMIT " + std::to_string(pageRows) : "";
     Query plan(db_, "EXPLAIN QUERY PLAN " + std::string(sql_) + limit);
@@ -117,7 +118,7 @@ bool SearchPlan::HasUsableIndex() {
     if (!isUsable_) {
         isUsable_ = index_ && index_->Fits(db_);
         if (*isUsable_)
-            lastLag = std::max<int64_t>(LargestIdEver(db_) + 1 - index_->Header().EndId(), 0);
+            lastLag = std::max<int64_t>(LargestIdEver(db_) - (index_->Header().EndId() - 1), 0);
     }
     return *isUsable_;
 }
@@ -140,7 +141,7 @@ bool SearchPlan::IsWorthwhile(int64_t pageRows) {
     const Access access = AccessOfStatement(pageRows);
     if (access.isScan && isPage)
         return isByStep_ = index_.has_value();
-    if (!access.isScan && text_.kind == SearchText::Kind::kSelect && text_.order == SearchText::Order::kNone)
+    if (!access.isScan && IsUnordered())
         return false;
     if (!access.isScan && !HasManyRows(access.column, kFewRows))
         return false;
@@ -156,7 +157,9 @@ bool SearchPlan::IsWorthwhile(int64_t pageRows) {
 // Takes the ids that a page is likely to be in off the range.
 IdRange SearchPlan::TakeWindow() {
     IdRange window = text_.ids;
-    if (IsAscending()) {
+    if (SpanOf(window) <= kWindowIds) {
+        text_.ids = {1, 0}; // what follows the largest id is no number
+    } else if (IsAscending()) {
         window.last = std::min(window.last, window.first + kWindowIds - 1);
         text_.ids.first = window.last + 1;
     } else {
@@ -174,7 +177,7 @@ bool SearchPlan::Next(std::vector<IdRange> &ranges) {
     }
     if (step_ == Step::kWindow) {
         ranges.push_back(TakeWindow());
-        step_ = Step::kOpen;
+        step_ = text_.ids.first <= text_.ids.last ? Step::kOpen : Step::kDone;
         return true;
     }
     if (step_ == Step::kOpen) {

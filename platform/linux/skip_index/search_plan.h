@@ -42,6 +42,9 @@ private:
     SearchPlan(sqlite3 *db, std::string_view sql, SearchText text, std::optional<SkipIndex> index)
         : db_(db), sql_(sql), text_(std::move(text)), index_(std::move(index)) {}
 
+    bool IsUnordered() const {
+        return text_.kind == SearchText::Kind::kSelect && text_.order == SearchText::Order::kNone;
+    }
     bool BoundIds();
     struct Access {
         bool isScan = false;
