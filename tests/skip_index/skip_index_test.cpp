@@ -190,6 +190,20 @@ TEST_F(SkipIndexTest, FindsRecordsThatComeBackFromACopy) {
     EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
 }
 
+// Ids that an older copy, or an emptied table, brings back; what would show it is deleted.
+TEST_F(SkipIndexTest, IsNotUsedWhenItsIdsAreUsedAgain) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    RunSql(path_, "PRAGMA synchronous=OFF; CREATE TEMP TABLE old AS SELECT * FROM logs; DELETE FROM logs; "
+                  "DELETE FROM sqlite_sequence WHERE name = 'logs'; INSERT INTO logs(llevel, fac, msg) "
+                  "SELECT llevel, fac, 'Needle ' || id FROM old; DELETE FROM logs WHERE id % 2 = 1");
+    EXPECT_EQ(Count("(msg GLOB '*Needle 20*')"), "556");
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    EXPECT_EQ(Count("(msg GLOB '*Needle 20*')"), "556");
+    EXPECT_THAT(log_.TakeTexts(), ElementsAre("skip index " + index_ +
+                                              ": it is that of another database; it is removed and built "
+                                              "again"));
+}
+
 TEST_F(SkipIndexTest, IsUsedUpToTheLargestId) {
     RunSql(path_,
            "UPDATE sqlite_sequence SET seq = 9223372036854755807; INSERT INTO logs(utcsec, msg) SELECT "

@@ -313,7 +313,7 @@ std::optional<LockedIndex> TakeIndex(sqlite3 *db, const std::string &path, Build
         return std::nullopt;
     IndexHeader header;
     const IndexFile::State state = file->ReadHeader(header);
-    if (state == IndexFile::State::kGood && FitsDatabase(db, header, *identity))
+    if (state == IndexFile::State::kGood && FitsDatabase(db, *file, header, *identity))
         return LockedIndex{std::move(*file), header};
     if (state != IndexFile::State::kNew) {
         Report(path, state == IndexFile::State::kGood      ? "it is that of another database"

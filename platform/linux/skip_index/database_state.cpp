@@ -3,6 +3,10 @@
 #include <algorithm>
 #include <limits>
 #include <string_view>
+#include <utility>
+#include <vector>
+
+#include "skip_index/candidates.h"
 
 namespace kelo::platform {
 namespace {
@@ -16,6 +20,46 @@ uint64_t HashOfRow(sqlite3_stmt *row) {
         hash = HashOf({text != nullptr ? text : "", size}, hash + 1);
     }
     return hash;
+}
+
+constexpr size_t kGramsOfRow = 24;
+
+std::string_view TextAt(sqlite3_stmt *row, int column) {
+    const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(row, column));
+    return {text != nullptr ? text : "", static_cast<size_t>(sqlite3_column_bytes(row, column))};
+}
+
+// What a search needs that finds the row of "msg, llevel, fac, utcsec, ldate" by all that it has.
+Need NeedOfRow(sqlite3_stmt *row) {
+    Need grams{.kind = Need::Kind::kGrams, .grams = GramsOfLiteral(TextAt(row, 0), kGramsOfRow)};
+    for (const auto &[column, at] : {std::pair(TokenColumn::kSeverity, 1), {TokenColumn::kFacility, 2}}) {
+        const auto bits = BitsOfToken(column, TextAt(row, at));
+        grams.grams.insert(grams.grams.end(), bits.begin(), bits.end());
+    }
+    Need all{.kind = Need::Kind::kAll, .parts = {std::move(grams)}};
+    const auto addTime = [&all](TimeColumn column, int64_t time) {
+        all.parts.push_back({.kind = Need::Kind::kTimes, .column = column, .times = {time, time}});
+    };
+    if (sqlite3_column_type(row, 3) == SQLITE_INTEGER)
+        addTime(TimeColumn::kSecond, sqlite3_column_int64(row, 3));
+    const bool isText = sqlite3_column_type(row, 4) == SQLITE_TEXT;
+    if (const auto day = NumberOfDay(TextAt(row, 4)); day && isText)
+        addTime(TimeColumn::kDay, *day);
+    return all;
+}
+
+// Whether the index, as far as it knows the row, would find it.
+bool FindsRow(sqlite3 *db, const IndexFile &file, const IndexHeader &header, int64_t id) {
+    Query row(db, "SELECT msg, llevel, fac, utcsec, ldate FROM main.logs WHERE id = ?1");
+    row.Bind(1, id);
+    if (!row.Step())
+        return false;
+    const Need need = NeedOfRow(row.Get());
+    Candidates candidates(file, header, need, {id, id});
+    std::vector<IdRange> ranges;
+    while (candidates.Next(true, ranges)) {
+    }
+    return !ranges.empty() || !candidates.IsGood(); // damage is no question of the database
 }
 
 } // namespace
@@ -78,15 +122,21 @@ std::optional<RowSample> RowSampler::UpTo(int64_t id) {
     return RowSample{id, std::numeric_limits<int64_t>::min(), 0};
 }
 
-bool FitsDatabase(sqlite3 *db, const IndexHeader &header, const DatabaseIdentity &identity) {
+bool FitsDatabase(sqlite3 *db, const IndexFile &file, const IndexHeader &header,
+                  const DatabaseIdentity &identity) {
     if (header.inode != identity.inode || header.birthSec != identity.birthSec ||
         header.birthNsec != identity.birthNsec || header.EndId() - 1 > LargestIdEver(db))
         return false;
     const auto *end = header.samples.begin() + header.sampleCount;
     RowSampler sampler(db);
+    int64_t found = std::numeric_limits<int64_t>::min(); // the last row that the index was asked for
     return std::all_of(header.samples.begin(), end, [&](const RowSample &sample) {
         const auto now = sampler.UpTo(sample.upTo);
-        return now && (now->id < sample.id || *now == sample);
+        if (!now || *now == sample)
+            return now.has_value();
+        if (now->id >= sample.id)
+            return false;
+        return now->id == std::exchange(found, now->id) || FindsRow(db, file, header, now->id);
     });
 }
 

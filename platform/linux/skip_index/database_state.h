@@ -54,8 +54,11 @@ private:
     Query row_;
 };
 
-// Whether the index is that of this file with this content: the remembered rows are the same or gone, and no
-// others have come.
-bool FitsDatabase(sqlite3 *db, const IndexHeader &header, const DatabaseIdentity &identity);
+// Whether the index is that of this file with this content: the remembered rows are the same or gone, no
+// others have come, and the rows before those that are gone are as the index has them. The last condition is
+// for a database whose ids were used again, by an older copy or by an emptied table, and where the rows that
+// would show it were deleted since.
+bool FitsDatabase(sqlite3 *db, const IndexFile &file, const IndexHeader &header,
+                  const DatabaseIdentity &identity);
 
 } // namespace kelo::platform

@@ -28,7 +28,7 @@ public:
 
     // Whether it is the index of the database as this is now, whose table is an indexable one. Call it in the
     // transaction that reads.
-    bool Fits(sqlite3 *db) const { return FitsDatabase(db, header_, identity_); }
+    bool Fits(sqlite3 *db) const { return FitsDatabase(db, file_, header_, identity_); }
     // Throws it away, because reading found it damaged.
     void Discard() const;
 
