@@ -3,18 +3,23 @@
 //
 //     skip_index_oracle [SEARCHES [SEED [DATABASE]]]
 //
-// With DATABASE: searches of that one, to which others may append meanwhile, up to its newest record at the
-// time. The index is extended now and then.
+// With DATABASE: the same with that one, to which others append and from which they delete meanwhile. A
+// search is for the records up to the newest one at the time; it is asked for without the index, with it, and
+// without it again.
 //
-// Exit status: 0 all the same, 1 a difference.
+// Exit status: 0 all the same, 1 a difference, or an index that was reported too often or not at all.
+
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <cstdlib>
 
+#include "comparison.h"
 #include "keloplatform/skip_index.h"
 #include "platform/db_fixture.h"
 #include "random_database.h"
-#include "random_search.h"
 #include "support/log_database.h"
 #include "support/syslog_capture.h"
 
@@ -22,155 +27,179 @@ namespace kelo::test {
 namespace {
 
 constexpr size_t kSearchesPerChange = 10;
-
-struct Answer {
-    int status = 0;
-    int count = 0;
-    size_t rows = 0;
-    std::string texts; // of all rows
-
-    bool operator==(const Answer &) const = default;
-};
-
-int Take(_SYSLOG_LOG_DATA_tag &log, void *context) {
-    auto &answer = *static_cast<Answer *>(context);
-    ++answer.rows;
-    answer.texts.append(std::to_string(log.id)).append(" ").append(log.msg).append("\n");
-    return 0;
-}
-
-class WithoutIndex {
-public:
-    WithoutIndex() { setenv("KELO_SKIP_INDEX", "off", 1); }
-    ~WithoutIndex() { unsetenv("KELO_SKIP_INDEX"); }
-};
-
-Answer Ask(const std::string &path, RandomSearch &search) {
-    Answer answer;
-    _SYSLOG_SQL_LIMIT_tag *limit = search.limit ? &*search.limit : nullptr;
-    _SYSLOG_SQL_ORDER_tag *order = search.order ? &*search.order : nullptr;
-    answer.status = SyslogDBSelect(path, search.conditions, limit, order, Take, &answer, false);
-    if (limit == nullptr)
-        answer.count = SyslogDBSelectCount(path, search.conditions, nullptr, order);
-    return answer;
-}
+constexpr uid_t kNobody = 65534;
 
 class Oracle {
 public:
     explicit Oracle(uint64_t seed) : random_(seed), database_(random_) {}
+    Oracle(uint64_t seed, const std::string &path)
+        : random_(seed), isShared_(true), database_(random_, path) {}
 
-    bool Search() {
-        RandomSearch search = MakeRandomSearch(random_, [this] { return database_.PartOfMessage(); });
-        if (random_.OneIn(100) && !search.conditions.empty())
-            return Delete(search);
-        const Answer found = Ask(database_.Path(), search);
-        const WithoutIndex off;
-        const Answer expected = Ask(database_.Path(), search);
-        rows_ += expected.rows;
-        return found == expected || Differ(search, found, expected);
-    }
-
-    void Change() {
-        last_ = database_.Change();
-        KELODBSkipIndex index;
-        indexed_ +=
-            KELODBSkipIndexGet(ConnectTo(database_.Path()).get(), &index) == 0 && index.endId > index.firstId;
-    }
-    size_t Rows() const { return rows_; }
-    size_t Indexed() const { return indexed_; }
+    // Does something every now and then, and searches. Returns what is wrong, "" for nothing.
+    std::string Search();
+    void Print(size_t searches) const;
+    const std::string &LastChange() const { return database_.LastChange(); }
 
 private:
-    // What is left is what does not match.
-    bool Delete(RandomSearch &search) {
-        search.limit.reset();
-        search.order = _SYSLOG_SQL_ORDER_tag{1, SYSLOG_ATTRI_ID};
-        RandomSearch everything;
-        everything.order = search.order;
-        Answer before;
-        Answer matching;
-        {
-            const WithoutIndex off;
-            before = Ask(database_.Path(), everything);
-            matching = Ask(database_.Path(), search);
-        }
-        SyslogDBDelete(database_.Path(), search.conditions);
-        const WithoutIndex off;
-        const Answer left = Ask(database_.Path(), search);
-        const Answer after = Ask(database_.Path(), everything);
-        return (left.rows == 0 && after.rows == before.rows - matching.rows) || Differ(search, after, before);
-    }
-
-    bool Differ(const RandomSearch &search, const Answer &found, const Answer &expected) const {
-        std::fprintf(
-            stderr, "after \"%s\": %zu rows (%d) instead of %zu (%d) for keyword [%s], conditions:\n",
-            last_.c_str(), found.rows, found.count, expected.rows, expected.count, search.keyword.c_str());
-        for (const _SYSLOG_SQL_COND_tag &condition : search.conditions)
-            std::fprintf(stderr, "  %s %d %s\n", LogAttriStrGet(condition.attr), condition.op,
-                         condition.value.c_str());
-        if (search.limit)
-            std::fprintf(stderr, "  limit %llu offset %llu\n",
-                         static_cast<unsigned long long>(search.limit->limit),
-                         static_cast<unsigned long long>(search.limit->offset));
-        return false;
-    }
+    std::string SearchShared();
+    std::string SearchAlone(RandomSearch &search);
+    std::string SearchBeside(RandomSearch &search);
+    std::string SearchAsNobody(RandomSearch &search);
+    std::string Delete(RandomSearch &search);
+    std::string CompareValues();
 
     Random random_;
+    const bool isShared_ = false;
+    SyslogCapture log_;
     RandomDatabase database_;
-    std::string last_;
-    size_t rows_ = 0;
-    size_t indexed_ = 0;
+    size_t done_ = 0;
+    size_t served_ = 0;
+    size_t asNobody_ = 0;
+    size_t deletions_ = 0;
+    size_t values_ = 0;
+    size_t changedMeanwhile_ = 0;
+    size_t undecided_ = 0;
 };
 
-// Nothing if both answers are the same, otherwise what was searched for.
-std::string SearchBeside(const std::string &path, Random &random) {
-    RandomSearch search = MakeRandomSearch(random, [&] { return RandomPartOfMessage(path, random); });
-    search.conditions.push_back(
-        {SYSLOG_ATTRI_ID, SYSLOG_OP_LE, RunSql(path, "SELECT ifnull(max(id), 0) FROM logs"), {}});
-    const Answer found = Ask(path, search);
-    const WithoutIndex off;
-    const Answer expected = Ask(path, search);
-    std::string clause;
-    if (found != expected)
-        LogSearchClauseGet(search.conditions, clause);
-    return clause;
+std::string Oracle::Search() {
+    if (isShared_)
+        return SearchShared();
+    if (done_++ % kSearchesPerChange == 0) {
+        if (std::string wrong = database_.CheckLines(log_.TakeTexts()); !wrong.empty())
+            return "before: " + wrong; // by searches
+        database_.Change();
+        if (std::string wrong = database_.CheckLines(log_.TakeTexts()); !wrong.empty())
+            return wrong;
+    }
+    RandomSearch search = MakeRandomSearch(random_, [this] { return database_.PartOfMessage(); });
+    if (random_.OneIn(100) && !search.conditions.empty())
+        return Delete(search);
+    if (random_.OneIn(50))
+        return CompareValues();
+    return random_.OneIn(30) ? SearchAsNobody(search) : SearchAlone(search);
 }
 
-int RunBeside(const std::string &path, size_t searches, uint64_t seed) {
-    Random random(seed);
-    KELODBSkipIndex index{};
-    const std::string first = RunSql(path, "SELECT max(id) FROM logs");
+// Statements of the test itself fail when somebody replaces the file meanwhile.
+std::string Oracle::SearchShared() {
+    try {
+        if (done_++ % kSearchesPerChange == 0)
+            database_.Change();
+        RandomSearch search = MakeRandomSearch(random_, [this] { return database_.PartOfMessage(); });
+        return SearchBeside(search);
+    } catch (const std::runtime_error &) {
+        ++undecided_;
+        return "";
+    }
+}
+
+std::string Oracle::SearchAlone(RandomSearch &search) {
+    const Answer found = Ask(database_.Path(), search, WithIndex::kYes);
+    served_ += WasServed() ? 1 : 0;
+    const Answer expected = Ask(database_.Path(), search, WithIndex::kNo);
+    return found == expected ? "" : Difference(search, found, expected);
+}
+
+// A file that took the place of the database is another one.
+std::pair<ino_t, std::string> StateOf(const std::string &path) {
+    struct stat file {};
+    stat(path.c_str(), &file);
+    return {file.st_ino, RunSql(path, "SELECT ifnull(max(seq), 0) FROM sqlite_sequence WHERE name = 'logs'")};
+}
+
+std::string Oracle::SearchBeside(RandomSearch &search) {
+    const std::string &path = database_.Path();
+    const auto state = StateOf(path);
+    search.conditions.push_back({SYSLOG_ATTRI_ID, SYSLOG_OP_LE, state.second, {}});
+    const Answer before = Ask(path, search, WithIndex::kNo);
+    const Answer found = Ask(path, search, WithIndex::kYes);
+    served_ += WasServed() ? 1 : 0;
+    const Answer after = Ask(path, search, WithIndex::kNo);
+    const auto later = StateOf(path);
+    if (later.first != state.first || std::stoll(later.second) < std::stoll(state.second)) {
+        ++undecided_;
+        return "";
+    }
+    if (before == after)
+        return found == before ? "" : Difference(search, found, before);
+    if (search.limit) {
+        ++undecided_;
+        return "";
+    }
+    ++changedMeanwhile_;
+    return IsBetween(found, before, after) ? "" : Difference(search, found, before);
+}
+
+// A user who may only read, while somebody has the database open.
+std::string Oracle::SearchAsNobody(RandomSearch &search) {
+    ++asNobody_;
+    const TestDatabase user(database_.Path());
+    const std::string folder = database_.Path().substr(0, database_.Path().rfind('/'));
+    if (geteuid() == 0)
+        chmod(folder.c_str(), 0755);
+    const pid_t child = fork();
+    if (child == 0) {
+        if (geteuid() == 0 && seteuid(kNobody) != 0)
+            _exit(1);
+        const std::string difference = SearchAlone(search);
+        std::fputs(difference.c_str(), stderr);
+        _exit(difference.empty() ? 0 : 1);
+    }
+    int status = 0;
+    waitpid(child, &status, 0);
+    return status == 0 ? "" : "a difference for a user who may only read";
+}
+
+// What is left is what does not match.
+std::string Oracle::Delete(RandomSearch &search) {
+    ++deletions_;
+    search.limit.reset();
+    search.order = _SYSLOG_SQL_ORDER_tag{1, SYSLOG_ATTRI_ID};
+    RandomSearch everything;
+    everything.order = search.order;
+    const Answer before = Ask(database_.Path(), everything, WithIndex::kNo);
+    const Answer matching = Ask(database_.Path(), search, WithIndex::kNo);
+    SyslogDBDelete(database_.Path(), search.conditions);
+    const Answer left = Ask(database_.Path(), search, WithIndex::kNo);
+    const Answer after = Ask(database_.Path(), everything, WithIndex::kNo);
+    return left.rows.empty() && after.rows.size() == before.rows.size() - matching.rows.size()
+               ? ""
+               : "deletion: " + Difference(search, after, before);
+}
+
+std::string Oracle::CompareValues() {
+    ++values_;
+    constexpr const char *kColumns[] = {"host", "prog", "llevel", "ldate"};
+    const std::string column = random_.Of(kColumns);
+    return ValuesOf(database_.Path(), column, WithIndex::kYes) ==
+                   ValuesOf(database_.Path(), column, WithIndex::kNo)
+               ? ""
+               : "values of " + column;
+}
+
+void Oracle::Print(size_t searches) const {
+    std::printf("%zu searches gave the same, %zu of them by the index", searches, served_);
+    if (isShared_)
+        std::printf("; %zu while records were deleted, %zu undecided for that reason", changedMeanwhile_,
+                    undecided_);
+    else
+        std::printf("; %zu deletions, %zu lists of values, %zu by a user who may only read; %zu lines in the "
+                    "system log",
+                    deletions_, values_, asNobody_, database_.Lines());
+    std::puts("\nafter:");
+    for (const auto &[name, count] : database_.Changes())
+        std::printf("  %5zu %s\n", count, name.c_str());
+}
+
+int Run(Oracle &oracle, size_t searches, uint64_t seed) {
     for (size_t done = 0; done < searches; ++done) {
-        if (done % kSearchesPerChange == 0)
-            KELODBSkipIndexBuild(path.c_str(), 0);
-        if (const std::string difference = SearchBeside(path, random); !difference.empty()) {
-            std::fprintf(stderr, "search %zu of seed %llu differs: %s\n", done,
-                         static_cast<unsigned long long>(seed), difference.c_str());
+        if (const std::string wrong = oracle.Search(); !wrong.empty()) {
+            std::fprintf(stderr, "search %zu of seed %llu, after \"%s\": %s\n", done,
+                         static_cast<unsigned long long>(seed), oracle.LastChange().c_str(), wrong.c_str());
+            oracle.Print(done);
             return 1;
         }
     }
-    KELODBSkipIndexGet(ConnectTo(path).get(), &index);
-    std::printf("%zu searches gave the same; the newest record was %s, then %s; the index ends at %lld\n",
-                searches, first.c_str(), RunSql(path, "SELECT max(id) FROM logs").c_str(),
-                static_cast<long long>(index.endId));
-    return index.endId > 0 ? 0 : 1;
-}
-
-int Run(size_t searches, uint64_t seed) {
-    SyslogCapture log;
-    Oracle oracle(seed);
-    for (size_t done = 0; done < searches; ++done) {
-        if (done % kSearchesPerChange == 0)
-            oracle.Change();
-        if (!oracle.Search()) {
-            std::fprintf(stderr, "search %zu of seed %llu\n", done, static_cast<unsigned long long>(seed));
-            return 1;
-        }
-    }
-    std::printf(
-        "%zu searches gave the same %zu rows; the database had an index after %zu of %zu changes, and %zu "
-        "were thrown away\n",
-        searches, oracle.Rows(), oracle.Indexed(), (searches + 9) / kSearchesPerChange,
-        log.TakeTexts().size());
+    oracle.Print(searches);
     return 0;
 }
 
@@ -178,7 +207,13 @@ int Run(size_t searches, uint64_t seed) {
 } // namespace kelo::test
 
 int main(int argc, char **argv) {
+    using namespace kelo::test;
     const size_t searches = argc > 1 ? std::strtoul(argv[1], nullptr, 10) : 1000;
     const uint64_t seed = argc > 2 ? std::strtoull(argv[2], nullptr, 10) : 1;
-    return argc > 3 ? kelo::test::RunBeside(argv[3], searches, seed) : kelo::test::Run(searches, seed);
+    if (argc > 3) {
+        Oracle oracle(seed, argv[3]);
+        return Run(oracle, searches, seed);
+    }
+    Oracle oracle(seed);
+    return Run(oracle, searches, seed);
 }

@@ -1,7 +1,11 @@
 #include "random_database.h"
 
+#include <sqlite3.h>
 #include <unistd.h>
 
+#include <utility>
+
+#include "builders.h"
 #include "keloplatform/skip_index.h"
 #include "support/log_database.h"
 
@@ -30,10 +34,14 @@ std::string Hex(const std::string &text) {
 
 } // namespace
 
-RandomDatabase::RandomDatabase(Random &random) : random_(random) {
+RandomDatabase::RandomDatabase(Random &random)
+    : random_(random), isShared_(false), path_(root_.File("logs.db")) {
     Begin(path_, kIdsPerSegment * 3 - 18'000);
     Append(25'000);
 }
+
+RandomDatabase::RandomDatabase(Random &random, const std::string &path)
+    : random_(random), isShared_(true), path_(path) {}
 
 void RandomDatabase::Begin(const std::string &path, long long firstId) {
     CreateLogDatabase(path);
@@ -119,20 +127,51 @@ void RandomDatabase::Replace() {
     Append(5'000 + random_.Below(20'000));
 }
 
-// An older copy takes the place of the database, or of its content.
-void RandomDatabase::Restore(bool inPlace) {
+// The ids begin again, as after a file was emptied by hand.
+void RandomDatabase::Clear() {
+    RunSql(path_, "DELETE FROM logs; DELETE FROM sqlite_sequence WHERE name = 'logs'");
+    Begin(path_, static_cast<long long>(random_.Below(kIdsPerSegment)) + 1);
+    Append(random_.Below(40'000));
+}
+
+void RandomDatabase::Copy() {
+    fs::remove(copy_);
+    RunSql(path_, "VACUUM INTO '" + copy_ + "'");
+    RunSql(copy_, "PRAGMA journal_mode = WAL");
+}
+
+// An older copy is written over the content of the file.
+void RandomDatabase::CopyBack() {
     if (!fs::exists(copy_))
         return;
     RunSql(path_, "PRAGMA wal_checkpoint(TRUNCATE)");
     for (const char *suffix : {"-wal", "-shm"})
         unlink((path_ + suffix).c_str());
-    if (inPlace) {
-        std::ofstream(path_, std::ios::binary | std::ios::trunc)
-            << std::ifstream(copy_, std::ios::binary).rdbuf();
-    } else {
-        fs::copy_file(copy_, path_ + ".new");
-        fs::rename(path_ + ".new", path_);
+    std::ofstream(path_, std::ios::binary | std::ios::trunc)
+        << std::ifstream(copy_, std::ios::binary).rdbuf();
+    Append(random_.OneIn(2) ? random_.Below(25'000) : 0);
+}
+
+void RandomDatabase::RenameBack() {
+    if (!fs::exists(copy_))
+        return;
+    for (const char *suffix : {"-wal", "-shm"})
+        unlink((path_ + suffix).c_str());
+    fs::copy_file(copy_, path_ + ".new");
+    fs::rename(path_ + ".new", path_);
+    Append(random_.OneIn(2) ? random_.Below(25'000) : 0);
+}
+
+// The same by SQLite, while others use the database.
+void RandomDatabase::BackUpBack() {
+    if (!fs::exists(copy_))
+        return;
+    TestDatabase from(copy_);
+    TestDatabase to(path_);
+    sqlite3_backup *backup = sqlite3_backup_init(to.Get(), "main", from.Get(), "main");
+    while (sqlite3_backup_step(backup, -1) == SQLITE_BUSY) {
     }
+    sqlite3_backup_finish(backup);
     Append(random_.OneIn(2) ? random_.Below(25'000) : 0);
 }
 
@@ -151,54 +190,123 @@ void RandomDatabase::DamageIndex() {
     WriteFile(index_, bytes);
 }
 
-// Most searches are to have an index.
-std::string RandomDatabase::Change() {
-    std::string done = ChangeSomething();
-    if (random_.OneIn(2))
-        KELODBSkipIndexBuild(path_.c_str(), random_.OneIn(8) ? 1 : 0);
-    return done;
+void RandomDatabase::ChangeVersion() {
+    std::string bytes = ReadFile(index_);
+    if (bytes.empty() || bytes[0] == '\0')
+        return;
+    bytes[16] ^= 4;
+    WriteFile(index_, bytes);
+    mustBeReported_ = true;
+    isBuilt_ = false;
 }
 
-std::string RandomDatabase::ChangeSomething() {
-    switch (random_.Below(13)) {
-    case 0:
+// The index of another database with the same ids.
+void RandomDatabase::TakeOtherIndex() {
+    if (!fs::exists(copy_) || KELODBSkipIndexBuild(copy_.c_str(), 0) != KELODB_SKIP_COMPLETE ||
+        !fs::exists(copy_ + "-skip"))
+        return;
+    fs::rename(copy_ + "-skip", index_);
+    mustBeReported_ = true;
+    isBuilt_ = false;
+}
+
+void RandomDatabase::RemoveIndex() {
+    unlink(index_.c_str());
+    mayBeBad_ = mustBeReported_ = false;
+}
+
+void RandomDatabase::Build(int maxMs) {
+    isBuilt_ = KELODBSkipIndexBuild(path_.c_str(), maxMs) == KELODB_SKIP_COMPLETE || isBuilt_;
+}
+
+void RandomDatabase::KillBuilder() {
+    BuildAndKill(path_, random_.Below(random_.OneIn(2) ? 60 : 600));
+    mustBeReported_ = false; // what it reported is not known
+}
+
+void RandomDatabase::StarveBuilder() {
+    linesOfOthers_ += BuildWithin(path_, random_.Below(8'000'000));
+}
+
+void RandomDatabase::BuildBesides() {
+    linesOfOthers_ += BuildTogether(path_, 4);
+}
+
+void RandomDatabase::DeleteLittle() {
+    const std::string newest = RunSql(path_, "SELECT ifnull(max(id), 0) / 16384 * 16384 FROM logs");
+    RunSql(path_, "DELETE FROM logs WHERE id BETWEEN " + newest + " - " + std::to_string(random_.Below(300)) +
+                      " AND " + newest + " - 1");
+}
+
+void RandomDatabase::AppendSome() {
+    Append(random_.Below(random_.OneIn(3) ? 20'000 : 500));
+    if (random_.OneIn(2))
         Delete();
-        return "delete";
-    case 1:
-        RunSql(path_, "VACUUM");
-        return "vacuum";
-    case 2:
-        if (random_.OneIn(3))
-            Replace();
-        return "replace";
-    case 3:
-        RunSql(path_, "PRAGMA wal_checkpoint(TRUNCATE)");
-        fs::copy_file(path_, copy_, fs::copy_options::overwrite_existing);
-        return "copy";
-    case 4:
-        Restore(true);
-        return "restore in place";
-    case 5:
-        Restore(false);
-        return "restore";
-    case 6:
-        DamageIndex();
-        return "damage the index";
-    case 7:
-        unlink(index_.c_str());
-        return "remove the index";
-    case 8:
-        KELODBSkipIndexBuild(path_.c_str(), 1);
-        return "build a part";
-    case 9:
-        KELODBSkipIndexBuild(path_.c_str(), 0);
-        return "build";
-    default:
-        Append(random_.Below(random_.OneIn(3) ? 20'000 : 500));
-        if (random_.OneIn(2))
-            Delete();
-        return "append";
+}
+
+void RandomDatabase::Vacuum() {
+    RunSql(path_, "VACUUM");
+}
+
+struct RandomDatabase::Event {
+    const char *name;
+    void (RandomDatabase::*happen)();
+    size_t weight = 1;
+    bool spoils = false;          // the index does not fit afterwards
+    bool isPossibleShared = true; // while others have the database open
+};
+
+const RandomDatabase::Event RandomDatabase::kEvents[] = {
+    {"append", &RandomDatabase::AppendSome, 4},
+    {"delete", &RandomDatabase::Delete},
+    {"delete the newest that are covered", &RandomDatabase::DeleteLittle, 2},
+    {"vacuum", &RandomDatabase::Vacuum},
+    {"another file", &RandomDatabase::Replace, 1, true, false},
+    {"ids begin again", &RandomDatabase::Clear, 1, true, false},
+    {"copy", &RandomDatabase::Copy, 2},
+    {"copy written back", &RandomDatabase::CopyBack, 1, true, false},
+    {"copy renamed back", &RandomDatabase::RenameBack, 1, true, false},
+    {"copy restored by SQLite", &RandomDatabase::BackUpBack, 1, true},
+    {"index cut or damaged", &RandomDatabase::DamageIndex, 2, true},
+    {"index of another version", &RandomDatabase::ChangeVersion, 1, true},
+    {"index of another database", &RandomDatabase::TakeOtherIndex, 1, true},
+    {"index removed", &RandomDatabase::RemoveIndex},
+    {"build a part", &RandomDatabase::BuildPart},
+    {"build", &RandomDatabase::BuildAll},
+    {"builder killed", &RandomDatabase::KillBuilder, 2},
+    {"builder that cannot write", &RandomDatabase::StarveBuilder},
+    {"several builders", &RandomDatabase::BuildBesides},
+};
+
+// Most searches are to have an index.
+void RandomDatabase::Change() {
+    std::vector<const Event *> possible;
+    for (const Event &event : kEvents) {
+        if (event.isPossibleShared || !isShared_)
+            possible.insert(possible.end(), event.weight, &event);
     }
+    const Event &event = *random_.Of(possible);
+    last_ = event.name;
+    ++changes_[last_];
+    mayBeBad_ |= event.spoils;
+    (this->*event.happen)();
+    if (random_.OneIn(2))
+        Build(random_.OneIn(8) ? 1 : 0);
+}
+
+std::string RandomDatabase::CheckLines(const std::vector<std::string> &lines) {
+    const size_t count = lines.size() + std::exchange(linesOfOthers_, 0);
+    const size_t most = mayBeBad_ ? 1 : 0;
+    const size_t least = mustBeReported_ && isBuilt_ ? 1 : 0;
+    lines_ += count;
+    if (count != 0 || least != 0)
+        mayBeBad_ = mustBeReported_ = false;
+    if (count >= least && count <= most)
+        return "";
+    std::string text = std::to_string(count) + " lines in the system log";
+    for (const std::string &line : lines)
+        text += "\n  " + line;
+    return text;
 }
 
 std::string RandomPartOfMessage(const std::string &database, Random &random) {
