@@ -22,7 +22,7 @@ uint64_t HashOfRow(sqlite3_stmt *row) {
     return hash;
 }
 
-constexpr size_t kGramsOfRow = 24;
+constexpr size_t kBitsOfRow = 24; // of its message
 
 std::string_view TextAt(sqlite3_stmt *row, int column) {
     const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(row, column));
@@ -31,7 +31,7 @@ std::string_view TextAt(sqlite3_stmt *row, int column) {
 
 // What a search needs that finds the row of "msg, llevel, fac, utcsec, ldate" by all that it has.
 Need NeedOfRow(sqlite3_stmt *row) {
-    Need grams{.kind = Need::Kind::kGrams, .grams = GramsOfLiteral(TextAt(row, 0), kGramsOfRow)};
+    Need grams{.kind = Need::Kind::kGrams, .grams = BitsOfLiteral(TextAt(row, 0), kBitsOfRow)};
     for (const auto &[column, at] : {std::pair(TokenColumn::kSeverity, 1), {TokenColumn::kFacility, 2}}) {
         const auto bits = BitsOfToken(column, TextAt(row, at));
         grams.grams.insert(grams.grams.end(), bits.begin(), bits.end());
