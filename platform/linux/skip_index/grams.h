@@ -25,7 +25,7 @@ void AddGrams(std::string_view text, GramFlags &flags);
 
 // The bits of a value of another column. A row with it has all of them.
 enum class TokenColumn : uint8_t { kSeverity, kFacility };
-inline constexpr size_t kBitsPerToken = 8;
+inline constexpr size_t kBitsPerToken = 12;
 std::array<uint16_t, kBitsPerToken> BitsOfToken(TokenColumn column, std::string_view value);
 
 // The bits of the grams of a literal, without repetition: any text of a row that contains the literal,

@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::array<char, 16> kMagic = {'k', 'e', 'l', 'o', ' ', 's', 'k', 'i',
                                          'p', ' ', 'i', 'n', 'd', 'e', 'x', '\n'};
-constexpr uint32_t kVersion = 3;
+constexpr uint32_t kVersion = 4;
 constexpr uint32_t kByteOrder = 0x01020304;
 constexpr int64_t kHeaderBytes = 4096;
 constexpr int64_t kLeastFreeShare = 20; // of a volume: 1/20 stays free
