@@ -13,7 +13,7 @@ function(kelo_library name)
     set_target_properties(${name} PROPERTIES
         VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR}
         CXX_VISIBILITY_PRESET hidden VISIBILITY_INLINES_HIDDEN ON
-        INSTALL_RPATH "$ORIGIN" # the libraries find each other in any prefix
+        INSTALL_RPATH "$ORIGIN" BUILD_WITH_INSTALL_RPATH ON # the libraries find each other in any prefix
         LINK_DEPENDS ${ARG_MAP})
     target_link_options(${name} PRIVATE -Wl,--version-script=${ARG_MAP})
     if(NOT KELO_SANITIZE)

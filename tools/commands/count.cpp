@@ -67,12 +67,11 @@ int PrintCount(const LogTable &table, const Conditions &conditions, const Option
     if (!options.limit.empty())
         limit = ParseNumber("--limit", options.limit, 0, kHighestLimit);
     const LogReader reader(table, conditions);
-    const bool isCluster =
-        KELODBIsCluster(table.path.c_str()) != 0; // it counts at once, and its ids are times
-    const uint64_t count = isCluster            ? reader.Count()
+    // A cluster counts at once, and its ids are times.
+    const bool countsAll = (!options.isEstimate && !limit) || KELODBIsCluster(table.path.c_str()) != 0;
+    const uint64_t count = countsAll            ? reader.Count()
                            : options.isEstimate ? reader.IdFromNewest(0)
-                           : limit              ? CountUpTo(table, conditions, *limit)
-                                                : reader.Count();
+                                                : CountUpTo(table, conditions, *limit);
     Output output(false);
     output.Write(Answer(count, limit, format));
     output.Finish();

@@ -18,8 +18,11 @@ namespace {
 constexpr int64_t kManyRows = 20'000; // a search reads them in some milliseconds
 
 bool IsBehind(const LogTable &table) {
+    // The search has just learnt it, if it used the index.
     if (const int64_t lag = KELODBSkipIndexLag(); lag >= 0)
         return lag >= kManyRows;
+    if (KELODBIsCluster(table.path.c_str()) != 0)
+        return false;
     try {
         const KELODBSkipIndex index = ReadOnlyQuery(table).SkipIndex();
         return index.isPossible != 0 && index.newestId - (index.isThere != 0 ? index.endId : 0) >= kManyRows;
@@ -47,8 +50,8 @@ bool MayWriteBeside(const std::string &path) {
 } // namespace
 
 void ExtendIndexLater(const LogTable &table) {
-    if (table.name != "logs" || std::getenv("KELO_SKIP_INDEX") != nullptr ||
-        KELODBIsCluster(table.path.c_str()) != 0 || !MayWriteBeside(table.path) || !IsBehind(table))
+    if (table.name != "logs" || std::getenv("KELO_SKIP_INDEX") != nullptr || !MayWriteBeside(table.path) ||
+        !IsBehind(table))
         return;
     const pid_t child = fork();
     if (child == 0) {
