@@ -149,6 +149,14 @@ TEST_F(SkipIndexTest, ServesSearchesAndLeavesOtherStatementsAlone) {
     EXPECT_EQ(Execute(connection, "SELECT * FROM logs WHERE (msg GLOB '*Needle*')").rows.size(), 1U);
 }
 
+TEST_F(SkipIndexTest, LeavesTheConnectionItsCacheOfPages) {
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    const Connection connection = ConnectTo(path_);
+    Execute(connection, "PRAGMA cache_size=-3000");
+    EXPECT_EQ(Execute(connection, "SELECT * FROM logs WHERE (msg GLOB '*Segfault*')").rows.size(), 8U);
+    EXPECT_EQ(Execute(connection, "PRAGMA cache_size", {"cache_size"}).rows.at(0).at(0), "-3000");
+}
+
 TEST_F(SkipIndexTest, FindsMessagesThatMatchByOtherBytesThanTheKeywords) {
     const struct {
         const char *hex; // of the message

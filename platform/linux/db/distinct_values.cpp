@@ -155,7 +155,7 @@ std::optional<bool> RunDistinctValues(sqlite3 *db, const char *sql, const PageBo
         return !index.empty() && IsPlain(db, index, column);
     };
     return AnswerInOtherWay(
-        db, "BEGIN", isPossible, [&] { return Values(db, column, page, rows).Collect(); }, rows);
+        db, Access::kRead, isPossible, [&] { return Values(db, column, page, rows).Collect(); }, rows);
 }
 
 } // namespace kelo::platform

@@ -144,7 +144,7 @@ std::optional<bool> RunIndexedSearch(sqlite3 *db, const char *sql, const PageBou
         return std::nullopt;
     const int64_t pageRows = page != nullptr && page->limit != 0 ? int64_t{page->limit} + page->offset : 0;
     return AnswerInOtherWay(
-        db, isDeletion ? "BEGIN IMMEDIATE" : "BEGIN", [&] { return plan->IsWorthwhile(pageRows); },
+        db, isDeletion ? Access::kWrite : Access::kRead, [&] { return plan->IsWorthwhile(pageRows); },
         [&] {
             return RunPlan(db, *plan, page != nullptr ? *page : PageBounds{0, 0}, rows);
         },

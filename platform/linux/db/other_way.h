@@ -7,22 +7,28 @@
 
 #include "db/raise_error.h"
 #include "db/result.h"
+#include "db/small_cache.h"
 #include "db/transaction.h"
 
 namespace kelo::platform {
 
-// Answers a statement in another way than SQLite would, in one transaction that the statement `begin` opens:
-// `isPossible` says whether to try, `run` collects the rows and returns whether that worked. Returns true
-// when it did, false with the connection's error when it was interrupted, and nothing, with no rows, when the
-// statement itself has to run, which also reports its own error.
+enum class Access { kRead, kWrite };
+
+// Answers a statement in another way than SQLite would, in one transaction: `isPossible` says whether to try,
+// `run` collects the rows and returns whether that worked. Returns true when it did, false with the
+// connection's error when it was interrupted, and nothing, with no rows, when the statement itself has to
+// run, which also reports its own error.
 template <typename IsPossible, typename Run>
-std::optional<bool> AnswerInOtherWay(sqlite3 *db, const char *begin, const IsPossible &isPossible,
-                                     const Run &run, std::unique_ptr<DBResult_tag> &rows) {
+std::optional<bool> AnswerInOtherWay(sqlite3 *db, Access access, const IsPossible &isPossible, const Run &run,
+                                     std::unique_ptr<DBResult_tag> &rows) {
     bool isInterrupted = false;
     {
-        Transaction transaction(db, begin);
+        std::optional<SmallCache> cache; // not while rows are deleted, which changes pages of every index
+        Transaction transaction(db, access == Access::kWrite ? "BEGIN IMMEDIATE" : "BEGIN");
         if (!transaction.IsOpen() || !isPossible())
             return std::nullopt;
+        if (access == Access::kRead)
+            cache.emplace(db);
         if (run() && transaction.Commit())
             return true;
         isInterrupted = sqlite3_errcode(db) == SQLITE_INTERRUPT;
