@@ -22,6 +22,7 @@ void ColumnIndex::Add(std::string_view name) {
     names_.push_back('\0');
     nameAt_.push_back(offset);
     follower_.push_back(0);
+    expectedName_ = Name(expected_);
     if (slots_.size() < 2 * nameAt_.size()) {
         Grow();
         return;
@@ -50,11 +51,10 @@ size_t ColumnIndex::SlotOf(const char *name) const {
 
 uint32_t ColumnIndex::Search(const char *name) {
     const uint32_t found = slots_[SlotOf(name)];
-    if (found != kNone) {
-        follower_[last_] = found;
-        last_ = found;
-    }
-    return found;
+    if (found == kNone)
+        return kNone;
+    follower_[last_] = found;
+    return Expect(found);
 }
 
 } // namespace kelo::platform

@@ -15,6 +15,10 @@ class ColumnIndex {
 public:
     static constexpr uint32_t kNone = UINT32_MAX;
 
+    ColumnIndex() = default;
+    ColumnIndex(const ColumnIndex &) = delete;
+    ColumnIndex &operator=(const ColumnIndex &) = delete;
+
     // Appends the next column. Throws std::bad_alloc.
     void Add(std::string_view name);
 
@@ -24,10 +28,7 @@ public:
     uint32_t Find(const char *name) {
         if (follower_.empty())
             return kNone;
-        const uint32_t expected = follower_[last_];
-        if (IsSame(Name(expected), name))
-            return last_ = expected;
-        return Search(name);
+        return IsSame(expectedName_, name) ? Expect(expected_) : Search(name);
     }
 
 private:
@@ -39,6 +40,13 @@ private:
         return false;
     }
     const char *Name(uint32_t column) const { return names_.data() + nameAt_[column]; }
+    // Notes that a column was found, and returns it.
+    uint32_t Expect(uint32_t found) {
+        last_ = found;
+        expected_ = follower_[found];
+        expectedName_ = Name(expected_);
+        return found;
+    }
     uint32_t Search(const char *name);
     // The slot of `name`, or the empty one for it.
     size_t SlotOf(const char *name) const;
@@ -48,6 +56,8 @@ private:
     std::vector<uint32_t> nameAt_;   // by position, offset into `names_`
     std::vector<uint32_t> follower_; // by position, the column that was asked for after it
     uint32_t last_ = 0;              // the column that was found last
+    uint32_t expected_ = 0;          // its follower
+    const char *expectedName_ = nullptr;
     std::vector<uint32_t> slots_;    // open addressing; a power of two, half empty at the least
 };
 

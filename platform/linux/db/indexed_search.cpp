@@ -98,9 +98,8 @@ bool Count(sqlite3 *db, SearchPlan &plan, std::unique_ptr<DBResult_tag> &rows) {
     const auto add = [&](sqlite3_stmt *row) { count += sqlite3_column_int64(row, 0); };
     if (!RunOver(plan, statement, kAllRows, add))
         return false;
-    DBResult_tag::Digits &digits = rows->digits[0];
-    const char *end = std::to_chars(digits.begin(), digits.end() - 1, count).ptr;
-    rows->cells[0] = {digits.data(), static_cast<size_t>(end - digits.data())};
+    const std::string text = std::to_string(count);
+    rows->cells[0] = {text.c_str(), text.size()};
     rows->AddRow();
     return true;
 }

@@ -6,9 +6,36 @@
 
 #include "common/failure.h"
 
+namespace {
+
+using kelo::platform::Cell;
+
+// Makes `cell` the text of a value, which it refers to. False when there is no memory.
+bool TakeValue(sqlite3_value *value, DBResult_tag::Source &source, Cell &cell) {
+    // SQLite makes the same text of an integer, but slowly. After a text there is rarely one, so to ask each
+    // time would take longer.
+    const int type = source.hadText ? SQLITE_TEXT : sqlite3_value_type(value);
+    if (type == SQLITE_INTEGER) {
+        const int64_t number = sqlite3_value_int64(value);
+        // Row after row has the same second, and of a page by row id the same total.
+        if (number != source.number || cell.text != source.digits.data()) {
+            const char *end = std::to_chars(source.digits.begin(), source.digits.end(), number).ptr;
+            cell = {source.digits.data(), static_cast<size_t>(end - source.digits.data())};
+            source.number = number;
+        }
+        return true;
+    }
+    const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
+    source.hadText = type == SQLITE_TEXT && text != nullptr;
+    cell = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
+    return text != nullptr || sqlite3_value_type(value) == SQLITE_NULL;
+}
+
+} // namespace
+
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
-    : cells(static_cast<size_t>(sqlite3_column_count(statement))), digits(cells.size()),
-      numbers(cells.size()), hadText(cells.size()) {
+    : cells(static_cast<size_t>(sqlite3_column_count(statement))), sources(cells.size()),
+      values(cells.size()) {
     for (int column = 0; column < sqlite3_column_count(statement); ++column) {
         const char *name = sqlite3_column_name(statement, column);
         if (name == nullptr)
@@ -18,14 +45,9 @@ DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
 }
 
 DBResult_tag::DBResult_tag(std::span<const std::string> columnNames)
-    : cells(columnNames.size()), digits(cells.size()) {
+    : cells(columnNames.size()), sources(cells.size()), values(cells.size()) {
     for (const std::string &name : columnNames)
         columns.Add(name);
-}
-
-kelo::platform::Cell DBResult_tag::TextOf(int64_t number, Digits &digits) {
-    char *end = std::to_chars(digits.begin(), digits.end(), number).ptr;
-    return {digits.data(), static_cast<size_t>(end - digits.data())};
 }
 
 void DBResult_tag::AddRow() {
@@ -34,34 +56,21 @@ void DBResult_tag::AddRow() {
     rows.Add(cells);
 }
 
-bool DBResult_tag::TakeValue(size_t column, sqlite3_value *value) {
-    kelo::platform::Cell &cell = cells[column];
-    // SQLite makes the same text of an integer, but slowly. After a text there is rarely one, so to ask each
-    // time would take longer.
-    const int type = hadText[column] != 0 ? SQLITE_TEXT : sqlite3_value_type(value);
-    if (type == SQLITE_INTEGER) {
-        const int64_t number = sqlite3_value_int64(value);
-        // Row after row has the same second, and of a page by row id the same total.
-        if (number != numbers[column] || cell.text != digits[column].data()) {
-            cell = TextOf(number, digits[column]);
-            numbers[column] = number;
-        }
-        return true;
+void DBResult_tag::AddRow(sqlite3_value *const *rowValues) {
+    Cell *cell = cells.data();
+    for (Source &source : sources) {
+        if (!TakeValue(*rowValues++, source, *cell++))
+            throw std::bad_alloc();
     }
-    const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
-    hadText[column] = static_cast<char>(type == SQLITE_TEXT && text != nullptr);
-    cell = {text, text != nullptr ? static_cast<size_t>(sqlite3_value_bytes(value)) : 0};
-    return text != nullptr || sqlite3_value_type(value) == SQLITE_NULL;
+    AddRow();
 }
 
 // One call into the statement for each cell: the functions that take a column check the connection's state
 // each time. One thread uses the connection, so the values need no protection.
 void DBResult_tag::AddRowOf(sqlite3_stmt *statement) {
-    for (size_t column = 0; column < cells.size(); ++column) {
-        if (!TakeValue(column, sqlite3_column_value(statement, static_cast<int>(column))))
-            throw std::bad_alloc();
-    }
-    AddRow();
+    for (size_t column = 0; column < values.size(); ++column)
+        values[column] = sqlite3_column_value(statement, static_cast<int>(column));
+    AddRow(values.data());
 }
 
 int KELODBNumRows(DBResult_tag *result) {

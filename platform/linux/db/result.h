@@ -22,24 +22,26 @@ struct DBResult_tag {
     explicit DBResult_tag(sqlite3_stmt *statement);
     explicit DBResult_tag(std::span<const std::string> columnNames);
 
-    using Digits = std::array<char, 20>; // -9223372036854775808
-    // An integer as a text in `digits`, which is faster than SQLite's conversion. The text has no NUL.
-    static kelo::platform::Cell TextOf(int64_t number, Digits &digits);
-
-    // Makes the cell of a column the text of a value, which it refers to. False when there is no memory.
-    bool TakeValue(size_t column, sqlite3_value *value);
-
     // Appends the row in `cells`. Throws std::bad_alloc, or std::length_error when the result is full.
     void AddRow();
+
+    // The same with a row of values, one for each column.
+    void AddRow(sqlite3_value *const *values);
 
     // The same with the row that a statement with as many columns is at.
     void AddRowOf(sqlite3_stmt *statement);
 
+    // What is known of a column from the row before.
+    struct Source {
+        std::array<char, 20> digits; // of the last integer; -9223372036854775808 is the longest
+        int64_t number = 0;          // of which they are the text
+        bool hadText = false;        // whether the last value was a text
+    };
+
     kelo::platform::ColumnIndex columns;
     kelo::platform::RowBlock rows;
     std::vector<kelo::platform::Cell> cells; // the row that is being delivered, one cell a column
-    std::vector<Digits> digits;              // of the integers in `cells`
-    std::vector<int64_t> numbers;            // of which they are the texts
-    std::vector<char> hadText;               // whether the last value of a column was a text
+    std::vector<Source> sources;             // one a column
+    std::vector<sqlite3_value *> values;     // of the row that a statement is at
     uint32_t nextRow = 0;
 };

@@ -27,7 +27,7 @@ void CopyByTwoWords(char *to, const char *from, size_t size) {
     std::memcpy(to + size - sizeof last, &last, sizeof last);
 }
 
-void CopyText(char *to, const char *from, size_t size) {
+inline void CopyText(char *to, const char *from, size_t size) {
     if (size > 2 * sizeof(uint64_t) || size < sizeof(uint16_t))
         std::memcpy(to, from, size);
     else if (size >= sizeof(uint64_t))
@@ -41,8 +41,8 @@ void CopyText(char *to, const char *from, size_t size) {
 } // namespace
 
 template <typename Offset>
-void RowBlock::WriteRow(char *row, Width width, std::span<const Cell> cells) {
-    row[0] = width;
+void RowBlock::WriteRow(char *row, std::span<const Cell> cells) {
+    row[0] = sizeof(Offset);
     char *offsets = row + 1;
     char *text = offsets + cells.size() * sizeof(Offset);
     for (const Cell &cell : cells) {
@@ -83,20 +83,34 @@ char *RowBlock::Allocate(size_t size) {
 
 void RowBlock::Add(std::span<const Cell> cells) {
     size_t textSize = 0;
-    for (const Cell &cell : cells)
-        textSize += cell.text != nullptr ? cell.size + 1 : 0;
-    const bool narrow = 1 + cells.size() * sizeof(uint16_t) + textSize <= UINT16_MAX;
-    const size_t size = 1 + cells.size() * (narrow ? sizeof(uint16_t) : sizeof(uint32_t)) + textSize;
+    size_t lastSize = 0; // of the last text, before which all offsets are
+    for (const Cell &cell : cells) {
+        if (cell.text == nullptr)
+            continue;
+        lastSize = cell.size + 1;
+        textSize += lastSize;
+    }
+    const size_t head = 1 + textSize - lastSize;
+    const size_t offsetSize = head + cells.size() * sizeof(uint8_t) <= UINT8_MAX     ? sizeof(uint8_t)
+                              : head + cells.size() * sizeof(uint16_t) <= UINT16_MAX ? sizeof(uint16_t)
+                                                                                     : sizeof(uint32_t);
+    const size_t size = 1 + cells.size() * offsetSize + textSize;
     if (size > UINT32_MAX)
         throw std::length_error("row too long");
 
     if (count_ == tables_.size() * kRowsPerTable)
         tables_.push_back(std::make_unique_for_overwrite<const char *[]>(kRowsPerTable));
     char *row = Allocate(size);
-    if (narrow)
-        WriteRow<uint16_t>(row, kNarrow, cells);
-    else
-        WriteRow<uint32_t>(row, kWide, cells);
+    switch (offsetSize) {
+    case sizeof(uint8_t):
+        WriteRow<uint8_t>(row, cells);
+        break;
+    case sizeof(uint16_t):
+        WriteRow<uint16_t>(row, cells);
+        break;
+    default:
+        WriteRow<uint32_t>(row, cells);
+    }
     tables_[count_ / kRowsPerTable][count_ % kRowsPerTable] = row;
     ++count_;
 }

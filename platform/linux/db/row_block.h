@@ -16,7 +16,8 @@ struct Cell {
 };
 
 // Rows of texts, packed one after the other into a few large chunks that never move or grow. A row takes its
-// texts with their NULs, two bytes per cell (four if the row exceeds 64 KiB) and nine bytes.
+// texts with their NULs, one byte per cell (two if its last text does not begin in the first 256 bytes, four if
+// not in the first 64 KiB) and nine bytes.
 class RowBlock {
 public:
     // Appends a row. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
@@ -28,15 +29,21 @@ public:
     // Text of a cell, null for NULL. Both positions must exist.
     const char *Text(uint64_t row, size_t column) const {
         const char *start = tables_[row / kRowsPerTable][row % kRowsPerTable];
-        return start[0] == kNarrow ? ReadText<uint16_t>(start, column) : ReadText<uint32_t>(start, column);
+        switch (start[0]) {
+        case sizeof(uint8_t):
+            return ReadText<uint8_t>(start, column);
+        case sizeof(uint16_t):
+            return ReadText<uint16_t>(start, column);
+        default:
+            return ReadText<uint32_t>(start, column);
+        }
     }
 
 private:
     // A row is a byte with the width of its offsets, the offsets of its texts from the row's start, and the
     // texts. No text starts at 0, so that offset means NULL.
-    enum Width : char { kNarrow = 0, kWide = 1 };
     template <typename Offset>
-    static void WriteRow(char *row, Width width, std::span<const Cell> cells);
+    static void WriteRow(char *row, std::span<const Cell> cells);
     template <typename Offset>
     static const char *ReadText(const char *row, size_t column) {
         Offset offset;

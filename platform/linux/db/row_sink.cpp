@@ -19,14 +19,8 @@ void Deliver(sqlite3_context *context, int count, sqlite3_value **values) {
         sqlite3_result_error(context, "kelo_rows() is internal", -1);
         return;
     }
-    for (size_t column = 0; column < result->cells.size(); ++column) {
-        if (!result->TakeValue(column, values[column + 1])) {
-            sqlite3_result_error_nomem(context);
-            return;
-        }
-    }
     try {
-        result->AddRow();
+        result->AddRow(values + 1);
     } catch (const std::bad_alloc &) {
         sqlite3_result_error_nomem(context);
     } catch (const std::length_error &) {
