@@ -49,6 +49,9 @@ TEST(DBRecToLogInfo, FillsWhatTheTableHas) {
         {"logs", false, "NULL id, '-9223372036854775808' utcsec",
          "0|-9223372036854775808|7|0|||||||||||||||"},
         {"logs", false, "'18446744073709551615' id, 4294967296 utcsec", "-1|4294967296|7|0|||||||||||||||"},
+        // The record is one for all rows.
+        {"logs", false, "'ab' host, 'x' msg UNION ALL SELECT 'cd', 'yz' UNION ALL SELECT NULL, 'uv'",
+         "0|0|7|0||ab|||||||x||||||0|0|7|0||cd|||||||yz||||||0|0|7|0|||||||||uv||||||"},
         {"LOGS", false, kEveryColumn, ""}, // the case counts
     };
     for (const auto &[table, trimUser, columns, expected] : cases) {

@@ -30,12 +30,26 @@ TEST_F(Result, HoldsRowsOfAnyWidth) {
     for (int i = 0; i < 300; ++i)
         values += std::to_string(i) + " AS c" + std::to_string(i) + ", ";
     EXPECT_EQ(Run("SELECT " + values + "'z' AS z", {"c0", "c299", "z"}).rows, (Rows{{"0", "299", "z"}}));
-    // Around the row size where offsets get wider, and past the size of a chunk.
-    for (const size_t size : {65516U, 65517U, 65518U, 65519U, 3000000U}) {
+    // Around the sizes where offsets get wider, and past the size of a chunk.
+    for (const size_t size : {247U, 248U, 249U, 250U, 65524U, 65525U, 65526U, 65527U, 3000000U}) {
         const std::string text(size, 'x');
         EXPECT_EQ(Run("SELECT 1 AS a, '" + text + "' AS b, 2 AS c", {"a", "b", "c"}).rows,
                   (Rows{{"1", text, "2"}}));
     }
+}
+
+TEST_F(Result, HoldsIntegersInAnyOrder) {
+    constexpr int64_t kMost = std::numeric_limits<int64_t>::max();
+    const std::vector<int64_t> numbers = {0,         1,     2,      9,  10,    13,         19,
+                                          20,        25,    24,     -1, -2,    3,          kMost - 7,
+                                          kMost - 1, kMost, -kMost, 1,  kMost, -kMost - 1, kMost};
+    Rows expected;
+    std::string values;
+    for (const int64_t number : numbers) {
+        expected.push_back({std::to_string(number)});
+        values += (values.empty() ? "(" : ",(") + std::to_string(number) + ")";
+    }
+    EXPECT_EQ(Run("WITH numbers(a) AS (VALUES " + values + ") SELECT a FROM numbers", {"a"}).rows, expected);
 }
 
 TEST_F(Result, IsThereWithoutRowsForAStatementWithColumnsOnly) {

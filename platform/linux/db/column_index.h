@@ -58,7 +58,7 @@ private:
     uint32_t last_ = 0;              // the column that was found last
     uint32_t expected_ = 0;          // its follower
     const char *expectedName_ = nullptr;
-    std::vector<uint32_t> slots_;    // open addressing; a power of two, half empty at the least
+    std::vector<uint32_t> slots_; // open addressing; a power of two, half empty at the least
 };
 
 } // namespace kelo::platform

@@ -16,13 +16,7 @@ bool TakeValue(sqlite3_value *value, DBResult_tag::Source &source, Cell &cell) {
     // time would take longer.
     const int type = source.hadText ? SQLITE_TEXT : sqlite3_value_type(value);
     if (type == SQLITE_INTEGER) {
-        const int64_t number = sqlite3_value_int64(value);
-        // Row after row has the same second, and of a page by row id the same total.
-        if (number != source.number || cell.text != source.digits.data()) {
-            const char *end = std::to_chars(source.digits.begin(), source.digits.end(), number).ptr;
-            cell = {source.digits.data(), static_cast<size_t>(end - source.digits.data())};
-            source.number = number;
-        }
+        cell = source.TextOf(sqlite3_value_int64(value));
         return true;
     }
     const auto *text = reinterpret_cast<const char *>(sqlite3_value_text(value));
@@ -32,6 +26,17 @@ bool TakeValue(sqlite3_value *value, DBResult_tag::Source &source, Cell &cell) {
 }
 
 } // namespace
+
+// Row after row has the same second or the next, the next id, and of a page by row id the same total.
+Cell DBResult_tag::Source::TextOf(int64_t next) {
+    char &last = digits[size - 1];
+    if (number > 0 && next >= number && next - number <= '9' - last)
+        last = static_cast<char>(last + (next - number));
+    else
+        size = static_cast<size_t>(std::to_chars(digits.begin(), digits.end(), next).ptr - digits.data());
+    number = next;
+    return {digits.data(), size};
+}
 
 DBResult_tag::DBResult_tag(sqlite3_stmt *statement)
     : cells(static_cast<size_t>(sqlite3_column_count(statement))), sources(cells.size()),

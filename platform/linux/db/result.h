@@ -31,11 +31,15 @@ struct DBResult_tag {
     // The same with the row that a statement with as many columns is at.
     void AddRowOf(sqlite3_stmt *statement);
 
-    // What is known of a column from the row before.
+    // What is known of a column from the rows before.
     struct Source {
-        std::array<char, 20> digits; // of the last integer; -9223372036854775808 is the longest
-        int64_t number = 0;          // of which they are the text
-        bool hadText = false;        // whether the last value was a text
+        // The text of an integer, without a NUL, until the next call. Faster than SQLite's conversion.
+        kelo::platform::Cell TextOf(int64_t next);
+
+        std::array<char, 20> digits = {'0'}; // of the last integer; -9223372036854775808 is the longest
+        size_t size = 1;                     // of the digits
+        int64_t number = 0;                  // of which they are the text
+        bool hadText = false;                // whether the last value was a text
     };
 
     kelo::platform::ColumnIndex columns;

@@ -16,8 +16,8 @@ struct Cell {
 };
 
 // Rows of texts, packed one after the other into a few large chunks that never move or grow. A row takes its
-// texts with their NULs, one byte per cell (two if its last text does not begin in the first 256 bytes, four if
-// not in the first 64 KiB) and nine bytes.
+// texts with their NULs, one byte per cell (two if its last text does not begin in the first 256 bytes, four
+// if not in the first 64 KiB) and nine bytes.
 class RowBlock {
 public:
     // Appends a row. Throws std::bad_alloc, or std::length_error for a row of 4 GiB;
