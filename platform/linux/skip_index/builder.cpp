@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "skip_index/database_state.h"
+#include "skip_index/piece_reader.h"
 
 namespace kelo::platform {
 namespace {
@@ -73,66 +74,12 @@ void Report(const std::string &dbPath, const char *reason) {
            reason);
 }
 
-// Throws std::bad_alloc.
-std::string_view TextOf(sqlite3_value *value) {
-    const auto *bytes = reinterpret_cast<const char *>(sqlite3_value_text(value));
-    if (bytes == nullptr && sqlite3_value_type(value) != SQLITE_NULL)
-        throw std::bad_alloc();
-    return {bytes != nullptr ? bytes : "", static_cast<size_t>(sqlite3_value_bytes(value))};
-}
-
-// No condition finds a NULL, and other values than the usual ones may be found by any.
-TimeSpan SecondOf(sqlite3_value *value) {
-    const int type = sqlite3_value_type(value);
-    if (type != SQLITE_INTEGER)
-        return type == SQLITE_NULL ? TimeSpan{} : kAllTimes;
-    const int64_t second = sqlite3_value_int64(value);
-    return {second, second};
-}
-
-TimeSpan DayOf(sqlite3_value *value) {
-    const int type = sqlite3_value_type(value);
-    if (type != SQLITE_TEXT)
-        return type == SQLITE_NULL ? TimeSpan{} : kAllTimes;
-    const std::optional<int64_t> day = NumberOfDay(TextOf(value));
-    return day ? TimeSpan{*day, *day} : kAllTimes;
-}
-
-// Takes the rows of a piece out of a statement, as an aggregate function of the connection: to step through
-// the rows and ask for their columns takes SQLite twice as long.
-constexpr char kTakeRow[] = "kelo_take_row";
-struct PieceOfRows {
-    Piece piece;
-    int64_t first = 0; // id
-};
-void TakeRow(sqlite3_context *context, int, sqlite3_value **values) {
-    auto *taken = static_cast<PieceOfRows *>(sqlite3_user_data(context));
-    try {
-        taken->piece.Add(static_cast<size_t>(sqlite3_value_int64(values[0]) - taken->first),
-                         {.message = TextOf(values[1]),
-                          .severity = TextOf(values[2]),
-                          .facility = TextOf(values[3]),
-                          .times = {SecondOf(values[4]), DayOf(values[5])}});
-    } catch (const std::bad_alloc &) {
-        sqlite3_result_error_nomem(context);
-    }
-}
-void EndRows(sqlite3_context *) {}
-
 class Builder {
 public:
     Builder(sqlite3 *db, IndexFile file, const IndexHeader &header)
         : db_(db), file_(std::move(file)), header_(header), newest_(LargestIdEver(db)),
-          databaseBytes_(NumberOf(db, "PRAGMA page_count", 0) * NumberOf(db, "PRAGMA page_size", 0)) {
-        sqlite3_create_function_v2(db, kTakeRow, 6, SQLITE_UTF8 | SQLITE_DIRECTONLY, &rows_, nullptr, TakeRow,
-                                   EndRows, nullptr);
-    }
-    ~Builder() {
-        sqlite3_create_function_v2(db_, kTakeRow, 6, SQLITE_UTF8, nullptr, nullptr, nullptr, nullptr,
-                                   nullptr);
-    }
-    Builder(const Builder &) = delete;
-    Builder &operator=(const Builder &) = delete;
+          databaseBytes_(NumberOf(db, "PRAGMA page_count", 0) * NumberOf(db, "PRAGMA page_size", 0)),
+          reader_(db) {}
 
     BuildResult Run(steady_clock::time_point deadline);
 
@@ -154,7 +101,7 @@ private:
     IndexHeader header_;
     int64_t newest_;
     int64_t databaseBytes_;
-    PieceOfRows rows_;
+    PieceReader reader_;
     std::vector<BuiltPiece> loose_; // pieces of the segment that is not complete
     int64_t looseOnDisk_ = 0;
 };
@@ -191,19 +138,10 @@ bool Builder::ReadLoose() {
 
 bool Builder::BuildPiece() {
     const int64_t piece = NextPiece();
-    rows_.first = piece * kIdsPerPiece;
-    rows_.piece.Clear();
-    Query rows(db_, std::string("SELECT ") + kTakeRow +
-                        "(id, msg, llevel, fac, utcsec, ldate) FROM main.logs NOT INDEXED "
-                        "WHERE id BETWEEN ?1 AND ?2");
-    rows.Bind(1, rows_.first);
-    rows.Bind(2, rows_.first + kIdsPerPiece - 1);
-    while (rows.Step()) {
-    }
-    if (rows.Status() != SQLITE_DONE)
+    const Piece *rows = reader_.Read(piece);
+    if (rows == nullptr)
         return false;
-    rows_.piece.Finish();
-    loose_.push_back(rows_.piece.Build(header_.fileNumber, piece));
+    loose_.push_back(rows->Build(header_.fileNumber, piece));
     return true;
 }
 

@@ -91,8 +91,8 @@ Candidates::Bitmap Candidates::Evaluate(const Need &need, int64_t segment, const
     switch (need.kind) {
     case Need::Kind::kNothing:
         return among;
-    case Need::Kind::kGrams:
-        return EvaluateGrams(need, segment, among);
+    case Need::Kind::kBits:
+        return EvaluateBits(need, segment, among);
     case Need::Kind::kTimes:
         return EvaluateTimes(need, segment, among);
     case Need::Kind::kAll: {
@@ -113,12 +113,12 @@ Candidates::Bitmap Candidates::Evaluate(const Need &need, int64_t segment, const
     return any;
 }
 
-Candidates::Bitmap Candidates::EvaluateGrams(const Need &need, int64_t segment, Bitmap among) {
+Candidates::Bitmap Candidates::EvaluateBits(const Need &need, int64_t segment, Bitmap among) {
     std::array<Slice, kPiecesPerSegment> slices;
-    for (const uint16_t gram : need.grams) {
+    for (const uint16_t bit : need.bits) {
         if (std::all_of(among.begin(), among.end(), [](uint64_t word) { return word == 0; }))
             break;
-        const int pieces = file_.ReadSlices(header_, segment, gram, slices);
+        const int pieces = file_.ReadSlices(header_, segment, bit, slices);
         if (pieces < 0) {
             isGood_ = false;
             return {};

@@ -34,7 +34,7 @@ private:
     void AddOutside(IdRange range, std::vector<IdRange> &ranges) const;
     void AddSegment(int64_t segment, bool isAscending, std::vector<IdRange> &ranges);
     Bitmap Evaluate(const Need &need, int64_t segment, const Bitmap &among);
-    Bitmap EvaluateGrams(const Need &need, int64_t segment, Bitmap among);
+    Bitmap EvaluateBits(const Need &need, int64_t segment, Bitmap among);
     Bitmap EvaluateTimes(const Need &need, int64_t segment, Bitmap among);
     bool ReadZonesOf(int64_t segment);
 

@@ -11,17 +11,6 @@
 namespace kelo::platform {
 namespace {
 
-// Of all values of the row that the statement is at.
-uint64_t HashOfRow(sqlite3_stmt *row) {
-    uint64_t hash = 0;
-    for (int column = 0; column < sqlite3_column_count(row); ++column) {
-        const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(row, column));
-        const auto size = static_cast<size_t>(sqlite3_column_bytes(row, column));
-        hash = HashOf({text != nullptr ? text : "", size}, hash + 1);
-    }
-    return hash;
-}
-
 constexpr size_t kBitsOfRow = 24; // of its message
 
 std::string_view TextAt(sqlite3_stmt *row, int column) {
@@ -29,14 +18,22 @@ std::string_view TextAt(sqlite3_stmt *row, int column) {
     return {text != nullptr ? text : "", static_cast<size_t>(sqlite3_column_bytes(row, column))};
 }
 
+// Of all values of the row that the statement is at.
+uint64_t HashOfRow(sqlite3_stmt *row) {
+    uint64_t hash = 0;
+    for (int column = 0; column < sqlite3_column_count(row); ++column)
+        hash = HashOf(TextAt(row, column), hash + 1);
+    return hash;
+}
+
 // What a search needs that finds the row of "msg, llevel, fac, utcsec, ldate" by all that it has.
 Need NeedOfRow(sqlite3_stmt *row) {
-    Need grams{.kind = Need::Kind::kGrams, .grams = BitsOfLiteral(TextAt(row, 0), kBitsOfRow)};
+    Need values{.kind = Need::Kind::kBits, .bits = BitsOfLiteral(TextAt(row, 0), kBitsOfRow)};
     for (const auto &[column, at] : {std::pair(TokenColumn::kSeverity, 1), {TokenColumn::kFacility, 2}}) {
         const auto bits = BitsOfToken(column, TextAt(row, at));
-        grams.grams.insert(grams.grams.end(), bits.begin(), bits.end());
+        values.bits.insert(values.bits.end(), bits.begin(), bits.end());
     }
-    Need all{.kind = Need::Kind::kAll, .parts = {std::move(grams)}};
+    Need all{.kind = Need::Kind::kAll, .parts = {std::move(values)}};
     const auto addTime = [&all](TimeColumn column, int64_t time) {
         all.parts.push_back({.kind = Need::Kind::kTimes, .column = column, .times = {time, time}});
     };

@@ -28,9 +28,9 @@ std::optional<SearchPlan> SearchPlan::Read(sqlite3 *db, std::string_view sql) {
     if (!text || IsSwitchedOff() || sqlite3_get_autocommit(db) == 0 ||
         sqlite3_txn_state(db, "main") != SQLITE_TXN_NONE)
         return std::nullopt;
-    // Without the need of grams only a page may be found faster.
+    // Without the need of bits only a page may be found faster.
     const bool isOrdered = text->kind == SearchText::Kind::kSelect && text->order != SearchText::Order::kNone;
-    if (!text->needsGrams && !isOrdered)
+    if (!text->needsBits && !isOrdered)
         return std::nullopt;
     std::optional<SkipIndex> index;
     if (text->need.kind != Need::Kind::kNothing)
@@ -147,7 +147,7 @@ bool SearchPlan::IsWorthwhile(int64_t pageRows) {
         return false;
     if (access.isSorted && isPage && ((text_.needsTimes && HasUsableIndex()) || NarrowByTimes()))
         return isByStep_ = true;
-    if (!text_.needsGrams || !CollectAll())
+    if (!text_.needsBits || !CollectAll())
         return false;
     const int64_t count = CountIds(all_, std::numeric_limits<int64_t>::max());
     return access.isScan ? count <= SpanOf(text_.ids) / 2

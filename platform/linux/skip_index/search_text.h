@@ -7,26 +7,9 @@
 #include <string_view>
 #include <vector>
 
-#include "skip_index/zone.h"
+#include "skip_index/need.h"
 
 namespace kelo::platform {
-
-// What a row must have for a condition to be true, as far as the index knows: sufficient to rule a row out,
-// never to accept it.
-struct Need {
-    enum class Kind {
-        kNothing, // the condition says nothing of the kind
-        kGrams,   // all of these bits, of grams of its message or of a value
-        kTimes,   // a time of `times` in `column`
-        kAll,     // all of the parts
-        kAny      // one of the parts
-    };
-    Kind kind = Kind::kNothing;
-    std::vector<uint16_t> grams{};
-    std::vector<Need> parts{};
-    TimeColumn column = TimeColumn::kSecond;
-    TimeSpan times{};
-};
 
 struct IdRange {
     int64_t first = std::numeric_limits<int64_t>::min();
@@ -47,7 +30,7 @@ struct SearchText {
     Order order = Order::kNone;
     Need need;
     // What it needs of. SQLite has indexes for times.
-    bool needsGrams = false;
+    bool needsBits = false;
     bool needsTimes = false;
     // The columns of times that have conditions of their own: "ldate", "utcsec".
     std::vector<std::string_view> times;
@@ -55,7 +38,7 @@ struct SearchText {
     bool isTextOnly = true;
 };
 
-// Takes a statement apart. Nothing for any text that is not known to be one of these, or that neither grams
+// Takes a statement apart. Nothing for any text that is not known to be one of these, or that neither bits
 // nor times say anything about. The result refers to `sql`.
 std::optional<SearchText> ReadSearchText(std::string_view sql);
 

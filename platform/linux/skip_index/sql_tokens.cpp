@@ -1,7 +1,9 @@
 #include "skip_index/sql_tokens.h"
 
 #include <algorithm>
+#include <charconv>
 #include <cstddef>
+#include <system_error>
 
 namespace kelo::platform {
 namespace {
@@ -52,6 +54,19 @@ SqlToken TakeToken(std::string_view rest) {
     return {IsDigit(rest[0]) ? Kind::kNumber : Kind::kWord, word};
 }
 
+constexpr int kMaxDepth = 50; // of brackets
+
+// Where the bracket that opens at `open` closes; tokens.size() if it does not.
+size_t ClosingBracket(SqlTokens tokens, size_t open) {
+    size_t depth = 0;
+    for (size_t at = open; at < tokens.size(); ++at) {
+        depth += tokens[at].Is('(') ? 1 : 0;
+        if (tokens[at].Is(')') && --depth == 0)
+            return at;
+    }
+    return tokens.size();
+}
+
 } // namespace
 
 bool SqlToken::Is(std::string_view word) const {
@@ -82,6 +97,68 @@ std::string StringValue(const SqlToken &token) {
             ++at;
     }
     return value;
+}
+
+std::optional<int64_t> IntegerValue(const SqlToken &token) {
+    int64_t number = 0;
+    const char *end = token.text.data() + token.text.size();
+    const auto [stop, error] = std::from_chars(token.text.data(), end, number);
+    return token.kind == SqlToken::Kind::kNumber && error == std::errc() && stop == end
+               ? std::optional(number)
+               : std::nullopt;
+}
+
+std::string_view TextOf(SqlTokens tokens) {
+    const char *begin = tokens.front().text.data();
+    const char *end = tokens.back().text.data() + tokens.back().text.size();
+    return {begin, static_cast<size_t>(end - begin)};
+}
+
+bool AreLike(SqlTokens tokens, std::initializer_list<std::string_view> form) {
+    return std::equal(tokens.begin(), tokens.end(), form.begin(), form.end(),
+                      [](const SqlToken &token, std::string_view expected) {
+                          if (token.kind == SqlToken::Kind::kString)
+                              return expected == "'";
+                          return token.kind == SqlToken::Kind::kWord ? token.Is(expected)
+                                                                     : token.text == expected;
+                      });
+}
+
+bool HasWord(SqlTokens tokens, std::span<const std::string_view> words) {
+    return std::any_of(tokens.begin(), tokens.end(), [&](const SqlToken &token) {
+        return std::any_of(words.begin(), words.end(), [&](std::string_view word) { return token.Is(word); });
+    });
+}
+
+bool HasPlainBrackets(SqlTokens tokens) {
+    int depth = 0;
+    for (const SqlToken &token : tokens) {
+        depth += token.Is('(') ? 1 : token.Is(')') ? -1 : 0;
+        if (depth < 0 || depth > kMaxDepth)
+            return false;
+    }
+    return depth == 0;
+}
+
+SqlTokens Bare(SqlTokens tokens) {
+    while (tokens.size() > 2 && tokens[0].Is('(') && ClosingBracket(tokens, 0) == tokens.size() - 1)
+        tokens = tokens.subspan(1, tokens.size() - 2);
+    return tokens;
+}
+
+std::vector<SqlTokens> Split(SqlTokens tokens, std::string_view word) {
+    std::vector<SqlTokens> parts;
+    size_t begin = 0;
+    for (size_t at = 0; at < tokens.size(); ++at) {
+        if (tokens[at].Is('('))
+            at = ClosingBracket(tokens, at);
+        else if (tokens[at].Is(word)) {
+            parts.push_back(tokens.subspan(begin, at - begin));
+            begin = at + 1;
+        }
+    }
+    parts.push_back(tokens.subspan(begin));
+    return parts;
 }
 
 } // namespace kelo::platform
