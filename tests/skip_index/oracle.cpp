@@ -4,8 +4,8 @@
 //     skip_index_oracle [SEARCHES [SEED [DATABASE]]]
 //
 // With DATABASE: the same with that one, to which others append and from which they delete meanwhile. A
-// search is for the records up to the newest one at the time; it is asked for without the index, with it, and
-// without it again.
+// search is for the records up to the newest one at the time; it is asked for without the index and with it,
+// and where the answers differ without it again: records may have been deleted.
 //
 // Exit status: 0 all the same, 1 a difference, or an index that was reported too often or not at all.
 
@@ -113,6 +113,8 @@ std::string Oracle::SearchBeside(RandomSearch &search) {
     const Answer before = Ask(path, search, WithIndex::kNo);
     const Answer found = Ask(path, search, WithIndex::kYes);
     served_ += WasServed() ? 1 : 0;
+    if (found == before)
+        return "";
     const Answer after = Ask(path, search, WithIndex::kNo);
     const auto later = StateOf(path);
     if (later.first != state.first || std::stoll(later.second) < std::stoll(state.second)) {
@@ -120,7 +122,7 @@ std::string Oracle::SearchBeside(RandomSearch &search) {
         return "";
     }
     if (before == after)
-        return found == before ? "" : Difference(search, found, before);
+        return Difference(search, found, before);
     if (search.limit) {
         ++undecided_;
         return "";

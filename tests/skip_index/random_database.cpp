@@ -194,7 +194,7 @@ void RandomDatabase::ChangeVersion() {
     std::string bytes = ReadFile(index_);
     if (bytes.empty() || bytes[0] == '\0')
         return;
-    bytes[16] ^= 4;
+    bytes[16] = 99;
     WriteFile(index_, bytes);
     mustBeReported_ = true;
     isBuilt_ = false;
