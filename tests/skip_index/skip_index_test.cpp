@@ -4,7 +4,12 @@
 #include "keloplatform/skip_index.h"
 
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <sys/file.h>
+
+#include <cstdarg>
+#include <functional>
+#include <utility>
 
 #include "platform/db_fixture.h"
 
@@ -16,6 +21,9 @@ struct Fault {
     int error = 0; // 0: the process ends, with half of what it was to write
 };
 Fault fault;
+// What somebody else does just before: the next time only.
+std::function<void()> beforeSlices;
+std::function<void()> beforeNewFile;
 
 bool IsDue() {
     if (fault.callsLeft < 0 || fault.callsLeft-- > 0)
@@ -42,12 +50,24 @@ Function Real(const char *name) {
 extern "C" {
 ssize_t pwrite(int fd, const void *bytes, size_t size, off_t offset) {
     static const auto real = Real<ssize_t (*)(int, const void *, size_t, off_t)>("pwrite");
+    if (beforeSlices && size > 100'000)
+        std::exchange(beforeSlices, nullptr)();
     if (!IsDue())
         return real(fd, bytes, size, offset);
     if (fault.error != 0)
         return -1;
     real(fd, bytes, size / 2, offset);
     _exit(0);
+}
+int open(const char *path, int flags, ...) {
+    static const auto real = Real<int (*)(const char *, int, mode_t)>("open");
+    va_list more;
+    va_start(more, flags);
+    const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(more, mode_t) : 0;
+    va_end(more);
+    if (beforeNewFile && (flags & O_EXCL) != 0)
+        std::exchange(beforeNewFile, nullptr)();
+    return real(path, flags, mode);
 }
 int ftruncate(int fd, off_t size) noexcept {
     static const auto real = Real<int (*)(int, off_t)>("ftruncate");
@@ -319,6 +339,15 @@ TEST_F(SkipIndexTest, IsReplacedWithOneLineWhenItIsDamagedOrAnotherOnes) {
     EXPECT_EQ(Count("(msg GLOB '*Segfault*')"), "8");
     EXPECT_EQ(log_.TakeTexts().size(), 1U);
     EXPECT_FALSE(fs::exists(index_));
+
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    bytes = ReadFile(index_);
+    bytes[bytes.size() - 1000] ^= 1; // in a piece that the next builder reads
+    WriteFile(index_, bytes);
+    RunSql(path_, "INSERT INTO logs(msg) SELECT msg FROM logs WHERE id <= 20000");
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    EXPECT_EQ(EndId(), (kRows + 20'000) / 16'384 * 16'384);
+    EXPECT_EQ(log_.TakeTexts().size(), 1U);
 }
 
 TEST_F(SkipIndexTest, IsNotMadeWhereIdsMayComeBack) {
@@ -351,6 +380,17 @@ TEST_F(SkipIndexTest, IsBuiltByOneAtATime) {
     EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_BUSY);
     close(other);
     EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    fs::remove(index_);
+    beforeNewFile = [&] { WriteFile(index_, ""); };
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_BUSY);
+}
+
+TEST_F(SkipIndexTest, IsNotUsedWhenTheContentIsReplacedWhileItIsBuilt) {
+    beforeSlices = [&] { RunSql(path_, "UPDATE logs SET msg = 'Needle ' || id"); };
+    ASSERT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    EXPECT_EQ(Count("(msg GLOB '*Needle 200*')"), "111");
+    EXPECT_EQ(KELODBSkipIndexBuild(path_.c_str(), 0), KELODB_SKIP_COMPLETE);
+    EXPECT_EQ(Count("(msg GLOB '*Needle 200*')"), "111");
 }
 
 // Whatever was built before is good, and the next one builds the rest without a word.

@@ -13,6 +13,7 @@
 #include <utility>
 #include <vector>
 
+#include "db/transaction.h"
 #include "skip_index/database_state.h"
 #include "skip_index/piece_reader.h"
 
@@ -69,6 +70,7 @@ void AddSample(IndexHeader &header, const RowSample &sample) {
     header.samples[header.sampleCount++] = sample;
 }
 
+constexpr char kDamaged[] = "it is damaged";
 void Report(const std::string &dbPath, const char *reason) {
     syslog(LOG_WARNING, "skip index %s: %s; it is removed and built again", IndexPathOf(dbPath).c_str(),
            reason);
@@ -81,7 +83,9 @@ public:
           databaseBytes_(NumberOf(db, "PRAGMA page_count", 0) * NumberOf(db, "PRAGMA page_size", 0)),
           reader_(db) {}
 
-    BuildResult Run(steady_clock::time_point deadline);
+    // Nothing if what is built already turned out to be damaged.
+    std::optional<BuildResult> Run(steady_clock::time_point deadline);
+    const IndexFile &File() const { return file_; }
 
 private:
     bool HasPiece() const { return NextPiece() < newest_ / kIdsPerPiece; }
@@ -91,6 +95,7 @@ private:
     BuildResult Refusal() const;
     bool ReadLoose();
     bool BuildPiece();
+    bool TakeSamples(int64_t piece);
     bool WriteSegment();
     bool WriteLoose();
     bool Publish();
@@ -102,7 +107,8 @@ private:
     int64_t newest_;
     int64_t databaseBytes_;
     PieceReader reader_;
-    std::vector<BuiltPiece> loose_; // pieces of the segment that is not complete
+    std::vector<RowSample> samples_; // of the pieces that are not published
+    std::vector<BuiltPiece> loose_;  // pieces of the segment that is not complete
     int64_t looseOnDisk_ = 0;
 };
 
@@ -137,24 +143,32 @@ bool Builder::ReadLoose() {
 }
 
 bool Builder::BuildPiece() {
+    const Transaction transaction(db_, "BEGIN"); // the samples are those of the rows that are indexed
     const int64_t piece = NextPiece();
     const Piece *rows = reader_.Read(piece);
-    if (rows == nullptr)
+    if (rows == nullptr || !TakeSamples(piece))
         return false;
     loose_.push_back(rows->Build(header_.fileNumber, piece));
+    return true;
+}
+
+bool Builder::TakeSamples(int64_t piece) {
+    RowSampler sampler(db_);
+    for (int64_t step = 1; step <= kSamplesPerPiece; ++step) {
+        const auto sample = sampler.UpTo(piece * kIdsPerPiece + step * kIdsPerPiece / kSamplesPerPiece - 1);
+        if (!sample)
+            return false;
+        samples_.push_back(*sample);
+    }
     return true;
 }
 
 bool Builder::Publish() {
     header_.pieceCount += Fresh();
     looseOnDisk_ = static_cast<int64_t>(loose_.size());
-    RowSampler sampler(db_);
-    for (int64_t step = kSamplesPerPiece; step > 0; --step) {
-        const auto sample = sampler.UpTo(header_.EndId() - 1 - (step - 1) * kIdsPerPiece / kSamplesPerPiece);
-        if (!sample)
-            return false;
-        AddSample(header_, *sample);
-    }
+    for (const RowSample &sample : samples_)
+        AddSample(header_, sample);
+    samples_.clear();
     return file_.Publish(header_);
 }
 
@@ -204,14 +218,12 @@ void Builder::DropDeadSegments() {
         file_.Drop((live - header_.basePiece) / kPiecesPerSegment);
 }
 
-BuildResult Builder::Run(steady_clock::time_point deadline) {
+std::optional<BuildResult> Builder::Run(steady_clock::time_point deadline) {
     DropDeadSegments();
     if (!HasPiece())
         return BuildResult::kComplete;
-    if (!ReadLoose()) {
-        errno = EIO;
-        return BuildResult::kFailed;
-    }
+    if (!ReadLoose())
+        return std::nullopt;
     BuildResult result = BuildResult::kComplete;
     bool isGood = true;
     while (isGood && HasPiece() && result == BuildResult::kComplete) {
@@ -244,8 +256,11 @@ std::optional<LockedIndex> TakeIndex(sqlite3 *db, const std::string &path, Build
     auto file = IndexFile::Open(path, *identity, IndexFile::Access::kWrite);
     if (!file && errno == ENOENT)
         file = IndexFile::Create(path, *identity);
-    if (!file)
+    if (!file) {
+        if (errno == EEXIST) // another one was faster
+            failure = BuildResult::kBusy;
         return std::nullopt;
+    }
     failure = BuildResult::kBusy;
     if (!file->Lock())
         return std::nullopt;
@@ -256,7 +271,7 @@ std::optional<LockedIndex> TakeIndex(sqlite3 *db, const std::string &path, Build
     if (state != IndexFile::State::kNew) {
         Report(path, state == IndexFile::State::kGood      ? "it is that of another database"
                      : state == IndexFile::State::kForeign ? "it has another version"
-                                                           : "it is damaged");
+                                                           : kDamaged);
         file->Unlink();
         file = IndexFile::Create(path, *identity);
         if (!file || !file->Lock())
@@ -275,11 +290,19 @@ BuildResult BuildIndex(sqlite3 *db, steady_clock::time_point deadline) {
         return BuildResult::kNoTable;
     if (LargestIdEver(db) < kIdsPerPiece && access(IndexPathOf(path).c_str(), F_OK) != 0)
         return BuildResult::kComplete;
-    BuildResult failure;
-    auto index = TakeIndex(db, path, failure);
-    if (!index)
-        return failure;
-    return Builder(db, std::move(index->file), index->header).Run(deadline);
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        BuildResult failure;
+        auto index = TakeIndex(db, path, failure);
+        if (!index)
+            return failure;
+        Builder builder(db, std::move(index->file), index->header);
+        if (const auto result = builder.Run(deadline))
+            return *result;
+        Report(path, kDamaged);
+        builder.File().Unlink();
+    }
+    errno = EIO;
+    return BuildResult::kFailed;
 }
 
 void DiscardIndex(const std::string &dbPath, const DatabaseIdentity &database, const IndexHeader &header) {
@@ -288,7 +311,7 @@ void DiscardIndex(const std::string &dbPath, const DatabaseIdentity &database, c
     if (!file || !file->Lock() || file->ReadHeader(now) != IndexFile::State::kGood ||
         std::memcmp(&now, &header, sizeof now) != 0)
         return;
-    Report(dbPath, "it is damaged");
+    Report(dbPath, kDamaged);
     file->Unlink();
 }
 
