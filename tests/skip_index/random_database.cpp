@@ -203,7 +203,7 @@ void RandomDatabase::ChangeVersion() {
 // The index of another database with the same ids.
 void RandomDatabase::TakeOtherIndex() {
     if (!fs::exists(copy_) || KELODBSkipIndexBuild(copy_.c_str(), 0) != KELODB_SKIP_COMPLETE ||
-        !fs::exists(copy_ + "-skip"))
+        !fs::exists(copy_ + "-skip") || fs::file_size(copy_ + "-skip") == 0)
         return;
     fs::rename(copy_ + "-skip", index_);
     mustBeReported_ = true;

@@ -31,6 +31,7 @@ kill_builder() {
 }
 happen_endlessly() {
     local -i happening
+    trap 'wait; exit' TERM # when the command has ended
     for ((happening = 0; ; happening++)); do
         case $((RANDOM % 40)) in
             0) kelosyslog archive --remove-archived --yes && send_lines "$root/lines" ;;
@@ -47,7 +48,7 @@ happen_endlessly() {
         sleep 0.1
     done >"$root/happened" 2>&1
 }
-trap 'kill $(jobs -p) 2>/dev/null || true; clean_up' EXIT
+trap 'kill $(jobs -p) 2>/dev/null || true; wait; clean_up || wait_until 20 rm -rf "$root"' EXIT # builders are in the background
 RANDOM=${KELO_SEED:-1}
 send_endlessly &
 sender=$!
@@ -56,6 +57,7 @@ happens=$!
 status=0
 "$KELO_BIN_DIR/skip_index_oracle" "${KELO_SEARCHES:-100}" "${KELO_SEED:-1}" "$database" >"$root/searches" 2>&1 || status=$?
 kill $sender $happens
+wait $happens || true
 cat "$root/searches"
 echo "$(<"$root/happenings") happenings beside them"
 expect "status of the searches" "$status" 0
