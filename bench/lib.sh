@@ -35,6 +35,18 @@ END
     define "$root/$kind/kelosyslog.conf" kelo_store "$kind"
 }
 
+# where_they_wait ROOT: of a run that has not stored everything: what syslog-ng has received, written and queued, and what it and its
+# children do. A queue behind which nothing is written names the program that does not read or store.
+where_they_wait() {
+    local process
+    syslog_ng_control "$1" stats | grep -E '^(source;s_kelo|dst\.).*;(processed|written|queued|dropped);[1-9]' | sort
+    for process in $(<"$1/pid") $(pgrep -P "$(<"$1/pid")"); do
+        echo "$process $(tr '\0' ' ' <"/proc/$process/cmdline"): $(sed -n 's/^State:\t//p' "/proc/$process/status"), $(<"/proc/$process/wchan")"
+    done
+    cat "$1/run/kelosyslog/receive.json" "$1/receiver.err"
+    tail -n 10 "$1/syslog-ng.err" "$1/syslog-ng.log"
+} 2>/dev/null
+
 # rsyslog, out of its packages. Fails where they cannot be had.
 rsyslog_unpack() {
     mkdir "$root/packages"
