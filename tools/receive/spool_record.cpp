@@ -150,8 +150,10 @@ SpoolParser::Piece SpoolParser::ParseRecord(std::string_view bytes, _SYSLOG_LOG_
         log.prog = prog > 0 ? bytes.substr(body + host + 1, prog) : "-";
         log.msg = text;
     }
-    if (mark_.empty())
-        MarkSet(mark);
+    if (mark_.empty()) {
+        mark_ = mark;
+        markSearcher_.emplace(mark_.data(), mark_.data() + mark_.size());
+    }
     size_ = size;
     return Piece::kRecord;
 }
@@ -180,21 +182,11 @@ size_t SpoolParser::FindStart(std::string_view bytes, size_t from) const {
     return std::string_view::npos;
 }
 
-void SpoolParser::MarkSet(std::string_view mark) {
-    mark_ = mark;
-    steps_.fill(kMarkBytes);
-    for (size_t i = 0; i + 1 < kMarkBytes; ++i)
-        steps_[static_cast<uint8_t>(mark_[i])] = static_cast<uint8_t>(kMarkBytes - 1 - i);
-}
-
-// Every record is searched for it: most steps are as long as the mark.
+// Every record is searched for it, and most steps of this search are as long as the mark.
 size_t SpoolParser::FindMark(std::string_view bytes, size_t from) const {
-    for (size_t end = from + kMarkBytes; end <= bytes.size();
-         end += steps_[static_cast<uint8_t>(bytes[end - 1])]) {
-        if (bytes[end - 1] == mark_.back() && bytes.substr(end - kMarkBytes, kMarkBytes) == mark_)
-            return end - kMarkBytes;
-    }
-    return std::string_view::npos;
+    const char *const end = bytes.data() + bytes.size();
+    const char *const found = (*markSearcher_)(bytes.data() + std::min(from, bytes.size()), end).first;
+    return found != end ? static_cast<size_t>(found - bytes.data()) : std::string_view::npos;
 }
 
 bool SpoolParser::SetTime(_SYSLOG_LOG_DATA_tag &log, int64_t utc, std::string_view zone) {

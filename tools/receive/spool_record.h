@@ -1,7 +1,8 @@
 #pragma once
 
-#include <array>
 #include <cstdint>
+#include <functional>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -30,6 +31,10 @@ public:
 
     static constexpr size_t kMaxRecordBytes = 512 * 1024;
 
+    SpoolParser() = default;
+    SpoolParser(const SpoolParser &) = delete;
+    SpoolParser &operator=(const SpoolParser &) = delete;
+
     // Looks at what `bytes`, which are not empty, begin with; a record goes into `log`.
     Piece Parse(std::string_view bytes, _SYSLOG_LOG_DATA_tag &log);
 
@@ -43,11 +48,10 @@ private:
     Piece Skip(std::string_view bytes);
     size_t FindStart(std::string_view bytes, size_t from) const;
     size_t FindMark(std::string_view bytes, size_t from) const;
-    void MarkSet(std::string_view mark);
     bool SetTime(_SYSLOG_LOG_DATA_tag &log, int64_t utc, std::string_view zone);
 
-    std::string mark_;                 // what every record of the file begins with, once one is known
-    std::array<uint8_t, 256> steps_{}; // by the last byte looked at: how far on the mark may end
+    std::string mark_; // what every record of the file begins with, once one is known
+    std::optional<std::boyer_moore_horspool_searcher<const char *>> markSearcher_; // points to the mark
     size_t size_ = 0;
     uint64_t receipt_ = 0;
     // Of the last record: most have the same second.
