@@ -2,9 +2,10 @@
 
 #include <algorithm>
 #include <chrono>
-#include <cstdlib>
 #include <thread>
 #include <unordered_map>
+
+#include "base/number_text.h"
 
 namespace kelo::tool {
 namespace {
@@ -113,8 +114,8 @@ std::vector<const EngineRow *> BlockTransfer::Missing(size_t server, const Expec
 std::vector<const EngineRow *> BlockTransfer::MissingOneByOne(size_t server, const Expected &expected) {
     std::unordered_map<uint64_t, uint64_t> hashes; // by id
     for (const auto &row : servers_.Ask(server, "SELECT id, " + HashExpression() + expected.where)) {
-        const uint64_t id = std::strtoull(row.at(0).c_str(), nullptr, 10);
-        const uint64_t hash = std::strtoull(row.at(1).c_str(), nullptr, 10);
+        const uint64_t id = UnsignedNumber(row.at(0));
+        const uint64_t hash = UnsignedNumber(row.at(1));
         if (!hashes.emplace(id, hash).second)
             throw DatabaseError(servers_.Url(server) + ": the cluster has two rows with the id " +
                                 std::to_string(id) + "; a server merges equal rows of its own, later");

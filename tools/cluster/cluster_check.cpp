@@ -4,6 +4,7 @@
 #include <cstdlib>
 #include <ctime>
 
+#include "base/number_text.h"
 #include "cluster/clock_check.h"
 #include "cluster/server_answers.h"
 #include "cluster/table_check.h"
@@ -19,10 +20,6 @@ constexpr uint64_t kLongDelaySec = 60;
 constexpr double kLittleDisk = 0.1;
 constexpr double kLeastDisk = 0.03;
 constexpr int kYearsOfVersion = 2;
-
-uint64_t CountIn(const std::string &text) {
-    return std::strtoull(text.c_str(), nullptr, 10);
-}
 
 // The checks of one server. Each throws DatabaseError where it does not answer.
 class ServerCheck {
@@ -86,7 +83,7 @@ public:
                           "'logs_shard'")) {
             if (row[0] != "0")
                 Note(Level::kError, "it takes no rows, as it has no connection to ZooKeeper");
-            if (CountIn(row[1]) > kLongDelaySec)
+            if (UnsignedNumber(row[1]) > kLongDelaySec)
                 Note(Level::kError,
                      "it is " + row[1] + " s behind the other replicas, with " + row[4] + " tasks to do");
             if (row[2] != row[3])
@@ -99,7 +96,7 @@ public:
                  server_, "SELECT partition, count() AS parts FROM system.parts WHERE active AND database = "
                           "currentDatabase() AND table = 'logs_shard' GROUP BY partition ORDER BY parts DESC "
                           "LIMIT 1")) {
-            const uint64_t parts = CountIn(row[1]);
+            const uint64_t parts = UnsignedNumber(row[1]);
             if (parts >= kManyParts)
                 Note(parts >= kMostParts ? Level::kError : Level::kWarning,
                      "the day " + row[0] + " has " + row[1] + " parts; from " + std::to_string(kMostParts) +
@@ -115,7 +112,8 @@ public:
             return Note(Level::kNote, "this version does not say how much disk is free");
         for (const std::vector<std::string> &row :
              servers_.Ask(server_, "SELECT name, free_space, total_space FROM system.disks")) {
-            const double free = static_cast<double>(CountIn(row[1])) / static_cast<double>(CountIn(row[2]));
+            const double free =
+                static_cast<double>(UnsignedNumber(row[1])) / static_cast<double>(UnsignedNumber(row[2]));
             char percent[16];
             std::snprintf(percent, sizeof percent, "%.1f %%", free * 100);
             if (free < kLittleDisk)

@@ -1,9 +1,9 @@
 #include "cluster/cluster_export.h"
 
-#include <cstdlib>
 #include <unordered_map>
 #include <vector>
 
+#include "base/number_text.h"
 #include "base/sqlite.h"
 #include "base/stop_signals.h"
 #include "cluster/engine_row.h"
@@ -72,9 +72,7 @@ private:
     std::vector<Span> Spans(const std::string &sql) {
         std::vector<Span> spans;
         for (const auto &row : AnyServer([&](size_t server) { return servers_.Ask(server, sql); }))
-            spans.push_back({std::strtoll(row.at(0).c_str(), nullptr, 10),
-                             std::strtoll(row.at(1).c_str(), nullptr, 10),
-                             std::strtoull(row.at(2).c_str(), nullptr, 10)});
+            spans.push_back({SignedNumber(row.at(0)), SignedNumber(row.at(1)), UnsignedNumber(row.at(2))});
         return spans;
     }
 

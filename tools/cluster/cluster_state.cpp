@@ -1,9 +1,9 @@
 #include "cluster/cluster_state.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <map>
 
+#include "base/number_text.h"
 #include "cluster/server_answers.h"
 
 #include "keloplatform/cluster.h"
@@ -13,10 +13,6 @@ namespace {
 
 constexpr int64_t kLatelySec = 60;
 constexpr int64_t kRecentSec = 86400;
-
-int64_t Integer(const std::string &text) {
-    return std::strtoll(text.c_str(), nullptr, 10);
-}
 
 // The replicas of a shard have the same rows of a log server, but for what one of them still lacks.
 void TakeLogServer(const LogServerState &found, std::map<int, LogServerState> &logServers) {
@@ -33,8 +29,8 @@ void AskServer(EngineServers &servers, size_t server, int64_t now, ClusterServer
             .Ask(server, "SELECT sum(rows), sum(bytes_on_disk) FROM system.parts WHERE active AND database = "
                          "currentDatabase() AND table = 'logs_shard'")
             .at(0);
-    state.rows = static_cast<uint64_t>(Integer(held.at(0)));
-    state.bytes = static_cast<uint64_t>(Integer(held.at(1)));
+    state.rows = UnsignedNumber(held.at(0));
+    state.bytes = UnsignedNumber(held.at(1));
     for (const std::vector<std::string> &row :
          servers.Ask(server, "SELECT substitution FROM system.macros WHERE macro = 'shard'"))
         state.shard = row.at(0);
@@ -44,14 +40,14 @@ void AskServer(EngineServers &servers, size_t server, int64_t now, ClusterServer
          servers.Ask(server, "SELECT node, countIf(utcsec > " + std::to_string(now - kLatelySec) +
                                  "), max(utcsec) FROM logs_shard WHERE id >= " + std::to_string(firstId) +
                                  " GROUP BY node")) {
-        const double perSec = static_cast<double>(Integer(row.at(1))) / kLatelySec;
-        const int64_t newest = Integer(row.at(2));
+        const double perSec = static_cast<double>(SignedNumber(row.at(1))) / kLatelySec;
+        const int64_t newest = SignedNumber(row.at(2));
         state.perSec += perSec;
         state.newest = std::max(state.newest.value_or(newest), newest);
-        TakeLogServer({static_cast<int>(Integer(row.at(0))), perSec, newest}, logServers);
+        TakeLogServer({static_cast<int>(SignedNumber(row.at(0))), perSec, newest}, logServers);
     }
     if (!state.newest && state.rows > 0)
-        state.newest = Integer(AskOne(servers, server, "SELECT max(utcsec) FROM logs_shard"));
+        state.newest = SignedNumber(AskOne(servers, server, "SELECT max(utcsec) FROM logs_shard"));
 }
 
 } // namespace

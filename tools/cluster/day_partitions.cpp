@@ -1,8 +1,9 @@
 #include "cluster/day_partitions.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <set>
+
+#include "base/number_text.h"
 
 namespace kelo::tool {
 
@@ -21,8 +22,7 @@ std::vector<DayPartition> DaysBefore(EngineServers &servers, size_t server, int6
     std::vector<DayPartition> old;
     for (const std::vector<std::string> &row : days) {
         if (!kept.contains(row.at(0)))
-            old.push_back({row.at(0), std::strtoull(row.at(1).c_str(), nullptr, 10),
-                           std::strtoull(row.at(2).c_str(), nullptr, 10)});
+            old.push_back({row.at(0), UnsignedNumber(row.at(1)), UnsignedNumber(row.at(2))});
     }
     return old;
 }

@@ -1,8 +1,8 @@
 #include "cluster/engine_servers.h"
 
-#include <cstdlib>
 #include <filesystem>
 
+#include "base/number_text.h"
 #include "keloplatform/cluster.h"
 #include "keloplatform/failure.h"
 #include "keloplatform/kelodb.h"
@@ -75,7 +75,7 @@ std::vector<uint64_t> EngineServers::AskNumbers(size_t server, const std::string
         throw DatabaseError(path_ + ": " + Url(server) + " gave no numbers for " + statement);
     std::vector<uint64_t> numbers;
     for (const std::string &number : rows.front())
-        numbers.push_back(std::strtoull(number.c_str(), nullptr, 10));
+        numbers.push_back(UnsignedNumber(number));
     return numbers;
 }
 

@@ -3,12 +3,12 @@
 #include <sys/stat.h>
 
 #include <condition_variable>
-#include <cstdlib>
 #include <fstream>
 #include <mutex>
 #include <thread>
 
 #include "base/errors.h"
+#include "base/number_text.h"
 #include "base/time_format.h"
 #include "cli/exit_status.h"
 #include "cli/progress_bar.h"
@@ -28,7 +28,7 @@ void AddTime(KeyValues &values, const std::string &name, const std::string &utcs
     if (utcsec.empty())
         values.AddUnknown(name);
     else
-        values.Add(name, TimeFormat(false).Iso(std::strtoll(utcsec.c_str(), nullptr, 10)));
+        values.Add(name, TimeFormat(false).Iso(SignedNumber(utcsec)));
 }
 
 // The time of the first record in one order of time; "" when there is none.
@@ -47,7 +47,7 @@ void AddDescription(KeyValues &values, const ReadOnlyQuery &database) {
         return;
     AddTime(values, "db_info_start_time", row->at(0));
     AddTime(values, "db_info_end_time", row->at(1));
-    values.Add("db_info_log_count", int64_t{std::strtoll(row->at(2).c_str(), nullptr, 10)});
+    values.Add("db_info_log_count", SignedNumber(row->at(2)));
     values.Add("db_info_device", row->at(3));
 }
 

@@ -1,8 +1,8 @@
 #include "read/accounting_samples.h"
 
-#include <cstdlib>
 #include <filesystem>
 
+#include "base/number_text.h"
 #include "read/read_only_query.h"
 
 namespace kelo::tool {
@@ -29,8 +29,7 @@ std::optional<StampRange> StoredStamps(const std::string &path, const StampRange
     const auto ends = ReadOnlyQuery({path, "eps"}).FirstRow(sql, {"first", "last"});
     if (!ends || ends->front().empty())
         return std::nullopt;
-    return StampRange{std::strtoll(ends->front().c_str(), nullptr, 10),
-                      std::strtoll(ends->back().c_str(), nullptr, 10)};
+    return StampRange{SignedNumber(ends->front()), SignedNumber(ends->back())};
 }
 
 } // namespace kelo::tool

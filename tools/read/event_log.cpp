@@ -4,11 +4,11 @@
 
 #include <algorithm>
 #include <array>
-#include <cstdlib>
 #include <filesystem>
 
 #include "base/errors.h"
 #include "base/folder_owner.h"
+#include "base/number_text.h"
 #include "read/failure_reason.h"
 #include "read/log_table.h"
 #include "read/read_only_query.h"
@@ -94,15 +94,14 @@ std::list<Event> ReadEvents(const std::string &path, int offset, int limit) {
 
 std::vector<Event> ReadEventsAfter(const std::string &path, int64_t &lastId) {
     const std::string sql = "SELECT * FROM log WHERE id > " + std::to_string(lastId) + " ORDER BY id";
-    const auto number = [](const std::string &text) { return std::strtoll(text.c_str(), nullptr, 10); };
     std::vector<Event> events;
     for (const ReadOnlyQuery::Row &row :
          ReadOnlyQuery({path, "log"}).Rows(sql, {"id", "level", "time", "user", "event"})) {
-        lastId = number(row[0]);
+        lastId = SignedNumber(row[0]);
         Event event;
         event.id = static_cast<decltype(event.id)>(lastId);
-        event.level = static_cast<decltype(event.level)>(number(row[1]));
-        event.time = number(row[2]);
+        event.level = static_cast<decltype(event.level)>(SignedNumber(row[1]));
+        event.time = SignedNumber(row[2]);
         event.user = row[3];
         event.event = row[4];
         events.push_back(event);

@@ -8,6 +8,7 @@
 #include <unordered_map>
 
 #include "base/errors.h"
+#include "base/number_text.h"
 #include "keloplatform/cluster.h"
 #include "keloplatform/failure.h"
 #include "read/read_only_query.h"
@@ -59,7 +60,7 @@ void ForEachGroup(const LogTable &table, const Conditions &conditions, const std
     const ReadOnlyQuery database(table);
     try {
         for (const ReadOnlyQuery::Row &row : database.Rows(sql, {"value", "llevel", "count"}))
-            take({row[0], SeverityOf(row[1]), std::strtoull(row[2].c_str(), nullptr, 10)});
+            take({row[0], SeverityOf(row[1]), UnsignedNumber(row[2])});
     } catch (const SqliteError &) {
         throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
     }
@@ -105,7 +106,7 @@ std::vector<ValueCount> CountManyValues(const LogTable &table, const Conditions 
     const ReadOnlyQuery database(table);
     try {
         for (const ReadOnlyQuery::Row &row : database.Rows(sql, {"value", "count"}))
-            values.push_back({row[0], std::strtoull(row[1].c_str(), nullptr, 10)});
+            values.push_back({row[0], UnsignedNumber(row[1])});
     } catch (const SqliteError &) {
         throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
     }
@@ -138,7 +139,7 @@ TimeTally TallyClusterByTime(const LogTable &table, const Conditions &conditions
     ForEachGroup(table, with(usable),
                  "(utcsec - (" + std::to_string(origin - before * span) + ")) / " + std::to_string(span),
                  [&](const Group &group) {
-                     const int64_t number = std::strtoll(group.key.c_str(), nullptr, 10) - before;
+                     const int64_t number = SignedNumber(group.key) - before;
                      Count(tally.spans[number], group.severity, group.count);
                      Count(tally.total, group.severity, group.count);
                  });
@@ -256,7 +257,7 @@ uint64_t CountUpTo(const LogTable &table, const Conditions &conditions, uint64_t
         try {
             const auto row =
                 database.FirstRow("SELECT COUNT(*) FROM " + SelectionOf(table, inRange), {"COUNT(*)"});
-            count += row ? std::strtoull(row->front().c_str(), nullptr, 10) : 0;
+            count += row ? UnsignedNumber(row->front()) : 0;
         } catch (const SqliteError &) {
             throw DatabaseError(DescribeDatabaseProblem(table, false, *KELOFailureGet()));
         }

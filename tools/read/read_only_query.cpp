@@ -3,10 +3,10 @@
 #include <sqlite3.h>
 #include <sys/stat.h>
 
-#include <cstdlib>
 #include <exception>
 #include <utility>
 
+#include "base/number_text.h"
 #include "keloplatform/kelodb.h"
 
 namespace kelo::tool {
@@ -127,7 +127,7 @@ std::optional<int64_t> ReadOnlyQuery::Values::Number(int column) const {
 
 int64_t ReadOnlyQuery::Number(const std::string &sql) const {
     const auto row = FirstRow(sql, {"value"});
-    return row ? std::strtoll(row->front().c_str(), nullptr, 10) : 0;
+    return row ? SignedNumber(row->front()) : 0;
 }
 
 void ReadOnlyQuery::RequireTable() const {

@@ -1,9 +1,9 @@
 #include "report/log_figures.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <ctime>
 
+#include "base/number_text.h"
 #include "kelosyslog/records.h"
 #include "read/read_only_query.h"
 
@@ -12,10 +12,6 @@ namespace {
 
 constexpr int64_t kMostSpans = 100;
 constexpr int64_t kDaySec = 86400;
-
-int64_t Number(const std::string &text) {
-    return std::strtoll(text.c_str(), nullptr, 10);
-}
 
 int64_t FloorMod(int64_t value, int64_t divisor) {
     return (value % divisor + divisor) % divisor;
@@ -79,7 +75,7 @@ std::optional<Period> LogPeriod(const LogTable &table, std::optional<int64_t> si
         {"first", "last"});
     if (!ends || ends->front().empty())
         return std::nullopt;
-    return Period{since.value_or(Number(ends->front())), until.value_or(Number(ends->back()))};
+    return Period{since.value_or(SignedNumber(ends->front())), until.value_or(SignedNumber(ends->back()))};
 }
 
 LogFigures ReadLogFigures(const LogTable &table, const Period &period, bool isWhole, size_t topDevices) {
@@ -95,12 +91,12 @@ LogFigures ReadLogFigures(const LogTable &table, const Period &period, bool isWh
     for (const ReadOnlyQuery::Row &row : database.Rows(
              "SELECT " + span + " AS span, prio, count(*) AS number FROM logs" + which + " GROUP BY 1, 2",
              {"prio", "span", "number"}))
-        AddSpan(figures, row[0], Number(row[1]), static_cast<uint64_t>(Number(row[2])));
+        AddSpan(figures, row[0], SignedNumber(row[1]), UnsignedNumber(row[2]));
     for (const ReadOnlyQuery::Row &row : database.Rows("SELECT host, count(*) AS number FROM logs" + which +
                                                            " GROUP BY host ORDER BY number DESC, host",
                                                        {"host", "number"})) {
         if (figures.deviceCount++ < topDevices)
-            figures.devices.emplace_back(row[0], static_cast<uint64_t>(Number(row[1])));
+            figures.devices.emplace_back(row[0], UnsignedNumber(row[1]));
     }
     return figures;
 }

@@ -1,8 +1,8 @@
 #include "status/accounting.h"
 
-#include <cstdlib>
 #include <limits>
 
+#include "base/number_text.h"
 #include "read/read_only_query.h"
 
 namespace kelo::tool {
@@ -20,10 +20,6 @@ double MeanRate(const ReadOnlyQuery &database, int64_t newest, int64_t seconds) 
     return static_cast<double>(logs) / static_cast<double>(seconds);
 }
 
-uint64_t Count(const std::string &text) {
-    return std::strtoull(text.c_str(), nullptr, 10);
-}
-
 } // namespace
 
 AccountingStatus GatherAccounting(const std::string &path, int devices) {
@@ -34,17 +30,18 @@ AccountingStatus GatherAccounting(const std::string &path, int devices) {
                                               std::to_string(std::numeric_limits<int32_t>::max()),
                                           {"newest"});
     if (newest && !newest->front().empty()) {
-        status.newest = std::strtoll(newest->front().c_str(), nullptr, 10);
+        status.newest = SignedNumber(newest->front());
         status.perSecond = MeanRate(database, status.newest, 60);
         status.perSecondHour = MeanRate(database, status.newest, 3600);
     }
-    status.total = Count(database.FirstRow("SELECT sum(count) AS total FROM histogram", {"total"})->front());
+    status.total =
+        UnsignedNumber(database.FirstRow("SELECT sum(count) AS total FROM histogram", {"total"})->front());
     for (const auto &row :
          database.Rows("SELECT substr(device, 1, " + std::to_string(kLongestName) +
                            ") AS device, count FROM histogram ORDER BY count DESC, device LIMIT " +
                            std::to_string(devices),
                        {"device", "count"}))
-        status.devices.emplace_back(row[0], Count(row[1]));
+        status.devices.emplace_back(row[0], UnsignedNumber(row[1]));
     return status;
 }
 

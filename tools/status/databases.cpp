@@ -4,11 +4,11 @@
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <cstdlib>
 #include <ctime>
 #include <filesystem>
 #include <limits>
 
+#include "base/number_text.h"
 #include "kelosyslog/records.h"
 #include "read/accounting_samples.h"
 #include "read/event_log.h"
@@ -32,7 +32,7 @@ std::optional<int64_t> SizeOf(const std::string &path) {
 }
 
 std::optional<int64_t> NumberOf(const std::string &text) {
-    return text.empty() ? std::nullopt : std::optional<int64_t>(std::strtoll(text.c_str(), nullptr, 10));
+    return text.empty() ? std::nullopt : std::optional<int64_t>(SignedNumber(text));
 }
 
 // The moment of a local date and time, "2020/01/02 10:11:12".

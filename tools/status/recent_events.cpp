@@ -2,6 +2,7 @@
 
 #include <cstdlib>
 
+#include "base/number_text.h"
 #include "read/read_only_query.h"
 
 namespace kelo::tool {
@@ -15,7 +16,7 @@ std::vector<Event> ReadRecentEvents(const std::string &path, int limit) {
         Event &event = events.emplace_back();
         event.id = std::atoi(row[0].c_str());
         event.level = std::atoi(row[1].c_str());
-        event.time = std::strtoll(row[2].c_str(), nullptr, 10);
+        event.time = SignedNumber(row[2]);
         event.user = std::move(row[3]);
         event.event = std::move(row[4]);
     }
