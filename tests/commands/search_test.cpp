@@ -8,6 +8,14 @@ namespace {
 class Search : public ProgramTest {
 protected:
     Search() { CreateLogDatabase(logs_); }
+
+    // "1 2 " for a search that prints these.
+    std::string Ids(const std::string &options) const {
+        std::string ids = Run("search -o csv --no-header --fields id " + options).out;
+        for (size_t at = 0; (at = ids.find("\r\n", at)) != std::string::npos;)
+            ids.replace(at, 2, " ");
+        return ids;
+    }
 };
 
 TEST_F(Search, PrintsTheNewestLogsOldestFirstAndTellsMatchFromNoMatch) {
@@ -66,10 +74,7 @@ TEST_F(Search, SelectsByEveryOption) {
         {"--table general_log --until '2020-01-02 00:00' -p err..err", "1 3 4 "},
     };
     for (const auto &[options, ids] : cases) {
-        std::string found = Run("search -o csv --no-header --fields id " + options).out;
-        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
-            found.replace(at, 2, " ");
-        EXPECT_EQ(found, ids) << options.substr(0, 80);
+        EXPECT_EQ(Ids(options), ids) << options.substr(0, 80);
         Expect("count " + options, 0, std::to_string(std::ranges::count(ids, ' ')) + "\n");
     }
 }
@@ -95,12 +100,8 @@ TEST_F(Search, PagesByIdFromBothEnds) {
         {"--follow --after-id 20 --idle 0", largest + " "},
         {"--follow --after-id 3 -n 2 --idle 0", "20 " + largest + " "},
     };
-    for (const auto &[options, ids] : cases) {
-        std::string found = Run("search -o csv --no-header --fields id " + options).out;
-        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
-            found.replace(at, 2, " ");
-        EXPECT_EQ(found, ids) << options;
-    }
+    for (const auto &[options, ids] : cases)
+        EXPECT_EQ(Ids(options), ids) << options;
     Expect("search --before-id 9223372036854775808", 2);
     Expect("search --follow --before-id 5", 2);
 }
@@ -116,12 +117,8 @@ TEST_F(Search, TakesNamesAsTheyAre) {
         {"--program-is-not 'p*' --program-is-not \"it's\"", "2 4 "},
         {"--host-is-not a,b -H 'a,b'", "3 4 "},
     };
-    for (const auto &[options, ids] : cases) {
-        std::string found = Run("search -o csv --no-header --fields id " + options).out;
-        for (size_t at = 0; (at = found.find("\r\n", at)) != std::string::npos;)
-            found.replace(at, 2, " ");
-        EXPECT_EQ(found, ids) << options;
-    }
+    for (const auto &[options, ids] : cases)
+        EXPECT_EQ(Ids(options), ids) << options;
     Expect("search --host-is ''", 2);
 }
 

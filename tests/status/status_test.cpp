@@ -264,6 +264,17 @@ TEST_F(Status, AsksSyslogNgForItsCountersInTime) {
     EXPECT_TRUE(GatherSyslogNg("", deep, 200ms).destinations.at(0).isStuck);
 }
 
+// Of the lines of status.md that begin so, the texts from column `from` up to one of the bytes `ends`.
+std::set<std::string> Documented(const char *begin, size_t from, const char *ends) {
+    std::set<std::string> documented;
+    std::istringstream page(ReadFile(SourcePath("docs/status.md")));
+    for (std::string line; std::getline(page, line);) {
+        if (line.starts_with(begin))
+            documented.insert(line.substr(from, line.find_first_of(ends, from) - from));
+    }
+    return documented;
+}
+
 // The names of all values: "databases[].rows", with NAME for names that are data themselves.
 void CollectKeys(const Json::Value &value, const std::string &name, std::set<std::string> &keys) {
     if (value.isArray() && !value.empty() && value[0].isObject()) {
@@ -287,13 +298,7 @@ TEST_F(Status, HasTheKeysThatAreDocumented) {
     status.network.listeners = ConfiguredListeners({});
     std::set<std::string> keys;
     CollectKeys(ParseJson(StatusJson(status)), "", keys);
-    std::set<std::string> documented;
-    std::istringstream page(ReadFile(SourcePath("docs/status.md")));
-    for (std::string line; std::getline(page, line);) {
-        if (line.starts_with("| `"))
-            documented.insert(line.substr(3, line.find('`', 3) - 3));
-    }
-    EXPECT_EQ(keys, documented);
+    EXPECT_EQ(keys, Documented("| `", 3, "`"));
 }
 
 TEST_F(Status, HasTheMetricsThatAreDocumented) {
@@ -316,13 +321,7 @@ TEST_F(Status, HasTheMetricsThatAreDocumented) {
             EXPECT_THAT(line, MatchesRegex(name + "(\\{[a-z]+=\".*\"\\})? [0-9.e+]+"));
         }
     }
-    std::set<std::string> documented;
-    std::istringstream page(ReadFile(SourcePath("docs/status.md")));
-    for (std::string line; std::getline(page, line);) {
-        if (line.starts_with("kelosyslog_"))
-            documented.insert(line.substr(0, line.find_first_of(" {")));
-    }
-    EXPECT_EQ(metrics, documented);
+    EXPECT_EQ(metrics, Documented("kelosyslog_", 0, " {"));
     // What is special in a label.
     EXPECT_THAT(StatusPrometheus(Gather()), HasSubstr("instance=\"a;\\\"b\\\"\"} 0\n"));
 }
