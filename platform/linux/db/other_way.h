@@ -8,7 +8,7 @@
 #include "db/raise_error.h"
 #include "db/result.h"
 #include "db/small_cache.h"
-#include "db/transaction.h"
+#include "skip_index/transaction.h"
 
 namespace kelo::platform {
 

@@ -13,9 +13,9 @@
 #include <utility>
 #include <vector>
 
-#include "db/transaction.h"
 #include "skip_index/database_state.h"
 #include "skip_index/piece_reader.h"
+#include "skip_index/transaction.h"
 
 namespace kelo::platform {
 namespace {
