@@ -42,12 +42,12 @@ int AccountingManager::ConfigLoad() {
 
 int AccountingManager::LogInc(std::string device) {
     CurEpsUpdate();
-    kelo::Device &entry = devices_->Find(device);
-    if (entry.inOpenSample == 0)
-        openSample_.push_back(&entry);
+    kelo::DeviceCounts &counts = devices_->Find(device);
+    if (counts.inOpenSample == 0)
+        openSample_.push_back(&devices_->DeviceOf(counts));
     // Nothing throws from here on: a record is in all figures or, without memory, in none.
-    ++entry.inOpenSample;
-    ++entry.total;
+    ++counts.inOpenSample;
+    ++counts.total;
     ++currentCount_;
     ++totalCount_;
     return 0;
@@ -63,7 +63,8 @@ int AccountingManager::CurEpsUpdate() {
     // From here on nothing throws until the sample is closed, so that none is closed twice.
     currentSecond_ = now;
     for (kelo::Device *device : openSample_)
-        samples_.back().devices.emplace_back(device, std::exchange(device->inOpenSample, 0));
+        samples_.back().devices.emplace_back(device,
+                                             std::exchange(devices_->CountsOf(*device).inOpenSample, 0));
     openSample_.clear();
     const auto eps = static_cast<uint64_t>(std::exchange(currentCount_, 0));
     if (epsHandler_)
@@ -118,7 +119,8 @@ void AccountingManager::AccountingDump() {
     Debuger::MSG(2, "EPS: " + ullNumberToString(static_cast<uint64_t>(currentCount_)));
     for (size_t i = 0; i < devices_->Size(); ++i) {
         const kelo::Device &device = (*devices_)[i];
-        Debuger::MSG(2, "Device: " + device.name + ", count: " + ullNumberToString(device.total));
+        Debuger::MSG(2, "Device: " + device.name +
+                            ", count: " + ullNumberToString(devices_->CountsOf(device).total));
     }
     Debuger::MSG(2, "==================================");
 }
@@ -134,6 +136,6 @@ int64_t AccountingManager::CurrentEpsGet() const {
 std::list<KELOLOG_LOG_DEVICE_STATISTIC> AccountingManager::HistogramGet() const {
     std::list<KELOLOG_LOG_DEVICE_STATISTIC> histogram;
     for (size_t i = 0; i < devices_->Size(); ++i)
-        histogram.push_back({(*devices_)[i].name, (*devices_)[i].total});
+        histogram.push_back({(*devices_)[i].name, devices_->CountsOf((*devices_)[i]).total});
     return histogram;
 }

@@ -8,36 +8,52 @@
 
 namespace kelo {
 
-// The counts of one sending device. In a separate cache line: with many devices, loading that line is the
-// main cost of counting a record.
-struct alignas(64) Device {
+// A sending device.
+struct Device {
     std::string name;
+    size_t slot = 0; // of its counts in the table
+};
+
+// What is counted of a device.
+struct DeviceCounts {
     uint64_t total = 0;       // in the histogram
     int32_t inOpenSample = 0; // since the last sample was closed
+    uint32_t number = 0;      // of the device in the table, from 1 on
 };
 
 // The devices in the order in which they were first asked for. They keep their place in memory.
 class DeviceTable {
 public:
-    // The device of this name, compared byte by byte; a new one when there is none yet. Throws std::bad_alloc
-    // and then leaves the table unchanged.
-    Device &Find(const std::string &name);
+    // The counts of the device of this name, compared byte by byte; of a new one when there is none yet. They
+    // are valid until the next call. Throws std::bad_alloc and then leaves the table unchanged.
+    DeviceCounts &Find(const std::string &name);
 
     size_t Size() const { return size_; }
     Device &operator[](size_t i) const { return chunks_[i / kChunk][i % kChunk]; }
+    Device &DeviceOf(const DeviceCounts &counts) const { return (*this)[counts.number - 1]; }
+    DeviceCounts &CountsOf(const Device &device) { return slots_[device.slot].counts; }
 
 private:
     static constexpr size_t kChunk = 256;
 
-    // The position of a device with this hash: from the slot of the hash on, before the first free one.
-    struct Slot {
-        uint32_t hash = 0;
-        uint32_t number = 0; // of the device, from 1 on; 0 for a free slot
+    // A name of up to 15 bytes and its size, or the hash of a longer one, whose device has to be looked at.
+    struct Key {
+        bool operator==(const Key &) const = default;
+        uint64_t head = 0;
+        uint64_t tail = 0;
     };
 
-    Device &Add(const std::string &name, uint32_t hash);
+    // A device, from the slot of its hash on, before the first free one. With many devices, loading the cache
+    // line of a slot is the main cost of counting a record, so all that it takes is in this line.
+    struct alignas(32) Slot {
+        Key key;
+        DeviceCounts counts; // the number is 0 in a free slot
+    };
+
+    static Key KeyOf(const std::string &name, size_t hash);
+    DeviceCounts &Add(const std::string &name, const Key &key, size_t hash);
     void Reserve();
-    static Slot &FreeSlot(std::vector<Slot> &slots, uint32_t hash);
+    static size_t FreeSlot(const std::vector<Slot> &slots, size_t hash);
 
     std::vector<std::unique_ptr<Device[]>> chunks_;
     std::vector<Slot> slots_; // a power of two of them, at least a quarter free

@@ -156,7 +156,8 @@ int AccountingManager::AccoutingFlush2DB() {
         }
     }
     for (size_t i = 0; i < devices_->Size(); ++i) {
-        if (!db.WriteHistogram((*devices_)[i].name, (*devices_)[i].total))
+        const kelo::Device &device = (*devices_)[i];
+        if (!db.WriteHistogram(device.name, devices_->CountsOf(device).total))
             return -1;
     }
     if (flushStatements_ && !db.Run(flushStatements_()))

@@ -130,6 +130,29 @@ TEST_F(Accounting, TakesADatabaseByItsPath) {
     EXPECT_EQ(Samples(), "");
 }
 
+TEST_F(Accounting, TellsNamesApartThatDifferInAnyByteOrInTheirSize) {
+    Names names;
+    for (size_t size = 0; size <= 20; ++size) {
+        const std::string name(size, 'a');
+        names.push_back(name);
+        for (size_t i = 0; i < size; ++i) {
+            for (char other = 0; other < 32; ++other)
+                names.emplace_back(name)[i] = other;
+        }
+    }
+    AccountingManager accounting;
+    for (size_t count = 0; count < 2; ++count) {
+        for (const std::string &name : names)
+            accounting.LogInc(name);
+    }
+    const auto histogram = accounting.HistogramGet();
+    ASSERT_EQ(histogram.size(), names.size());
+    EXPECT_TRUE(
+        std::equal(names.begin(), names.end(), histogram.begin(), [](const auto &name, const auto &device) {
+            return device.device == name && device.count == 2;
+        }));
+}
+
 TEST_F(Accounting, CountsManyDevicesExactly) {
     AccountingManager accounting;
     std::map<std::string, uint64_t> counted;
