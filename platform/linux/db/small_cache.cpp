@@ -7,7 +7,7 @@
 namespace kelo::platform {
 namespace {
 
-constexpr int64_t kSmall = -256;
+constexpr int64_t kSmall = 24; // pages, far more than a path from the root to a record
 
 std::optional<int64_t> SizeOf(sqlite3 *db) {
     sqlite3_stmt *prepared = nullptr;
