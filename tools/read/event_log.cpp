@@ -116,7 +116,7 @@ int64_t NewestEventId(const std::string &path) {
 std::string AddEvent(const std::string &root, const std::function<int(Logger &)> &add) {
     const std::string path = EventDatabasePath("", root);
     const bool hasExisted = access(path.c_str(), F_OK) == 0;
-    const std::string reason = AsOwnerOfFolder(path, [&] {
+    std::string reason = AsOwnerOfFolder(path, [&] {
         Logger logger;
         return add(logger) == 0 ? std::string() : WhyFailed(path);
     });
