@@ -144,6 +144,8 @@ bool Builder::ReadLoose() {
 
 bool Builder::BuildPiece() {
     const Transaction transaction(db_, "BEGIN"); // the samples are those of the rows that are indexed
+    if (!transaction.IsOpen())
+        return false;
     const int64_t piece = NextPiece();
     const Piece *rows = reader_.Read(piece);
     if (rows == nullptr || !TakeSamples(piece))

@@ -11,7 +11,8 @@
 namespace kelo::platform {
 namespace {
 
-constexpr size_t kBitsOfRow = 24; // of its message
+constexpr size_t kBitsOfRow = 24;    // of its message
+constexpr size_t kBytesOfRow = 1024; // of its message, which may have millions
 
 std::string_view TextAt(sqlite3_stmt *row, int column) {
     const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(row, column));
@@ -28,7 +29,8 @@ uint64_t HashOfRow(sqlite3_stmt *row) {
 
 // What a search needs that finds the row of "msg, llevel, fac, utcsec, ldate" by all that it has.
 Need NeedOfRow(sqlite3_stmt *row) {
-    Need values{.kind = Need::Kind::kBits, .bits = BitsOfLiteral(TextAt(row, 0), kBitsOfRow)};
+    Need values{.kind = Need::Kind::kBits,
+                .bits = BitsOfLiteral(TextAt(row, 0).substr(0, kBytesOfRow), kBitsOfRow)};
     for (const auto &[column, at] : {std::pair(TokenColumn::kSeverity, 1), {TokenColumn::kFacility, 2}}) {
         const auto bits = BitsOfToken(column, TextAt(row, at));
         values.bits.insert(values.bits.end(), bits.begin(), bits.end());

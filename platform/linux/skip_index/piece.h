@@ -69,7 +69,7 @@ public:
     // Throws std::bad_alloc.
     Piece();
     void Clear();
-    // Adds the row with this number in the piece, each once. The order of the numbers is the fastest one.
+    // Adds the row with this number in the piece, each once; fastest in ascending order.
     void Add(size_t number, const IndexedRow &row);
     // After the last row: makes a block or zone with fewer rows than ids fit every search. The others were
     // deleted, and come back when somebody copies an older database over the content of this one.
